@@ -1,0 +1,24 @@
+// The device's counters service, as its clients see it.
+#pragma once
+
+#include <cstdint>
+
+#include "platform/PropertyList.h"
+
+namespace platform {
+
+class CountersService {
+ public:
+  virtual ~CountersService() = default;
+
+  // Today: whole days since 1970-01-01 on the service's calendar.
+  virtual std::int32_t PLDaysSince1970() = 0;
+
+  // The instant at which a day begins: the inverse of PLDaysSince1970.
+  virtual Date PLDateFromDaysSince1970(std::int32_t day) = 0;
+
+  // Asks the service to bring everything recorded so far into its database.
+  virtual void PLClientCheckpoint() = 0;
+};
+
+}  // namespace platform

@@ -1,0 +1,40 @@
+// What the device says of itself.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "platform/PropertyList.h"
+
+namespace platform {
+
+class DeviceProperties {
+ public:
+  virtual ~DeviceProperties() = default;
+
+  // A device property as a truth value; false when the device doesn't know it.
+  virtual bool booleanProperty(std::string_view name) = 0;
+
+  // The multi-user indicator, or none when the query fails.
+  virtual std::optional<std::uint32_t> multiUserIndicator() = 0;
+
+  // The path of a system group container. None when there is none, with the error code set.
+  virtual std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
+                                                              std::uint64_t& error) = 0;
+};
+
+// The version of the operating system.
+class SystemVersion {
+ public:
+  virtual ~SystemVersion() = default;
+
+  // The system version dictionary ("ProductBuildVersion", "ProductVersion"), or none.
+  virtual std::optional<Dictionary> systemVersionDictionary() = 0;
+
+  // The version as one text; empty when nothing is known.
+  virtual std::string operatingSystemVersion() = 0;
+};
+
+}  // namespace platform

@@ -1,0 +1,24 @@
+// The analytics event sink.
+#pragma once
+
+#include <functional>
+#include <string_view>
+
+#include "platform/PropertyList.h"
+
+namespace platform {
+
+class Eventra {
+ public:
+  using PayloadProducer = std::function<Dictionary()>;
+
+  virtual ~Eventra() = default;
+
+  virtual bool EventraIsEventUsed(std::string_view event) = 0;
+
+  // Sends an event whose payload is built only if the sink wants it: later, and on the sink's own
+  // thread, so the producer holds what it needs. True when the event is used and could be queued.
+  virtual bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) = 0;
+};
+
+}  // namespace platform

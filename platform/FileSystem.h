@@ -1,0 +1,22 @@
+// The files of the device. Paths are absolute paths of the device.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+class FileSystem {
+ public:
+  virtual ~FileSystem() = default;
+
+  // The file status of a path: its size in bytes, or none when the status can't be had.
+  virtual std::optional<std::uint64_t> fileStatus(std::string_view path) = 0;
+
+  // The bytes of a regular file, at most `maximum` of them; none when it can't be read.
+  virtual std::optional<std::string> readFile(std::string_view path, std::size_t maximum) = 0;
+};
+
+}  // namespace platform

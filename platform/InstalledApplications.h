@@ -1,0 +1,18 @@
+// The registry of installed applications.
+#pragma once
+
+#include <functional>
+
+namespace platform {
+
+class InstalledApplications {
+ public:
+  enum class BundleType { system, user };
+
+  virtual ~InstalledApplications() = default;
+
+  // Calls the handler once for each installed application bundle.
+  virtual void enumerateBundles(const std::function<void(BundleType type)>& handler) = 0;
+};
+
+}  // namespace platform

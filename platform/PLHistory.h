@@ -1,0 +1,59 @@
+// The counters history store: what the counters service recorded, by day and key.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <span>
+#include <string_view>
+
+namespace platform {
+
+// The samples of one key and day, in the order in which they were recorded.
+class PLHistoryDistributionEnumerator {
+ public:
+  // Values beside their offsets in seconds within the day; the two spans have the same length.
+  struct Samples {
+    std::span<const double> values;
+    std::span<const std::int32_t> secondsInDayOffsets;
+  };
+
+  virtual ~PLHistoryDistributionEnumerator() = default;
+
+  // The next samples, as many as the store has at hand; empty at the end. They are borrowed until
+  // the next call. Samples come in blocks because a call for each would double the cost of reading.
+  virtual Samples getNextValues() = 0;
+};
+
+class PLHistory {
+ public:
+  // Called once a row. The key and the enumerator are borrowed until the handler returns; a handler
+  // that sets `stop` gets no further row.
+  using ScalarRowHandler =
+      std::function<void(std::string_view key, std::int32_t day, std::int64_t value, bool& stop)>;
+  using DistributionRowHandler =
+      std::function<void(std::string_view key, std::int32_t day,
+                         PLHistoryDistributionEnumerator& samples, bool& stop)>;
+
+  virtual ~PLHistory() = default;
+
+  // The rows whose key begins with the prefix, from the first to the last day, both included,
+  // ordered by day and then by key (bytewise). A store that fails delivers no further row.
+  virtual void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
+                                   std::int32_t maxDaysSince1970,
+                                   const ScalarRowHandler& rowHandler) = 0;
+  virtual void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
+                                         std::int32_t maxDaysSince1970,
+                                         const DistributionRowHandler& rowHandler) = 0;
+};
+
+class HistoryStore {
+ public:
+  virtual ~HistoryStore() = default;
+
+  // Opens the history on the store's default database. Never null: a database that is not there, or
+  // can't be opened, reads as an empty history.
+  virtual std::unique_ptr<PLHistory> initWithDefaultPath() = 0;
+};
+
+}  // namespace platform

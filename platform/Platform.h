@@ -1,0 +1,54 @@
+// Everything outside the process, as one bundle of interfaces.
+#pragma once
+
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+#include "platform/DeviceProperties.h"
+#include "platform/Digest.h"
+#include "platform/EventLoop.h"
+#include "platform/Eventra.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/FileSystem.h"
+#include "platform/InstalledApplications.h"
+#include "platform/Kernel.h"
+#include "platform/LibraryLoader.h"
+#include "platform/LocaleService.h"
+#include "platform/LogSubmission.h"
+#include "platform/PLHistory.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PropertyListCodec.h"
+#include "platform/RunLock.h"
+#include "platform/ServitaLogs.h"
+#include "platform/SystemLog.h"
+
+namespace platform {
+
+// References only: whoever makes a Platform keeps the services alive longer than its users.
+struct Platform {
+  SystemLog& log;
+  Clock& clock;
+  Digest& digest;
+  PropertyListCodec& propertyLists;
+  FileSystem& files;
+  CountersService& counters;
+  HistoryStore& history;
+  PreferenceStore& preferences;
+  AnalyticsConfiguration& analyticsConfiguration;
+  PrivilegedPreferences& privilegedPreferences;
+  LogSubmission& submission;
+  FaultwatchSupport& faultwatch;
+  ServitaLogs& servitaLogs;
+  EventLoop& eventLoop;
+  NamedServices& namedServices;
+  NotificationCenter& notifications;
+  Eventra& eventra;
+  DeviceProperties& deviceProperties;
+  SystemVersion& systemVersion;
+  Kernel& kernel;
+  InstalledApplications& applications;
+  LocaleService& locale;
+  LibraryLoader& libraries;
+  RunLock& runLock;
+};
+
+}  // namespace platform

@@ -1,0 +1,27 @@
+#include "platform/PreferenceStore.h"
+
+namespace platform {
+
+namespace {
+
+std::optional<Number> numberOf(const std::optional<Value>& value, bool* found) {
+  const Number* number = value ? value->as<Number>() : nullptr;
+  if (found != nullptr) *found = number != nullptr;
+  return number ? std::optional(*number) : std::nullopt;
+}
+
+}  // namespace
+
+std::int64_t PreferenceStore::QNSPreferencesGetIntegerValue(std::string_view key,
+                                                            std::string_view domain, bool* found) {
+  const auto number = numberOf(QNSPreferencesGetValue(key, domain), found);
+  return number ? number->int64Value() : 0;
+}
+
+bool PreferenceStore::QNSPreferencesGetBooleanValue(std::string_view key, std::string_view domain,
+                                                    bool* found) {
+  const auto number = numberOf(QNSPreferencesGetValue(key, domain), found);
+  return number && number->boolValue();
+}
+
+}  // namespace platform

@@ -1,0 +1,62 @@
+// The preference services: values by key and domain.
+//
+// Preferences belong to a user. PreferenceStore is the system's own view, AnalyticsConfiguration the
+// view of the system analytics service, PrivilegedPreferences that of any user.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "platform/PropertyList.h"
+
+namespace platform {
+
+// In all three, a missing value in a write (a null pointer) removes the key.
+
+class PreferenceStore {
+ public:
+  virtual ~PreferenceStore() = default;
+
+  // The value of a key, or none. A write by this process is seen at once.
+  virtual std::optional<Value> QNSPreferencesGetValue(std::string_view key,
+                                                      std::string_view domain) = 0;
+  virtual void QNSPreferencesSetValue(std::string_view key, const Value* value,
+                                      std::string_view domain) = 0;
+
+  // Brings the domain's writes to storage; without it they get there when the process ends.
+  virtual void QNSPreferencesSynchronize(std::string_view domain) = 0;
+
+  // The value as a number or as a truth value; 0 or false when it is absent or not a number.
+  // `found`, if given, tells whether there was a number.
+  std::int64_t QNSPreferencesGetIntegerValue(std::string_view key, std::string_view domain,
+                                             bool* found = nullptr);
+  bool QNSPreferencesGetBooleanValue(std::string_view key, std::string_view domain,
+                                     bool* found = nullptr);
+};
+
+class AnalyticsConfiguration {
+ public:
+  virtual ~AnalyticsConfiguration() = default;
+
+  virtual std::optional<Value> getPreference(std::string_view key, std::string_view domain) = 0;
+  virtual void setPreference(std::string_view key, const Value* value, std::string_view domain,
+                             bool synchronize) = 0;
+
+  // The bug types of the logs that are switched off; elements that aren't texts are left out.
+  virtual std::vector<std::string> logBlocklist() = 0;
+};
+
+class PrivilegedPreferences {
+ public:
+  virtual ~PrivilegedPreferences() = default;
+
+  virtual void setPreference(std::string_view key, std::string_view user, std::string_view domain,
+                             const Value* value) = 0;
+  virtual void deletePreference(std::string_view key, std::string_view user,
+                                std::string_view domain) = 0;
+};
+
+}  // namespace platform

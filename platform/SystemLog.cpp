@@ -1,0 +1,15 @@
+#include "platform/SystemLog.h"
+
+#include "platform/Text.h"
+
+namespace platform {
+
+void SystemLog::log(LogLevel level, const char* format, ...) {
+  if (!shows(level)) return;
+  std::va_list arguments;
+  va_start(arguments, format);
+  write(level, vformat(format, arguments));
+  va_end(arguments);
+}
+
+}  // namespace platform

@@ -1,0 +1,43 @@
+// The device root: the directory that stands for a device's file system.
+//
+// Every path of the device is resolved below it, ".." and links included, so that nothing outside is
+// read or written. Paths are device paths, with or without a leading slash. Nothing here logs:
+// failures come back as error numbers, for the service that knows what they mean to its user.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "platform/Result.h"
+#include "platform/host/FileDescriptor.h"
+
+namespace platform::host {
+
+class DeviceRoot {
+ public:
+  // `path` is a path of the host; a root that isn't there reads as an empty device.
+  explicit DeviceRoot(std::string path);
+
+  const std::string& path() const { return path_; }
+
+  // Opens a file for reading; links are followed, within the root. The file may be of any kind, and
+  // opening never blocks. On failure the descriptor is empty and errno says why.
+  FileDescriptor openForReading(std::string_view path) const;
+
+  // The bytes of a regular file, at most `maximum` of them. The error is an error number's text.
+  Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
+
+  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700. No
+  // link is followed (ELOOP), unless `followLinks` allows those that stay within the root, as a
+  // system's own links from one of its folders to another do. On failure as openForReading.
+  enum class Missing { fails, create };
+  enum class Links { refused, followed };
+  FileDescriptor openFolder(std::string_view path, Missing missing,
+                            Links links = Links::refused) const;
+
+ private:
+  std::string path_;
+  FileDescriptor root_;
+};
+
+}  // namespace platform::host

@@ -1,0 +1,111 @@
+#include "platform/host/Files.h"
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstring>
+
+namespace platform::host {
+
+namespace {
+
+// 0 for a regular file or for no file at all.
+int refuseOtherKinds(int folder, const std::string& name) {
+  struct stat status;
+  if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
+    return errno == ENOENT ? 0 : errno;
+  }
+  return S_ISREG(status.st_mode) ? 0 : EINVAL;
+}
+
+// The size of the file without the unfinished line at its end.
+off_t sizeOfWholeLines(int file, off_t size) {
+  std::array<char, 4096> block;
+  while (size > 0) {
+    const auto length = static_cast<std::size_t>(std::min<off_t>(size, block.size()));
+    const off_t start = size - static_cast<off_t>(length);
+    if (::pread(file, block.data(), length, start) != static_cast<ssize_t>(length)) return size;
+    for (std::size_t i = length; i > 0; --i) {
+      if (block[i - 1] == '\n') return start + static_cast<off_t>(i);
+    }
+    size = start;
+  }
+  return 0;
+}
+
+}  // namespace
+
+Result<std::string> readRegularFile(int file, std::size_t maximum) {
+  struct stat status;
+  if (::fstat(file, &status) != 0) return Result<std::string>::failure(std::strerror(errno));
+  if (!S_ISREG(status.st_mode)) return Result<std::string>::failure("not a regular file");
+  std::string bytes;
+  bytes.resize(std::min(maximum, static_cast<std::size_t>(status.st_size)));
+  std::size_t filled = 0;
+  while (filled < bytes.size()) {
+    const ssize_t got = ::read(file, bytes.data() + filled, bytes.size() - filled);
+    if (got < 0 && errno == EINTR) continue;
+    if (got < 0) return Result<std::string>::failure(std::strerror(errno));
+    if (got == 0) break;
+    filled += static_cast<std::size_t>(got);
+  }
+  bytes.resize(filled);
+  return Result<std::string>::success(std::move(bytes));
+}
+
+int writeAll(int file, std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t written = ::write(file, bytes.data(), bytes.size());
+    if (written < 0 && errno == EINTR) continue;
+    if (written < 0) return errno;
+    if (written == 0) return EIO;
+    bytes.remove_prefix(static_cast<std::size_t>(written));
+  }
+  return 0;
+}
+
+int replaceFile(int folder, const std::string& name, std::string_view bytes) {
+  if (const int error = refuseOtherKinds(folder, name)) return error;
+  const std::string beside = "." + name + ".new";
+  if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return errno;
+  const FileDescriptor file(::openat(folder, beside.c_str(),
+                                     O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  if (!file) return errno;
+  int error = writeAll(file.get(), bytes);
+  if (error == 0 && ::fsync(file.get()) != 0) error = errno;
+  if (error == 0 && ::renameat(folder, beside.c_str(), folder, name.c_str()) != 0) error = errno;
+  if (error != 0) {
+    ::unlinkat(folder, beside.c_str(), 0);
+    return error;
+  }
+  return ::fsync(folder) == 0 ? 0 : errno;
+}
+
+int appendLine(int folder, const std::string& name, std::string_view line) {
+  const FileDescriptor file(::openat(
+      folder, name.c_str(),
+      O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
+  if (!file) return errno == ELOOP ? EINVAL : errno;
+  const FileLock lock(file.get());
+  struct stat status;
+  if (::fstat(file.get(), &status) != 0) return errno;
+  if (!S_ISREG(status.st_mode)) return EINVAL;
+  const off_t whole = sizeOfWholeLines(file.get(), status.st_size);
+  if (whole != status.st_size && ::ftruncate(file.get(), whole) != 0) return errno;
+  const int error = writeAll(file.get(), line);
+  if (error != 0 && ::ftruncate(file.get(), whole) != 0) return errno;
+  return error;
+}
+
+FileLock::FileLock(int file) : file_(file) {
+  while (::flock(file_, LOCK_EX) != 0 && errno == EINTR) {
+  }
+}
+
+FileLock::~FileLock() { ::flock(file_, LOCK_UN); }
+
+}  // namespace platform::host
