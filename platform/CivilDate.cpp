@@ -12,9 +12,7 @@ namespace {
 constexpr std::int64_t kDaysPerEra = 146097;  // 400 years
 constexpr std::int64_t kEpochShift = 719468;  // days from 0000-03-01 to 1970-01-01
 
-std::int64_t floorDivide(std::int64_t a, std::int64_t b) {
-  return a / b - (a % b < 0 ? 1 : 0);
-}
+std::int64_t floorDivide(std::int64_t a, std::int64_t b) { return a / b - (a % b < 0 ? 1 : 0); }
 
 }  // namespace
 

@@ -1,7 +1,7 @@
 // The preference services: values by key and domain.
 //
-// Preferences belong to a user. PreferenceStore is the system's own view, AnalyticsConfiguration the
-// view of the system analytics service, PrivilegedPreferences that of any user.
+// Preferences belong to a user. PreferenceStore is the system's own view, AnalyticsConfiguration
+// the view of the system analytics service, PrivilegedPreferences that of any user.
 #pragma once
 
 #include <cstdint>

@@ -143,6 +143,9 @@ Value& Dictionary::setKey(Key&& key, Value value) {
 }
 
 Value& Dictionary::set(std::string_view key, Value value) { return setKey(key, std::move(value)); }
+Value& Dictionary::set(const char* key, Value value) {
+  return setKey(std::string_view(key), std::move(value));
+}
 Value& Dictionary::set(std::string&& key, Value value) {
   return setKey(std::move(key), std::move(value));
 }

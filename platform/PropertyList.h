@@ -78,6 +78,7 @@ class Dictionary {
 
   // Sets a key; one that is there keeps its place. The reference holds until the next change.
   Value& set(std::string_view key, Value value);
+  Value& set(const char* key, Value value);
   Value& set(std::string&& key, Value value);
 
   // Removes a key; true if it was there.
@@ -161,7 +162,8 @@ struct Dictionary::Entry {
   Value value;
 };
 
-// The deepest nesting of arrays and dictionaries that is read or written; the top level counts as 1.
+// The deepest nesting of arrays and dictionaries that is read or written; the top level counts
+// as 1.
 inline constexpr int kMaximumPropertyListDepth = 128;
 
 // A value's text in a message: a text as it is, a number as its text, anything else as an indented

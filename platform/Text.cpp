@@ -37,8 +37,8 @@ std::string format(const char* format, ...) {
 std::string doubleText(double value) {
   if (std::isnan(value)) return "nan";
   std::array<char, 32> text;
-  const auto end = std::to_chars(text.data(), text.data() + text.size(), value,
-                                 std::chars_format::general, 16);
+  const auto end =
+      std::to_chars(text.data(), text.data() + text.size(), value, std::chars_format::general, 16);
   return {text.data(), end.ptr};
 }
 

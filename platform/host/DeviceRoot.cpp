@@ -30,8 +30,7 @@ std::string relative(std::string_view path) {
 }  // namespace
 
 DeviceRoot::DeviceRoot(std::string path)
-    : path_(std::move(path)),
-      root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {}
+    : path_(std::move(path)), root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {}
 
 FileDescriptor DeviceRoot::openForReading(std::string_view path) const {
   return openBelow(root_.get(), relative(path), O_RDONLY | O_NONBLOCK | O_NOCTTY, RESOLVE_IN_ROOT);

@@ -72,8 +72,8 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes) {
   if (const int error = refuseOtherKinds(folder, name)) return error;
   const std::string beside = "." + name + ".new";
   if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return errno;
-  const FileDescriptor file(::openat(folder, beside.c_str(),
-                                     O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  const FileDescriptor file(
+      ::openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
   if (!file) return errno;
   int error = writeAll(file.get(), bytes);
   if (error == 0 && ::fsync(file.get()) != 0) error = errno;
@@ -86,9 +86,9 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes) {
 }
 
 int appendLine(int folder, const std::string& name, std::string_view line) {
-  const FileDescriptor file(::openat(
-      folder, name.c_str(),
-      O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
+  const FileDescriptor file(
+      ::openat(folder, name.c_str(),
+               O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
   if (!file) return errno == ELOOP ? EINVAL : errno;
   const FileLock lock(file.get());
   struct stat status;

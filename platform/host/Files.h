@@ -13,8 +13,8 @@
 
 namespace platform::host {
 
-// The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file is
-// an error; the error is an error number's text.
+// The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
+// is an error; the error is an error number's text.
 Result<std::string> readRegularFile(int file, std::size_t maximum);
 
 // Writes all the bytes, going on after short writes and signals.
@@ -29,8 +29,8 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes);
 // taken back, and a line that an earlier failure left unfinished is removed first.
 int appendLine(int folder, const std::string& name, std::string_view line);
 
-// An exclusive lock on an open file or folder, waiting for it; released at the end of the scope. The
-// descriptor is borrowed.
+// An exclusive lock on an open file or folder, waiting for it; released at the end of the scope.
+// The descriptor is borrowed.
 class FileLock {
  public:
   explicit FileLock(int file);
