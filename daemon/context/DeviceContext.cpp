@@ -1,0 +1,92 @@
+#include "daemon/context/DeviceContext.h"
+
+#include "platform/FaultwatchSupport.h"
+
+namespace morvend {
+
+using platform::LogLevel;
+
+namespace {
+
+constexpr char kInternalBuild[] = "InternalBuild";
+constexpr char kForceMultiUserMode[] = "/var/db/forceMultiUserMode";
+constexpr char kSystemGroupContainer[] = "systemgroup.com.norba.quenset";
+constexpr char kSingleUserHome[] = "/var/mobile";
+constexpr char kDatabaseBelowHome[] = "/Library/Pelloran/PLDataStore.sqlitedb";
+constexpr char kCorruptionCount[] = "DatabaseCorruptionCount";
+constexpr char kCorruptionDomain[] = "com.norba.pellorand";
+
+}  // namespace
+
+bool DeviceContext::PLIsInternalDevice() {
+  std::call_once(internalOnce_,
+                 [&] { internal_ = platform_.deviceProperties.booleanProperty(kInternalBuild); });
+  return internal_;
+}
+
+// The property is read directly here, not through the flag that PLIsInternalDevice keeps.
+bool DeviceContext::determineMultiUserMode() {
+  if (platform_.deviceProperties.booleanProperty(kInternalBuild) &&
+      platform_.files.fileStatus(kForceMultiUserMode)) {
+    platform_.log.log(LogLevel::standard,
+                      "Forcing Multi User Mode behavior due to the presence of %s",
+                      kForceMultiUserMode);
+    return true;
+  }
+  return platform_.deviceProperties.multiUserIndicator().value_or(0) != 0;
+}
+
+const std::string* DeviceContext::GetHomeDirectoryPath() {
+  if (home_) return &*home_;
+  if (!multiUser_) multiUser_ = determineMultiUserMode();
+  if (*multiUser_) {
+    std::uint64_t error = 1;
+    home_ = platform_.deviceProperties.systemGroupContainerPath(kSystemGroupContainer, error);
+    if (!home_) {
+      platform_.log.log(LogLevel::standard, "Error getting system group container: %llu",
+                        static_cast<unsigned long long>(error));
+      return nullptr;
+    }
+  } else {
+    home_ = kSingleUserHome;
+  }
+  return &*home_;
+}
+
+std::int64_t DeviceContext::GetCountersDatabaseSizeMB() {
+  const std::string* home = GetHomeDirectoryPath();
+  if (home == nullptr) return -1;
+  const auto size = platform_.files.fileStatus(*home + kDatabaseBelowHome);
+  return size ? static_cast<std::int64_t>(*size / 1048576) : -1;
+}
+
+void DeviceContext::LoadPreferenceFunctions() {
+  void* library = platform_.libraries.load(platform::kFaultwatchSupportPath);
+  if (library == nullptr) {
+    platform_.log.log(LogLevel::error,
+                      "Failed to dynamically load the FaultwatchSupport framework");
+    return;
+  }
+  readInteger_ = reinterpret_cast<platform::QNSPreferencesGetIntegerValueFunction*>(
+      platform_.libraries.symbol(library, "QNSPreferencesGetIntegerValue"));
+  if (readInteger_ == nullptr) {
+    // The spelling is the one that log readers look for.
+    platform_.log.log(LogLevel::error, "Failed to dyanmically link QNSPreferencesGetIntegerValue");
+  }
+  writeValue_ = reinterpret_cast<platform::QNSPreferencesSetValueFunction*>(
+      platform_.libraries.symbol(library, "QNSPreferencesSetValue"));
+  if (writeValue_ == nullptr) {
+    platform_.log.log(LogLevel::error, "Failed to dynamically link QNSPreferencesSetValue");
+  }
+}
+
+std::int64_t DeviceContext::ReadAndResetDatabaseCorruptionCount() {
+  if (readInteger_ == nullptr || writeValue_ == nullptr) LoadPreferenceFunctions();
+  if (readInteger_ == nullptr || writeValue_ == nullptr) return 0;
+  const std::int64_t count = readInteger_(kCorruptionCount, kCorruptionDomain, nullptr);
+  const platform::Value zero(0);
+  writeValue_(kCorruptionCount, &zero, kCorruptionDomain);
+  return count;
+}
+
+}  // namespace morvend
