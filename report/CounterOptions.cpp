@@ -1,0 +1,62 @@
+#include "report/CounterOptions.h"
+
+#include <utility>
+
+namespace report {
+
+using platform::Number;
+using platform::Value;
+
+Intervals::Intervals(std::vector<Number> bounds) : bounds_(std::move(bounds)), ascending_(true) {
+  values_.reserve(bounds_.size());
+  for (const Number& bound : bounds_) {
+    const double value = bound.doubleValue();
+    if (!(values_.empty() ? value == value : values_.back() <= value)) ascending_ = false;
+    values_.push_back(value);
+  }
+}
+
+namespace {
+
+const Number* asNumber(const Value& value) {
+  const auto* number = value.as<Number>();
+  return number != nullptr && number->type() != Number::Type::boolean ? number : nullptr;
+}
+
+bool readUnsigned(const Value* value, std::optional<std::uint64_t>& option) {
+  if (value == nullptr) return true;
+  const Number* number = asNumber(*value);
+  if (number == nullptr) return false;
+  if (number->type() != Number::Type::uint64 && !(number->doubleValue() >= 0)) return false;
+  option = number->uint64Value();
+  return true;
+}
+
+bool readIntervals(const Value* value, std::optional<Intervals>& option) {
+  if (value == nullptr) return true;
+  const auto* array = value->as<platform::Array>();
+  if (array == nullptr) return false;
+  std::vector<Number> bounds;
+  bounds.reserve(array->size());
+  for (const Value& element : *array) {
+    const Number* number = asNumber(element);
+    if (number == nullptr) return false;
+    bounds.push_back(*number);
+  }
+  option.emplace(std::move(bounds));
+  return true;
+}
+
+}  // namespace
+
+std::optional<CounterOptions> parseCounterOptions(const Value& entry) {
+  const auto* dictionary = entry.as<platform::Dictionary>();
+  if (dictionary == nullptr) return std::nullopt;
+  CounterOptions options;
+  const bool usable = readUnsigned(dictionary->find("bucket_interval"), options.bucketInterval) &&
+                      readUnsigned(dictionary->find("sig_fig"), options.significantFigures) &&
+                      readIntervals(dictionary->find("intervals"), options.intervals);
+  return usable ? std::optional(std::move(options)) : std::nullopt;
+}
+
+}  // namespace report

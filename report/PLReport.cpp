@@ -1,0 +1,151 @@
+#include "report/PLReport.h"
+
+#include <optional>
+#include <utility>
+
+#include "platform/CivilDate.h"
+#include "report/Arithmetic.h"
+
+namespace report {
+
+using platform::Dictionary;
+using platform::LogLevel;
+using platform::Value;
+
+namespace {
+
+constexpr char kDomain[] = "com.norba.pellorand.morvend";
+constexpr char kLastOSVersion[] = "LastOSVersion";
+constexpr std::int32_t kCrashLogVersion = 1;
+
+}  // namespace
+
+PLReport::PLReport(platform::Platform& platform, morvend::DeviceContext& context)
+    : platform_(platform), context_(context), config_(PLConfig::init(platform, context)) {}
+
+void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) {
+  platform_.log.log(LogLevel::info, "writing pellorand log. yesterday=%d", day);
+  if (config_ != nullptr) {
+    const auto history = platform_.history.initWithDefaultPath();
+    const std::int32_t first = platform::dayBefore(day);
+    history->scalarsForKeyPrefix(
+        "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
+          if (const auto* options = config_->configOptionsForScalarKey(key)) {
+            addScalar(value, key, *options);
+          }
+        });
+    history->distributionsForKeyPrefix(
+        "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
+          if (const auto* options = config_->configOptionsForDistributionKey(key)) {
+            computeAndAddDistribution(samples, key, *options);
+          }
+        });
+  }
+  serializeWithDate(day, appInfo);
+}
+
+void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo) {
+  if (scalarsOutput_.empty() && distributionsOutput_.empty() && histogramsOutput_.empty()) return;
+  addInstalledAppInfo();
+  addMetadataKeys();
+  reportDatabaseSize();
+  reportCPUUptime();
+  reportVMStats();
+
+  const auto log = platform_.propertyLists.writeXML(buildLog(day, appInfo));
+  if (!log) {
+    platform_.log.log(LogLevel::error, "Could not create pellorand plist: %s", log.error.c_str());
+    return;
+  }
+  submit(*log);
+}
+
+// Takes the sections and the whitelist's digest out of the report.
+Dictionary PLReport::buildLog(std::int32_t day, const ActivatedAppInfo* appInfo) {
+  const std::string digest = config_ != nullptr ? config_->configFileDigest() : std::string();
+  config_.reset();
+  auto preference = [&](const char* key, Value otherwise) {
+    return platform_.preferences.QNSPreferencesGetValue(key, kDomain)
+        .value_or(std::move(otherwise));
+  };
+  Value taskID = preference("TaskingID", "(no tasking id)");
+  Value taskDigest = preference("TaskingDigest", "(no tasking digest)");
+  Value tasking = preference("TaskingPayload", platform::Array());
+
+  Dictionary log;
+  log.set("PLCrashLogVersion", kCrashLogVersion);
+  log.set("PLStartDate", platform_.counters.PLDateFromDaysSince1970(day));
+  log.set("PLLogCreationDate", platform_.clock.now());
+  log.set("PLMetadata", std::move(metadataOutput_));
+  log.set("PLScalars", std::move(scalarsOutput_));
+  log.set("PLDistributions", std::move(distributionsOutput_));
+  log.set("PLDistributionsHistogram", std::move(histogramsOutput_));
+  log.set("PLTasking", std::move(tasking));
+  log.set("PLTaskID", std::move(taskID));
+  log.set("PLTaskDigest", std::move(taskDigest));
+  log.set("PLWhitelistDigest", digest);
+  if (appInfo != nullptr) log.set("PLActivatedAppInfo", *appInfo);
+  return log;
+}
+
+// The recorded version is updated whether or not the submission then succeeds.
+void PLReport::submit(const std::string& log) {
+  Dictionary options;
+  const auto stored = platform_.preferences.QNSPreferencesGetValue(kLastOSVersion, kDomain);
+  const Value current = platform_.systemVersion.operatingSystemVersion();
+  if (!stored || !(*stored == current)) {
+    platform_.preferences.QNSPreferencesSetValue(kLastOSVersion, &current, kDomain);
+    platform_.preferences.QNSPreferencesSynchronize(kDomain);
+    options.set("previous_os_version", stored.value_or("<unknown>"));
+  }
+  const bool submitted = platform_.submission.QNSWriteLogForSubmission(
+      "193", "log-pellorand", options.empty() ? nullptr : &options,
+      [&](platform::LogHandle& handle) { handle.write(log); });
+  if (!submitted) platform_.log.log(LogLevel::error, "Failed to write pellorand log");
+}
+
+const CounterOptions* PLReport::scalarOptions(std::string_view key) const {
+  return config_ != nullptr ? config_->configOptionsForScalarKey(key) : nullptr;
+}
+
+std::int64_t PLReport::addScalar(std::int64_t value, std::string_view key,
+                                 const CounterOptions& options) {
+  const std::int64_t rounded = roundScalar(value, options);
+  scalarsOutput_.set(key, rounded);
+  return rounded;
+}
+
+void PLReport::addScalarForKey(std::string_view key,
+                               const std::function<std::int64_t()>& byExecutingBlock) {
+  if (const auto* options = scalarOptions(key)) addScalar(byExecutingBlock(), key, *options);
+}
+
+void PLReport::computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
+                                         std::string_view key, const CounterOptions& options) {
+  const int length = static_cast<int>(key.size());
+  const Intervals* intervals = options.intervals ? &*options.intervals : nullptr;
+  if (intervals != nullptr) {
+    platform_.log.log(LogLevel::debug, "Treating key %.*s as a histogram", length, key.data());
+  }
+  Distribution distribution(intervals);
+  if (distribution.histogramFailed()) {
+    platform_.log.log(
+        LogLevel::standard,
+        "Couldn't allocate histCounts for key %.*s. Will not calculate histogram values", length,
+        key.data());
+  }
+  for (auto block = samples.getNextValues(); !block.values.empty();
+       block = samples.getNextValues()) {
+    distribution.add(block.values);
+  }
+  if (intervals != nullptr && !distribution.histogramFailed()) {
+    if (auto histogram = distribution.histogram()) {
+      histogramsOutput_.set(key, std::move(*histogram));
+    } else {
+      histogramsOutput_.remove(key);
+    }
+  }
+  distributionsOutput_.set(key, distribution.statistics());
+}
+
+}  // namespace report

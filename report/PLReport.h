@@ -1,0 +1,70 @@
+// The daily counters report: yesterday's whitelisted counters, rounded, with what the report
+// collects itself, submitted as one property-list log.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "daemon/context/DeviceContext.h"
+#include "platform/Platform.h"
+#include "report/PLConfig.h"
+
+namespace report {
+
+// Activated-app info: one dictionary ("bundle", "version", "orloID", "arch", "uuid") for each
+// application, as a client delivered it.
+using ActivatedAppInfo = platform::Array;
+
+class PLReport {
+ public:
+  // Loads the whitelist. Without one nothing is whitelisted and no log will be written.
+  PLReport(platform::Platform& platform, morvend::DeviceContext& context);
+
+  // Fills the report from the history rows of the day (and of the day before it: a later day's row
+  // replaces an earlier one's) and submits it. `day` is the day that is reported; `appInfo` may be
+  // null, which is not the same as empty. Failures are logged.
+  void writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo);
+
+  // Runs the collectors, builds the log and submits it; does nothing at all when no counter has
+  // been added so far. Drops the whitelist.
+  void serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo);
+
+  // Stores a scalar, rounded as its options ask, and returns what it stored.
+  std::int64_t addScalar(std::int64_t value, std::string_view key, const CounterOptions& options);
+
+  // The same for a value that is computed only if its key is whitelisted.
+  void addScalarForKey(std::string_view key, const std::function<std::int64_t()>& byExecutingBlock);
+
+  // Stores the statistics of the samples, and their histogram if the options hold intervals.
+  void computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
+                                 std::string_view key, const CounterOptions& options);
+
+  // The collectors, in the order in which they run; each reads its own source.
+  void addInstalledAppInfo();
+  void addMetadataKeys();
+  void reportDatabaseSize();
+  void reportCPUUptime();
+  void reportVMStats();
+
+  // What has been added so far. Scalars: int64; distributions: the five statistics; histograms:
+  // dictionaries of bucket label to count; metadata: texts.
+  const platform::Dictionary& scalarsOutput() const { return scalarsOutput_; }
+  const platform::Dictionary& distributionsOutput() const { return distributionsOutput_; }
+  const platform::Dictionary& histogramsOutput() const { return histogramsOutput_; }
+  const platform::Dictionary& metadataOutput() const { return metadataOutput_; }
+
+ private:
+  const CounterOptions* scalarOptions(std::string_view key) const;
+  platform::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
+  void submit(const std::string& log);
+
+  platform::Platform& platform_;
+  morvend::DeviceContext& context_;
+  std::unique_ptr<PLConfig> config_;
+  platform::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;
+};
+
+}  // namespace report
