@@ -1,0 +1,26 @@
+// The once-a-day gate and the daily sequence.
+#pragma once
+
+#include <cstdint>
+
+#include "daemon/context/DeviceContext.h"
+#include "platform/Platform.h"
+#include "report/PLReport.h"
+
+namespace morvend {
+
+using report::ActivatedAppInfo;
+
+// Runs the daily sequence for yesterday, unless the gate record in the preferences says that it has
+// already run for yesterday or a later day; the record is written once the sequence is through.
+// `appInfo` may be null. Holds the run lock, so that of two processes one runs and the other finds
+// the gate closed.
+void RunDailyTasksIfDue(platform::Platform& platform, DeviceContext& context,
+                        const ActivatedAppInfo* appInfo);
+
+// Runs the daily sequence for a day, whatever the gate record says, and leaves the record alone.
+// Holds the run lock.
+void RunDailyTasks(platform::Platform& platform, DeviceContext& context, std::int32_t day,
+                   const ActivatedAppInfo* appInfo);
+
+}  // namespace morvend

@@ -1,0 +1,7 @@
+#include "daemon/DailyTelemetry.h"
+
+namespace morvend {
+
+void CollectDailyTelemetry(platform::Platform&, DeviceContext&) {}
+
+}  // namespace morvend

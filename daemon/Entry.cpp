@@ -1,0 +1,64 @@
+#include "daemon/Entry.h"
+
+#include <string_view>
+
+#include "daemon/DailyRun.h"
+#include "daemon/ServiceListener.h"
+#include "platform/CivilDate.h"
+
+namespace morvend {
+
+using platform::EventLoop;
+using platform::LogLevel;
+using platform::Platform;
+
+namespace {
+
+constexpr char kServiceName[] = "com.norba.pellorand.morvend";
+constexpr double kIdleSeconds = 10.0;
+
+void serve(Platform& platform, DeviceContext& context) {
+  ServiceState state;
+  const auto listener = platform.namedServices.listen(kServiceName);
+  if (listener != nullptr) {
+    listener->start([&](const platform::Dictionary* message) {
+      HandleServiceMessage(platform, context, state, message);
+    });
+  }
+  while (platform.eventLoop.run(kIdleSeconds, true) != EventLoop::RunResult::timedOut) {
+  }
+  if (state.AwaitingAppInfo) {
+    platform.log.log(LogLevel::standard,
+                     "never received requested AAI, so moving along without it");
+    RunDailyTasksIfDue(platform, context, nullptr);
+  }
+}
+
+void runOption(Platform& platform, DeviceContext& context, const char* argument) {
+  const std::int32_t today = platform.counters.PLDaysSince1970();
+  const std::string_view option = argument;
+  if (option == "-d") {
+    RunDailyTasksIfDue(platform, context, nullptr);
+  } else if (option == "-f") {
+    RunDailyTasks(platform, context, platform::dayBefore(today), nullptr);
+  } else if (option == "-t") {
+    RunDailyTasks(platform, context, today, nullptr);
+  } else {
+    platform.log.log(LogLevel::standard, "Unknown arg: %s", argument);
+  }
+}
+
+}  // namespace
+
+void Run(Platform& platform, DeviceContext& context, int argumentCount,
+         const char* const* arguments) {
+  platform.log.log(LogLevel::standard, "morvend started");
+  if (argumentCount == 1) {
+    serve(platform, context);
+  } else if (argumentCount >= 2) {
+    runOption(platform, context, arguments[1]);
+  }
+  platform.log.log(LogLevel::standard, "morvend ended");
+}
+
+}  // namespace morvend

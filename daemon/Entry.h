@@ -1,0 +1,15 @@
+// The process: what morvend does between its start and its end.
+#pragma once
+
+#include "daemon/context/DeviceContext.h"
+#include "platform/Platform.h"
+
+namespace morvend {
+
+// Acts on the argument vector as `main` gets it: without arguments serves messages until ten
+// seconds pass without one, with "-d" runs the gate, with "-f" or "-t" the daily sequence for
+// yesterday or today. Everything that goes wrong is logged; the exit status is 0 in every case.
+void Run(platform::Platform& platform, DeviceContext& context, int argumentCount,
+         const char* const* arguments);
+
+}  // namespace morvend

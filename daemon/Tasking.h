@@ -1,0 +1,13 @@
+// Tasking: records of operating-system changes, preference changes that the analytics configuration
+// schedules, and the report of log types that are switched off.
+#pragma once
+
+#include "platform/Platform.h"
+
+namespace morvend {
+
+// The three in this order. Records lie in the preferences of "com.norba.pellorand.morvend":
+// "LastOSUpdate", "TaskingID", "TaskingOS", "TaskingDigest", "TaskingPayload".
+void UpdateTaskingState(platform::Platform& platform);
+
+}  // namespace morvend
