@@ -71,8 +71,8 @@ void Table::add(Row row) {
 }
 
 int Table::finish() const {
-  const auto missed =
-      std::count_if(rows_.begin(), rows_.end(), [](const Row& row) { return row.ratio > row.goal; });
+  const auto missed = std::count_if(rows_.begin(), rows_.end(),
+                                    [](const Row& row) { return row.ratio > row.goal; });
   std::printf("%zu rows, %d missed their goal\n", rows_.size(), static_cast<int>(missed));
   return static_cast<int>(missed);
 }
