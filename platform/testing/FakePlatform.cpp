@@ -1,0 +1,250 @@
+#include "platform/testing/FakePlatform.h"
+
+#include <algorithm>
+#include <cerrno>
+
+#include "platform/Text.h"
+
+namespace platform::fakes {
+
+std::optional<std::uint64_t> FakeFileSystem::fileStatus(std::string_view path) {
+  const auto found = contents.find(path);
+  return found != contents.end() ? std::optional<std::uint64_t>(found->second.size())
+                                 : std::nullopt;
+}
+
+std::optional<std::string> FakeFileSystem::readFile(std::string_view path, std::size_t maximum) {
+  const auto found = contents.find(path);
+  if (found == contents.end()) return std::nullopt;
+  return found->second.substr(0, maximum);
+}
+
+namespace {
+
+class BlockEnumerator : public PLHistoryDistributionEnumerator {
+ public:
+  BlockEnumerator(const std::vector<double>& samples, std::size_t blockSize)
+      : left_(samples), offsets_(samples.size(), 0), blockSize_(blockSize) {}
+
+  Samples getNextValues() override {
+    const std::size_t count = std::min(blockSize_, left_.size());
+    const auto values = left_.first(count);
+    left_ = left_.subspan(count);
+    return {values, std::span(offsets_).first(count)};
+  }
+
+ private:
+  std::span<const double> left_;
+  std::vector<std::int32_t> offsets_;
+  std::size_t blockSize_;
+};
+
+class OpenHistory : public PLHistory {
+ public:
+  explicit OpenHistory(FakeHistory& store) : store_(store) {}
+
+  void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay, std::int32_t maxDay,
+                           const ScalarRowHandler& rowHandler) override {
+    bool stop = false;
+    for (const auto& [row, value] : store_.scalars) {
+      if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
+      rowHandler(row.second, row.first, value, stop);
+    }
+  }
+
+  void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay,
+                                 std::int32_t maxDay,
+                                 const DistributionRowHandler& rowHandler) override {
+    bool stop = false;
+    for (const auto& [row, samples] : store_.distributions) {
+      if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
+      BlockEnumerator enumerator(samples, store_.blockSize);
+      rowHandler(row.second, row.first, enumerator, stop);
+    }
+  }
+
+ private:
+  static bool covers(const FakeHistory::RowKey& row, std::string_view keyPrefix,
+                     std::int32_t minDay, std::int32_t maxDay) {
+    return row.first >= minDay && row.first <= maxDay && row.second.starts_with(keyPrefix);
+  }
+
+  FakeHistory& store_;
+};
+
+}  // namespace
+
+std::unique_ptr<PLHistory> FakeHistory::initWithDefaultPath() {
+  return std::make_unique<OpenHistory>(*this);
+}
+
+std::optional<Value> FakePreferences::mobile(std::string_view domain, std::string_view key) const {
+  const auto found = values.find({"mobile", std::string(domain), std::string(key)});
+  return found != values.end() ? std::optional(found->second) : std::nullopt;
+}
+
+void FakePreferences::setMobile(std::string_view domain, std::string_view key, Value value) {
+  values.insert_or_assign({"mobile", std::string(domain), std::string(key)}, std::move(value));
+}
+
+void FakePreferences::write(std::string_view user, std::string_view domain, std::string_view key,
+                            const Value* value) {
+  const std::tuple place{std::string(user), std::string(domain), std::string(key)};
+  const std::string where = std::string(user) + "/" + std::get<1>(place) + "/" + std::get<2>(place);
+  if (value != nullptr) {
+    values.insert_or_assign(place, *value);
+    journal_.push_back("set " + where + " = " + description(*value));
+  } else {
+    values.erase(place);
+    journal_.push_back("remove " + where);
+  }
+}
+
+std::optional<Value> FakePreferences::QNSPreferencesGetValue(std::string_view key,
+                                                             std::string_view domain) {
+  return mobile(domain, key);
+}
+
+void FakePreferences::QNSPreferencesSetValue(std::string_view key, const Value* value,
+                                             std::string_view domain) {
+  write("mobile", domain, key, value);
+}
+
+void FakePreferences::QNSPreferencesSynchronize(std::string_view domain) {
+  journal_.push_back("synchronize " + std::string(domain));
+}
+
+std::optional<Value> FakePreferences::getPreference(std::string_view key, std::string_view domain) {
+  const auto found = values.find({"__quenset__", std::string(domain), std::string(key)});
+  return found != values.end() ? std::optional(found->second) : std::nullopt;
+}
+
+void FakePreferences::setPreference(std::string_view key, const Value* value,
+                                    std::string_view domain, bool synchronize) {
+  write("__quenset__", domain, key, value);
+  if (synchronize) journal_.push_back("synchronize configuration " + std::string(domain));
+}
+
+void FakePreferences::setPreference(std::string_view key, std::string_view user,
+                                    std::string_view domain, const Value* value) {
+  journal_.push_back("privileged set");
+  write(user, domain, key, value);
+}
+
+void FakePreferences::deletePreference(std::string_view key, std::string_view user,
+                                       std::string_view domain) {
+  journal_.push_back("privileged delete");
+  write(user, domain, key, nullptr);
+}
+
+namespace {
+
+class StringHandle : public LogHandle {
+ public:
+  explicit StringHandle(std::string& contents) : contents_(contents) {}
+  bool write(std::string_view bytes) override {
+    contents_ += bytes;
+    return true;
+  }
+
+ private:
+  std::string& contents_;
+};
+
+}  // namespace
+
+bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
+                                              const Dictionary* options, const Writer& writer) {
+  Log log{std::string(logType), std::string(logName), {}, {}};
+  if (options != nullptr) log.options = *options;
+  StringHandle handle(log.contents);
+  writer(handle);
+  logs.push_back(std::move(log));
+  journal_.push_back("submit " + logs.back().name);
+  return true;
+}
+
+void FakeHousekeeping::logStructuredData(std::int32_t type, const Dictionary& data) {
+  journal_.push_back(format("structured %d ", type) + description(Value(data)));
+}
+
+class FakeService::Listener : public NamedServiceListener {
+ public:
+  explicit Listener(FakeService& service) : service_(service) {}
+  void start(EventHandler handler) override { service_.handler_ = std::move(handler); }
+
+ private:
+  FakeService& service_;
+};
+
+void FakeService::willDeliver(std::optional<Dictionary> message) {
+  script.push_back([this, message = std::move(message)] {
+    if (handler_) handler_(message ? &*message : nullptr);
+    return RunResult::handledSource;
+  });
+}
+
+EventLoop::RunResult FakeService::run(double seconds, bool returnAfterSourceHandled) {
+  journal_.push_back(format("run loop %g %d", seconds, returnAfterSourceHandled ? 1 : 0));
+  if (script.empty()) return RunResult::timedOut;
+  const auto step = std::move(script.front());
+  script.pop_front();
+  return step();
+}
+
+std::unique_ptr<NamedServiceListener> FakeService::listen(std::string_view serviceName) {
+  journal_.push_back("listen " + std::string(serviceName));
+  if (!registers) return nullptr;
+  return std::make_unique<Listener>(*this);
+}
+
+bool FakeEventra::EventraSendEventLazy(std::string_view event, PayloadProducer producer) {
+  if (everyEventIsUsed) events.emplace_back(event, producer());
+  return everyEventIsUsed;
+}
+
+bool FakeDevice::booleanProperty(std::string_view name) {
+  ++internalBuildQueries;
+  return name == "InternalBuild" && internalBuild;
+}
+
+std::optional<std::string> FakeDevice::systemGroupContainerPath(std::string_view,
+                                                                std::uint64_t& error) {
+  ++containerQueries;
+  if (!container) error = containerError;
+  return container;
+}
+
+void FakeDevice::enumerateBundles(const std::function<void(BundleType)>& handler) {
+  ++enumerations;
+  for (const BundleType type : bundles) handler(type);
+}
+
+void* FakeDevice::load(std::string_view path) {
+  ++loads;
+  return libraryLoads && path == kFaultwatchSupportPath ? this : nullptr;
+}
+
+void* FakeDevice::symbol(void*, const char* name) {
+  const auto found = symbols.find(name);
+  return found != symbols.end() ? found->second : nullptr;
+}
+
+Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std::byte> buffer) {
+  reads.emplace_back(name);
+  const auto found = integers.find(name);
+  if (found == integers.end()) return {ENOENT, 0};
+  const std::size_t length = std::min<std::size_t>(buffer.size(), 8);
+  for (std::size_t i = 0; i < length; ++i) {
+    buffer[i] = static_cast<std::byte>(found->second >> (8 * i));
+  }
+  return {0, length};
+}
+
+FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest)
+    : platform{log,          clock,       digest,      codec,       files,      counters,
+               history,      preferences, preferences, preferences, submission, housekeeping,
+               housekeeping, service,     service,     service,     eventra,    device,
+               device,       kernel,      device,      device,      device,     runLock} {}
+
+}  // namespace platform::fakes

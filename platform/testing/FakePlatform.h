@@ -1,0 +1,240 @@
+// A platform in memory, for tests: every service answers from plain members and writes down what
+// was asked of it.
+#pragma once
+
+#include <deque>
+#include <functional>
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <tuple>
+#include <utility>
+#include <vector>
+
+#include "platform/Platform.h"
+#include "platform/testing/RecordingLog.h"
+
+namespace platform::fakes {
+
+// What happened outside the process, in order, across all services: "checkpoint",
+// "synchronize <domain>", "post <notification>" and so on.
+using Journal = std::vector<std::string>;
+
+class FakeClock : public Clock {
+ public:
+  double secondsSince1970 = 0;
+  Date now() override { return {secondsSince1970}; }
+};
+
+class FakeFileSystem : public FileSystem {
+ public:
+  std::map<std::string, std::string, std::less<>> contents;
+  std::optional<std::uint64_t> fileStatus(std::string_view path) override;
+  std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override;
+};
+
+class FakeCounters : public CountersService {
+ public:
+  explicit FakeCounters(Journal& journal) : journal_(journal) {}
+  std::int32_t today = 0;
+  std::int32_t PLDaysSince1970() override { return today; }
+  Date PLDateFromDaysSince1970(std::int32_t day) override { return {day * 86400.0}; }
+  void PLClientCheckpoint() override { journal_.push_back("checkpoint"); }
+
+ private:
+  Journal& journal_;
+};
+
+// Rows are delivered in the order of the maps: by day, then by key.
+class FakeHistory : public HistoryStore {
+ public:
+  using RowKey = std::pair<std::int32_t, std::string>;
+  std::map<RowKey, std::int64_t> scalars;
+  std::map<RowKey, std::vector<double>> distributions;
+  std::size_t blockSize = 3;  // samples handed over at a time
+
+  std::unique_ptr<PLHistory> initWithDefaultPath() override;
+};
+
+class FakePreferences : public PreferenceStore,
+                        public AnalyticsConfiguration,
+                        public PrivilegedPreferences {
+ public:
+  explicit FakePreferences(Journal& journal) : journal_(journal) {}
+
+  // By user, domain and key.
+  std::map<std::tuple<std::string, std::string, std::string>, Value> values;
+
+  std::optional<Value> mobile(std::string_view domain, std::string_view key) const;
+  void setMobile(std::string_view domain, std::string_view key, Value value);
+
+  std::optional<Value> QNSPreferencesGetValue(std::string_view key,
+                                              std::string_view domain) override;
+  void QNSPreferencesSetValue(std::string_view key, const Value* value,
+                              std::string_view domain) override;
+  void QNSPreferencesSynchronize(std::string_view domain) override;
+  std::optional<Value> getPreference(std::string_view key, std::string_view domain) override;
+  void setPreference(std::string_view key, const Value* value, std::string_view domain,
+                     bool synchronize) override;
+  std::vector<std::string> blocklist;
+  std::vector<std::string> logBlocklist() override { return blocklist; }
+  void setPreference(std::string_view key, std::string_view user, std::string_view domain,
+                     const Value* value) override;
+  void deletePreference(std::string_view key, std::string_view user,
+                        std::string_view domain) override;
+
+ private:
+  void write(std::string_view user, std::string_view domain, std::string_view key,
+             const Value* value);
+
+  Journal& journal_;
+};
+
+class FakeSubmission : public LogSubmission {
+ public:
+  struct Log {
+    std::string type, name, contents;
+    std::optional<Dictionary> options;
+  };
+
+  explicit FakeSubmission(Journal& journal) : journal_(journal) {}
+  bool allowed = true;
+  std::vector<Log> logs;
+
+  bool DiagnosticLogSubmissionEnabled() override { return allowed; }
+  bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
+                                const Dictionary* options, const Writer& writer) override;
+
+ private:
+  Journal& journal_;
+};
+
+class FakeHousekeeping : public FaultwatchSupport, public ServitaLogs {
+ public:
+  explicit FakeHousekeeping(Journal& journal) : journal_(journal) {}
+  void logStructuredData(std::int32_t type, const Dictionary& data) override;
+  void dumpAllOldStructuredDataLogs() override { journal_.push_back("dump structured logs"); }
+  void rollServitaLogs() override { journal_.push_back("roll servita logs"); }
+
+ private:
+  Journal& journal_;
+};
+
+// An event loop that follows a script: each run takes the next step, and times out when none is
+// left.
+class FakeService : public EventLoop, public NamedServices, public NotificationCenter {
+ public:
+  explicit FakeService(Journal& journal) : journal_(journal) {}
+  bool registers = true;
+  std::deque<std::function<RunResult()>> script;
+
+  // Scripts the delivery of a message, or of an event that isn't one.
+  void willDeliver(std::optional<Dictionary> message);
+
+  RunResult run(double seconds, bool returnAfterSourceHandled) override;
+  std::unique_ptr<NamedServiceListener> listen(std::string_view serviceName) override;
+  void postNotification(std::string_view name) override {
+    journal_.push_back("post " + std::string(name));
+  }
+
+ private:
+  class Listener;
+
+  Journal& journal_;
+  NamedServiceListener::EventHandler handler_;
+};
+
+class FakeEventra : public Eventra {
+ public:
+  bool everyEventIsUsed = true;
+  std::vector<std::pair<std::string, Dictionary>> events;
+  bool EventraIsEventUsed(std::string_view) override { return everyEventIsUsed; }
+  bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) override;
+};
+
+class FakeDevice : public DeviceProperties,
+                   public SystemVersion,
+                   public InstalledApplications,
+                   public LocaleService,
+                   public LibraryLoader {
+ public:
+  bool internalBuild = false;
+  int internalBuildQueries = 0;
+  std::optional<std::uint32_t> multiUser = 0;
+  std::optional<std::string> container;
+  std::uint64_t containerError = 2;
+  int containerQueries = 0;
+  std::optional<Dictionary> version;
+  std::string versionText;
+  std::vector<BundleType> bundles;
+  int enumerations = 0;
+  std::vector<std::string> languages, localizations, matches;
+  std::optional<std::string> country;
+  std::map<std::string, void*> symbols;  // of the one library that loads
+  bool libraryLoads = true;
+  int loads = 0;
+
+  bool booleanProperty(std::string_view name) override;
+  std::optional<std::uint32_t> multiUserIndicator() override { return multiUser; }
+  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
+                                                      std::uint64_t& error) override;
+  std::optional<Dictionary> systemVersionDictionary() override { return version; }
+  std::string operatingSystemVersion() override { return versionText; }
+  void enumerateBundles(const std::function<void(BundleType)>& handler) override;
+  std::vector<std::string> preferredLanguages() override { return languages; }
+  std::vector<std::string> systemLocalizations() override { return localizations; }
+  std::vector<std::string> bestMatch(const std::vector<std::string>&,
+                                     const std::vector<std::string>&) override {
+    return matches;
+  }
+  std::optional<std::string> countryCode() override { return country; }
+  void* load(std::string_view path) override;
+  void* symbol(void* library, const char* name) override;
+};
+
+// Integers are delivered little-endian, in the buffer's width up to 8 bytes; a name that isn't
+// there fails with ENOENT.
+class FakeKernel : public Kernel {
+ public:
+  std::map<std::string, std::uint64_t, std::less<>> integers;
+  std::vector<std::string> reads;  // the names asked for, in order
+  std::uint64_t bytesPerPage = 4096, ticks = 0;
+  std::optional<Timebase> ratio = Timebase{1, 1};
+
+  ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override;
+  std::uint64_t pageSize() override { return bytesPerPage; }
+  std::uint64_t absoluteTime() override { return ticks; }
+  std::optional<Timebase> timebase() override { return ratio; }
+};
+
+class FakeRunLock : public RunLock {
+ public:
+  int held = 0, taken = 0;
+  void lock() override { ++held, ++taken; }
+  void unlock() override { --held; }
+};
+
+// All of them, assembled. The codec and the digest have no state: tests bring the real ones.
+class FakePlatform {
+ public:
+  FakePlatform(PropertyListCodec& codec, Digest& digest);
+
+  Journal journal;
+  RecordingLog log;
+  FakeClock clock;
+  FakeFileSystem files;
+  FakeCounters counters{journal};
+  FakeHistory history;
+  FakePreferences preferences{journal};
+  FakeSubmission submission{journal};
+  FakeHousekeeping housekeeping{journal};
+  FakeService service{journal};
+  FakeEventra eventra;
+  FakeDevice device;
+  FakeKernel kernel;
+  FakeRunLock runLock;
+  Platform platform;
+};
+
+}  // namespace platform::fakes

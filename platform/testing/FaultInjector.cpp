@@ -1,0 +1,207 @@
+#include "platform/testing/FaultInjector.h"
+
+#include <cerrno>
+
+namespace platform::fakes {
+
+namespace {
+
+struct Plan {
+  int calls = 0, failing = 0;
+  bool fails() { return ++calls == failing; }
+};
+
+struct Files : FileSystem {
+  Files(FileSystem& i, Plan& p) : inner(i), plan(p) {}
+  FileSystem& inner;
+  Plan& plan;
+  std::optional<std::uint64_t> fileStatus(std::string_view path) override {
+    return plan.fails() ? std::nullopt : inner.fileStatus(path);
+  }
+  std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override {
+    return plan.fails() ? std::nullopt : inner.readFile(path, maximum);
+  }
+};
+
+struct PropertyLists : PropertyListCodec {
+  PropertyLists(PropertyListCodec& i, Plan& p) : inner(i), plan(p) {}
+  PropertyListCodec& inner;
+  Plan& plan;
+  Result<Value> read(std::string_view bytes) override {
+    return plan.fails() ? Result<Value>::failure("injected") : inner.read(bytes);
+  }
+  Result<std::string> writeXML(const Value& value) override {
+    return plan.fails() ? Result<std::string>::failure("injected") : inner.writeXML(value);
+  }
+};
+
+struct EmptyHistory : PLHistory {
+  void scalarsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
+                           const ScalarRowHandler&) override {}
+  void distributionsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
+                                 const DistributionRowHandler&) override {}
+};
+
+struct Histories : HistoryStore {
+  Histories(HistoryStore& i, Plan& p) : inner(i), plan(p) {}
+  HistoryStore& inner;
+  Plan& plan;
+  std::unique_ptr<PLHistory> initWithDefaultPath() override {
+    if (plan.fails()) return std::make_unique<EmptyHistory>();
+    return inner.initWithDefaultPath();
+  }
+};
+
+struct Preferences : PreferenceStore {
+  Preferences(PreferenceStore& i, Plan& p) : inner(i), plan(p) {}
+  PreferenceStore& inner;
+  Plan& plan;
+  std::optional<Value> QNSPreferencesGetValue(std::string_view key,
+                                              std::string_view domain) override {
+    return plan.fails() ? std::nullopt : inner.QNSPreferencesGetValue(key, domain);
+  }
+  void QNSPreferencesSetValue(std::string_view key, const Value* value,
+                              std::string_view domain) override {
+    inner.QNSPreferencesSetValue(key, value, domain);
+  }
+  void QNSPreferencesSynchronize(std::string_view domain) override {
+    inner.QNSPreferencesSynchronize(domain);
+  }
+};
+
+struct Submissions : LogSubmission {
+  Submissions(LogSubmission& i, Plan& p) : inner(i), plan(p) {}
+  LogSubmission& inner;
+  Plan& plan;
+  bool DiagnosticLogSubmissionEnabled() override { return inner.DiagnosticLogSubmissionEnabled(); }
+  bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
+                                const Dictionary* options, const Writer& writer) override {
+    return !plan.fails() && inner.QNSWriteLogForSubmission(logType, logName, options, writer);
+  }
+};
+
+struct Events : Eventra {
+  Events(Eventra& i, Plan& p) : inner(i), plan(p) {}
+  Eventra& inner;
+  Plan& plan;
+  bool EventraIsEventUsed(std::string_view event) override {
+    return !plan.fails() && inner.EventraIsEventUsed(event);
+  }
+  bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) override {
+    return !plan.fails() && inner.EventraSendEventLazy(event, std::move(producer));
+  }
+};
+
+struct Listeners : NamedServices {
+  Listeners(NamedServices& i, Plan& p) : inner(i), plan(p) {}
+  NamedServices& inner;
+  Plan& plan;
+  std::unique_ptr<NamedServiceListener> listen(std::string_view serviceName) override {
+    return plan.fails() ? nullptr : inner.listen(serviceName);
+  }
+};
+
+struct Device : DeviceProperties, SystemVersion, LibraryLoader {
+  Device(Platform& i, Plan& p) : inner(i), plan(p) {}
+  Platform& inner;
+  Plan& plan;
+  bool booleanProperty(std::string_view name) override {
+    return !plan.fails() && inner.deviceProperties.booleanProperty(name);
+  }
+  std::optional<std::uint32_t> multiUserIndicator() override {
+    return plan.fails() ? std::nullopt : inner.deviceProperties.multiUserIndicator();
+  }
+  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
+                                                      std::uint64_t& error) override {
+    if (plan.fails()) return std::nullopt;
+    return inner.deviceProperties.systemGroupContainerPath(identifier, error);
+  }
+  std::optional<Dictionary> systemVersionDictionary() override {
+    return plan.fails() ? std::nullopt : inner.systemVersion.systemVersionDictionary();
+  }
+  std::string operatingSystemVersion() override {
+    return plan.fails() ? std::string() : inner.systemVersion.operatingSystemVersion();
+  }
+  void* load(std::string_view path) override {
+    return plan.fails() ? nullptr : inner.libraries.load(path);
+  }
+  void* symbol(void* library, const char* name) override {
+    return plan.fails() ? nullptr : inner.libraries.symbol(library, name);
+  }
+};
+
+struct KernelValues : Kernel {
+  KernelValues(Kernel& i, Plan& p) : inner(i), plan(p) {}
+  Kernel& inner;
+  Plan& plan;
+  ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override {
+    return plan.fails() ? ReadResult{EIO, 0} : inner.sysctlbyname(name, buffer);
+  }
+  std::uint64_t pageSize() override { return inner.pageSize(); }
+  std::uint64_t absoluteTime() override { return inner.absoluteTime(); }
+  std::optional<Timebase> timebase() override {
+    return plan.fails() ? std::nullopt : inner.timebase();
+  }
+};
+
+}  // namespace
+
+struct FaultInjector::Services {
+  explicit Services(Platform& inner)
+      : files(inner.files, plan),
+        propertyLists(inner.propertyLists, plan),
+        history(inner.history, plan),
+        preferences(inner.preferences, plan),
+        submission(inner.submission, plan),
+        eventra(inner.eventra, plan),
+        namedServices(inner.namedServices, plan),
+        device(inner, plan),
+        kernel(inner.kernel, plan),
+        platform{inner.log,
+                 inner.clock,
+                 inner.digest,
+                 propertyLists,
+                 files,
+                 inner.counters,
+                 history,
+                 preferences,
+                 inner.analyticsConfiguration,
+                 inner.privilegedPreferences,
+                 submission,
+                 inner.faultwatch,
+                 inner.servitaLogs,
+                 inner.eventLoop,
+                 namedServices,
+                 inner.notifications,
+                 eventra,
+                 device,
+                 device,
+                 kernel,
+                 inner.applications,
+                 inner.locale,
+                 device,
+                 inner.runLock} {}
+
+  Plan plan;
+  Files files;
+  PropertyLists propertyLists;
+  Histories history;
+  Preferences preferences;
+  Submissions submission;
+  Events eventra;
+  Listeners namedServices;
+  Device device;
+  KernelValues kernel;
+  Platform platform;
+};
+
+FaultInjector::FaultInjector(Platform& inner) : services_(std::make_unique<Services>(inner)) {}
+FaultInjector::~FaultInjector() = default;
+Platform& FaultInjector::platform() { return services_->platform; }
+int FaultInjector::calls() const { return services_->plan.calls; }
+void FaultInjector::failAt(int call) {
+  services_->plan.calls = 0;
+  services_->plan.failing = call;
+}
+
+}  // namespace platform::fakes

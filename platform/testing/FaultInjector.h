@@ -1,0 +1,30 @@
+// A decorator of a whole platform that makes the n-th call which can fail do so.
+#pragma once
+
+#include <memory>
+
+#include "platform/Platform.h"
+
+namespace platform::fakes {
+
+// Decorated are the services that have a failure to report: files, property lists, history,
+// preferences (a read finds nothing), submission, events, listener, device properties, system
+// version, kernel and libraries. All other services are the inner platform's own.
+class FaultInjector {
+ public:
+  explicit FaultInjector(Platform& inner);
+  ~FaultInjector();
+
+  Platform& platform();
+
+  // The number of calls that could have failed so far, and the one that does (1 is the first; 0:
+  // none).
+  int calls() const;
+  void failAt(int call);
+
+ private:
+  struct Services;
+  std::unique_ptr<Services> services_;
+};
+
+}  // namespace platform::fakes
