@@ -1,0 +1,189 @@
+#include "daemon/DailyRun.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+
+#include "daemon/Entry.h"
+#include "platform/testing/FaultInjector.h"
+#include "support/TestPlatform.h"
+
+namespace morvend {
+namespace {
+
+using platform::Dictionary;
+using platform::Value;
+using Lines = std::vector<std::string>;
+
+constexpr char kDomain[] = "com.norba.pellorand.morvend";
+constexpr char kRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
+
+class DailyRunTest : public ::testing::Test {
+ protected:
+  DailyRunTest() {
+    platform.counters.today = 20001;
+    platform.device.versionText = "1";
+    platform.whitelistScalars({"key"});
+    for (std::int32_t day = 19990; day < 20010; ++day) platform.history.scalars[{day, "key"}] = day;
+    platform.preferences.setMobile(kDomain, "LastOSVersion", "1");
+  }
+
+  void run(std::initializer_list<const char*> arguments) {
+    DeviceContext context(platform.platform);
+    const std::vector<const char*> vector(arguments);
+    Run(platform.platform, context, static_cast<int>(vector.size()), vector.data());
+    EXPECT_EQ(platform.runLock.held, 0);
+  }
+
+  // The days whose values were reported.
+  std::vector<std::int64_t> reportedDays() {
+    std::vector<std::int64_t> days;
+    for (const auto& log : platform.submission.logs) {
+      days.push_back(
+          platform.parse(log.contents).dictionary("PLScalars")->number("key")->int64Value());
+    }
+    return days;
+  }
+
+  support::TestPlatform platform;
+};
+
+const Lines kSequence{"checkpoint", "submit log-pellorand", "dump structured logs",
+                      "roll servita logs"};
+const std::string kWriteRecord = std::string("set mobile/") + kDomain + "/" + kRecord + " = 20000";
+const std::string kSynchronize = std::string("synchronize ") + kDomain;
+
+TEST_F(DailyRunTest, RunsTheSequenceInItsOrderThenWritesTheRecord) {
+  run({"morvend", "-d", "-t"});
+  Lines expected = kSequence;
+  expected.insert(expected.end(), {kWriteRecord, kSynchronize});
+  EXPECT_EQ(platform.journal, expected);
+  EXPECT_EQ(platform.log.lines().front(), "default: morvend started");
+  EXPECT_EQ(platform.log.lines().at(1), "default: daily tasks for day 20000");
+  EXPECT_EQ(platform.log.lines().back(), "default: morvend ended");
+  EXPECT_EQ(reportedDays(), std::vector<std::int64_t>{20000});
+  const auto record = platform.preferences.mobile(kDomain, kRecord);
+  EXPECT_EQ(record->as<platform::Number>()->type(), platform::Number::Type::int32);
+}
+
+TEST_F(DailyRunTest, OpensTheGateOnceADayWhateverTheClockDoes) {
+  const struct {
+    std::optional<Value> record;
+    std::int32_t today;
+    bool runs;
+  } rows[] = {{{}, 20001, true},
+              {Value(19999), 20001, true},
+              {Value(20000), 20001, false},
+              {Value(20001), 20001, false},
+              {Value("text"), 20001, true},
+              {Value(std::numeric_limits<std::int64_t>::min()), 20001, true},
+              {Value(std::numeric_limits<std::int64_t>::max()), 20001, false},
+              {Value(-5), -5, false},
+              {Value(20000), std::numeric_limits<std::int32_t>::max(), true},
+              {Value(20000), std::numeric_limits<std::int32_t>::min(), false},
+              {{}, 1, false}};  // a missing record reads as 0
+  for (const auto& row : rows) {
+    support::TestPlatform device;
+    device.counters.today = row.today;
+    if (row.record) device.preferences.setMobile(kDomain, kRecord, *row.record);
+    DeviceContext context(device.platform);
+    RunDailyTasksIfDue(device.platform, context, nullptr);
+    EXPECT_EQ(device.log.count("daily tasks for day"), row.runs ? 1 : 0) << row.today;
+    EXPECT_EQ(device.log.count("default: Day unchanged since last run"), row.runs ? 0 : 1);
+    if (!row.runs) {
+      EXPECT_EQ(device.preferences.mobile(kDomain, kRecord), row.record);
+      EXPECT_TRUE(device.journal.empty());
+    }
+    RunDailyTasksIfDue(device.platform, context, nullptr);
+    EXPECT_EQ(device.log.count("daily tasks for day"), row.runs ? 1 : 0) << "second run";
+    EXPECT_EQ(device.runLock.taken, 2);
+  }
+}
+
+TEST_F(DailyRunTest, ActsOnItsFirstArgumentOnly) {
+  platform.preferences.setMobile(kDomain, kRecord, 20000);
+  const struct {
+    std::initializer_list<const char*> arguments;
+    Lines log;
+    std::vector<std::int64_t> reported;
+  } rows[] = {{{}, {}, {}},
+              {{"morvend", "-d"}, {"default: Day unchanged since last run"}, {}},
+              {{"morvend", "-f"}, {"default: daily tasks for day 20000"}, {20000}},
+              {{"morvend", "-t", "-d"}, {"default: daily tasks for day 20001"}, {20001}},
+              {{"morvend", "-D"}, {"default: Unknown arg: -D"}, {}},
+              {{"morvend", "", "-f"}, {"default: Unknown arg: "}, {}},
+              {{"morvend", "%s%n"}, {"default: Unknown arg: %s%n"}, {}}};
+  for (const auto& row : rows) {
+    platform.log.clear();
+    platform.submission.logs.clear();
+    run(row.arguments);
+    Lines lines;
+    for (const std::string& line : platform.log.lines()) {
+      if (line.starts_with("default: ")) lines.push_back(line);
+    }
+    Lines expected{"default: morvend started"};
+    expected.insert(expected.end(), row.log.begin(), row.log.end());
+    expected.push_back("default: morvend ended");
+    EXPECT_EQ(lines, expected);
+    EXPECT_EQ(reportedDays(), row.reported);
+  }
+  EXPECT_EQ(platform.preferences.mobile(kDomain, kRecord), Value(20000));
+}
+
+TEST_F(DailyRunTest, LeavesOutTheReportWithoutConsent) {
+  platform.submission.allowed = false;
+  run({"morvend", "-f"});
+  EXPECT_EQ(platform.journal, (Lines{"checkpoint", "dump structured logs", "roll servita logs"}));
+}
+
+TEST_F(DailyRunTest, ServesInSlicesUntilOneTimesOut) {
+  using Result = platform::EventLoop::RunResult;
+  for (const Result result : {Result::finished, Result::stopped, Result::handledSource}) {
+    platform.service.script.push_back([result] { return result; });
+  }
+  run({"morvend"});
+  Lines expected{"listen com.norba.pellorand.morvend"};
+  expected.insert(expected.end(), 4, "run loop 10 1");
+  EXPECT_EQ(platform.journal, expected);
+  platform.journal.clear();
+  platform.service.registers = false;
+  run({"morvend"});
+  EXPECT_EQ(platform.journal, (Lines{"listen com.norba.pellorand.morvend", "run loop 10 1"}));
+  EXPECT_EQ(platform.log.lines(), (Lines{"default: morvend started", "default: morvend ended",
+                                         "default: morvend started", "default: morvend ended"}));
+}
+
+// Whatever single call fails, the rest of the sequence runs and the record is written.
+TEST_F(DailyRunTest, SurvivesTheFailureOfAnySingleCall) {
+  platform.whitelistScalars({"key", "com.norba.quenset.prnd.database.size",
+                             "com.norba.quenset.prnd.database.corruptions",
+                             "com.norba.usage.cur_boot_session_cpu_uptime",
+                             "com.norba.kernel.vmtc_total", "com.norba.kernel.swapusage"});
+  platform.kernel.integers = {{"vm.vmtc_total", 1}, {"vm.swapusage", 1}};
+  platform.device.version = Dictionary{{"ProductBuildVersion", "A"}};
+  platform.preferences.blocklist = {"110"};
+  const auto preferences = platform.preferences.values;
+  platform::fakes::FaultInjector faults(platform.platform);
+  const char* const arguments[] = {"morvend", "-d"};
+  int calls = 1;
+  for (int failing = 0; failing <= calls; ++failing) {
+    platform.preferences.values = preferences;
+    platform.journal.clear();
+    platform.log.clear();
+    faults.failAt(failing);
+    DeviceContext context(faults.platform());
+    Run(faults.platform(), context, 2, arguments);
+    if (failing == 0) calls = faults.calls();
+    const auto& journal = platform.journal;
+    EXPECT_EQ(std::count(journal.begin(), journal.end(), "roll servita logs"), 1) << failing;
+    EXPECT_EQ(std::count(journal.begin(), journal.end(), "dump structured logs"), 1) << failing;
+    ASSERT_GE(journal.size(), 2u);
+    EXPECT_EQ(journal[journal.size() - 2], kWriteRecord) << failing;
+    EXPECT_EQ(journal.back(), kSynchronize) << failing;
+    EXPECT_EQ(platform.log.lines().back(), "default: morvend ended");
+  }
+  EXPECT_GT(calls, 30);
+}
+
+}  // namespace
+}  // namespace morvend

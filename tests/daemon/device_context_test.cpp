@@ -1,0 +1,127 @@
+#include "daemon/context/DeviceContext.h"
+
+#include <gtest/gtest.h>
+
+#include "support/TestPlatform.h"
+
+namespace morvend {
+namespace {
+
+using platform::Value;
+
+// The two functions of the support library, over one stored count.
+std::int64_t storedCount = 0;
+std::vector<std::string> asked;
+
+std::int64_t readInteger(const char* key, const char* domain, bool* found) {
+  asked.push_back(std::string("read ") + key + " " + domain + (found ? " found" : ""));
+  return storedCount;
+}
+
+void writeValue(const char* key, const Value* value, const char* domain) {
+  asked.push_back(std::string("write ") + key + " " + domain);
+  storedCount = value->as<platform::Number>()->int64Value();
+}
+
+class DeviceContextTest : public ::testing::Test {
+ protected:
+  void offerFunctions() {
+    platform.device.symbols = {
+        {"QNSPreferencesGetIntegerValue", reinterpret_cast<void*>(readInteger)},
+        {"QNSPreferencesSetValue", reinterpret_cast<void*>(writeValue)}};
+  }
+
+  support::TestPlatform platform;
+  DeviceContext context{platform.platform};
+};
+
+TEST_F(DeviceContextTest, ForcesMultiUserModeOnInternalBuildsOnly) {
+  const std::string forcing =
+      "default: Forcing Multi User Mode behavior due to the presence of /var/db/forceMultiUserMode";
+  const struct {
+    bool internal, marker;
+    std::optional<std::uint32_t> indicator;
+    const char* home;
+    bool forced;
+  } rows[] = {{false, false, 0, "/var/mobile", false}, {false, false, {}, "/var/mobile", false},
+              {false, false, 2, "/container", false},  {false, true, 0, "/var/mobile", false},
+              {true, true, 0, "/container", true},     {true, false, 0, "/var/mobile", false},
+              {true, true, {}, "/container", true}};
+  for (const auto& row : rows) {
+    support::TestPlatform device;
+    device.device.internalBuild = row.internal;
+    device.device.multiUser = row.indicator;
+    device.device.container = "/container";
+    if (row.marker) device.files.contents["/var/db/forceMultiUserMode"] = "";
+    DeviceContext probes(device.platform);
+    for (int call = 0; call < 2; ++call) {
+      ASSERT_NE(probes.GetHomeDirectoryPath(), nullptr);
+      EXPECT_EQ(*probes.GetHomeDirectoryPath(), row.home);
+    }
+    EXPECT_EQ(device.log.lines(), row.forced ? std::vector{forcing} : std::vector<std::string>{});
+  }
+}
+
+TEST_F(DeviceContextTest, AsksForTheContainerUntilThereIsOne) {
+  platform.device.multiUser = 1;
+  EXPECT_EQ(context.GetCountersDatabaseSizeMB(), -1);
+  EXPECT_EQ(context.GetHomeDirectoryPath(), nullptr);
+  EXPECT_EQ(platform.log.lines(),
+            std::vector<std::string>(2, "default: Error getting system group container: 2"));
+  platform.device.multiUser = 0;  // asked once in a process
+  platform.device.container = "/c";
+  EXPECT_EQ(*context.GetHomeDirectoryPath(), "/c");
+  EXPECT_EQ(*context.GetHomeDirectoryPath(), "/c");
+  EXPECT_EQ(platform.device.containerQueries, 3);
+}
+
+TEST_F(DeviceContextTest, KnowsTheDatabaseSizeInWholeMebibytes) {
+  EXPECT_EQ(context.GetCountersDatabaseSizeMB(), -1);
+  for (const auto& [bytes, size] :
+       {std::pair{0, 0}, {1048575, 0}, {1048576, 1}, {5 * 1048576 + 1, 5}}) {
+    platform.files.contents["/var/mobile/Library/Pelloran/PLDataStore.sqlitedb"] =
+        std::string(static_cast<std::size_t>(bytes), 'x');
+    EXPECT_EQ(context.GetCountersDatabaseSizeMB(), size);
+  }
+}
+
+TEST_F(DeviceContextTest, AsksWhetherTheDeviceIsInternalOnce) {
+  EXPECT_FALSE(context.PLIsInternalDevice());
+  platform.device.internalBuild = true;
+  EXPECT_FALSE(context.PLIsInternalDevice());
+  EXPECT_EQ(platform.device.internalBuildQueries, 1);
+}
+
+TEST_F(DeviceContextTest, ReadsAndResetsTheCorruptionCount) {
+  offerFunctions();
+  storedCount = 3;
+  asked.clear();
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 3);
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 0);
+  EXPECT_EQ(platform.device.loads, 1);
+  EXPECT_EQ(asked, (std::vector<std::string>{"read DatabaseCorruptionCount com.norba.pellorand",
+                                             "write DatabaseCorruptionCount com.norba.pellorand",
+                                             "read DatabaseCorruptionCount com.norba.pellorand",
+                                             "write DatabaseCorruptionCount com.norba.pellorand"}));
+}
+
+TEST_F(DeviceContextTest, TriesAgainToLoadWhatIsMissing) {
+  const std::string noLibrary = "error: Failed to dynamically load the FaultwatchSupport framework";
+  const std::string noRead = "error: Failed to dyanmically link QNSPreferencesGetIntegerValue";
+  const std::string noWrite = "error: Failed to dynamically link QNSPreferencesSetValue";
+  storedCount = 4;
+  platform.device.libraryLoads = false;
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 0);
+  platform.device.libraryLoads = true;
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 0);
+  offerFunctions();
+  platform.device.symbols.erase("QNSPreferencesSetValue");
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 0);
+  EXPECT_EQ(storedCount, 4);
+  EXPECT_EQ(platform.log.lines(), (std::vector<std::string>{noLibrary, noRead, noWrite, noWrite}));
+  offerFunctions();
+  EXPECT_EQ(context.ReadAndResetDatabaseCorruptionCount(), 4);
+}
+
+}  // namespace
+}  // namespace morvend

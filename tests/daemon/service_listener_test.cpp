@@ -1,0 +1,152 @@
+#include "daemon/ServiceListener.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+
+#include "daemon/Entry.h"
+#include "support/TestPlatform.h"
+
+namespace morvend {
+namespace {
+
+using platform::Array;
+using platform::Data;
+using platform::Dictionary;
+using platform::Value;
+using Lines = std::vector<std::string>;
+
+Dictionary operation(std::int64_t number) { return {{"operation", number}}; }
+
+Dictionary run(std::int64_t day) { return {{"operation", 1}, {"value", day}}; }
+
+Dictionary deliver(Array apps) { return {{"operation", 2}, {"app_data", std::move(apps)}}; }
+
+Dictionary application(const char* bundle) {
+  return {{"bundle_id", bundle},
+          {"version", "1.0"},
+          {"orlo_id", std::int64_t{7}},
+          {"arch", std::uint64_t{2}},
+          {"uuid", Data{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 255}}};
+}
+
+class ServiceTest : public ::testing::Test {
+ protected:
+  ServiceTest() {
+    platform.counters.today = 20001;
+    platform.whitelistScalars({"key"});
+    platform.history.scalars[{20000, "key"}] = 1;
+  }
+
+  // One process in service mode that gets these events; its standard and error lines.
+  Lines serve(std::vector<std::optional<Dictionary>> events) {
+    platform.log.clear();
+    platform.journal.clear();
+    platform.submission.logs.clear();
+    platform.preferences.values.clear();
+    for (auto& event : events) platform.service.willDeliver(std::move(event));
+    DeviceContext context(platform.platform);
+    const char* const arguments[] = {"morvend"};
+    Run(platform.platform, context, 1, arguments);
+    Lines lines;
+    for (const std::string& line : platform.log.lines()) {
+      if (line.starts_with("default: ") || line.starts_with("error: ")) {
+        lines.push_back(line.substr(line.find(' ') + 1));
+      }
+    }
+    lines.erase(lines.begin());
+    lines.pop_back();
+    return lines;
+  }
+
+  int posted() const {
+    return static_cast<int>(std::count(platform.journal.begin(), platform.journal.end(),
+                                       "post com.norba.pellorand.morvend.logging"));
+  }
+
+  support::TestPlatform platform;
+};
+
+const std::string kWaiting = "notified of logging status, waiting for activate app info";
+const std::string kMovingOn = "never received requested AAI, so moving along without it";
+const std::string kUnsolicited = "morvend got (unsolicited -- so ignoring) AAI:\n(\n)";
+const std::string kRequested = "morvend got requestedAAI:\n(\n)";
+const std::string kSequence = "daily tasks for day 20000";
+
+TEST_F(ServiceTest, ActsOnMessagesAsTheHandshakeSays) {
+  const auto wait = operation(0), other = operation(3), delivery = deliver({});
+  const struct {
+    std::vector<std::optional<Dictionary>> events;
+    Lines log;
+    int posted;
+  } rows[] = {
+      {{}, {}, 0},
+      {{std::nullopt, std::nullopt}, {}, 0},
+      {{wait}, {kWaiting, kMovingOn, kSequence}, 1},
+      {{std::nullopt, wait, delivery, delivery},
+       {kWaiting, kRequested, kSequence, kUnsolicited},
+       1},
+      {{wait, wait, run(5), other, delivery}, {kWaiting, kRequested, kSequence}, 1},
+      {{delivery, wait}, {kUnsolicited, kWaiting, kMovingOn, kSequence}, 1},
+      {{run(20000), wait, delivery}, {kSequence, kUnsolicited}, 0},
+      {{other, wait, run(20000), delivery}, {kUnsolicited}, 0},
+      // What is missing or of the wrong type is 0.
+      {{Dictionary{}, delivery}, {kWaiting, kRequested, kSequence}, 1},
+      {{Dictionary{{"operation", "2"}}, delivery}, {kWaiting, kRequested, kSequence}, 1},
+      {{Dictionary{{"operation", 1}, {"value", 2.0}}}, {"daily tasks for day 0"}, 0},
+      // Only the low 32 bits count.
+      {{operation(0x1'0000'0001)}, {"daily tasks for day 0"}, 0},
+      {{run(0x7'0000'0000 - 1)}, {"daily tasks for day -1"}, 0},
+      {{run(std::numeric_limits<std::int64_t>::min())}, {"daily tasks for day 0"}, 0},
+      {{Dictionary{{"operation", ~std::uint64_t{0} - 0xffffffff}}},
+       {kWaiting, kMovingOn, kSequence},
+       1},
+      {{Dictionary{{"operation", 2}, {"app_data", "text"}}}, {kUnsolicited}, 0},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(serve(row.events), row.log) << &row - rows;
+    EXPECT_EQ(posted(), row.posted) << &row - rows;
+  }
+}
+
+TEST_F(ServiceTest, HandsTheDeliveredApplicationsToTheReport) {
+  const auto lines = serve(
+      {operation(0),
+       deliver({application("com.b"), Value("not a dictionary"),
+                Dictionary{{"version", 5}, {"uuid", Data{1, 2}}, {"orlo_id", true}, {"arch", 9.0}},
+                application("com.a")})});
+  const std::string uuid = "00010203-0405-0607-0809-0a0b0c0d0eff";
+  auto entry = [&](const char* bundle) {
+    return Dictionary{{"bundle", bundle},
+                      {"version", "1.0"},
+                      {"orloID", std::int64_t{7}},
+                      {"arch", std::int64_t{2}},
+                      {"uuid", uuid}};
+  };
+  ASSERT_EQ(platform.submission.logs.size(), 1u);
+  const auto log = platform.parse(platform.submission.logs[0].contents);
+  const Array expected{entry("com.b"),
+                       Dictionary{{"bundle", ""},
+                                  {"version", ""},
+                                  {"orloID", std::int64_t{0}},
+                                  {"arch", std::int64_t{0}},
+                                  {"uuid", ""}},
+                       entry("com.a")};
+  ASSERT_NE(log.array("PLActivatedAppInfo"), nullptr);
+  EXPECT_EQ(*log.array("PLActivatedAppInfo"), expected);
+  EXPECT_EQ(lines.at(1), "morvend got requestedAAI:\n" + description(Value(expected)));
+  EXPECT_NE(lines.at(1).find("        uuid = " + uuid + ";\n"), std::string::npos);
+}
+
+// The record is written by the gate that a delivery starts, and not by a run for a day.
+TEST_F(ServiceTest, WritesTheGateRecordForDeliveriesOnly) {
+  constexpr char kRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
+  serve({operation(0), deliver({})});
+  EXPECT_EQ(platform.preferences.mobile("com.norba.pellorand.morvend", kRecord), Value(20000));
+  serve({run(20000)});
+  EXPECT_EQ(platform.preferences.mobile("com.norba.pellorand.morvend", kRecord), std::nullopt);
+  EXPECT_EQ(platform.submission.logs.size(), 1u);
+}
+
+}  // namespace
+}  // namespace morvend

@@ -1,0 +1,359 @@
+#include "report/PLReport.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+#include <new>
+
+#include "report/KernelCounters.h"
+#include "support/TestPlatform.h"
+
+namespace {
+
+// Allocations that report failure instead of throwing fail while this is set.
+bool allocationsFail = false;
+
+}  // namespace
+
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
+  return allocationsFail ? nullptr : ::operator new[](size);
+}
+
+namespace report {
+namespace {
+
+using platform::Array;
+using platform::Dictionary;
+using platform::Value;
+constexpr char kDomain[] = "com.norba.pellorand.morvend";
+constexpr std::int32_t kDay = 20000;
+
+class PLReportTest : public ::testing::Test {
+ protected:
+  PLReportTest() {
+    platform.clock.secondsSince1970 = 20001 * 86400.0 + 4 * 3600;
+    platform.device.languages = {"de-AT", "en"};
+    platform.device.matches = {"de"};
+    platform.device.country = "AT";
+    platform.device.versionText = "17.4 (21E219)";
+    platform.setWhitelist(
+        {{"Group",
+          Dictionary{{"ScalarKeys",
+                      Dictionary{{"exact", Dictionary()}, {"rounded", Dictionary{{"sig_fig", 1}}}}},
+                     {"ScalarKeyPrefixes", Dictionary{{"p.", Dictionary{{"bucket_interval", 10}}}}},
+                     {"DistributionKeys",
+                      Dictionary{{"plain", Dictionary()},
+                                 {"counted",
+                                  Dictionary{{"intervals", Array{Value(10), Value(100)}}}}}}}}});
+  }
+
+  void write(const ActivatedAppInfo* appInfo = nullptr) {
+    morvend::DeviceContext context(platform.platform);
+    PLReport(platform.platform, context).writeLogForYesterday(kDay, appInfo);
+  }
+
+  std::string digestOfWhitelist() {
+    morvend::DeviceContext context(platform.platform);
+    return PLConfig::init(platform.platform, context)->configFileDigest();
+  }
+
+  // The report's own collectors, over a whitelist of these keys.
+  Dictionary collect(std::initializer_list<const char*> keys, void (PLReport::*collector)()) {
+    platform.whitelistScalars(keys);
+    morvend::DeviceContext context(platform.platform);
+    PLReport report(platform.platform, context);
+    (report.*collector)();
+    return report.scalarsOutput();
+  }
+
+  support::TestPlatform platform;
+};
+
+TEST_F(PLReportTest, WritesTheWholeLog) {
+  platform.history.scalars = {{{kDay - 2, "exact"}, 1},     {{kDay - 1, "exact"}, 2},
+                              {{kDay, "exact"}, 3},         {{kDay, "p.q"}, 15},
+                              {{kDay - 1, "rounded"}, 987}, {{kDay, "secret"}, 4},
+                              {{kDay + 1, "exact"}, 5}};
+  platform.history.distributions = {{{kDay, "counted"}, {10, 11, 1000}},
+                                    {{kDay, "plain"}, {1, 2, 3, 4}},
+                                    {{kDay, "hidden"}, {1}}};
+  const ActivatedAppInfo apps{Dictionary{{"bundle", "com.x"}}};
+  write(&apps);
+  ASSERT_EQ(platform.submission.logs.size(), 1u);
+  const auto& log = platform.submission.logs[0];
+  EXPECT_EQ(log.type, "193");
+  EXPECT_EQ(log.name, "log-pellorand");
+  EXPECT_EQ(log.options, (Dictionary{{"previous_os_version", "<unknown>"}}));
+  EXPECT_EQ(log.contents, R"(<?xml version="1.0" encoding="UTF-8"?>
+<plist version="1.0">
+<dict>
+	<key>PLCrashLogVersion</key>
+	<integer>1</integer>
+	<key>PLStartDate</key>
+	<date>2024-10-04T00:00:00Z</date>
+	<key>PLLogCreationDate</key>
+	<date>2024-10-05T04:00:00Z</date>
+	<key>PLMetadata</key>
+	<dict>
+		<key>PLUserInterfaceLanguage</key>
+		<string>de</string>
+		<key>PLPreferredUserInterfaceLanguage</key>
+		<string>de-AT</string>
+		<key>PLUserSetRegionFormat</key>
+		<string>AT</string>
+	</dict>
+	<key>PLScalars</key>
+	<dict>
+		<key>exact</key>
+		<integer>3</integer>
+		<key>rounded</key>
+		<integer>1000</integer>
+		<key>p.q</key>
+		<integer>20</integer>
+	</dict>
+	<key>PLDistributions</key>
+	<dict>
+		<key>counted</key>
+		<array>
+			<real>10</real>
+			<real>1000</real>
+			<real>340.3333333333333</real>
+			<real>652740.6666666666</real>
+			<integer>3</integer>
+		</array>
+		<key>plain</key>
+		<array>
+			<real>1</real>
+			<real>4</real>
+			<real>2.5</real>
+			<real>5</real>
+			<integer>4</integer>
+		</array>
+	</dict>
+	<key>PLDistributionsHistogram</key>
+	<dict>
+		<key>counted</key>
+		<dict>
+			<key>(-inf, 10]</key>
+			<integer>1</integer>
+			<key>(10, 100]</key>
+			<integer>1</integer>
+			<key>(100, inf)</key>
+			<integer>1</integer>
+		</dict>
+	</dict>
+	<key>PLTasking</key>
+	<array/>
+	<key>PLTaskID</key>
+	<string>(no tasking id)</string>
+	<key>PLTaskDigest</key>
+	<string>(no tasking digest)</string>
+	<key>PLWhitelistDigest</key>
+	<string>)" + digestOfWhitelist() +
+                              R"(</string>
+	<key>PLActivatedAppInfo</key>
+	<array>
+		<dict>
+			<key>bundle</key>
+			<string>com.x</string>
+		</dict>
+	</array>
+</dict>
+</plist>
+)");
+}
+
+TEST_F(PLReportTest, CarriesTaskingAndTellsAMissingAppInfoFromAnEmptyOne) {
+  platform.history.scalars = {{{kDay, "exact"}, 3}};
+  platform.preferences.setMobile(kDomain, "TaskingID", "T1");
+  platform.preferences.setMobile(kDomain, "TaskingDigest", "D1");
+  platform.preferences.setMobile(kDomain, "TaskingPayload", Array{Value("item")});
+  write();
+  const ActivatedAppInfo none;
+  write(&none);
+  const auto first = platform.parse(platform.submission.logs.at(0).contents);
+  EXPECT_EQ(*first.find("PLTaskID"), Value("T1"));
+  EXPECT_EQ(*first.find("PLTaskDigest"), Value("D1"));
+  EXPECT_EQ(*first.find("PLTasking"), Value(Array{Value("item")}));
+  EXPECT_EQ(first.find("PLActivatedAppInfo"), nullptr);
+  const auto second = platform.parse(platform.submission.logs.at(1).contents);
+  ASSERT_NE(second.array("PLActivatedAppInfo"), nullptr);
+  EXPECT_TRUE(second.array("PLActivatedAppInfo")->empty());
+}
+
+TEST_F(PLReportTest, RecordsTheVersionOnlyWithALog) {
+  write();  // nothing whitelisted for the day: no log, no collector, no record
+  EXPECT_TRUE(platform.journal.empty());
+  EXPECT_EQ(platform.log.lines(),
+            std::vector<std::string>{"info: writing pellorand log. yesterday=20000"});
+  platform.history.distributions = {{{kDay, "counted"}, {}}};  // an empty one is a report
+  const struct {
+    const char* version;
+    std::optional<Dictionary> options;
+  } rows[] = {{"17.4 (21E219)", Dictionary{{"previous_os_version", "<unknown>"}}},
+              {"17.4 (21E219)", std::nullopt},
+              {"17.5", Dictionary{{"previous_os_version", "17.4 (21E219)"}}},
+              {"17.5", std::nullopt}};
+  for (const auto& row : rows) {
+    platform.device.versionText = row.version;
+    write();
+    EXPECT_EQ(platform.submission.logs.back().options, row.options);
+    EXPECT_EQ(platform.preferences.mobile(kDomain, "LastOSVersion"), Value(row.version));
+  }
+  const auto log = platform.parse(platform.submission.logs.back().contents);
+  EXPECT_EQ(log.dictionary("PLDistributions")->array("counted")->size(), 5u);
+  EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
+}
+
+TEST_F(PLReportTest, GoesOnWithoutAHistogramWhenMemoryIsShort) {
+  platform.history.distributions = {{{kDay, "counted"}, {1, 2}}};
+  allocationsFail = true;
+  write();
+  allocationsFail = false;
+  EXPECT_EQ(platform.log.count("default: Couldn't allocate histCounts for key counted. Will not "
+                               "calculate histogram values"),
+            1);
+  const auto log = platform.parse(platform.submission.logs.at(0).contents);
+  EXPECT_EQ(log.dictionary("PLDistributions")->size(), 1u);
+  EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
+}
+
+// A later row without samples takes the histogram of an earlier day's row away.
+TEST_F(PLReportTest, ReplacesEarlierRowsWhole) {
+  platform.history.distributions = {{{kDay - 1, "counted"}, {1, 2}}, {{kDay, "counted"}, {}}};
+  write();
+  const auto log = platform.parse(platform.submission.logs.at(0).contents);
+  EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
+  EXPECT_EQ(log.dictionary("PLDistributions")->array("counted")->at(4), Value(0));
+}
+
+TEST_F(PLReportTest, CountsApplicationsOnlyIfSomebodyWantsThem) {
+  using Type = platform::InstalledApplications::BundleType;
+  constexpr char kAll[] = "com.norba.tarvenn.numAllInstalledApps";
+  constexpr char kUser[] = "com.norba.tarvenn.numThirdPartyApps";
+  platform.device.bundles = {Type::user, Type::system, Type::user};
+  platform.eventra.everyEventIsUsed = false;
+  EXPECT_TRUE(collect({"other"}, &PLReport::addInstalledAppInfo).empty());
+  EXPECT_EQ(platform.device.enumerations, 0);
+  EXPECT_EQ(collect({kUser}, &PLReport::addInstalledAppInfo),
+            (Dictionary{{kUser, std::int64_t{2}}}));
+  EXPECT_TRUE(platform.eventra.events.empty());
+  platform.eventra.everyEventIsUsed = true;
+  EXPECT_TRUE(collect({"other"}, &PLReport::addInstalledAppInfo).empty());
+  EXPECT_EQ(collect({kAll, kUser}, &PLReport::addInstalledAppInfo),
+            (Dictionary{{kAll, std::int64_t{3}}, {kUser, std::int64_t{2}}}));
+  ASSERT_EQ(platform.eventra.events.size(), 2u);
+  EXPECT_EQ(platform.eventra.events[0].first, "com.norba.tarvenn.appInstalls");
+  EXPECT_EQ(platform.eventra.events[0].second,
+            (Dictionary{{"numThirdPartyApps", std::int64_t{2}}, {"numAllApps", std::int64_t{3}}}));
+}
+
+TEST_F(PLReportTest, FillsUnknownLanguages) {
+  platform.device.languages.clear();
+  platform.device.matches.clear();
+  platform.device.country.reset();
+  morvend::DeviceContext context(platform.platform);
+  PLReport report(platform.platform, context);
+  report.addMetadataKeys();
+  EXPECT_EQ(report.metadataOutput(),
+            (Dictionary{{"PLUserInterfaceLanguage", "<unknown>"},
+                        {"PLPreferredUserInterfaceLanguage", "<unknown>"}}));
+}
+
+TEST_F(PLReportTest, TellsMinutesSinceBoot) {
+  constexpr char kKey[] = "com.norba.usage.cur_boot_session_cpu_uptime";
+  const struct {
+    std::optional<platform::Kernel::Timebase> ratio;
+    std::uint64_t ticks;
+    std::int64_t minutes;
+  } rows[] = {{{{1, 1}}, 90'000'000'000, 1},
+              {{{125, 3}}, 24'000'000 * 60 * 10 + 12'000'000, 10},
+              {{{1, 1}}, 0, 0},
+              {{{4294967295, 1}}, ~std::uint64_t{0}, 1320481671000000000},
+              {{}, 1, -1},
+              {{{1, 0}}, 1, -1}};
+  for (const auto& row : rows) {
+    platform.kernel.ratio = row.ratio;
+    platform.kernel.ticks = row.ticks;
+    const auto scalars = collect({kKey}, &PLReport::reportCPUUptime);
+    const std::int64_t minutes = scalars.number(kKey)->int64Value();
+    EXPECT_NEAR(static_cast<double>(minutes), static_cast<double>(row.minutes),
+                1e-9 * static_cast<double>(std::abs(row.minutes)));
+  }
+  EXPECT_EQ(platform.log.count("error: Couldn't retrieve mach_timebase_info"), 2);
+}
+
+// Every key of the memory statistics, with the kernel values that make it what it is.
+TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
+  constexpr std::uint64_t kLarge = std::uint64_t{1} << 62;
+  constexpr auto kMax = std::numeric_limits<std::int64_t>::max();
+  using Integers = std::map<std::string, std::uint64_t, std::less<>>;
+  const std::string frozen = "kern.memorystatus_freeze_pageouts",
+                    thaws = "kern.memorystatus_thaw_count_since_boot",
+                    considered = "kern.memorystatus_freezer_process_considered_count",
+                    other = "kern.memorystatus_freezer_error_other_count",
+                    below = "kern.memorystatus_freezer_below_threshold_count",
+                    skipped = "kern.memorystatus_freezer_skipped_full_count",
+                    refreezes = "kern.memorystatus_freezer_refreeze_count",
+                    refrozen = "kern.memorystatus_freezer_bytes_refrozen";
+  const struct {
+    const char* key;
+    Integers kernel;
+    std::optional<std::int64_t> expected;
+  } rows[] = {
+      {"com.norba.kernel.vmtc_2_byte", {{"vm.vmtc_total", 0}, {"vm.vmtc_2_byte", 5}}, {}},
+      {"com.norba.kernel.vmtc_2_byte", {{"vm.vmtc_2_byte", 5}}, {}},
+      {"com.norba.kernel.vmtc_2_byte", {{"vm.vmtc_total", 1}, {"vm.vmtc_2_byte", 5}}, 5},
+      {"com.norba.kernel.vmtc_2_byte", {{"vm.vmtc_total", 1}}, 4294967295},
+      {"com.norba.kernel.memorystatus_freeze_count", {}, 4294967295},
+      {"com.norba.kernel.memorystatus_freeze_count",
+       {{"kern.memorystatus_freeze_count", 0x1'0000'0007}},
+       7},
+      {"com.norba.kernel.memorystatus_freeze_pageouts", {}, {}},
+      {"com.norba.kernel.memorystatus_freeze_pageouts", {{frozen, 9}}, 9},
+      {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262143}, {thaws, 9}}, {}},
+      {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262144 * 2}, {thaws, 9}}, 4},
+      {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262144}}, kMax},
+      {"com.norba.kernel.memorystatus_freeze_budget_pages_remaining", {}, -1},
+      {"com.norba.kernel.memorystatus_thaw_count", {}, 4294967295},
+      {"com.norba.kernel.swapusage", {}, -1},
+      {"com.norba.kernel.swapusage", {{"vm.swapusage", kLarge}}, kLarge},
+      {"com.norba.memorystatus_freezer_error_other_count", {{other, 5}}, {}},
+      {"com.norba.memorystatus_freezer_error_other_count", {{considered, 3}, {other, 2}}, 66},
+      {"com.norba.memorystatus_freezer_error_other_count", {{considered, 0}, {other, 2}}, kMax},
+      {"com.norba.memorystatus_freezer_error_other_count", {{considered, 0}, {other, 0}}, 0},
+      {"com.norba.memorystatus_freezer_error_other_count", {{considered, 100}}, kMax},
+      {"com.norba.memorystatus_freezer_process_considered_count", {{considered, ~0ull}}, -1},
+      {"com.norba.memorystatus_freezer_skipped_full_count", {{below, 8}, {skipped, 2}}, 25},
+      {"com.norba.memorystatus_freezer_skipped_full_count", {{skipped, 2}}, {}},
+      {"com.norba.memorystatus_freezer_thaw_percentage", {}, -1},
+      {"com.norba.memorystatus_freezer_refreeze_average", {{refreezes, 9}, {refrozen, 90}}, {}},
+      {"com.norba.memorystatus_freezer_refreeze_average", {{refreezes, 10}, {refrozen, 99}}, 9},
+      {"com.norba.memorystatus_freezer_refreeze_average", {{refreezes, 16}}, (1ll << 60) - 1},
+      {"com.norba.memorystatus_freezer_refreeze_average", {{refreezes, ~0ull}}, {}},
+      {"com.norba.memorystatus_freezer_refreeze_average", {}, {}},
+  };
+  for (const auto& row : rows) {
+    platform.kernel.integers = row.kernel;
+    const auto scalars = collect({row.key}, &PLReport::reportVMStats);
+    const auto* number = scalars.number(row.key);
+    EXPECT_EQ(number ? std::optional(number->int64Value()) : std::nullopt, row.expected) << row.key;
+  }
+}
+
+TEST_F(PLReportTest, ReadsGatesAlwaysAndValuesOnlyWhenWhitelisted) {
+  for (const KernelCounter& row : kTagCheckCounters) platform.kernel.integers[row.name] = 1;
+  platform.whitelistScalars({"com.norba.kernel.vmtc_1_byte"});
+  morvend::DeviceContext context(platform.platform);
+  PLReport report(platform.platform, context);
+  report.reportVMStats();
+  EXPECT_EQ(platform.kernel.reads,
+            (std::vector<std::string>{"vm.vmtc_total", "vm.vmtc_1_byte",
+                                      "kern.memorystatus_freeze_pageouts",
+                                      "kern.memorystatus_freezer_process_considered_count",
+                                      "kern.memorystatus_freezer_below_threshold_count",
+                                      "kern.memorystatus_freezer_refreeze_count"}));
+}
+
+}  // namespace
+}  // namespace report
