@@ -44,9 +44,9 @@ std::string doubleText(double value) {
 
 namespace {
 
-template <typename Integer>
-void append(std::string& text, Integer value) {
-  std::array<char, 24> digits;
+template <typename Number>
+void append(std::string& text, Number value) {
+  std::array<char, 32> digits;
   const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), value);
   text.append(digits.data(), end.ptr);
 }
@@ -55,5 +55,14 @@ void append(std::string& text, Integer value) {
 
 void appendInteger(std::string& text, std::int64_t value) { append(text, value); }
 void appendInteger(std::string& text, std::uint64_t value) { append(text, value); }
+
+void appendReal(std::string& text, double value) {
+  // Not-a-number has a sign that nobody wants to read.
+  if (std::isnan(value)) {
+    text += "nan";
+  } else {
+    append(text, value);
+  }
+}
 
 }  // namespace platform
