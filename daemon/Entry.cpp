@@ -50,8 +50,8 @@ void runOption(Platform& platform, DeviceContext& context, const char* argument)
 
 }  // namespace
 
-void Run(Platform& platform, DeviceContext& context, int argumentCount,
-         const char* const* arguments) {
+void RunProcess(Platform& platform, DeviceContext& context, int argumentCount,
+                const char* const* arguments) {
   platform.log.log(LogLevel::standard, "morvend started");
   if (argumentCount == 1) {
     serve(platform, context);

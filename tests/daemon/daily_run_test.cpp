@@ -31,7 +31,7 @@ class DailyRunTest : public ::testing::Test {
   void run(std::initializer_list<const char*> arguments) {
     DeviceContext context(platform.platform);
     const std::vector<const char*> vector(arguments);
-    Run(platform.platform, context, static_cast<int>(vector.size()), vector.data());
+    RunProcess(platform.platform, context, static_cast<int>(vector.size()), vector.data());
     EXPECT_EQ(platform.runLock.held, 0);
   }
 
@@ -172,7 +172,7 @@ TEST_F(DailyRunTest, SurvivesTheFailureOfAnySingleCall) {
     platform.log.clear();
     faults.failAt(failing);
     DeviceContext context(faults.platform());
-    Run(faults.platform(), context, 2, arguments);
+    RunProcess(faults.platform(), context, 2, arguments);
     if (failing == 0) calls = faults.calls();
     const auto& journal = platform.journal;
     EXPECT_EQ(std::count(journal.begin(), journal.end(), "roll servita logs"), 1) << failing;

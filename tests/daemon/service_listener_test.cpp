@@ -47,7 +47,7 @@ class ServiceTest : public ::testing::Test {
     for (auto& event : events) platform.service.willDeliver(std::move(event));
     DeviceContext context(platform.platform);
     const char* const arguments[] = {"morvend"};
-    Run(platform.platform, context, 1, arguments);
+    RunProcess(platform.platform, context, 1, arguments);
     Lines lines;
     for (const std::string& line : platform.log.lines()) {
       if (line.starts_with("default: ") || line.starts_with("error: ")) {

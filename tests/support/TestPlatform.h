@@ -31,8 +31,8 @@ class TestPlatform : private RealCodecs, public platform::fakes::FakePlatform {
     setWhitelist({{"Group", platform::Dictionary{{"ScalarKeys", entries}}}});
   }
 
-  platform::Dictionary parse(const std::string& log) {
-    const auto value = codec.read(log);
+  platform::Dictionary parse(const std::string& bytes) {
+    const auto value = codec.read(bytes);
     const auto* dictionary = value ? value->as<platform::Dictionary>() : nullptr;
     return dictionary != nullptr ? *dictionary : platform::Dictionary();
   }
