@@ -118,7 +118,7 @@ TEST_F(PLReportTest, WritesTheWholeLog) {
 			<real>10</real>
 			<real>1000</real>
 			<real>340.3333333333333</real>
-			<real>652740.6666666666</real>
+			<real>652740.6666666667</real>
 			<integer>3</integer>
 		</array>
 		<key>plain</key>
@@ -269,7 +269,7 @@ TEST_F(PLReportTest, TellsMinutesSinceBoot) {
   } rows[] = {{{{1, 1}}, 90'000'000'000, 1},
               {{{125, 3}}, 24'000'000ull * 60 * 10 + 12'000'000, 10},
               {{{1, 1}}, 0, 0},
-              {{{4294967295, 1}}, ~std::uint64_t{0}, 1320481671000000000},
+              {{{4294967295, 1}}, ~std::uint64_t{0}, 1320469374930293248},
               {{}, 1, -1},
               {{{1, 0}}, 1, -1}};
   for (const auto& row : rows) {
