@@ -1,0 +1,95 @@
+#include "platform/host/Host.h"
+
+#include <csignal>
+#include <cstdlib>
+#include <optional>
+
+#include "platform/host/Bus.h"
+#include "platform/host/DeviceFileSystem.h"
+#include "platform/host/EventSink.h"
+#include "platform/host/HostApplications.h"
+#include "platform/host/HostDeviceProperties.h"
+#include "platform/host/HostKernel.h"
+#include "platform/host/HostLibraryLoader.h"
+#include "platform/host/HostLocale.h"
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/HostSystemVersion.h"
+#include "platform/host/MD5Digest.h"
+#include "platform/host/PreferenceFiles.h"
+#include "platform/host/RunLockFile.h"
+#include "platform/host/ServitaLogFiles.h"
+#include "platform/host/StandardErrorLog.h"
+#include "platform/host/StructuredLogFiles.h"
+#include "platform/host/SubmissionSpool.h"
+#include "platform/host/SystemClock.h"
+
+namespace platform::host {
+
+HostOptions HostOptions::fromEnvironment() {
+  HostOptions options;
+  if (const char* root = std::getenv("MORVEND_ROOT"); root != nullptr && *root != '\0') {
+    options.root = root;
+  }
+  options.lowestLevel = StandardErrorLog::levelNamed(std::getenv("MORVEND_LOG"));
+  return options;
+}
+
+// In the order of construction: each service stands after those that it uses.
+struct Host::Services {
+  explicit Services(const HostOptions& options) : root(options.root), log(options.lowestLevel) {}
+
+  void countDamagedDatabase() {
+    preferences.addToInteger("DatabaseCorruptionCount", "com.norba.pellorand", 1);
+  }
+
+  DeviceRoot root;
+  StandardErrorLog log;
+  SystemClock clock;
+  MD5Digest digest;
+  HostPropertyListCodec codec;
+  DeviceFileSystem files{root};
+  PreferenceFiles preferences{root, codec, log};
+  std::function<const std::string*()> home;
+  CounterStore counters{root, clock, log,
+                        [this]() -> std::optional<std::string> {
+                          const std::string* path = home ? home() : nullptr;
+                          return path ? std::optional(*path) : std::nullopt;
+                        },
+                        [this] { countDamagedDatabase(); }};
+  SubmissionSpool submission{root, codec, preferences, clock, log};
+  StructuredLogFiles structuredLogs{root, clock, log};
+  ServitaLogFiles servitaLogs{root, log};
+  Bus bus{log};
+  EventSink eventSink{root, codec, clock, log};
+  DeviceFile propertiesFile{root, codec, log, "device/properties.plist"};
+  HostDeviceProperties deviceProperties{root, propertiesFile};
+  HostSystemVersion systemVersion{root, codec, log};
+  HostKernel kernel{root, codec, log};
+  HostApplications applications{root, codec, log};
+  HostLocale locale{root, codec, log};
+  HostLibraryLoader libraries{root, preferences};
+  RunLockFile runLock{root, log};
+
+  Platform platform{log,           clock,          digest,      codec,       files,
+                    counters,      counters,       preferences, preferences, preferences,
+                    submission,    structuredLogs, servitaLogs, bus,         bus,
+                    bus,           eventSink,      deviceProperties, systemVersion, kernel,
+                    applications,  locale,         libraries,   runLock};
+};
+
+Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {
+  // A reader of our output that goes away must not end a run.
+  std::signal(SIGPIPE, SIG_IGN);
+}
+
+Host::~Host() = default;
+
+Platform& Host::platform() { return services_->platform; }
+CounterStore& Host::counters() { return services_->counters; }
+const DeviceRoot& Host::root() const { return services_->root; }
+
+void Host::keepCountersBelow(std::function<const std::string*()> home) {
+  services_->home = std::move(home);
+}
+
+}  // namespace platform::host

@@ -1,0 +1,43 @@
+// The Linux host: every service of the platform, assembled over one device root.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "platform/Platform.h"
+#include "platform/host/CounterStore.h"
+#include "platform/host/DeviceRoot.h"
+
+namespace platform::host {
+
+struct HostOptions {
+  std::string root = "/";                  // the device root, a path of the host
+  LogLevel lowestLevel = LogLevel::standard;
+
+  // As the environment says: MORVEND_ROOT and MORVEND_LOG.
+  static HostOptions fromEnvironment();
+};
+
+class Host {
+ public:
+  explicit Host(const HostOptions& options = HostOptions::fromEnvironment());
+
+  // Flushes the preferences and writes every event that was sent.
+  ~Host();
+
+  // The services live as long as the host.
+  Platform& platform();
+  CounterStore& counters();
+  const DeviceRoot& root() const;
+
+  // Tells where the counters' data lie: `home` yields a device path (borrowed), or null while there
+  // is no such place. Until it is told, there are no counters.
+  void keepCountersBelow(std::function<const std::string*()> home);
+
+ private:
+  struct Services;
+  std::unique_ptr<Services> services_;
+};
+
+}  // namespace platform::host
