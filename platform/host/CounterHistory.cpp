@@ -123,7 +123,8 @@ class StoredSamples : public PLHistoryDistributionEnumerator {
 void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
                                          std::int32_t maxDaysSince1970,
                                          const ScalarRowHandler& rowHandler) {
-  const bool done = database_.read([&](sqlite::Connection& connection) {
+  if (failed_) return;
+  failed_ = !database_.read([&](sqlite::Connection& connection) {
     sqlite::Statement rows(connection,
                            "SELECT day, key, value FROM scalars WHERE day BETWEEN ? AND ? "
                            "ORDER BY day, key",
@@ -136,14 +137,14 @@ void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_
       rowHandler(key, static_cast<std::int32_t>(rows.integer(0)), rows.integer(2), stop);
     }
   });
-  failed_ = failed_ || !done;
 }
 
 void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
                                                std::int32_t minDaysSince1970,
                                                std::int32_t maxDaysSince1970,
                                                const DistributionRowHandler& rowHandler) {
-  const bool done = database_.read([&](sqlite::Connection& connection) {
+  if (failed_) return;
+  failed_ = !database_.read([&](sqlite::Connection& connection) {
     const sqlite::Transaction snapshot(connection, sqlite::Transaction::Kind::read);
     sqlite::Statement packed(connection,
                              "SELECT day, key, samples FROM packed WHERE day BETWEEN ? AND ? "
@@ -167,7 +168,6 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
       samples.finish();
     }
   });
-  failed_ = failed_ || !done;
 }
 
 }  // namespace platform::host

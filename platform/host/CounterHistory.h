@@ -15,8 +15,8 @@ class CounterHistory : public PLHistory {
   // The place is borrowed.
   explicit CounterHistory(const CounterPlace& place) : database_(place) {}
 
-  // Each query sees the database as it was when the query began. A handler may query this history
-  // and write to the store.
+  // Each query sees the database as it was when the query began. After a failure, which the log
+  // tells, this history is empty. A handler may query this history and write to the store.
   void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
                            std::int32_t maxDaysSince1970,
                            const ScalarRowHandler& rowHandler) override;
@@ -24,7 +24,7 @@ class CounterHistory : public PLHistory {
                                  std::int32_t maxDaysSince1970,
                                  const DistributionRowHandler& rowHandler) override;
 
-  // Whether a query failed so far; the log says why.
+  // Whether a query failed so far.
   bool failed() const { return failed_; }
 
  private:
