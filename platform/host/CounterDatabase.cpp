@@ -1,0 +1,246 @@
+#include "platform/host/CounterDatabase.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <climits>
+#include <cstring>
+
+#include "platform/Text.h"
+#include "platform/host/Files.h"
+#include "platform/host/SQLite.h"
+
+namespace platform::host {
+
+using sqlite::Connection;
+using sqlite::Failure;
+
+namespace {
+
+constexpr char kName[] = "PLDataStore.sqlitedb";
+constexpr std::array<const char*, 3> kBeside = {
+    "PLDataStore.sqlitedb-wal", "PLDataStore.sqlitedb-shm", "PLDataStore.sqlitedb-journal"};
+constexpr char kAside[] = "PLDataStore.sqlitedb.corrupt";
+constexpr char kLogAside[] = "PLDataStore.sqlitedb.corrupt-wal";
+
+constexpr int kMostPagesInLog = 1000;
+
+// Scalars and days are found by (day, key). Samples are appended to `staged`, and a checkpoint
+// packs them into data of 12 bytes each. The texts are compared with those of a database that is
+// opened: they stand as SQLite keeps them.
+constexpr std::int64_t kVersion = 1;
+constexpr char kSchema[] =
+    "CREATE TABLE scalars(day INTEGER NOT NULL, key TEXT NOT NULL, value INTEGER NOT NULL, "
+    "PRIMARY KEY(day, key)) WITHOUT ROWID, STRICT;"
+    "CREATE TABLE staged(day INTEGER NOT NULL, key TEXT NOT NULL, seconds INTEGER NOT NULL, "
+    "value REAL NOT NULL) STRICT;"
+    "CREATE TABLE packed(day INTEGER NOT NULL, key TEXT NOT NULL, samples BLOB NOT NULL) STRICT;"
+    "CREATE INDEX packed_by_day ON packed(day, key);";
+constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
+
+}  // namespace
+
+CounterDatabase::CounterDatabase(const CounterPlace& place) : place_(place) {}
+CounterDatabase::~CounterDatabase() = default;
+
+bool CounterDatabase::read(const Work& work) {
+  Failure failure;
+  if (!connection_) {
+    std::string error;
+    if (!openFolder(DeviceRoot::Missing::fails, error)) {
+      if (!error.empty()) place_.log.log(LogLevel::error, "%s", error.c_str());
+      return error.empty();
+    }
+    const FileLock lock(folder_.get());
+    failure = connect(Use::read);
+  }
+  if (connection_ && !failure) {
+    work(*connection_);
+    failure = connection_->failure();
+  }
+  if (!failure) return true;
+  if (failure.kind == Failure::Kind::damaged) {
+    const FileLock lock(folder_.get());
+    setAside(failure.text);
+  } else {
+    place_.log.log(LogLevel::error, "%s", located(failure.text).c_str());
+  }
+  connection_.reset();
+  return false;
+}
+
+std::string CounterDatabase::write(Missing missing, const Work& work) {
+  const bool creates = missing == Missing::create;
+  std::string error;
+  if (!openFolder(creates ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails, error)) {
+    return error;
+  }
+  const FileLock lock(folder_.get());
+  for (bool again = false;; again = true) {
+    Failure failure = connect(creates ? Use::create : Use::write);
+    if (!failure && !connection_) return {};
+    if (!failure) {
+      work(*connection_);
+      failure = connection_->failure();
+    }
+    const bool written = !failure;
+    if (written && connection_->pagesInLog() > kMostPagesInLog) {
+      connection_->checkpoint(Connection::Checkpoint::passive);
+      failure = connection_->failure();
+    }
+    if (!failure) return {};
+    connection_.reset();
+    const bool damaged = failure.kind == Failure::Kind::damaged;
+    // What was written is safe in the log, unless that is damaged.
+    if (written && !damaged) return {};
+    if (damaged) setAside(failure.text);
+    if (!damaged || again) return located(failure.text);
+  }
+}
+
+// False with an empty error: there is no home, or no folder, and none is to be made.
+bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error) {
+  if (folder_) return true;
+  const bool creates = missing == DeviceRoot::Missing::create;
+  const auto home = place_.home();
+  if (!home) {
+    if (creates) error = "there is no home folder for the counters database";
+    return false;
+  }
+  folderPath_ = *home + "/Library/Pelloran";
+  folder_ = place_.root.openFolder(folderPath_, missing);
+  if (folder_) return true;
+  if (creates || errno != ENOENT) error = folderPath_ + ": " + std::strerror(errno);
+  return false;
+}
+
+// The file that bears the database's name now; none, with errno set, when it isn't a regular file.
+std::optional<CounterDatabase::Identity> CounterDatabase::identity() const {
+  struct stat status;
+  if (::fstatat(folder_.get(), kName, &status, AT_SYMLINK_NOFOLLOW) != 0) {
+    if (errno == ENOENT) return Identity{};
+    return std::nullopt;
+  }
+  if (!S_ISREG(status.st_mode)) {
+    errno = EINVAL;
+    return std::nullopt;
+  }
+  return Identity{status.st_dev, status.st_ino};
+}
+
+std::string CounterDatabase::pathOnHost() const {
+  std::array<char, PATH_MAX> path;
+  const std::string link = format("/proc/self/fd/%d", folder_.get());
+  const ssize_t length = ::readlink(link.c_str(), path.data(), path.size());
+  if (length <= 0) return {};
+  return std::string(path.data(), static_cast<std::size_t>(length)) + "/" + kName;
+}
+
+std::string CounterDatabase::create() {
+  // A new database must not meet what is left of another one.
+  for (const char* name : kBeside) ::unlinkat(folder_.get(), name, 0);
+  const FileDescriptor file(
+      ::openat(folder_.get(), kName, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  return file ? std::string() : std::strerror(errno);
+}
+
+// With the lock held: sees to it that the connection is one to the file that is there. Without a
+// failure and without a connection there is no database, and none is to be created.
+Failure CounterDatabase::connect(Use use) {
+  constexpr char notRegular[] = "it, or a file beside it, is not a regular file";
+  auto now = identity();
+  if (now && connection_ && *now == opened_) return {};
+  connection_.reset();
+  if (!now) return {Failure::Kind::other, notRegular};
+  for (const char* name : kBeside) {
+    struct stat status;
+    if (::fstatat(folder_.get(), name, &status, AT_SYMLINK_NOFOLLOW) == 0 &&
+        !S_ISREG(status.st_mode)) {
+      return {Failure::Kind::other, notRegular};
+    }
+  }
+  if (now->inode == 0) {
+    if (use != Use::create) return {};
+    if (const std::string error = create(); !error.empty()) return {Failure::Kind::other, error};
+    now = identity();
+    if (!now) return {Failure::Kind::other, notRegular};
+  }
+  opened_ = *now;
+  const std::string path = pathOnHost();
+  connection_ = std::make_unique<Connection>(path, Connection::Access::readWrite);
+  verify(use);
+  if (use == Use::read && connection_ && connection_->failure().kind == Failure::Kind::unwritable) {
+    struct stat log;
+    if (::fstatat(folder_.get(), kBeside[0], &log, AT_SYMLINK_NOFOLLOW) == 0 && log.st_size > 0) {
+      place_.log.log(
+          LogLevel::error, "%s",
+          located("it is read without its write-ahead log: " + connection_->failure().text)
+              .c_str());
+    }
+    connection_ = std::make_unique<Connection>(path, Connection::Access::immutable);
+    verify(use);
+  }
+  return connection_ ? connection_->failure() : Failure{};
+}
+
+// Makes sure that what was opened is a database of this store, and makes it one if it is empty.
+void CounterDatabase::verify(Use use) {
+  Connection& connection = *connection_;
+  std::int64_t version = 0;
+  std::string schema;
+  {
+    const sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::read);
+    sqlite::Statement userVersion(connection, "PRAGMA user_version");
+    if (userVersion.step()) version = userVersion.integer(0);
+    sqlite::Statement texts(connection,
+                            "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL ORDER BY rowid");
+    while (texts.step()) schema.append(texts.text(0)).append(";");
+  }
+  if (connection.failure()) return;
+  if (version > kVersion) {
+    connection.fail(Failure::Kind::other,
+                    format("made by a newer version of the store (%d)", static_cast<int>(version)));
+  } else if (version == 0 && schema.empty()) {
+    if (use != Use::create) {
+      connection_.reset();
+      return;
+    }
+    connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE");
+    connection.execute(kSchema);
+    connection.execute(kCreation);
+  } else if (version != kVersion || schema != kSchema) {
+    connection.fail(Failure::Kind::damaged, "its tables are not the store's");
+  } else if (use != Use::read) {
+    if (connection.readOnly() && ::faccessat(folder_.get(), kName, W_OK, AT_EACCESS) == 0) {
+      connection.fail(Failure::Kind::damaged, "its header forbids writing");
+    }
+    connection.execute("PRAGMA journal_mode = WAL");
+  }
+}
+
+// With the lock held. Does nothing when another process was first.
+void CounterDatabase::setAside(const std::string& why) {
+  connection_.reset();
+  const auto now = identity();
+  if (!now || now->inode == 0 || *now != opened_) return;
+  // The database goes first: what is left beside no database is removed before a new one is made.
+  if (::renameat(folder_.get(), kName, folder_.get(), kAside) != 0) {
+    place_.log.log(LogLevel::error, "%s",
+                   located(why + "; it can't be set aside: " + std::strerror(errno)).c_str());
+    return;
+  }
+  if (::renameat(folder_.get(), kBeside[0], folder_.get(), kLogAside) != 0) {
+    ::unlinkat(folder_.get(), kLogAside, 0);
+  }
+  for (const char* name : kBeside) ::unlinkat(folder_.get(), name, 0);
+  place_.log.log(LogLevel::error, "%s", located(why + "; it is set aside as " + kAside).c_str());
+  place_.foundDamaged();
+}
+
+std::string CounterDatabase::located(const std::string& text) const {
+  return folderPath_ + "/" + kName + ": " + text;
+}
+
+}  // namespace platform::host

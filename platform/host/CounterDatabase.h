@@ -1,0 +1,77 @@
+// Where the counters database lies, and one connection to it.
+//
+// Every process that opens the database, writes to it or checkpoints it holds the store's lock: a
+// lock on the folder that the database lies in. So no two connections write or checkpoint at once,
+// and a database that is found damaged is set aside by one process while the others notice, the
+// next time they hold the lock, that the file is another.
+#pragma once
+
+#include <sys/types.h>
+
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "platform/SystemLog.h"
+#include "platform/host/DeviceRoot.h"
+
+namespace platform::host {
+
+namespace sqlite {
+class Connection;
+struct Failure;
+}  // namespace sqlite
+
+// What the connections of one store share.
+struct CounterPlace {
+  const DeviceRoot& root;
+  SystemLog& log;
+  // The device path of the home folder; none: there is no database.
+  std::function<std::optional<std::string>()> home;
+  // Called once for each database that was set aside, with the store's lock held.
+  std::function<void()> foundDamaged;
+};
+
+class CounterDatabase {
+ public:
+  // Nothing is opened before it is needed. The place is borrowed.
+  explicit CounterDatabase(const CounterPlace& place);
+  ~CounterDatabase();
+
+  // Runs the work on a connection for reading. True when it could be done; with no database there
+  // is nothing to be done, and the work isn't run. A failure is logged.
+  using Work = std::function<void(sqlite::Connection&)>;
+  bool read(const Work& work);
+
+  // Runs the work, which writes, with the lock held; once more, on a new database, when the first
+  // turns out to be damaged. Returns the empty text, or what went wrong and where. The work must
+  // neither use this object nor open another connection to the database.
+  enum class Missing { create, skip };
+  std::string write(Missing missing, const Work& work);
+
+ private:
+  struct Identity {
+    dev_t device = 0;
+    ino_t inode = 0;  // 0: there is no file
+    bool operator==(const Identity&) const = default;
+  };
+  enum class Use { read, write, create };
+
+  bool openFolder(DeviceRoot::Missing missing, std::string& error);
+  std::optional<Identity> identity() const;
+  std::string pathOnHost() const;
+  std::string create();
+  sqlite::Failure connect(Use use);
+  void verify(Use use);
+  void setAside(const std::string& why);
+  std::string located(const std::string& text) const;
+
+  const CounterPlace& place_;
+  std::string folderPath_;  // of the device
+  FileDescriptor folder_;
+  Identity opened_;
+  std::unique_ptr<sqlite::Connection> connection_;
+};
+
+}  // namespace platform::host

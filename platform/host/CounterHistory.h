@@ -1,0 +1,35 @@
+// The history of the counters: reads the counters database by day.
+#pragma once
+
+#include "platform/PLHistory.h"
+#include "platform/host/CounterDatabase.h"
+
+namespace platform::host {
+
+// One record of a packed series: the value (double) and the second within the day (int32), both
+// little-endian.
+inline constexpr std::size_t kPackedSampleSize = 12;
+
+class CounterHistory : public PLHistory {
+ public:
+  // The place is borrowed.
+  explicit CounterHistory(const CounterPlace& place) : database_(place) {}
+
+  // Each query sees the database as it was when the query began. After a failure, which the log
+  // tells, this history is empty. A handler may query this history and write to the store.
+  void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
+                           std::int32_t maxDaysSince1970,
+                           const ScalarRowHandler& rowHandler) override;
+  void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
+                                 std::int32_t maxDaysSince1970,
+                                 const DistributionRowHandler& rowHandler) override;
+
+  // Whether a query failed so far.
+  bool failed() const { return failed_; }
+
+ private:
+  CounterDatabase database_;
+  bool failed_ = false;
+};
+
+}  // namespace platform::host

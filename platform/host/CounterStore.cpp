@@ -1,0 +1,159 @@
+#include "platform/host/CounterStore.h"
+
+#include <cmath>
+#include <cstring>
+
+#include "platform/CivilDate.h"
+#include "platform/host/SQLite.h"
+
+namespace platform::host {
+
+namespace {
+
+constexpr int kDaysKept = 60;
+constexpr std::size_t kMostSamplesInRow = 65536;
+
+void record(sqlite::Connection& connection, const CounterChange& change) {
+  switch (change.kind) {
+    case CounterChange::Kind::set:
+      sqlite::Statement(connection,
+                        "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
+                        "ON CONFLICT(day, key) DO UPDATE SET value = excluded.value",
+                        change.day, change.key, change.amount)
+          .run();
+      return;
+    case CounterChange::Kind::add:
+      sqlite::Statement(
+          connection,
+          "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
+          "ON CONFLICT(day, key) DO UPDATE SET value = CASE "
+          "WHEN ?3 > 0 AND value > 9223372036854775807 - ?3 THEN 9223372036854775807 "
+          "WHEN ?3 < 0 AND value < -9223372036854775807 - 1 - ?3 THEN -9223372036854775807 - 1 "
+          "ELSE value + ?3 END",
+          change.day, change.key, change.amount)
+          .run();
+      return;
+    case CounterChange::Kind::push:
+      sqlite::Statement(connection,
+                        "INSERT INTO staged(day, key, seconds, value) VALUES(?1, ?2, ?3, ?4)",
+                        change.day, change.key, change.seconds, change.sample)
+          .run();
+  }
+}
+
+// Moves the staged samples behind those that are packed already.
+void pack(sqlite::Connection& connection) {
+  std::int64_t day = 0;
+  std::string key, samples;
+  const auto flush = [&] {
+    if (samples.empty()) return;
+    sqlite::Statement(connection, "INSERT INTO packed(day, key, samples) VALUES(?, ?, ?)", day, key,
+                      sqlite::Blob{samples})
+        .run();
+    samples.clear();
+  };
+  sqlite::Statement staged(connection,
+                           "SELECT day, key, seconds, value FROM staged ORDER BY day, key, rowid");
+  while (staged.step()) {
+    if (!staged.isInteger(0) || !staged.isText(1) || !staged.isInteger(2) || !staged.isReal(3)) {
+      continue;
+    }
+    if (day != staged.integer(0) || key != staged.text(1) ||
+        samples.size() == kMostSamplesInRow * kPackedSampleSize) {
+      flush();
+      day = staged.integer(0);
+      key = staged.text(1);
+    }
+    const double value = staged.real(3);
+    const auto seconds = static_cast<std::int32_t>(staged.integer(2));
+    samples.append(reinterpret_cast<const char*>(&value), sizeof value);
+    samples.append(reinterpret_cast<const char*>(&seconds), sizeof seconds);
+  }
+  flush();
+  sqlite::Statement(connection, "DELETE FROM staged").run();
+}
+
+// Samples are packed before this, so that none is staged. Each step back is one seek in each table.
+void dropOldDays(sqlite::Connection& connection) {
+  std::int64_t oldest = std::int64_t{INT32_MAX} + 1;
+  for (int kept = 0; kept < kDaysKept; ++kept) {
+    sqlite::Statement before(connection,
+                             "SELECT max(day) FROM ("
+                             "SELECT max(day) AS day FROM scalars WHERE day < ?1 UNION ALL "
+                             "SELECT max(day) FROM packed WHERE day < ?1)",
+                             oldest);
+    if (!before.step() || !before.isInteger(0)) return;
+    oldest = before.integer(0);
+  }
+  sqlite::Statement(connection, "DELETE FROM scalars WHERE day < ?", oldest).run();
+  sqlite::Statement(connection, "DELETE FROM packed WHERE day < ?", oldest).run();
+}
+
+}  // namespace
+
+CounterStore::CounterStore(const DeviceRoot& root, Clock& clock, SystemLog& log,
+                           std::function<std::optional<std::string>()> home,
+                           std::function<void()> foundDamaged)
+    : place_{root, log, std::move(home), std::move(foundDamaged)},
+      clock_(clock),
+      database_(place_) {}
+
+std::int32_t CounterStore::PLDaysSince1970() { return dayNumber(clock_.now().secondsSince1970); }
+
+Date CounterStore::PLDateFromDaysSince1970(std::int32_t day) {
+  return {static_cast<double>(day) * static_cast<double>(kSecondsPerDay)};
+}
+
+void CounterStore::PLClientCheckpoint() {
+  const std::string error =
+      database_.write(CounterDatabase::Missing::skip, [](sqlite::Connection& connection) {
+        {
+          sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
+          pack(connection);
+          dropOldDays(connection);
+          transaction.commit();
+        }
+        connection.checkpoint(sqlite::Connection::Checkpoint::truncate);
+      });
+  if (!error.empty()) place_.log.log(LogLevel::error, "%s", error.c_str());
+}
+
+std::string CounterStore::apply(std::span<const CounterChange> changes) {
+  for (const CounterChange& change : changes) {
+    if (std::isnan(change.sample)) return "not a number can't be recorded as a sample";
+  }
+  return database_.write(
+      CounterDatabase::Missing::create, [changes](sqlite::Connection& connection) {
+        if (changes.size() == 1) {
+          record(connection, changes.front());
+          return;
+        }
+        sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
+        for (const CounterChange& change : changes) record(connection, change);
+        transaction.commit();
+      });
+}
+
+std::string CounterStore::set(std::string_view key, std::int64_t value, std::int32_t day) {
+  const CounterChange change{
+      .kind = CounterChange::Kind::set, .key = key, .day = day, .amount = value};
+  return apply({&change, 1});
+}
+
+std::string CounterStore::add(std::string_view key, std::int64_t value, std::int32_t day) {
+  const CounterChange change{
+      .kind = CounterChange::Kind::add, .key = key, .day = day, .amount = value};
+  return apply({&change, 1});
+}
+
+std::string CounterStore::push(std::string_view key, double value, std::int32_t day,
+                               std::int32_t seconds) {
+  const CounterChange change{.kind = CounterChange::Kind::push,
+                             .key = key,
+                             .day = day,
+                             .sample = value,
+                             .seconds = seconds};
+  return apply({&change, 1});
+}
+
+}  // namespace platform::host

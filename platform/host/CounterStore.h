@@ -1,0 +1,58 @@
+// The counters service and the history store: an SQLite database below the device root.
+#pragma once
+
+#include <span>
+
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+#include "platform/host/CounterHistory.h"
+
+namespace platform::host {
+
+// One thing to be recorded: a scalar set or added to, or a sample pushed.
+struct CounterChange {
+  enum class Kind { set, add, push };
+
+  Kind kind;
+  std::string_view key;
+  std::int32_t day;
+  std::int64_t amount = 0;   // set, add
+  double sample = 0;         // push; not-a-number is refused
+  std::int32_t seconds = 0;  // push: the second within the day
+};
+
+// For one thread. Nothing is opened before it is needed.
+class CounterStore : public CountersService, public HistoryStore {
+ public:
+  // `home` yields the device path of the folder that holds the counters' data; while it yields none
+  // there is no database: reads are empty, writes fail. `foundDamaged` is called once for each
+  // database that is found damaged and set aside; it must not use the store.
+  CounterStore(const DeviceRoot& root, Clock& clock, SystemLog& log,
+               std::function<std::optional<std::string>()> home,
+               std::function<void()> foundDamaged);
+
+  std::int32_t PLDaysSince1970() override;
+  Date PLDateFromDaysSince1970(std::int32_t day) override;
+
+  // Packs the samples, drops what is older than the newest 60 days that hold rows, and brings the
+  // write-ahead log into the database file. Failures are logged.
+  void PLClientCheckpoint() override;
+
+  // The history lives no longer than the store.
+  std::unique_ptr<PLHistory> initWithDefaultPath() override { return history(); }
+  std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
+
+  // Records all the changes or none. Like the three for one change, it returns the empty text or
+  // what went wrong. Sums saturate.
+  std::string apply(std::span<const CounterChange> changes);
+  std::string set(std::string_view key, std::int64_t value, std::int32_t day);
+  std::string add(std::string_view key, std::int64_t value, std::int32_t day);
+  std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
+
+ private:
+  CounterPlace place_;
+  Clock& clock_;
+  CounterDatabase database_;
+};
+
+}  // namespace platform::host

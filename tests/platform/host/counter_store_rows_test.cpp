@@ -1,0 +1,261 @@
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+
+#include <cmath>
+#include <limits>
+
+#include "counter_store_support.h"
+
+namespace {
+
+using platform::host::CounterChange;
+using support::StoreFixture;
+using Lines = std::vector<std::string>;
+
+constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
+constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
+
+class CounterStoreRows : public testing::Test {
+ protected:
+  // Runs SQL on the database behind the store's back.
+  void sql(const char* text) {
+    sqlite3* database = nullptr;
+    ASSERT_EQ(sqlite3_open((folder / support::kDatabase).c_str(), &database), SQLITE_OK);
+    EXPECT_EQ(sqlite3_exec(database, text, nullptr, nullptr, nullptr), SQLITE_OK)
+        << sqlite3_errmsg(database);
+    sqlite3_close(database);
+  }
+
+  support::TemporaryFolder folder;
+  StoreFixture here{folder.path()};
+};
+
+TEST_F(CounterStoreRows, SumsSaturateInsteadOfWrapping) {
+  struct {
+    std::int64_t start, added, sum;
+  } const cases[] = {{1, 2, 3},
+                     {kMost, 1, kMost},
+                     {kMost - 1, 1, kMost},
+                     {kLeast, -1, kLeast},
+                     {kLeast, kLeast, kLeast},
+                     {kMost, kMost, kMost},
+                     {kMost, kLeast, -1},
+                     {-1, kLeast, kLeast},
+                     {0, kLeast, kLeast},
+                     {kLeast, kMost, -1},
+                     {5, -7, -2}};
+  for (const auto& row : cases) {
+    EXPECT_EQ(here.store.set("k", row.start, 1), "");
+    EXPECT_EQ(here.store.add("k", row.added, 1), "");
+    EXPECT_EQ(here.rows(), Lines{"1 k " + std::to_string(row.sum)});
+  }
+}
+
+TEST_F(CounterStoreRows, RowsComeByDayThenBytesOfTheKeyWithinTheBounds) {
+  const std::string nul("a\0b", 3);
+  for (const std::string_view key : {"b", "\xff", "B", "a", ""}) {
+    here.store.set(key, 1, -3);
+  }
+  here.store.set(nul, 2, -3);
+  here.store.set("a", 3, INT32_MAX);
+  here.store.set("a", 4, INT32_MIN);
+  EXPECT_EQ(here.rows(), (Lines{"-2147483648 a 4", "-3  1", "-3 B 1", "-3 a 1", "-3 " + nul + " 2",
+                                "-3 b 1", "-3 \xff 1", "2147483647 a 3"}));
+  const auto history = here.store.initWithDefaultPath();
+  EXPECT_EQ(support::rows(*history, "a", -3, 5), (Lines{"-3 a 1", "-3 " + nul + " 2"}));
+  EXPECT_EQ(support::rows(*history, "", -2, -3), Lines{});
+  EXPECT_EQ(support::rows(*history, "", -4, -3).size(), 6u);
+}
+
+TEST_F(CounterStoreRows, SamplesKeepTheirOrderAcrossCheckpointsAndBlocks) {
+  std::string expected = "7 k";
+  std::vector<CounterChange> changes;
+  for (int i = 0; i < 3000; ++i) {
+    expected += platform::format(" %d:%d.5", i % 86400, 5000 - i);
+    changes.push_back({.kind = CounterChange::Kind::push,
+                       .key = "k",
+                       .day = 7,
+                       .sample = 5000.5 - i,
+                       .seconds = i % 86400});
+    if (i % 700 == 699 || i == 2999) {
+      EXPECT_EQ(here.store.apply(changes), "");
+      EXPECT_EQ(here.store.push("j", i, 7, 1), "");
+      changes.clear();
+      if (i < 2900) here.store.PLClientCheckpoint();
+    }
+  }
+  here.store.push("z", std::numeric_limits<double>::infinity(), 6, 2);
+  EXPECT_EQ(here.rows(), (Lines{"6 z 2:inf", "7 j 1:699 1:1399 1:2099 1:2799 1:2999", expected}));
+  EXPECT_EQ(here.log.lines(), Lines{});
+}
+
+TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsTheRows) {
+  for (int i = 0; i < 600; ++i) here.store.push(i % 2 == 0 ? "a" : "b", i, 1, 0);
+  here.store.PLClientCheckpoint();
+  here.store.push("a", 600, 1, 0);
+  here.store.push("c", 1, 1, 0);
+  Lines seen;
+  here.store.history()->distributionsForKeyPrefix(
+      "", 0, 9,
+      [&](std::string_view key, std::int32_t, platform::PLHistoryDistributionEnumerator& samples,
+          bool& stop) {
+        // A handler may query, and write to the store.
+        if (key == "b") {
+          EXPECT_EQ(here.rows().size(), 3u);
+          seen.push_back("b" + platform::doubleText(samples.getNextValues().values.front()));
+          EXPECT_EQ(here.store.push("c", 2, 1, 0), "");
+        } else {
+          seen.emplace_back(key);
+        }
+        stop = key == "b";
+      });
+  EXPECT_EQ(seen, (Lines{"a", "b1"}));
+  EXPECT_EQ(here.rows().back(), "1 c 0:1 0:2");
+}
+
+TEST_F(CounterStoreRows, ACheckpointKeepsTheNewestSixtyDaysThatHoldRowsOfAnyKind) {
+  for (int i = 0; i < 70; ++i) {
+    const std::int32_t day = i * 1000 - 20000;
+    EXPECT_EQ(i % 2 == 0 ? here.store.set("k", i, day) : here.store.push("k", i, day, 0), "");
+  }
+  here.store.PLClientCheckpoint();
+  const auto lines = here.rows();
+  ASSERT_EQ(lines.size(), 60u);
+  EXPECT_EQ(lines.front(), "-10000 k 10");
+  EXPECT_EQ(std::filesystem::file_size(folder / (std::string(support::kDatabase) + "-wal")), 0u);
+}
+
+TEST_F(CounterStoreRows, ReadsAndCheckpointsOfNothingCreateNothing) {
+  for (const auto& home : {std::optional<std::string>(), std::optional<std::string>("/nowhere"),
+                           std::optional<std::string>("/var/mobile")}) {
+    here.home = home;
+    EXPECT_EQ(here.rows(), Lines{});
+    here.store.PLClientCheckpoint();
+  }
+  EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
+  here.home.reset();
+  EXPECT_NE(here.store.set("k", 1, 1), "");
+  EXPECT_EQ(here.log.lines(), Lines{});
+}
+
+TEST_F(CounterStoreRows, FilesAreForTheirOwnerOnly) {
+  here.store.set("k", 1, 1);
+  const auto modeOf = [&](const std::string& path) {
+    struct stat status {};
+    ::lstat((folder / path).c_str(), &status);
+    return status.st_mode & 07777;
+  };
+  for (const char* suffix : {"", "-wal", "-shm"}) {
+    EXPECT_EQ(modeOf(std::string(support::kDatabase) + suffix), 0600u) << suffix;
+  }
+  EXPECT_EQ(modeOf("var/mobile/Library/Pelloran"), 0700u);
+}
+
+TEST_F(CounterStoreRows, AChangeThatCannotBeRecordedTakesTheOthersWithIt) {
+  const CounterChange changes[] = {
+      {.kind = CounterChange::Kind::set, .key = "k", .day = 1, .amount = 1},
+      {.kind = CounterChange::Kind::push, .key = "k", .day = 1, .sample = NAN}};
+  EXPECT_NE(here.store.apply(changes), "");
+  EXPECT_EQ(here.rows(), Lines{});
+}
+
+TEST_F(CounterStoreRows, AnythingButARegularFileInAPlaceOfTheDatabaseIsRefused) {
+  const support::TemporaryFolder outside;
+  outside.write("victim", "untouched");
+  for (const char* suffix : {"", "-wal", "-shm", "-journal"}) {
+    for (const bool link : {true, false}) {
+      const support::TemporaryFolder device;
+      const auto path = device / (std::string(support::kDatabase) + suffix);
+      StoreFixture there(device.path());
+      if (*suffix != '\0') there.store.set("k", 1, 1);
+      std::filesystem::create_directories(path.parent_path());
+      std::filesystem::remove(path);
+      if (link) {
+        std::filesystem::create_symlink(outside / "victim", path);
+      } else {
+        ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+      }
+      StoreFixture fresh(device.path());
+      EXPECT_NE(fresh.store.set("k", 1, 1), "") << path;
+      EXPECT_EQ(fresh.rows(), Lines{}) << path;
+      EXPECT_EQ(fresh.log.count("not a regular file"), 1) << path;
+      EXPECT_EQ(fresh.damaged, 0);
+      EXPECT_EQ(outside.read("victim"), "untouched");
+    }
+  }
+}
+
+TEST_F(CounterStoreRows, RowsOfWrongTypesAndHalfRecordsAreSkipped) {
+  here.store.set("k", 1, 1);
+  here.store.push("k", 2.5, 1, 3);
+  here.store.PLClientCheckpoint();
+  sql("UPDATE packed SET samples = CAST(samples || x'0102030405' AS BLOB)");
+  sql("INSERT INTO packed VALUES(1, 'l', x''), (1, 'm', x'00'), (99999999999, 'n', x'')");
+  sql("INSERT INTO scalars VALUES(99999999999, 'far', 1)");
+  EXPECT_EQ(here.rows(), (Lines{"1 k 1", "1 k 3:2.5", "1 l", "1 m"}));
+}
+
+TEST_F(CounterStoreRows, ANewerDatabaseIsRefusedAndLeftAlone) {
+  here.store.set("k", 1, 1);
+  sql("PRAGMA user_version = 2");
+  StoreFixture fresh(folder.path());
+  EXPECT_NE(fresh.store.set("k", 2, 1).find("newer version"), std::string::npos);
+  EXPECT_EQ(fresh.rows(), Lines{});
+  EXPECT_EQ(fresh.log.count("newer version"), 1);
+  EXPECT_EQ(fresh.damaged, 0);
+}
+
+TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
+  for (const char* change :
+       {"CREATE TRIGGER t AFTER INSERT ON scalars BEGIN DELETE FROM scalars; END",
+        "DROP TABLE staged", "PRAGMA user_version = -1", "PRAGMA user_version = 0"}) {
+    here.store.set("k", 1, 1);
+    sql(change);
+    StoreFixture fresh(folder.path());
+    EXPECT_EQ(fresh.store.add("k", 5, 1), "") << change;
+    EXPECT_EQ(fresh.rows(), Lines{"1 k 5"}) << change;
+    EXPECT_EQ(fresh.damaged, 1) << change;
+    // The other store notices that the file is another.
+    EXPECT_EQ(here.store.add("k", 1, 1), "");
+    EXPECT_EQ(here.rows(), Lines{"1 k 6"}) << change;
+    EXPECT_EQ(here.damaged, 0);
+  }
+}
+
+// As another user where the tests run as root, whom no mode stops.
+TEST_F(CounterStoreRows, ADeviceThatCannotBeWrittenIsStillRead) {
+  for (const char* left : {"", "-wal", "-shm"}) {
+    here.store.set("k", 1, 1);
+    here.store.PLClientCheckpoint();
+    const std::string database = support::kDatabase;
+    if (*left == '\0') std::filesystem::remove(folder / (database + "-wal"));
+    if (*left == '\0') std::filesystem::remove(folder / (database + "-shm"));
+    if (std::string_view(left) == "-wal") std::filesystem::remove(folder / (database + "-shm"));
+    std::filesystem::path path = folder.path();
+    std::filesystem::permissions(path, std::filesystem::perms(0555));
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
+      std::filesystem::permissions(entry.path(),
+                                   std::filesystem::perms(entry.is_directory() ? 0555 : 0444));
+    }
+    const pid_t child = ::fork();
+    if (child == 0) {
+      if (::geteuid() == 0 && ::setresuid(65534, 65534, 65534) != 0) ::_exit(9);
+      StoreFixture reader(folder.path());
+      if (reader.rows() != Lines{"1 k 1"}) ::_exit(1);
+      if (reader.store.set("k", 2, 1).empty()) ::_exit(2);
+      ::_exit(reader.damaged == 0 ? 0 : 3);
+    }
+    int status = 0;
+    ASSERT_EQ(::waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0) << left;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
+      std::filesystem::permissions(entry.path(),
+                                   std::filesystem::perms(entry.is_directory() ? 0700 : 0600));
+    }
+    std::filesystem::permissions(path, std::filesystem::perms(0700));
+  }
+}
+
+}  // namespace
