@@ -22,8 +22,7 @@ std::string relative(std::string_view path) {
 }  // namespace
 
 DeviceRoot::DeviceRoot(std::string path)
-    : path_(std::move(path)),
-      root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {}
+    : path_(std::move(path)), root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {}
 
 FileDescriptor DeviceRoot::open(const std::string& path, int flags, std::uint64_t resolve) const {
   if (!root_ || path.find('\0') != std::string::npos) {

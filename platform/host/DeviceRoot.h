@@ -1,7 +1,7 @@
 // The device root: the directory that stands for a device's file system.
 //
-// Every path of the device is resolved below it, ".." and links included, so that nothing outside is
-// read or written. Paths are device paths, with or without a leading slash. Nothing here logs:
+// Every path of the device is resolved below it, ".." and links included, so that nothing outside
+// is read or written. Paths are device paths, with or without a leading slash. Nothing here logs:
 // failures come back as error numbers, for the service that knows what they mean to its user.
 #pragma once
 
@@ -32,9 +32,9 @@ class DeviceRoot {
   // The bytes of a regular file, at most `maximum` of them. The error is an error number's text.
   Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
 
-  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700, but
-  // not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay within
-  // the root, as a system's own links from one of its folders to another do. On failure as
+  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700,
+  // but not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay
+  // within the root, as a system's own links from one of its folders to another do. On failure as
   // openForReading.
   enum class Missing { fails, create };
   enum class Links { refused, followed };

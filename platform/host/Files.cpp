@@ -65,27 +65,25 @@ Result<std::string> readRegularFile(int file, std::size_t maximum) {
   return Result<std::string>::success(std::move(bytes));
 }
 
-Result<std::vector<std::string>> namesInFolder(int folder) {
-  using Names = Result<std::vector<std::string>>;
+int namesInFolder(int folder, std::vector<std::string>& names) {
   // A description of its own, because the place in the listing belongs to the description.
   const int again = ::openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  if (again < 0) return Names::failure(std::strerror(errno));
+  if (again < 0) return errno;
   const auto close = [](DIR* listing) { ::closedir(listing); };
   const std::unique_ptr<DIR, decltype(close)> listing(::fdopendir(again), close);
   if (listing == nullptr) {
     ::close(again);
-    return Names::failure(std::strerror(ENOMEM));
+    return ENOMEM;
   }
-  std::vector<std::string> names;
   errno = 0;
   while (const dirent* entry = ::readdir(listing.get())) {
     const std::string_view name = entry->d_name;
     if (name != "." && name != "..") names.emplace_back(name);
     errno = 0;
   }
-  if (errno != 0) return Names::failure(std::strerror(errno));
+  const int error = errno;
   std::sort(names.begin(), names.end());
-  return Names::success(std::move(names));
+  return error;
 }
 
 bool isPlainFileName(std::string_view name, std::size_t longest) {
@@ -116,8 +114,8 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes) {
   if (const int error = refuseOtherKinds(folder, name)) return error;
   const std::string beside = "." + name + ".new";
   if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return errno;
-  const FileDescriptor file(::openat(folder, beside.c_str(),
-                                     O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  const FileDescriptor file(
+      ::openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
   if (!file) return errno;
   int error = writeAll(file.get(), bytes);
   if (error == 0 && ::fsync(file.get()) != 0) error = errno;
@@ -135,9 +133,9 @@ int renameToFreeName(int fromFolder, const std::string& from, int toFolder, cons
 }
 
 int appendLines(int folder, const std::string& name, std::string_view lines) {
-  const FileDescriptor file(::openat(
-      folder, name.c_str(),
-      O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
+  const FileDescriptor file(
+      ::openat(folder, name.c_str(),
+               O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
   if (!file) return errno == ELOOP || errno == EISDIR ? EINVAL : errno;
   const FileLock lock(file.get());
   struct stat status;

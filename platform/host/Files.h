@@ -19,13 +19,12 @@ namespace platform::host {
 // text.
 const char* errorText(int error);
 
-// The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file is
-// an error; the error is an error number's text.
+// The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
+// is an error; the error is an error number's text.
 Result<std::string> readRegularFile(int file, std::size_t maximum);
 
-// The names in an open folder, "." and ".." left out, in bytewise order. The error is an error
-// number's text.
-Result<std::vector<std::string>> namesInFolder(int folder);
+// The names in an open folder, "." and ".." left out, in bytewise order. 0 or an error number.
+int namesInFolder(int folder, std::vector<std::string>& names);
 
 // The longest name that a file can have, in bytes.
 inline constexpr std::size_t kLongestFileName = 255;
@@ -49,14 +48,14 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes);
 // whatever it is.
 int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to);
 
-// Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the file
-// when it is missing. A line is in the file whole or not at all: what a failed write left is taken
-// back, all of this call's lines, and a line that an earlier failure left unfinished is removed
-// first.
+// Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
+// file when it is missing. A line is in the file whole or not at all: what a failed write left is
+// taken back, all of this call's lines, and a line that an earlier failure left unfinished is
+// removed first.
 int appendLines(int folder, const std::string& name, std::string_view lines);
 
-// An exclusive lock on an open file or folder, waiting for it; released at the end of the scope. The
-// descriptor is borrowed.
+// An exclusive lock on an open file or folder, waiting for it; released at the end of the scope.
+// The descriptor is borrowed.
 class FileLock {
  public:
   explicit FileLock(int file);

@@ -82,14 +82,14 @@ void PreferenceFile::load(int folder, bool evenIfUnchanged) {
     stored_ = {};
     return;
   }
-  const bool known = (state_ == State::whole || state_ == State::broken) &&
-                     sameFile(status, status_);
+  const bool known =
+      (state_ == State::whole || state_ == State::broken) && sameFile(status, status_);
   if (known && !evenIfUnchanged) return;
   if (!known) readError_.clear();
   status_ = status;
   if (!S_ISREG(status.st_mode)) return fail(State::broken, errorText(EINVAL));
-  const FileDescriptor file(::openat(
-      folder, name_.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  const FileDescriptor file(
+      ::openat(folder, name_.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
   // The file that is read may be a newer one.
   if (!file || ::fstat(file.get(), &status_) != 0) return fail(State::unreadable, errorText(errno));
   const auto bytes = readRegularFile(file.get(), kMaximumPropertyListSize + 1);
@@ -130,8 +130,8 @@ void PreferenceFile::write(const Edit& edit) {
 // Empty, or why the changes aren't in the file.
 std::string PreferenceFile::merge(const Edit& edit) {
   const bool adds = edit != nullptr || !set_.empty();
-  const FileDescriptor folder = root_.openFolder(
-      folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
+  const FileDescriptor folder =
+      root_.openFolder(folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
   if (!folder) return errno == ENOENT && !adds ? "" : errorText(errno);
   const FileLock lock(folder.get());
   // Another process's writing may leave all that is compared as it was.

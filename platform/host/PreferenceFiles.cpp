@@ -12,8 +12,7 @@ constexpr std::string_view kSystemUser = "mobile";
 constexpr std::string_view kAnalyticsUser = "__quenset__";
 constexpr std::string_view kAnalyticsDomain = "com.norba.Varnhollow";
 
-constexpr std::size_t kLongestDomain =
-    kLongestFileName - std::string_view(".plist.corrupt").size();
+constexpr std::size_t kLongestDomain = kLongestFileName - std::string_view(".plist.corrupt").size();
 
 }  // namespace
 

@@ -54,8 +54,8 @@ class PreferenceFiles final : public PreferenceStore,
  private:
   PreferenceFile* file(std::string_view user, std::string_view domain);
   std::optional<Value> get(std::string_view user, std::string_view domain, std::string_view key);
-  void set(std::string_view user, std::string_view domain, std::string_view key,
-           const Value* value, bool synchronize);
+  void set(std::string_view user, std::string_view domain, std::string_view key, const Value* value,
+           bool synchronize);
 
   const DeviceRoot& root_;
   PropertyListCodec& codec_;

@@ -20,9 +20,9 @@ int openLocked(const DeviceRoot& root, FileDescriptor& file) {
   const FileDescriptor folder =
       root.openFolder(kFolder, DeviceRoot::Missing::create, DeviceRoot::Links::followed);
   if (!folder) return errno;
-  FileDescriptor opened(
-      ::openat(folder.get(), kName,
-               O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
+  FileDescriptor opened(::openat(folder.get(), kName,
+                                 O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC,
+                                 0600));
   if (!opened) return errno;
   struct stat status;
   if (::fstat(opened.get(), &status) != 0) return errno;

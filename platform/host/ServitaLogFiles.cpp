@@ -57,9 +57,9 @@ void ServitaLogFiles::rollServitaLogs() {
     return;
   }
   const FileLock lock(folder.get());
-  const auto names = namesInFolder(folder.get());
-  if (!names) return report("", names.error.c_str());
-  for (const std::string& log : *names) {
+  std::vector<std::string> names;
+  if (const int error = namesInFolder(folder.get(), names)) report("", errorText(error));
+  for (const std::string& log : names) {
     if (log.size() <= kSuffix.size() || !log.ends_with(kSuffix)) continue;
     std::string name;
     if (const int error = roll(folder.get(), log, name)) report(name, errorText(error));

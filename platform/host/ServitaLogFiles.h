@@ -14,8 +14,8 @@ class ServitaLogFiles final : public ServitaLogs {
   ServitaLogFiles(const DeviceRoot& root, SystemLog& log) : root_(root), log_(log) {}
 
   // Rolls every log that has a current file. Old ones move up only as far as the first free number:
-  // the gap that a killed roll-over left is filled, and nothing falls off the end before its time. A
-  // log with anything but regular files in its way stays as it is, with an error line.
+  // the gap that a killed roll-over left is filled, and nothing falls off the end before its time.
+  // A log with anything but regular files in its way stays as it is, with an error line.
   void rollServitaLogs() override;
 
  private:
