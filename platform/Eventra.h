@@ -14,6 +14,9 @@ class Eventra {
 
   virtual ~Eventra() = default;
 
+  // Whether the sink of this device has the lazy-send operation.
+  virtual bool offersLazySend() { return true; }
+
   virtual bool EventraIsEventUsed(std::string_view event) = 0;
 
   // Sends an event whose payload is built only if the sink wants it: later, and on the sink's own

@@ -5,6 +5,7 @@
 // failures come back as error numbers, for the service that knows what they mean to its user.
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -24,18 +25,25 @@ class DeviceRoot {
   // opening never blocks. On failure the descriptor is empty and errno says why.
   FileDescriptor openForReading(std::string_view path) const;
 
+  // Opens a file of any kind for its status only: no right to read it is needed. Otherwise as
+  // openForReading.
+  FileDescriptor openForStatus(std::string_view path) const;
+
   // The bytes of a regular file, at most `maximum` of them. The error is an error number's text.
   Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
 
-  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700.
-  // No link is followed (ELOOP), unless `followLinks` allows those that stay within the root, as a
-  // system's own links from one of its folders to another do. On failure as openForReading.
+  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700,
+  // but not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay
+  // within the root, as a system's own links from one of its folders to another do. On failure as
+  // openForReading.
   enum class Missing { fails, create };
   enum class Links { refused, followed };
   FileDescriptor openFolder(std::string_view path, Missing missing,
                             Links links = Links::refused) const;
 
  private:
+  FileDescriptor open(const std::string& path, int flags, std::uint64_t resolve) const;
+
   std::string path_;
   FileDescriptor root_;
 };

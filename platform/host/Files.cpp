@@ -1,5 +1,6 @@
 #include "platform/host/Files.h"
 
+#include <dirent.h>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -7,7 +8,10 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
+#include <memory>
+#include <tuple>
 
 namespace platform::host {
 
@@ -39,10 +43,14 @@ off_t sizeOfWholeLines(int file, off_t size) {
 
 }  // namespace
 
+const char* errorText(int error) {
+  return error == EINVAL ? "not a regular file" : std::strerror(error);
+}
+
 Result<std::string> readRegularFile(int file, std::size_t maximum) {
   struct stat status;
   if (::fstat(file, &status) != 0) return Result<std::string>::failure(std::strerror(errno));
-  if (!S_ISREG(status.st_mode)) return Result<std::string>::failure("not a regular file");
+  if (!S_ISREG(status.st_mode)) return Result<std::string>::failure(errorText(EINVAL));
   std::string bytes;
   bytes.resize(std::min(maximum, static_cast<std::size_t>(status.st_size)));
   std::size_t filled = 0;
@@ -55,6 +63,40 @@ Result<std::string> readRegularFile(int file, std::size_t maximum) {
   }
   bytes.resize(filled);
   return Result<std::string>::success(std::move(bytes));
+}
+
+int namesInFolder(int folder, std::vector<std::string>& names) {
+  // A description of its own, because the place in the listing belongs to the description.
+  const int again = ::openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+  if (again < 0) return errno;
+  const auto close = [](DIR* listing) { ::closedir(listing); };
+  const std::unique_ptr<DIR, decltype(close)> listing(::fdopendir(again), close);
+  if (listing == nullptr) {
+    ::close(again);
+    return ENOMEM;
+  }
+  errno = 0;
+  while (const dirent* entry = ::readdir(listing.get())) {
+    const std::string_view name = entry->d_name;
+    if (name != "." && name != "..") names.emplace_back(name);
+    errno = 0;
+  }
+  const int error = errno;
+  std::sort(names.begin(), names.end());
+  return error;
+}
+
+bool isPlainFileName(std::string_view name, std::size_t longest) {
+  return !name.empty() && name != "." && name != ".." && name.size() <= longest &&
+         name.find('/') == std::string_view::npos && name.find('\0') == std::string_view::npos;
+}
+
+std::string shownText(std::string_view text) {
+  constexpr std::size_t kLongest = 80;
+  std::string shown(text.substr(0, kLongest));
+  std::replace_if(
+      shown.begin(), shown.end(), [](unsigned char c) { return c < 0x20 || c == 0x7f; }, '?');
+  return text.size() > kLongest ? shown + "..." : shown;
 }
 
 int writeAll(int file, std::string_view bytes) {
@@ -85,19 +127,25 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes) {
   return ::fsync(folder) == 0 ? 0 : errno;
 }
 
-int appendLine(int folder, const std::string& name, std::string_view line) {
+int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to) {
+  return ::renameat2(fromFolder, from.c_str(), toFolder, to.c_str(), RENAME_NOREPLACE) == 0 ? 0
+                                                                                            : errno;
+}
+
+int appendLines(int folder, const std::string& name, std::string_view lines) {
   const FileDescriptor file(
       ::openat(folder, name.c_str(),
                O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
-  if (!file) return errno == ELOOP ? EINVAL : errno;
+  if (!file) return errno == ELOOP || errno == EISDIR ? EINVAL : errno;
   const FileLock lock(file.get());
   struct stat status;
   if (::fstat(file.get(), &status) != 0) return errno;
   if (!S_ISREG(status.st_mode)) return EINVAL;
   const off_t whole = sizeOfWholeLines(file.get(), status.st_size);
   if (whole != status.st_size && ::ftruncate(file.get(), whole) != 0) return errno;
-  const int error = writeAll(file.get(), line);
-  if (error != 0 && ::ftruncate(file.get(), whole) != 0) return errno;
+  const int error = writeAll(file.get(), lines);
+  // Where this fails too, the next call removes the unfinished line.
+  if (error != 0) std::ignore = ::ftruncate(file.get(), whole);
   return error;
 }
 

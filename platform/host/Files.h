@@ -1,4 +1,5 @@
-// What the host does with single files: read one whole, replace one whole, append a line.
+// What the host does with single files: read one whole, replace one whole, append a line; and with
+// their names.
 //
 // Functions that write return 0 or an error number. A name that is taken by anything but a regular
 // file is refused with EINVAL; links are never followed. Files are made with mode 0600.
@@ -7,15 +8,34 @@
 #include <cstddef>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "platform/Result.h"
 #include "platform/host/FileDescriptor.h"
 
 namespace platform::host {
 
+// What an error number of these functions says: "not a regular file" for EINVAL, else the system's
+// text.
+const char* errorText(int error);
+
 // The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
 // is an error; the error is an error number's text.
 Result<std::string> readRegularFile(int file, std::size_t maximum);
+
+// The names in an open folder, "." and ".." left out, in bytewise order. 0 or an error number.
+int namesInFolder(int folder, std::vector<std::string>& names);
+
+// The longest name that a file can have, in bytes.
+inline constexpr std::size_t kLongestFileName = 255;
+
+// Whether a text from elsewhere can be a file's name, or part of one, that stays in its folder: not
+// empty, "." or "..", without "/" and NUL, and no longer than `longest`.
+bool isPlainFileName(std::string_view name, std::size_t longest);
+
+// A text from elsewhere as it may stand in one line of the log: cut when it is long, with "?" for
+// control characters.
+std::string shownText(std::string_view text);
 
 // Writes all the bytes, going on after short writes and signals.
 int writeAll(int file, std::string_view bytes);
@@ -24,10 +44,15 @@ int writeAll(int file, std::string_view bytes);
 // whole, whatever happens. Callers serialise: two replacements of one name use one name beside.
 int replaceFile(int folder, const std::string& name, std::string_view bytes);
 
-// Appends one line, whose line feed the text already holds, to a file that holds lines; makes the
+// Renames a file, within a folder or from one to another; EEXIST when the new name is taken, by
+// whatever it is.
+int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to);
+
+// Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
 // file when it is missing. A line is in the file whole or not at all: what a failed write left is
-// taken back, and a line that an earlier failure left unfinished is removed first.
-int appendLine(int folder, const std::string& name, std::string_view line);
+// taken back, all of this call's lines, and a line that an earlier failure left unfinished is
+// removed first.
+int appendLines(int folder, const std::string& name, std::string_view lines);
 
 // An exclusive lock on an open file or folder, waiting for it; released at the end of the scope.
 // The descriptor is borrowed.

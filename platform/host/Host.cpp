@@ -70,11 +70,11 @@ struct Host::Services {
   HostLibraryLoader libraries{root, preferences};
   RunLockFile runLock{root, log};
 
-  Platform platform{log,           clock,          digest,      codec,       files,
-                    counters,      counters,       preferences, preferences, preferences,
-                    submission,    structuredLogs, servitaLogs, bus,         bus,
-                    bus,           eventSink,      deviceProperties, systemVersion, kernel,
-                    applications,  locale,         libraries,   runLock};
+  Platform platform{log,          clock,          digest,           codec,         files,
+                    counters,     counters,       preferences,      preferences,   preferences,
+                    submission,   structuredLogs, servitaLogs,      bus,           bus,
+                    bus,          eventSink,      deviceProperties, systemVersion, kernel,
+                    applications, locale,         libraries,        runLock};
 };
 
 Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {

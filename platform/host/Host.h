@@ -12,7 +12,7 @@
 namespace platform::host {
 
 struct HostOptions {
-  std::string root = "/";                  // the device root, a path of the host
+  std::string root = "/";  // the device root, a path of the host
   LogLevel lowestLevel = LogLevel::standard;
 
   // As the environment says: MORVEND_ROOT and MORVEND_LOG.

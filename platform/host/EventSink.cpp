@@ -1,0 +1,124 @@
+#include "platform/host/EventSink.h"
+
+#include <cerrno>
+#include <system_error>
+
+#include "platform/host/Files.h"
+#include "platform/host/JSON.h"
+
+namespace platform::host {
+
+namespace {
+
+constexpr char kConfiguration[] = "/device/analytics.plist";
+constexpr char kFolder[] = "/var/spool/morvend";
+constexpr char kName[] = "events.jsonl";
+
+// Lines are written together up to about this size.
+constexpr std::size_t kBatch = std::size_t{256} << 10;
+
+}  // namespace
+
+EventSink::~EventSink() { drain(); }
+
+const EventSink::Configuration& EventSink::configuration() {
+  std::call_once(configured_, [this] {
+    const FileDescriptor file = root_.openForReading(kConfiguration);
+    if (!file && errno == ENOENT) return;
+    const auto bytes = file ? readRegularFile(file.get(), kMaximumPropertyListSize + 1)
+                            : Result<std::string>::failure(errorText(errno));
+    const auto value = bytes ? codec_.read(*bytes) : Result<Value>::failure(bytes.error);
+    if (!value) {
+      log_.log(LogLevel::error, "Could not read %s: %s", kConfiguration, value.error.c_str());
+      return;
+    }
+    const auto* entries = value->as<Dictionary>();
+    if (entries == nullptr) return;
+    if (const Number* available = entries->number("Available")) {
+      configuration_.available = available->boolValue();
+    }
+    if (const Array* names = entries->array("UsedEvents")) {
+      auto& used = configuration_.used.emplace();
+      for (const Value& name : *names) {
+        if (const auto* text = name.as<std::string>()) used.insert(*text);
+      }
+    }
+  });
+  return configuration_;
+}
+
+bool EventSink::offersLazySend() { return configuration().available; }
+
+bool EventSink::EventraIsEventUsed(std::string_view event) {
+  const auto& used = configuration().used;
+  return !used || used->contains(event);
+}
+
+bool EventSink::EventraSendEventLazy(std::string_view event, PayloadProducer producer) {
+  if (!offersLazySend() || !EventraIsEventUsed(event)) return false;
+  Event sent{std::string(event), clock_.now(), std::move(producer)};
+  const std::scoped_lock lock(mutex_);
+  if (queue_.size() >= kMaximumQueued || !isServing()) return false;
+  queue_.push_back(std::move(sent));
+  changed_.notify_one();
+  return true;
+}
+
+// Whether there is a thread that will see the queue, started if need be. The mutex is held.
+bool EventSink::isServing() {
+  if (serving_) return true;
+  draining_ = false;
+  try {
+    thread_ = std::thread([this] { serve(); });
+  } catch (const std::system_error&) {
+    return false;
+  }
+  return serving_ = true;
+}
+
+void EventSink::drain() {
+  std::thread ending;
+  {
+    const std::scoped_lock lock(mutex_);
+    draining_ = true;
+    ending.swap(thread_);
+    changed_.notify_one();
+  }
+  if (ending.joinable()) ending.join();
+}
+
+void EventSink::serve() {
+  std::unique_lock lock(mutex_);
+  for (;;) {
+    changed_.wait(lock, [this] { return draining_ || !queue_.empty(); });
+    if (queue_.empty()) break;
+    std::vector<Event> events;
+    events.swap(queue_);
+    lock.unlock();
+    write(events);
+    events.clear();
+    lock.lock();
+  }
+  serving_ = false;
+}
+
+void EventSink::write(const std::vector<Event>& events) {
+  std::string lines;
+  for (const Event& event : events) {
+    appendJSON(
+        lines,
+        Dictionary{{"event", event.name}, {"time", event.time}, {"payload", event.producer()}});
+    lines += '\n';
+    if (lines.size() < kBatch && &event != &events.back()) continue;
+    const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
+    const int error = folder ? appendLines(folder.get(), kName, lines) : errno;
+    if (error != 0 && !failed_) {
+      log_.log(LogLevel::error, "Could not write %s/%s: %s; events are dropped", kFolder, kName,
+               errorText(error));
+      failed_ = true;
+    }
+    lines.clear();
+  }
+}
+
+}  // namespace platform::host

@@ -1,0 +1,85 @@
+// The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl.
+//
+// device/analytics.plist says which events are used ("UsedEvents", an array of names; missing: all)
+// and whether the device has the lazy-send operation ("Available"; default true). It is read when
+// it is first needed.
+#pragma once
+
+#include <condition_variable>
+#include <functional>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <thread>
+#include <unordered_set>
+#include <vector>
+
+#include "platform/Clock.h"
+#include "platform/Eventra.h"
+#include "platform/PropertyListCodec.h"
+#include "platform/SystemLog.h"
+#include "platform/host/DeviceRoot.h"
+
+namespace platform::host {
+
+class EventSink final : public Eventra {
+ public:
+  // Events beyond this number of waiting ones aren't queued.
+  static constexpr std::size_t kMaximumQueued = 65536;
+
+  // All are borrowed; the clock is asked on the sender's thread, the log used on both.
+  EventSink(const DeviceRoot& root, PropertyListCodec& codec, Clock& clock, SystemLog& log)
+      : root_(root), codec_(codec), clock_(clock), log_(log) {}
+
+  // Drains.
+  ~EventSink() override;
+
+  bool offersLazySend() override;
+  bool EventraIsEventUsed(std::string_view event) override;
+
+  // The sink's thread starts with the first event. The time of an event is when it was sent.
+  bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) override;
+
+  // Writes every event that was sent, and ends the thread until another is sent. Events that can't
+  // be written are dropped; the first failure is logged. For one thread at a time, and not for
+  // producers.
+  void drain();
+
+ private:
+  struct Event {
+    std::string name;
+    Date time;
+    PayloadProducer producer;
+  };
+  struct Configuration {
+    struct Hash : std::hash<std::string_view> {
+      using is_transparent = void;
+    };
+    bool available = true;
+    std::optional<std::unordered_set<std::string, Hash, std::equal_to<>>> used;
+  };
+
+  const Configuration& configuration();
+  bool isServing();
+  void serve();
+  void write(const std::vector<Event>& events);
+
+  const DeviceRoot& root_;
+  PropertyListCodec& codec_;
+  Clock& clock_;
+  SystemLog& log_;
+
+  std::once_flag configured_;
+  Configuration configuration_;
+
+  std::mutex mutex_;  // over all that follows
+  std::condition_variable changed_;
+  std::vector<Event> queue_;
+  bool serving_ = false;   // a thread looks at the queue
+  bool draining_ = false;  // it ends when the queue is empty
+  std::thread thread_;     // empty while nothing is served, and while somebody waits for its end
+
+  bool failed_ = false;  // the sink's thread's
+};
+
+}  // namespace platform::host

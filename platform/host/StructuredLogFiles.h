@@ -1,0 +1,31 @@
+// Structured-data logs as JSON Lines, a file for each day:
+// var/spool/morvend/structured/<day>.jsonl.
+#pragma once
+
+#include "platform/Clock.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/SystemLog.h"
+#include "platform/host/DeviceRoot.h"
+
+namespace platform::host {
+
+class StructuredLogFiles final : public FaultwatchSupport {
+ public:
+  // All are borrowed.
+  StructuredLogFiles(const DeviceRoot& root, Clock& clock, SystemLog& log)
+      : root_(root), clock_(clock), log_(log) {}
+
+  // A log that can't be written is dropped, with an error line.
+  void logStructuredData(std::int32_t type, const Dictionary& data) override;
+
+  // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl. What
+  // isn't a regular file, or larger than the spool, stays where it is, with an error line.
+  void dumpAllOldStructuredDataLogs() override;
+
+ private:
+  const DeviceRoot& root_;
+  Clock& clock_;
+  SystemLog& log_;
+};
+
+}  // namespace platform::host

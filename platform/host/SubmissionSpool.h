@@ -1,0 +1,43 @@
+// Log submission into a spool folder: var/spool/morvend/submitted/<log name>.<log type>.<time>,
+// with the options beside it (see SpoolFolder). Consent is the user's preference
+// "DiagnosticLogSubmissionEnabled".
+#pragma once
+
+#include "platform/Clock.h"
+#include "platform/LogSubmission.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PropertyListCodec.h"
+#include "platform/SystemLog.h"
+#include "platform/host/DeviceRoot.h"
+
+namespace platform::host {
+
+class SpoolFolder;
+
+class SubmissionSpool final : public LogSubmission {
+ public:
+  // All are borrowed.
+  SubmissionSpool(const DeviceRoot& root, PropertyListCodec& codec, PreferenceStore& preferences,
+                  Clock& clock, SystemLog& log)
+      : root_(root), codec_(codec), preferences_(preferences), clock_(clock), log_(log) {}
+
+  bool DiagnosticLogSubmissionEnabled() override;
+
+  // The spool is locked while the writer writes: it must not submit a log itself. Type and name
+  // must be fit for a file's name, and the name not begin with "."; a log larger than the spool
+  // fails. A failure is logged, with its reason.
+  bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
+                                const Dictionary* options, const Writer& writer) override;
+
+ private:
+  static int submit(SpoolFolder& spool, const std::string& stem, const std::string* options,
+                    const Writer& writer);
+
+  const DeviceRoot& root_;
+  PropertyListCodec& codec_;
+  PreferenceStore& preferences_;
+  Clock& clock_;
+  SystemLog& log_;
+};
+
+}  // namespace platform::host
