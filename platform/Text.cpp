@@ -37,16 +37,16 @@ std::string format(const char* format, ...) {
 std::string doubleText(double value) {
   if (std::isnan(value)) return "nan";
   std::array<char, 32> text;
-  const auto end = std::to_chars(text.data(), text.data() + text.size(), value,
-                                 std::chars_format::general, 16);
+  const auto end =
+      std::to_chars(text.data(), text.data() + text.size(), value, std::chars_format::general, 16);
   return {text.data(), end.ptr};
 }
 
 namespace {
 
-template <typename Integer>
-void append(std::string& text, Integer value) {
-  std::array<char, 24> digits;
+template <typename Number>
+void append(std::string& text, Number value) {
+  std::array<char, 32> digits;
   const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), value);
   text.append(digits.data(), end.ptr);
 }
@@ -55,5 +55,14 @@ void append(std::string& text, Integer value) {
 
 void appendInteger(std::string& text, std::int64_t value) { append(text, value); }
 void appendInteger(std::string& text, std::uint64_t value) { append(text, value); }
+
+void appendReal(std::string& text, double value) {
+  // Not-a-number has a sign that nobody wants to read.
+  if (std::isnan(value)) {
+    text += "nan";
+  } else {
+    append(text, value);
+  }
+}
 
 }  // namespace platform

@@ -18,4 +18,7 @@ std::string doubleText(double value);
 void appendInteger(std::string& text, std::int64_t value);
 void appendInteger(std::string& text, std::uint64_t value);
 
+// Appends the shortest text that reads back as the same double: "inf", "-inf", "nan" for the rest.
+void appendReal(std::string& text, double value);
+
 }  // namespace platform

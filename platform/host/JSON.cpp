@@ -1,0 +1,95 @@
+#include "platform/host/JSON.h"
+
+#include <cmath>
+
+#include "platform/Text.h"
+#include "platform/host/Base64.h"
+#include "platform/host/Timestamp.h"
+#include "platform/host/UTF8.h"
+
+namespace platform::host {
+
+namespace {
+
+constexpr EscapedCharacters kEscaped("", "\"\\");
+
+void append(std::string& out, const std::string& text) {
+  out += '"';
+  appendEscaped(out, text, kEscaped, [](std::string& to, char c) {
+    switch (c) {
+      case '"':
+      case '\\':
+        to += '\\';
+        to += c;
+        break;
+      case '\n':
+        to += "\\n";
+        break;
+      case '\r':
+        to += "\\r";
+        break;
+      case '\t':
+        to += "\\t";
+        break;
+      default:
+        to += format("\\u%04x", static_cast<unsigned>(c));
+    }
+  });
+  out += '"';
+}
+
+void append(std::string& out, const Number& number) {
+  if (number.type() == Number::Type::boolean) {
+    out += number.boolValue() ? "true" : "false";
+  } else if (number.type() == Number::Type::uint64) {
+    appendInteger(out, number.uint64Value());
+  } else if (!number.isReal()) {
+    appendInteger(out, number.int64Value());
+  } else if (!std::isfinite(number.doubleValue())) {
+    out += "null";
+  } else {
+    const std::size_t begin = out.size();
+    appendReal(out, number.doubleValue());
+    if (out.find_first_of(".e", begin) == std::string::npos) out += ".0";
+  }
+}
+
+void append(std::string& out, const Array& array) {
+  out += '[';
+  for (const Value& element : array) {
+    if (&element != array.data()) out += ", ";
+    appendJSON(out, element);
+  }
+  out += ']';
+}
+
+void append(std::string& out, const Dictionary& dictionary) {
+  out += '{';
+  for (const Dictionary::Entry& entry : dictionary) {
+    if (&entry != dictionary.begin()) out += ", ";
+    append(out, entry.key);
+    out += ": ";
+    appendJSON(out, entry.value);
+  }
+  out += '}';
+}
+
+void append(std::string& out, const Date& date) {
+  out += '"';
+  appendTimestamp(out, date.secondsSince1970);
+  out += '"';
+}
+
+void append(std::string& out, const Data& data) {
+  out += '"';
+  appendBase64(out, data);
+  out += '"';
+}
+
+}  // namespace
+
+void appendJSON(std::string& out, const Value& value) {
+  std::visit([&out](const auto& content) { append(out, content); }, value.variant());
+}
+
+}  // namespace platform::host

@@ -1,0 +1,148 @@
+#include "platform/host/PropertyListXMLWriter.h"
+
+#include "platform/Text.h"
+#include "platform/host/Base64.h"
+#include "platform/host/Timestamp.h"
+#include "platform/host/UTF8.h"
+
+namespace platform::host {
+
+namespace {
+
+// A reader turns a bare carriage return into a line feed.
+constexpr EscapedCharacters kEscaped("\t\n", "\r&<>");
+
+void appendText(std::string& out, std::string_view text) {
+  appendEscaped(out, text, kEscaped, [](std::string& to, char c) {
+    switch (c) {
+      case '&':
+        to += "&amp;";
+        break;
+      case '<':
+        to += "&lt;";
+        break;
+      case '>':
+        to += "&gt;";
+        break;
+      case '\r':
+        to += "&#13;";
+        break;
+      default:
+        to += kReplacementCharacter;
+    }
+  });
+}
+
+class Writer {
+ public:
+  // `depth` is the number of containers around the value; it is the indentation too.
+  void write(const Value& value, std::size_t depth) {
+    std::visit([&](const auto& content) { write(content, depth); }, value.variant());
+  }
+
+  std::string out;
+  bool tooDeep = false;
+
+ private:
+  void write(const Number& number, std::size_t depth) {
+    indent(depth);
+    switch (number.type()) {
+      case Number::Type::boolean:
+        out += number.boolValue() ? "<true/>\n" : "<false/>\n";
+        break;
+      case Number::Type::float32:
+      case Number::Type::float64:
+        out += "<real>";
+        appendReal(out, number.doubleValue());
+        out += "</real>\n";
+        break;
+      case Number::Type::uint64:
+        out += "<integer>";
+        appendInteger(out, number.uint64Value());
+        out += "</integer>\n";
+        break;
+      case Number::Type::int32:
+      case Number::Type::int64:
+        out += "<integer>";
+        appendInteger(out, number.int64Value());
+        out += "</integer>\n";
+        break;
+    }
+  }
+
+  void write(const std::string& text, std::size_t depth) {
+    indent(depth);
+    out += "<string>";
+    appendText(out, text);
+    out += "</string>\n";
+  }
+
+  void write(const Array& array, std::size_t depth) {
+    indent(depth);
+    if (array.empty()) {
+      out += "<array/>\n";
+    } else if (enters(depth)) {
+      out += "<array>\n";
+      for (const Value& element : array) write(element, depth + 1);
+      indent(depth);
+      out += "</array>\n";
+    }
+  }
+
+  void write(const Dictionary& dictionary, std::size_t depth) {
+    indent(depth);
+    if (dictionary.empty()) {
+      out += "<dict/>\n";
+    } else if (enters(depth)) {
+      out += "<dict>\n";
+      for (const Dictionary::Entry& entry : dictionary) {
+        indent(depth + 1);
+        out += "<key>";
+        appendText(out, entry.key);
+        out += "</key>\n";
+        write(entry.value, depth + 1);
+      }
+      indent(depth);
+      out += "</dict>\n";
+    }
+  }
+
+  void write(const Date& date, std::size_t depth) {
+    indent(depth);
+    out += "<date>";
+    appendTimestamp(out, date.secondsSince1970);
+    out += "</date>\n";
+  }
+
+  void write(const Data& data, std::size_t depth) {
+    indent(depth);
+    out += "<data>";
+    appendBase64(out, data);
+    out += "</data>\n";
+  }
+
+  void indent(std::size_t depth) { out.append(depth, '\t'); }
+
+  bool enters(std::size_t depth) {
+    tooDeep |= depth >= static_cast<std::size_t>(kMaximumPropertyListDepth);
+    return !tooDeep;
+  }
+};
+
+}  // namespace
+
+Result<std::string> writeXMLPropertyList(const Value& value) {
+  Writer writer;
+  writer.out =
+      "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
+      "<plist version=\"1.0\">\n";
+  writer.write(value, 0);
+  if (writer.tooDeep) {
+    return Result<std::string>::failure(format(
+        "the value is nested deeper than %d arrays and dictionaries", kMaximumPropertyListDepth));
+  }
+  writer.out += "</plist>\n";
+  return Result<std::string>::success(std::move(writer.out));
+}
+
+}  // namespace platform::host
