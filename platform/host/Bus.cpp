@@ -17,11 +17,6 @@ namespace platform::host {
 
 namespace {
 
-using namespace std::chrono_literals;
-
-// The longest wait for an answer of the bus.
-constexpr auto kPatience = 5s;
-
 constexpr char kObjectPath[] = "/com/norba/pellorand/morvend";
 constexpr char kMethod[] = "Message";
 constexpr char kSignature[] = "a{sv}";
@@ -113,7 +108,7 @@ int Bus::Listener::addObject() {
 
 int Bus::Listener::takeName() {
   // Messages may come before the answer; they wait for the next run.
-  sd_bus_set_method_call_timeout(connection(), microseconds(kPatience));
+  sd_bus_set_method_call_timeout(connection(), microseconds(bus_.patience_));
   const int result = sd_bus_request_name(connection(), name(), 0);
   ownsName_ = result >= 0;
   return result;
@@ -181,12 +176,12 @@ bool Bus::closeService() {
     return false;
   }
   bool served = false;
-  auto end = Clock::now() + kPatience;
+  auto end = Clock::now() + patience_;
   while (bus_ && listener_->isReleasing()) {
     serve(end - Clock::now());
     if (listener_->takeDelivered()) {
       served = true;
-      end = Clock::now() + kPatience;
+      end = Clock::now() + patience_;
     } else if (Clock::now() >= end) {
       failed(LogLevel::error, "can't release the name of the service", -ETIMEDOUT);
       disconnect();
@@ -201,7 +196,7 @@ bool Bus::closeService() {
 
 // ---- The event loop ---------------------------------------------------------------------------
 
-Bus::Bus(SystemLog& log) : log_(log) {
+Bus::Bus(SystemLog& log, std::chrono::milliseconds patience) : log_(log), patience_(patience) {
   sd_event* loop = nullptr;
   if (sd_event_new(&loop) >= 0) loop_.reset(loop);
 }
@@ -252,7 +247,7 @@ bool Bus::connect() {
 
 // Drives the library ourselves: left alone, it waits for a silent bus for much longer.
 int Bus::finishHandshake() {
-  const auto end = Clock::now() + kPatience;
+  const auto end = Clock::now() + patience_;
   while (sd_bus_is_ready(bus_.get()) <= 0) {
     if (Clock::now() >= end) return -ETIMEDOUT;
     int result = sd_bus_process(bus_.get(), nullptr);
@@ -263,7 +258,7 @@ int Bus::finishHandshake() {
 }
 
 void Bus::flush() {
-  const auto end = Clock::now() + kPatience;
+  const auto end = Clock::now() + patience_;
   std::uint64_t queued = 0;
   while (bus_ && sd_bus_get_n_queued_write(bus_.get(), &queued) >= 0 && queued > 0 &&
          Clock::now() < end) {

@@ -23,10 +23,11 @@ namespace platform::host {
 
 class Bus : public EventLoop, public NamedServices, public NotificationCenter {
  public:
-  // The process is expected to ignore SIGPIPE.
-  explicit Bus(SystemLog& log);
+  // `patience` is the longest wait for an answer of the bus.
+  explicit Bus(SystemLog& log, std::chrono::milliseconds patience = std::chrono::seconds(5));
 
-  // Hands over what is not sent yet, waiting a few seconds for a slow bus. Listeners go first.
+  // Hands over what is not sent yet, waiting for a slow bus within the patience. Listeners go
+  // first.
   ~Bus() override;
 
   // EventLoop. A handled event is a message that was given to the listener's handler; the bus's own
@@ -66,6 +67,7 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   void failed(LogLevel level, const char* what, int error);
 
   SystemLog& log_;
+  std::chrono::milliseconds patience_;
   std::unique_ptr<sd_event, FreeLoop> loop_;  // null if the system couldn't make one
   std::unique_ptr<sd_bus, CloseBus> bus_;
   bool tried_ = false;  // whether connecting was tried

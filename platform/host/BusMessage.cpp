@@ -137,11 +137,11 @@ bool Reader::readContent(char type, const char* contents, std::optional<Value>& 
       if (contents[0] == '{') {
         Dictionary dictionary;
         if (!readEntries(dictionary, depth + 1)) return false;
-        value = Value(std::move(dictionary));
+        value.emplace(std::move(dictionary));
       } else {
         Array array;
         if (!readArray(array, depth + 1)) return false;
-        value = Value(std::move(array));
+        value.emplace(std::move(array));
       }
       return leave();
     default:
@@ -155,11 +155,11 @@ bool Reader::readNumber(char type, std::optional<Value>& value) {
   if (sd_bus_message_read_basic(message_, type, &number) <= 0) return false;
   if constexpr (std::is_same_v<Wire, std::uint64_t>) {
     if (number > INT64_MAX) {
-      value = Value(number);
+      value.emplace(number);
       return true;
     }
   }
-  value = Value(static_cast<Kept>(number));
+  value.emplace(static_cast<Kept>(number));
   return true;
 }
 
@@ -167,7 +167,7 @@ bool Reader::readText(char type, std::optional<Value>& value) {
   const char* text = nullptr;
   if (sd_bus_message_read_basic(message_, type, &text) <= 0) return false;
   const std::string_view view = text;
-  if (affordBytes(view.size())) value = Value(view);
+  if (affordBytes(view.size())) value.emplace(view);
   return true;
 }
 
@@ -176,7 +176,7 @@ bool Reader::readData(std::optional<Value>& value) {
   std::size_t length = 0;
   if (sd_bus_message_read_array(message_, 'y', &bytes, &length) < 0) return false;
   const auto* first = static_cast<const std::uint8_t*>(bytes);
-  if (affordBytes(length)) value = Value(length == 0 ? Data() : Data(first, first + length));
+  if (affordBytes(length)) value.emplace(Data(first, first + length));
   return true;
 }
 

@@ -53,11 +53,8 @@ Kernel::ReadResult deliverValue(const Value& value, std::span<std::byte> buffer)
 
 Kernel::ReadResult bootSession(std::span<std::byte> buffer) {
   const FileDescriptor file(::open("/proc/sys/kernel/random/boot_id", O_RDONLY | O_CLOEXEC));
-  std::array<char, 36> identifier;
-  if (!file || ::read(file.get(), identifier.data(), identifier.size()) != identifier.size()) {
-    return failure(ENOENT);
-  }
-  std::string text(identifier.data(), identifier.size());
+  std::string text(36, '\0');
+  if (!file || ::read(file.get(), text.data(), text.size()) != ssize_t{36}) return failure(ENOENT);
   for (char& c : text) {
     if (c >= 'a' && c <= 'f') c = static_cast<char>(c - 'a' + 'A');
   }

@@ -8,8 +8,8 @@ namespace platform::host {
 
 namespace {
 
-constexpr char kVersion[] = "ProductVersion";
-constexpr char kBuild[] = "ProductBuildVersion";
+constexpr std::string_view kVersion = "ProductVersion";
+constexpr std::string_view kBuild = "ProductBuildVersion";
 constexpr std::size_t kMaximumOsRelease = 65536;
 
 // The value of a shell-like assignment: in quotes or bare, with backslash escapes.
@@ -48,8 +48,8 @@ std::optional<Dictionary> hostVersion(const std::string& osRelease) {
   std::string build = assigned(*lines, "BUILD_ID");
   if (build.empty()) build = version;
   Dictionary dictionary;
-  if (!build.empty()) dictionary.set(kBuild, build);
-  if (!version.empty()) dictionary.set(kVersion, version);
+  if (!build.empty()) dictionary.set(kBuild, Value(build));
+  if (!version.empty()) dictionary.set(kVersion, Value(version));
   if (dictionary.empty()) return std::nullopt;
   return dictionary;
 }
