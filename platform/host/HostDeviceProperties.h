@@ -1,0 +1,30 @@
+// Device properties and system group containers.
+#pragma once
+
+#include "platform/DeviceProperties.h"
+#include "platform/host/DeviceFile.h"
+
+namespace platform::host {
+
+class HostDeviceProperties : public DeviceProperties {
+ public:
+  // `properties` is device/properties.plist, which other services read too.
+  HostDeviceProperties(const DeviceRoot& root, DeviceFile& properties)
+      : root_(root), properties_(properties) {}
+
+  bool booleanProperty(std::string_view name) override;
+  std::optional<std::uint32_t> multiUserIndicator() override;
+
+  // /var/containers/systemgroup/<identifier>, a path of the device, where that folder exists; else
+  // error 2. An identifier that is not a plain name has no container.
+  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
+                                                      std::uint64_t& error) override;
+
+ private:
+  const Number* number(std::string_view name);
+
+  const DeviceRoot& root_;
+  DeviceFile& properties_;
+};
+
+}  // namespace platform::host

@@ -1,0 +1,36 @@
+// Kernel values: device/kernel.plist and device/ecc-events/, then what the host has a true
+// equivalent of.
+#pragma once
+
+#include "platform/Kernel.h"
+#include "platform/host/DeviceFile.h"
+
+namespace platform::host {
+
+class HostKernel : public Kernel {
+ public:
+  HostKernel(const DeviceRoot& root, PropertyListCodec& codec, SystemLog& log)
+      : root_(root), log_(log), values_(root, codec, log, "device/kernel.plist") {}
+
+  // Integers come little-endian in the buffer's width, in 8 bytes when it is larger. Texts come
+  // with a closing NUL; a text or data that is longer than the buffer fails with ENOMEM. A name
+  // that nothing is known of fails with ENOENT.
+  //
+  // "kern.next_ecc_event" delivers the next file of device/ecc-events/ and removes it; one that
+  // doesn't fit fails with ENOMEM and stays.
+  ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override;
+
+  std::uint64_t pageSize() override;
+  std::uint64_t absoluteTime() override;
+  std::optional<Timebase> timebase() override;
+
+ private:
+  std::optional<ReadResult> nextEvent(std::span<std::byte> buffer);
+  const Value* deviceValue(std::string_view name);
+
+  const DeviceRoot& root_;
+  SystemLog& log_;
+  DeviceFile values_;
+};
+
+}  // namespace platform::host

@@ -1,0 +1,32 @@
+// The user's languages and region: device/locale.plist, else LANGUAGE and LANG of the environment.
+#pragma once
+
+#include "platform/LocaleService.h"
+#include "platform/host/DeviceFile.h"
+
+namespace platform::host {
+
+class HostLocale : public LocaleService {
+ public:
+  HostLocale(const DeviceRoot& root, PropertyListCodec& codec, SystemLog& log)
+      : file_(root, codec, log, "device/locale.plist") {}
+
+  // What a device's file doesn't hold is not known: empty, or none. Without a file the localization
+  // is "en"; "C" and "POSIX" are no languages.
+  std::vector<std::string> preferredLanguages() override;
+  std::vector<std::string> systemLocalizations() override;
+  std::optional<std::string> countryCode() override;
+
+  // For each preferred language, in order, the localization equal to it, else the longest one that
+  // is a prefix of it at a "-", without regard to case; each once. Without any, the first
+  // localization.
+  std::vector<std::string> bestMatch(const std::vector<std::string>& localizations,
+                                     const std::vector<std::string>& preferred) override;
+
+ private:
+  std::vector<std::string> texts(std::string_view key);
+
+  DeviceFile file_;
+};
+
+}  // namespace platform::host

@@ -1,0 +1,203 @@
+// A message bus of a test's own, and a client of it.
+#pragma once
+
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/prctl.h>
+#include <sys/wait.h>
+#include <systemd/sd-bus.h>
+#include <unistd.h>
+
+#include <array>
+#include <functional>
+#include <memory>
+#include <stdexcept>
+#include <string>
+
+#include "platform/PropertyList.h"
+#include "support/TemporaryFolder.h"
+
+namespace support {
+
+// A dbus-daemon on a socket in a folder of its own; it ends with the object, or with the test.
+class PrivateBus {
+ public:
+  PrivateBus() {
+    folder_.write("bus.conf", "<busconfig><type>session</type><listen>unix:path=" +
+                                  (folder_ / "socket").string() +
+                                  "</listen><auth>EXTERNAL</auth><policy context=\"default\">"
+                                  "<allow send_destination=\"*\"/><allow receive_sender=\"*\"/>"
+                                  "<allow own=\"*\"/></policy>"
+                                  "</busconfig>");
+    const std::string configuration = "--config-file=" + (folder_ / "bus.conf").string();
+    std::array<int, 2> ready;
+    if (::pipe(ready.data()) != 0) throw std::runtime_error("pipe failed");
+    const std::string print = "--print-address=" + std::to_string(ready[1]);
+    process_ = ::fork();
+    if (process_ == 0) {
+      ::prctl(PR_SET_PDEATHSIG, SIGKILL);
+      ::dup2(::open((folder_ / "log").c_str(), O_WRONLY | O_CREAT, 0600), STDERR_FILENO);
+      ::execlp("dbus-daemon", "dbus-daemon", "--nofork", "--nopidfile", configuration.c_str(),
+               print.c_str(), nullptr);
+      ::_exit(127);
+    }
+    ::close(ready[1]);
+    std::array<char, 512> text;
+    const ssize_t length = ::read(ready[0], text.data(), text.size());
+    ::close(ready[0]);
+    if (length <= 0) throw std::runtime_error("dbus-daemon did not start");
+    address_.assign(text.data(), static_cast<std::size_t>(length) - 1);
+  }
+  ~PrivateBus() { kill(); }
+  PrivateBus(const PrivateBus&) = delete;
+  PrivateBus& operator=(const PrivateBus&) = delete;
+
+  // What DBUS_SYSTEM_BUS_ADDRESS takes.
+  const std::string& address() const { return address_; }
+
+  // From now on the bus takes connections and bytes, but answers nothing.
+  void freeze() {
+    ::kill(process_, SIGSTOP);
+    int status = 0;
+    ::waitpid(process_, &status, WUNTRACED);
+  }
+
+  void kill() {
+    if (process_ <= 0) return;
+    ::kill(process_, SIGKILL);
+    ::waitpid(process_, nullptr, 0);
+    process_ = -1;
+  }
+
+ private:
+  TemporaryFolder folder_;
+  pid_t process_ = -1;
+  std::string address_;
+};
+
+// A client with a connection of its own. Whatever fails throws.
+class BusClient {
+ public:
+  static constexpr char kService[] = "com.norba.pellorand.morvend";
+  static constexpr char kPath[] = "/com/norba/pellorand/morvend";
+
+  explicit BusClient(const std::string& address) {
+    sd_bus* bus = nullptr;
+    check(sd_bus_new(&bus));
+    bus_.reset(bus);
+    check(sd_bus_set_address(bus, address.c_str()));
+    check(sd_bus_set_bus_client(bus, 1));
+    check(sd_bus_start(bus));
+    settle();
+  }
+
+  sd_bus* bus() const { return bus_.get(); }
+
+  // Sends a message to the service: integers as x, booleans, doubles and texts as themselves, data
+  // as ay, arrays as aa{sv} when they hold dictionaries alone, else as av.
+  void send(const platform::Dictionary& message) {
+    sendCall([&](sd_bus_message* call) { append(call, message); });
+  }
+
+  // Sends a call of Message with a body of the caller's making. A call that expects an answer is
+  // given to the handler with it.
+  void sendCall(const std::function<void(sd_bus_message*)>& makeBody,
+                sd_bus_message_handler_t onAnswer = nullptr, void* context = nullptr) {
+    sd_bus_message* call = nullptr;
+    check(sd_bus_message_new_method_call(bus(), &call, kService, kPath, kService, "Message"));
+    const std::unique_ptr<sd_bus_message, decltype(&sd_bus_message_unref)> owned(
+        call, sd_bus_message_unref);
+    makeBody(call);
+    if (onAnswer != nullptr) {
+      check(sd_bus_call_async(bus(), nullptr, call, onAnswer, context, 0));
+    } else {
+      check(sd_bus_message_set_expect_reply(call, 0));
+      check(sd_bus_send(bus(), call, nullptr));
+    }
+    check(sd_bus_flush(bus()));
+  }
+
+  // Asks the bus something and waits for the answer: what was sent before has reached its
+  // receiver's queue, and what was sent to this client before has been handled.
+  void settle() {
+    check(sd_bus_call_method(bus(), "org.freedesktop.DBus", "/org/freedesktop/DBus",
+                             "org.freedesktop.DBus", "GetId", nullptr, nullptr, nullptr));
+    while (check(sd_bus_process(bus(), nullptr)) > 0) {
+    }
+  }
+
+  bool serviceHasOwner() {
+    sd_bus_message* answer = nullptr;
+    check(sd_bus_call_method(bus(), "org.freedesktop.DBus", "/org/freedesktop/DBus",
+                             "org.freedesktop.DBus", "NameHasOwner", nullptr, &answer, "s",
+                             kService));
+    int owned = 0;
+    check(sd_bus_message_read(answer, "b", &owned));
+    sd_bus_message_unref(answer);
+    return owned != 0;
+  }
+
+  static void append(sd_bus_message* call, const platform::Dictionary& dictionary) {
+    check(sd_bus_message_open_container(call, 'a', "{sv}"));
+    for (const auto& entry : dictionary) {
+      check(sd_bus_message_open_container(call, 'e', "sv"));
+      check(sd_bus_message_append(call, "s", entry.key.c_str()));
+      append(call, entry.value);
+      check(sd_bus_message_close_container(call));
+    }
+    check(sd_bus_message_close_container(call));
+  }
+
+ private:
+  static int check(int result) {
+    if (result < 0) throw std::runtime_error("bus client: error " + std::to_string(-result));
+    return result;
+  }
+
+  static void append(sd_bus_message* call, const platform::Value& value) {
+    if (const auto* text = value.as<std::string>()) {
+      check(sd_bus_message_append(call, "v", "s", text->c_str()));
+    } else if (const auto* number = value.as<platform::Number>()) {
+      if (number->isReal()) {
+        check(sd_bus_message_append(call, "v", "d", number->doubleValue()));
+      } else if (number->type() == platform::Number::Type::boolean) {
+        check(sd_bus_message_append(call, "v", "b", static_cast<int>(number->boolValue())));
+      } else {
+        check(sd_bus_message_append(call, "v", "x", number->int64Value()));
+      }
+    } else if (const auto* data = value.as<platform::Data>()) {
+      check(sd_bus_message_open_container(call, 'v', "ay"));
+      check(sd_bus_message_append_array(call, 'y', data->data(), data->size()));
+      check(sd_bus_message_close_container(call));
+    } else if (const auto* dictionary = value.as<platform::Dictionary>()) {
+      check(sd_bus_message_open_container(call, 'v', "a{sv}"));
+      append(call, *dictionary);
+      check(sd_bus_message_close_container(call));
+    } else if (const auto* array = value.as<platform::Array>()) {
+      appendArray(call, *array);
+    }
+  }
+
+  static void appendArray(sd_bus_message* call, const platform::Array& array) {
+    bool dictionaries = true;
+    for (const auto& element : array) {
+      dictionaries = dictionaries && element.as<platform::Dictionary>() != nullptr;
+    }
+    check(sd_bus_message_open_container(call, 'v', dictionaries ? "aa{sv}" : "av"));
+    check(sd_bus_message_open_container(call, 'a', dictionaries ? "a{sv}" : "v"));
+    for (const auto& element : array) {
+      if (dictionaries) {
+        append(call, *element.as<platform::Dictionary>());
+      } else {
+        append(call, element);
+      }
+    }
+    check(sd_bus_message_close_container(call));
+    check(sd_bus_message_close_container(call));
+  }
+
+  std::unique_ptr<sd_bus, decltype(&sd_bus_flush_close_unref)> bus_{nullptr,
+                                                                    sd_bus_flush_close_unref};
+};
+
+}  // namespace support
