@@ -216,10 +216,10 @@ class Reader {
         place(text_);
         break;
       case Element::integer:
-        placeIf(integerFrom(trimmed(text_)), "integer");
+        placeIf(integerFrom(trimmed(text_)), "no integer, or out of range");
         break;
       case Element::real:
-        placeIf(realFrom(trimmed(text_)), "real number");
+        placeIf(realFrom(trimmed(text_)), "no real number, or out of range");
         break;
       case Element::date:
         if (const auto seconds = secondsFromTimestamp(trimmed(text_))) {
@@ -229,7 +229,7 @@ class Reader {
         }
         break;
       case Element::data:
-        placeIf(bytesFromBase64(text_), "base64 data");
+        placeIf(bytesFromBase64(text_), "no base64 data");
         break;
       default:
         place(scalar_ == Element::yes);
@@ -238,11 +238,11 @@ class Reader {
   }
 
   template <typename Content>
-  void placeIf(std::optional<Content> content, const char* what) {
+  void placeIf(std::optional<Content> content, const char* otherwise) {
     if (content) {
       place(std::move(*content));
     } else {
-      fail(format("no %s, or out of range", what));
+      fail(otherwise);
     }
   }
 
