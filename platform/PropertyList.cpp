@@ -39,7 +39,13 @@ std::string Number::text() const {
 }
 
 bool Number::operator==(const Number& other) const {
-  if (isReal() || other.isReal()) return doubleValue() == other.doubleValue();
+  if (isReal() && other.isReal()) return real_ == other.real_;
+  if (other.isReal()) return other == *this;
+  if (isReal()) {
+    // Not by the double of the integer, which may be rounded.
+    if (real_ != other.doubleValue() || real_ >= 0x1p64) return false;
+    return real_ < 0 ? Number(int64Value()) == other : Number(uint64Value()) == other;
+  }
   const bool bothSigned = type_ != Type::uint64 && other.type_ != Type::uint64;
   return integer_ == other.integer_ && (bothSigned || type_ == other.type_ || integer_ >= 0);
 }
@@ -122,11 +128,12 @@ void Dictionary::buildIndex(std::size_t slots) {
 }
 
 template <typename Key>
-Value& Dictionary::setKey(Key&& key, Value value) {
+Value& Dictionary::setKey(Key&& key, Value&& value) {
   std::uint32_t hash = index_.empty() ? 0 : hashOf(key);
   const std::size_t found = place(key, hash);
   if (found < entries_.size()) return entries_[found].value = std::move(value);
-  entries_.push_back(Entry{std::string(std::forward<Key>(key)), std::move(value)});
+  if (entries_.empty()) entries_.reserve(kUnindexed / 2);
+  entries_.emplace_back(std::string(std::forward<Key>(key)), std::move(value));
   if (index_.empty()) {
     if (entries_.size() > kUnindexed) buildIndex(4 * kUnindexed);
   } else if (entries_.size() * 2 > index_.size()) {

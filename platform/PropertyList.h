@@ -111,7 +111,7 @@ class Dictionary {
 
   std::size_t place(std::string_view key, std::uint32_t hash) const;
   template <typename Key>
-  Value& setKey(Key&& key, Value value);
+  Value& setKey(Key&& key, Value&& value);
   void buildIndex(std::size_t slots);
   void insertIntoIndex(std::uint32_t hash, std::uint32_t entry);
 
@@ -157,6 +157,8 @@ class Value {
 };
 
 struct Dictionary::Entry {
+  Entry(std::string k, Value v) : key(std::move(k)), value(std::move(v)) {}
+
   std::string key;
   Value value;
 };

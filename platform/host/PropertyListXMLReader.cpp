@@ -2,7 +2,7 @@
 
 #include <expat.h>
 
-#include <array>
+#include <algorithm>
 #include <charconv>
 #include <cstdint>
 #include <memory>
@@ -57,12 +57,12 @@ Element elementOf(const char* name) {
   }
 }
 
-constexpr std::string_view kWhiteSpace = " \t\r\n";
+bool isSpace(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r'; }
 
 std::string_view trimmed(std::string_view text) {
-  const std::size_t begin = text.find_first_not_of(kWhiteSpace);
-  if (begin == std::string_view::npos) return {};
-  return text.substr(begin, text.find_last_not_of(kWhiteSpace) - begin + 1);
+  while (!text.empty() && isSpace(text.front())) text.remove_prefix(1);
+  while (!text.empty() && isSpace(text.back())) text.remove_suffix(1);
+  return text;
 }
 
 // Decimal or, after 0x, hexadecimal.
@@ -94,6 +94,8 @@ std::optional<double> realFrom(std::string_view text) {
   if (parsed.ec != std::errc{} || parsed.ptr != end) return std::nullopt;
   return value;
 }
+
+constexpr std::size_t kUsualArraySize = 8;
 
 // Builds the value while expat reads: containers grow in place, the scalar that is open gathers its
 // text in a buffer that is used again and again.
@@ -250,6 +252,7 @@ class Reader {
     if (containers_.empty()) return root_.emplace(std::forward<Content>(content));
     const Container& container = containers_.back();
     if (container.array != nullptr) {
+      if (container.array->empty()) container.array->reserve(kUsualArraySize);
       return container.array->emplace_back(std::forward<Content>(content));
     }
     hasKey_ = false;
@@ -262,7 +265,7 @@ class Reader {
         scalar_ != Element::other && scalar_ != Element::yes && scalar_ != Element::no;
     if (takesText) {
       text_ += text;
-    } else if (text.find_first_not_of(kWhiteSpace) != std::string_view::npos) {
+    } else if (!std::all_of(text.begin(), text.end(), isSpace)) {
       fail("text outside of a scalar");
     }
   }

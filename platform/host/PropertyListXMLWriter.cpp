@@ -78,10 +78,11 @@ class Writer {
   }
 
   void write(const Array& array, std::size_t depth) {
+    if (!enters(depth)) return;
     indent(depth);
     if (array.empty()) {
       out += "<array/>\n";
-    } else if (enters(depth)) {
+    } else {
       out += "<array>\n";
       for (const Value& element : array) write(element, depth + 1);
       indent(depth);
@@ -90,10 +91,11 @@ class Writer {
   }
 
   void write(const Dictionary& dictionary, std::size_t depth) {
+    if (!enters(depth)) return;
     indent(depth);
     if (dictionary.empty()) {
       out += "<dict/>\n";
-    } else if (enters(depth)) {
+    } else {
       out += "<dict>\n";
       for (const Dictionary::Entry& entry : dictionary) {
         indent(depth + 1);

@@ -31,8 +31,8 @@ class TemporaryFolder {
   void write(std::string_view below, std::string_view bytes) const {
     const auto file = path_ / below;
     std::filesystem::create_directories(file.parent_path());
-    std::ofstream(file, std::ios::binary).write(bytes.data(),
-                                                static_cast<std::streamsize>(bytes.size()));
+    std::ofstream(file, std::ios::binary)
+        .write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
   }
 
   // A file's bytes; empty when there is no such file.

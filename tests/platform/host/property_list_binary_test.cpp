@@ -1,0 +1,204 @@
+#include <gtest/gtest.h>
+
+#include <limits>
+
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/PropertyListBinaryReader.h"
+#include "support/BinaryPropertyList.h"
+#include "support/RandomValue.h"
+
+namespace platform::host {
+namespace {
+
+using support::BinaryPropertyList;
+using namespace std::string_view_literals;
+
+Result<Value> readObject(std::string_view object) {
+  BinaryPropertyList list;
+  const std::size_t top = list.object(object);
+  return readBinaryPropertyList(list.finish(top));
+}
+
+TEST(PropertyListBinary, ReadsEveryObject) {
+  const double infinity = std::numeric_limits<double>::infinity();
+  struct Row {
+    std::string_view object;
+    Value value;
+  };
+  for (const Row& row : {
+           Row{"\x08"sv, false},
+           Row{"\x09"sv, true},
+           Row{"\x10\xFF"sv, 255},
+           Row{"\x11\xFF\xFE"sv, 65534},
+           Row{"\x12\xFF\xFF\xFF\xFF"sv, std::int64_t{4294967295}},
+           Row{"\x13\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFE"sv, -2},
+           Row{"\x14\0\0\0\0\0\0\0\0\x80\0\0\0\0\0\0\0"sv, std::uint64_t{1} << 63},
+           Row{"\x14\0\0\0\0\0\0\0\0\0\0\0\0\0\0\0\x07"sv, 7},
+           Row{"\x14\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF\x80\0\0\0\0\0\0\0"sv, INT64_MIN},
+           Row{"\x22\x3F\0\0\0"sv, 0.5f},
+           Row{"\x23\xFF\xF0\0\0\0\0\0\0"sv, -infinity},
+           Row{"\x33\0\0\0\0\0\0\0\0"sv, Date{978307200}},
+           Row{"\x42\0\xFF"sv, Data{0, 255}},
+           Row{"\x52hi"sv, "hi"},
+           Row{"\x5F\x10\x10zero123456789abcdef"sv.substr(0, 19), "zero123456789abc"},
+           Row{"\x5F\x11\0\x01z"sv, "z"},
+           Row{"\x52h\xE4"sv, "h\xEF\xBF\xBD"},
+           Row{"\x73h\xC3\xA4"sv, "h\xC3\xA4"},
+           Row{"\x64\0a\x20\xAC\xD8\x3D\xDE\0"sv, "a\xE2\x82\xAC\xF0\x9F\x98\x80"},
+           Row{"\x63\xDE\0\xD8\x3D\0a"sv,
+               "\xEF\xBF\xBD\xEF\xBF\xBD"
+               "a"},
+           Row{"\x61\xD8\x3D"sv, "\xEF\xBF\xBD"},
+           Row{"\xA0"sv, Array{}},
+           Row{"\xD0"sv, Dictionary{}},
+       }) {
+    const Result<Value> result = readObject(row.object);
+    ASSERT_TRUE(result) << description(row.value) << ": " << result.error;
+    EXPECT_TRUE(*result == row.value) << description(*result) << " " << description(row.value);
+    EXPECT_EQ(result->variant().index(), row.value.variant().index());
+  }
+  EXPECT_EQ(readObject("\x22\x3F\0\0\0"sv)->as<Number>()->type(), Number::Type::float32);
+  EXPECT_EQ(readObject("\x10\x01"sv)->as<Number>()->type(), Number::Type::int64);
+}
+
+TEST(PropertyListBinary, RefusesOtherObjectsWithTheirOffset) {
+  for (const std::string_view object : {
+           "\0"sv,
+           "\x0F"sv,
+           "\x80\x01"sv,
+           "\xC0"sv,
+           "\xB0"sv,
+           "\x90"sv,
+           "\xE1\0"sv,
+           "\x15"sv,
+           "\x13\0\0"sv,
+           "\x1F"sv,
+           "\x14\0\0\0\0\0\0\0\x01\0\0\0\0\0\0\0\0"sv,
+           "\x14\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF\x70\0\0\0\0\0\0\0"sv,
+           "\x21\0\0"sv,
+           "\x24"sv,
+           "\x22\0\0\0"sv,
+           "\x32\0\0\0\0"sv,
+           "\x33\0\0\0\0"sv,
+           "\x33\x7F\xF0\0\0\0\0\0\0"sv,
+           "\x33\x7F\xF8\0\0\0\0\0\0"sv,
+           "\x43\0\0"sv,
+           "\x52h"sv,
+           "\x62\0a\0"sv,
+           "\x5F"sv,
+           "\x5F\x50"sv,
+           "\x5F\x10"sv,
+           "\x5F\x14\0\0\0\0\0\0\0\0\0\0\0\0\0\0\0\x01z"sv,
+           "\x4F\x13\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF"sv,
+           "\x6F\x13\x80\0\0\0\0\0\0\0"sv,
+           "\xAF\x13\x80\0\0\0\0\0\0\0"sv,
+           "\xDF\x13\x40\0\0\0\0\0\0\0"sv,
+           "\xAF\x12\x7F\xFF\xFF\xFF"sv,
+           "\xA1\0"sv,
+           "\xD1\0\0\0"sv,
+       }) {
+    const Result<Value> result = readObject(object);
+    EXPECT_FALSE(result) << description(*result.value);
+    EXPECT_TRUE(result.error.starts_with("binary property list, offset 8: ")) << result.error;
+  }
+  EXPECT_FALSE(readObject("\xA1\0\x01"sv)) << "a reference to no object";
+  EXPECT_FALSE(readObject(""sv)) << "an object behind the last";
+}
+
+TEST(PropertyListBinary, AcceptsEveryWidthOfReferences) {
+  for (std::size_t width = 1; width <= 8; ++width) {
+    BinaryPropertyList list(width);
+    const std::size_t one = list.add(1), text = list.add("t");
+    const std::size_t top = list.container(0xD, {text, one});
+    EXPECT_EQ(*readBinaryPropertyList(list.finish(top)), Value(Dictionary{{"t", 1}}));
+  }
+}
+
+TEST(PropertyListBinary, KeysAreTextsAndTheLaterCounts) {
+  BinaryPropertyList list;
+  const std::size_t key = list.add("k"), one = list.add(1), two = list.add(2);
+  const std::size_t twice = list.container(0xD, {key, key, one, two});
+  const std::size_t wrong = list.container(0xD, {one, key});
+  EXPECT_EQ(*readBinaryPropertyList(list.finish(twice)), Value(Dictionary{{"k", 2}}));
+  EXPECT_FALSE(readBinaryPropertyList(list.finish(wrong)));
+}
+
+TEST(PropertyListBinary, NamesTheContainerThatHoldsItself) {
+  BinaryPropertyList list;
+  list.container(0xA, {1});
+  const std::size_t offset = list.offset();
+  list.container(0xA, {2});
+  list.container(0xD, {3, 1});
+  list.add("key");
+  EXPECT_EQ(
+      readBinaryPropertyList(list.finish(0)).error,
+      "binary property list, offset " + std::to_string(offset) + ": the container holds itself");
+}
+
+TEST(PropertyListBinary, DepthIsLimited) {
+  BinaryPropertyList list;
+  std::size_t top = list.container(0xA, {});
+  for (int depth = 2; depth <= kMaximumPropertyListDepth; ++depth) top = list.container(0xA, {top});
+  EXPECT_TRUE(readBinaryPropertyList(list.finish(top)));
+  top = list.container(0xA, {top});
+  EXPECT_FALSE(readBinaryPropertyList(list.finish(top)));
+}
+
+TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
+  BinaryPropertyList laughs;
+  std::size_t top = laughs.add("ha");
+  for (int level = 0; level < 100; ++level) {
+    top = laughs.container(0xA, std::vector<std::size_t>(10, top));
+  }
+  EXPECT_NE(readBinaryPropertyList(laughs.finish(top)).error.find("too many objects"),
+            std::string::npos);
+
+  for (const char* kind : {"text", "data", "keys"}) {
+    BinaryPropertyList list;
+    const std::string megabyte(1 << 20, 'x');
+    std::size_t large = list.add(megabyte);
+    if (kind == "data"sv) large = list.add(Data(megabyte.begin(), megabyte.end()));
+    const std::vector<std::size_t> many(100, large);
+    EXPECT_NE(
+        readBinaryPropertyList(list.finish(list.container(kind == "keys"sv ? 0xD : 0xA, many)))
+            .error.find("too much text and data"),
+        std::string::npos)
+        << kind;
+  }
+}
+
+// Lying trailers, counts, offsets and references: each byte in turn gets other values.
+TEST(PropertyListBinary, SurvivesCutsAndAlterations) {
+  const Value value =
+      Dictionary{{"array", Array{1, 0.5, "text that is longer than fifteen bytes", Array{true}}},
+                 {"data", Data(20)},
+                 {"date", Date{0}}};
+  const std::string whole = BinaryPropertyList::of(value);
+  HostPropertyListCodec codec;
+  ASSERT_EQ(*codec.read(whole), value);
+  for (std::size_t length = 6; length < whole.size(); ++length) {
+    EXPECT_FALSE(codec.read(whole.substr(0, length))) << length;
+    codec.read("bplist00" + whole.substr(whole.size() - length));
+  }
+  for (std::size_t i = 0; i < whole.size(); ++i) {
+    for (const int byte : {0x00, 0x01, 0x0F, 0x10, 0x7F, 0x80, 0xA1, 0xD1, 0xFF}) {
+      std::string altered = whole;
+      altered[i] = static_cast<char>(byte);
+      const Result<Value> result = codec.read(altered);
+      EXPECT_TRUE(!result || codec.read(*codec.writeXML(*result))) << i;
+    }
+  }
+}
+
+TEST(PropertyListBinary, RandomValuesComeBackEqual) {
+  support::RandomValue random(2);
+  for (int i = 0; i < 300; ++i) {
+    const Value value = random.value();
+    const Result<Value> again = readBinaryPropertyList(BinaryPropertyList::of(value));
+    ASSERT_TRUE(again) << again.error;
+    ASSERT_TRUE(*again == value) << description(value);
+  }
+}
+
+}  // namespace
+}  // namespace platform::host

@@ -1,0 +1,273 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+
+#include "platform/host/HostPropertyListCodec.h"
+#include "support/RandomValue.h"
+
+namespace platform::host {
+namespace {
+
+std::string document(std::string_view content) {
+  return "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<plist version=\"1.0\">" +
+         std::string(content) + "</plist>\n";
+}
+
+Result<Value> read(std::string_view bytes) { return HostPropertyListCodec().read(bytes); }
+Result<std::string> write(const Value& value) { return HostPropertyListCodec().writeXML(value); }
+
+Value nested(int depth) {
+  Value value = Array();
+  for (int i = 1; i < depth; ++i) {
+    Array outer;
+    outer.push_back(std::move(value));
+    value = std::move(outer);
+  }
+  return value;
+}
+
+TEST(PropertyListXML, ReadsEveryForm) {
+  const double infinity = std::numeric_limits<double>::infinity();
+  struct Row {
+    const char* content;
+    Value value;
+  };
+  for (const Row& row : {
+           Row{"<true/>", true},
+           Row{"<false></false>", false},
+           Row{"<integer>-0</integer>", 0},
+           Row{"<integer> +17\n</integer>", 17},
+           Row{"<integer>0x7fFF</integer>", 0x7FFF},
+           Row{"<integer>-0X10</integer>", -16},
+           Row{"<integer>9223372036854775807</integer>", INT64_MAX},
+           Row{"<integer>9223372036854775808</integer>", std::uint64_t{1} << 63},
+           Row{"<integer>-9223372036854775808</integer>", INT64_MIN},
+           Row{"<integer>18446744073709551615</integer>", UINT64_MAX},
+           Row{"<real>.5</real>", 0.5},
+           Row{"<real>+1.e3</real>", 1000.0},
+           Row{"<real>-Infinity</real>", -infinity},
+           Row{"<real>+inf</real>", infinity},
+           Row{"<string/>", ""},
+           Row{"<string> a&amp;&lt;&#65;&#x20AC;<!-- - --><![CDATA[<b>]]>\r\n</string>",
+               " a&<A\xE2\x82\xAC<b>\n"},
+           Row{"<date>2026-11-22T04:00:00Z</date>", Date{1795320000}},
+           Row{"<date>-0001-12-31T23:59:59Z</date>", Date{-62167219201}},
+           Row{"<date>12000-02-29T00:00:00Z</date>", Date{316521302400}},
+           Row{"<data/>", Data{}},
+           Row{"<data>\n\tAA EC\n\tAwQ=\n</data>", Data{0, 1, 2, 3, 4}},
+           Row{"<array> <array/>\n<dict/> </array>", Array{Array{}, Dictionary{}}},
+           Row{"<dict><key>a</key><integer>1</integer><key/><array/>"
+               "<key>a</key><string>later</string></dict>",
+               Dictionary{{"a", "later"}, {"", Array{}}}},
+       }) {
+    const Result<Value> result = read(document(row.content));
+    ASSERT_TRUE(result) << row.content << ": " << result.error;
+    EXPECT_TRUE(*result == row.value) << row.content << ": " << description(*result);
+    EXPECT_EQ(result->variant().index(), row.value.variant().index()) << row.content;
+  }
+  EXPECT_EQ(read(document("<integer>5</integer>"))->as<Number>()->type(), Number::Type::int64);
+  EXPECT_EQ(read(document("<true/>"))->as<Number>()->type(), Number::Type::boolean);
+  EXPECT_TRUE(std::isnan(read(document("<real>NaN</real>"))->as<Number>()->doubleValue()));
+}
+
+TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
+  const std::string content(1, '\0');
+  for (const char* bad : {
+           "",
+           "<true/><true/>",
+           "<plist><true/></plist>",
+           "<true>x</true>",
+           "x<true/>",
+           "<set/>",
+           "<arrays/>",
+           "<stringstring>a</stringstring>",
+           "<key>a</key>",
+           "<array><key>a</key></array>",
+           "<string><b/></string>",
+           "<array>x</array>",
+           "<dict><true/></dict>",
+           "<dict><key>a</key></dict>",
+           "<dict><key>a</key>1<true/></dict>",
+           "<dict><key>a</key><key>b</key><true/></dict>",
+           "<integer/>",
+           "<integer>-</integer>",
+           "<integer>1.0</integer>",
+           "<integer>0x</integer>",
+           "<integer>+-1</integer>",
+           "<integer>1 2</integer>",
+           "<integer>0x1g</integer>",
+           "<integer>18446744073709551616</integer>",
+           "<integer>-9223372036854775809</integer>",
+           "<real/>",
+           "<real>1,5</real>",
+           "<real>1e999</real>",
+           "<real>+-1</real>",
+           "<real>0x10</real>",
+           "<real>1.5 m</real>",
+           "<date/>",
+           "<date>2026-11-22</date>",
+           "<date>2026-11-22T04:00:00</date>",
+           "<date>2026-02-29T00:00:00Z</date>",
+           "<date>2026-13-01T00:00:00Z</date>",
+           "<date>2026-00-01T00:00:00Z</date>",
+           "<date>2026-01-00T00:00:00Z</date>",
+           "<date>2026-01-01T24:00:00Z</date>",
+           "<date>2026-01-01T00:60:00Z</date>",
+           "<date>2026-01-01T00:00:60Z</date>",
+           "<date>026-01-01T00:00:00Z</date>",
+           "<date>--026-01-01T00:00:00Z</date>",
+           "<date>9999999-01-01T00:00:00Z</date>",
+           "<date>12345678-01-01T00:00:00Z</date>",
+           "<date>2026-01-01T-1:00:00Z</date>",
+           "<data>A</data>",
+           "<data>AA</data>",
+           "<data>AA=</data>",
+           "<data>AA===</data>",
+           "<data>AAA</data>",
+           "<data>AB==</data>",
+           "<data>AAB=</data>",
+           "<data>AA==AAAA</data>",
+           "<data>====</data>",
+           "<data>AAAA====</data>",
+           "<data>A*AA</data>",
+           "<string>&nbsp;</string>",
+           "<string>&#0;</string>",
+           "<string>\xFF</string>",
+           "<string>a",
+           "<array><true/></dict>",
+       }) {
+    const Result<Value> result = read(document(std::string("<!-- -->\n") + bad));
+    EXPECT_FALSE(result) << bad;
+    EXPECT_TRUE(result.error.starts_with("XML property list, line ")) << bad << result.error;
+  }
+  EXPECT_EQ(read("<plist>\n <string>a</string>\n <sting/></plist>").error,
+            "XML property list, line 3, column 2: the element is no property-list value");
+  for (const char* whole : {"<dict/>", "<html><true/></html>", "plist", "<plist><true/></plist>x",
+                            "<?xml version=\"1.0\" encoding=\"klingon\"?><plist><true/></plist>"}) {
+    EXPECT_FALSE(read(whole)) << whole;
+  }
+}
+
+TEST(PropertyListXML, IgnoresADoctypeButTakesNothingFromIt) {
+  const std::string outside = "<!DOCTYPE plist SYSTEM \"file:///etc/passwd\">";
+  EXPECT_EQ(*read(outside + "<plist><string>&lt;</string></plist>"), Value("<"));
+  for (const std::string& hostile : {
+           outside + "<plist><string>&outside;</string></plist>",
+           outside + "<plist>&outside;<true/></plist>",
+           std::string("<!DOCTYPE plist []><plist><true/></plist>"),
+           std::string("<!DOCTYPE plist [<!ENTITY a \"b\">]><plist><string>&a;</string></plist>"),
+           std::string("<!DOCTYPE plist [<!ENTITY % p SYSTEM \"/dev/zero\"> %p;]><plist/>"),
+       }) {
+    EXPECT_FALSE(read(hostile)) << hostile;
+  }
+}
+
+TEST(PropertyListXML, ReadsOtherEncodings) {
+  std::string wide = "\xFF\xFE";
+  for (const char c : std::string("<plist><string>\xE4</string></plist>")) wide += {c, '\0'};
+  EXPECT_EQ(*read(wide), Value("\xC3\xA4"));
+  EXPECT_EQ(*read("<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?>"
+                  "<plist><string>\xE4</string></plist>"),
+            Value("\xC3\xA4"));
+}
+
+TEST(PropertyListXML, DepthIsLimitedBothWays) {
+  const auto deep = [](int depth) {
+    std::string content;
+    for (int i = 0; i < depth; ++i) content += "<array>";
+    for (int i = 0; i < depth; ++i) content += "</array>";
+    return document(content);
+  };
+  EXPECT_TRUE(read(deep(kMaximumPropertyListDepth)));
+  EXPECT_FALSE(read(deep(kMaximumPropertyListDepth + 1)));
+  EXPECT_FALSE(read(deep(500000)));
+  EXPECT_EQ(*read(*write(nested(kMaximumPropertyListDepth))), nested(kMaximumPropertyListDepth));
+  EXPECT_FALSE(write(nested(kMaximumPropertyListDepth + 1)));
+}
+
+TEST(PropertyListXML, ACutDocumentIsNeverAValue) {
+  const std::string whole = *write(Dictionary{{"a", Array{1, "\xE2\x82\xAC", Data{1}}}});
+  for (std::size_t length = 0; length + 1 < whole.size(); ++length) {
+    EXPECT_FALSE(read(std::string_view(whole).substr(0, length))) << length;
+  }
+}
+
+TEST(PropertyListXML, WritesThisAndNothingElse) {
+  const Value value = Dictionary{
+      {"z", Array{}},
+      {"a&b", Dictionary{}},
+      {"list", Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, 0.5f, true, false, Date{0.9},
+                     Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
+  };
+  EXPECT_EQ(*write(value),
+            "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
+            "<plist version=\"1.0\">\n"
+            "<dict>\n"
+            "\t<key>z</key>\n"
+            "\t<array/>\n"
+            "\t<key>a&amp;b</key>\n"
+            "\t<dict/>\n"
+            "\t<key>list</key>\n"
+            "\t<array>\n"
+            "\t\t<integer>9223372036854775808</integer>\n"
+            "\t\t<integer>-1</integer>\n"
+            "\t\t<real>0.1</real>\n"
+            "\t\t<real>100</real>\n"
+            "\t\t<real>0.5</real>\n"
+            "\t\t<true/>\n"
+            "\t\t<false/>\n"
+            "\t\t<date>1970-01-01T00:00:00Z</date>\n"
+            "\t\t<data>AAECAw==</data>\n"
+            "\t\t<string>&lt;&#13;\n\t\xEF\xBF\xBD\xEF\xBF\xBD&gt;</string>\n"
+            "\t</array>\n"
+            "</dict>\n"
+            "</plist>\n");
+}
+
+TEST(PropertyListXML, WhatCantBeTextIsReplacedByteByByte) {
+  const std::string r = "\xEF\xBF\xBD";
+  struct Row {
+    const char* bytes;
+    std::string text;
+  };
+  for (const Row& row : {
+           Row{"\x01\x1F\x7F", r + r + "\x7F"},
+           Row{"\x80\xC0\xAF\xC3", r + r + r + r},
+           Row{"\xE0\x9F\xBF", r + r + r},
+           Row{"\xED\xA0\x80", r + r + r},
+           Row{"\xEF\xBF\xBE\xEF\xBF\xBF", r + r + r + r + r + r},
+           Row{"\xF0\x8F\xBF\xBF", r + r + r + r},
+           Row{"\xF4\x90\x80\x80", r + r + r + r},
+           Row{"\xE2\x82z", r + r + "z"},
+           Row{"\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80",
+               "\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80"},
+       }) {
+    EXPECT_EQ(*read(*write(row.bytes)), Value(row.text)) << row.text;
+  }
+}
+
+TEST(PropertyListXML, RandomValuesComeBackEqual) {
+  support::RandomValue random(1);
+  for (int i = 0; i < 500; ++i) {
+    const Value value = random.value();
+    const std::string text = *write(value);
+    const Result<Value> again = read(text);
+    ASSERT_TRUE(again) << again.error << "\n" << text;
+    ASSERT_TRUE(*again == value) << text;
+    ASSERT_EQ(*write(*again), text);
+  }
+  for (int i = 0; i < 2000; ++i) {
+    const Result<Value> again = read(*write(Dictionary{{random.bytes(), random.bytes()}}));
+    ASSERT_TRUE(again) << again.error;
+  }
+}
+
+TEST(HostPropertyListCodec, RefusesNothingAndTooMuch) {
+  EXPECT_EQ(read("").error, "the property list is empty");
+  const std::string tooMuch(kMaximumPropertyListSize + 1, ' ');
+  EXPECT_EQ(read(tooMuch).error, "the property list has 16777217 bytes, more than 16777216");
+}
+
+}  // namespace
+}  // namespace platform::host

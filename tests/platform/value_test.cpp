@@ -1,0 +1,157 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+
+#include "platform/Convert.h"
+#include "platform/PropertyList.h"
+#include "platform/Text.h"
+
+namespace platform {
+namespace {
+
+constexpr double kInfinity = std::numeric_limits<double>::infinity();
+constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
+
+TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
+  struct Row {
+    double from;
+    std::int32_t as32;
+    std::int64_t as64;
+    std::uint64_t asUnsigned;
+  };
+  for (const Row& row : {
+           Row{kNaN, 0, 0, 0},
+           Row{-0.9, 0, 0, 0},
+           Row{1.9, 1, 1, 1},
+           Row{-1.9, -1, -1, 0},
+           Row{2147483647.5, INT32_MAX, 2147483647, 2147483647},
+           Row{2147483648.0, INT32_MAX, 2147483648, 2147483648},
+           Row{-2147483648.5, INT32_MIN, -2147483648, 0},
+           Row{0x1p63, INT32_MAX, INT64_MAX, std::uint64_t{1} << 63},
+           Row{0x1.fffffffffffffp62, INT32_MAX, 9223372036854774784, 9223372036854774784u},
+           Row{-0x1p63, INT32_MIN, INT64_MIN, 0},
+           Row{0x1p64, INT32_MAX, INT64_MAX, UINT64_MAX},
+           Row{0x1.fffffffffffffp63, INT32_MAX, INT64_MAX, 18446744073709549568u},
+           Row{kInfinity, INT32_MAX, INT64_MAX, UINT64_MAX},
+           Row{-kInfinity, INT32_MIN, INT64_MIN, 0},
+       }) {
+    EXPECT_EQ(saturatingCast<std::int32_t>(row.from), row.as32) << row.from;
+    EXPECT_EQ(saturatingCast<std::int64_t>(row.from), row.as64) << row.from;
+    EXPECT_EQ(saturatingCast<std::uint64_t>(row.from), row.asUnsigned) << row.from;
+    EXPECT_EQ(Number(row.from).int64Value(), row.as64);
+    EXPECT_EQ(Number(row.from).uint64Value(), row.asUnsigned);
+  }
+}
+
+TEST(Number, ConvertsBetweenItsTypes) {
+  EXPECT_EQ(Number(std::int32_t{-1}).uint64Value(), UINT64_MAX);
+  EXPECT_EQ(Number(UINT64_MAX).int64Value(), -1);
+  EXPECT_EQ(Number(UINT64_MAX).doubleValue(), 0x1p64);
+  EXPECT_EQ(Number(true).doubleValue(), 1.0);
+  EXPECT_TRUE(Number(0.25).boolValue());
+  EXPECT_FALSE(Number(-0.0).boolValue());
+  EXPECT_TRUE(Number(std::int64_t{1} << 40).boolValue());
+}
+
+// Each group stands for one number, no two groups for the same.
+TEST(Number, IsEqualByTheNumberWhateverItsType) {
+  const std::vector<std::vector<Number>> groups = {
+      {Number(0), Number(std::uint64_t{0}), Number(0.0), Number(-0.0f), Number(false)},
+      {Number(1), Number(std::int64_t{1}), Number(1.0f), Number(true)},
+      {Number(-1), Number(std::int64_t{-1}), Number(-1.0)},
+      {Number(UINT64_MAX)},
+      {Number(0x1p64)},
+      {Number(INT64_MAX), Number(std::uint64_t{INT64_MAX})},
+      {Number(0x1p63), Number(std::uint64_t{1} << 63)},
+      {Number(INT64_MIN), Number(-0x1p63)},
+      {Number(std::int64_t{1} << 53), Number(0x1p53)},
+      {Number((std::int64_t{1} << 53) + 1)},
+      {Number(0.5), Number(0.5f)},
+      {Number(kInfinity)},
+      {Number(-kInfinity)},
+  };
+  for (std::size_t i = 0; i < groups.size(); ++i) {
+    for (std::size_t j = 0; j < groups.size(); ++j) {
+      for (const Number& a : groups[i]) {
+        for (const Number& b : groups[j]) EXPECT_EQ(a == b, i == j) << a.text() << " " << b.text();
+      }
+    }
+  }
+  EXPECT_FALSE(Number(kNaN) == Number(kNaN));
+  EXPECT_FALSE(Number(kNaN) == Number(0));
+}
+
+TEST(Number, TextHasNoPointWhenIntegral) {
+  struct Row {
+    Number number;
+    const char* text;
+  };
+  for (const Row& row : {
+           Row{Number(-7), "-7"},
+           Row{Number(INT64_MIN), "-9223372036854775808"},
+           Row{Number(UINT64_MAX), "18446744073709551615"},
+           Row{Number(true), "1"},
+           Row{Number(100.0), "100"},
+           Row{Number(1e15), "1000000000000000"},
+           Row{Number(1e16), "1e+16"},
+           Row{Number(0.1), "0.1"},
+           Row{Number(1.0 / 3), "0.3333333333333333"},
+           Row{Number(0.1f), "0.1000000014901161"},
+           Row{Number(-kInfinity), "-inf"},
+           Row{Number(-kNaN), "nan"},
+       }) {
+    EXPECT_EQ(row.number.text(), row.text);
+  }
+}
+
+TEST(Description, ShowsTextsAsTheyAreAndContainersAsListings) {
+  EXPECT_EQ(description(Value("two words\n")), "two words\n");
+  EXPECT_EQ(description(Value(2.5)), "2.5");
+  EXPECT_EQ(description(Array{}), "(\n)");
+  EXPECT_EQ(description(static_cast<const Value*>(nullptr)), "(null)");
+  EXPECT_EQ(description(std::optional<std::string>()), "(null)");
+  EXPECT_EQ(description(std::optional<std::string>("x")), "x");
+  const Value value = Dictionary{
+      {"plain.key", "word"},
+      {"two words", "say \"hi\"\n\x01\\"},
+      {"", ""},
+      {"list", Array{1, true, Dictionary{{"date", Date{0}}}, Data{1, 2, 3}}},
+  };
+  EXPECT_EQ(description(value), R"({
+    plain.key = word;
+    "two words" = "say \"hi\"\n\x01\\";
+    "" = "";
+    list = (
+        1,
+        1,
+        {
+            date = 1970-01-01 00:00:00 +0000;
+        },
+        {length = 3}
+    );
+})");
+}
+
+TEST(Text, FormatsBeyondItsFixedBuffer) {
+  const std::string longText(1000, 'x');
+  EXPECT_EQ(format("<%s|%d>", longText.c_str(), 5), "<" + longText + "|5>");
+  EXPECT_EQ(format("%s", longText.substr(0, 255).c_str()).size(), 255u);
+  EXPECT_EQ(format("%s", longText.substr(0, 256).c_str()).size(), 256u);
+}
+
+TEST(Text, RealsReadBackAsTheSameDouble) {
+  for (const double value :
+       {0.1, -0.0, 5e-324, 1.7976931348623157e308, 1.0 / 3, 1e22, 123456789.0}) {
+    std::string text;
+    appendReal(text, value);
+    EXPECT_EQ(std::strtod(text.c_str(), nullptr), value) << text;
+    EXPECT_EQ(std::signbit(std::strtod(text.c_str(), nullptr)), std::signbit(value)) << text;
+  }
+  std::string text;
+  appendReal(text, -kNaN);
+  EXPECT_EQ(text, "nan");
+}
+
+}  // namespace
+}  // namespace platform

@@ -1,0 +1,114 @@
+// Writes binary property lists for tests: whole values, or objects given byte by byte, which makes
+// lists that no honest writer would.
+#pragma once
+
+#include <bit>
+#include <cstdint>
+#include <initializer_list>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "platform/PropertyList.h"
+
+namespace support {
+
+class BinaryPropertyList {
+ public:
+  explicit BinaryPropertyList(std::size_t referenceSize = 2) : referenceSize_(referenceSize) {}
+
+  static std::string of(const platform::Value& value) {
+    BinaryPropertyList list(3);
+    const std::size_t top = list.add(value);
+    return list.finish(top);
+  }
+
+  // Each of these adds an object and returns its number, which references name.
+  std::size_t object(std::string_view bytes) {
+    offsets_.push_back(bytes_.size());
+    bytes_ += bytes;
+    return offsets_.size() - 1;
+  }
+
+  // A marker, a count, and what is counted.
+  std::size_t counted(unsigned marker, std::size_t count, std::string_view content) {
+    std::string bytes;
+    if (count < 15) {
+      bytes = bigEndian(marker << 4 | count, 1);
+    } else {
+      bytes = bigEndian(marker << 4 | 15, 1) + "\x12" + bigEndian(count, 4);
+    }
+    return object(bytes.append(content));
+  }
+
+  // An array (marker 0xA), or a dictionary (0xD) with all keys before all values.
+  std::size_t container(unsigned marker, const std::vector<std::size_t>& references) {
+    std::string content;
+    for (const std::size_t reference : references) content += bigEndian(reference, referenceSize_);
+    return counted(marker, references.size() / (marker == 0xD ? 2 : 1), content);
+  }
+
+  std::size_t add(const platform::Value& value) {
+    using platform::Number;
+    if (const auto* number = value.as<Number>()) {
+      switch (number->type()) {
+        case Number::Type::boolean:
+          return object(number->boolValue() ? "\x09" : "\x08");
+        case Number::Type::float32:
+          return object("\x22" + bigEndian(std::bit_cast<std::uint32_t>(
+                                               static_cast<float>(number->doubleValue())),
+                                           4));
+        case Number::Type::float64:
+          return object("\x23" + bigEndian(std::bit_cast<std::uint64_t>(number->doubleValue()), 8));
+        case Number::Type::uint64:
+          return object("\x14" + bigEndian(0, 8) + bigEndian(number->uint64Value(), 8));
+        case Number::Type::int32:
+        case Number::Type::int64:
+          return object("\x13" + bigEndian(number->uint64Value(), 8));
+      }
+    }
+    if (const auto* text = value.as<std::string>()) return counted(0x7, text->size(), *text);
+    if (const auto* data = value.as<platform::Data>()) {
+      return counted(0x4, data->size(), std::string(data->begin(), data->end()));
+    }
+    if (const auto* date = value.as<platform::Date>()) {
+      const double since2001 = date->secondsSince1970 - 978307200;
+      return object("\x33" + bigEndian(std::bit_cast<std::uint64_t>(since2001), 8));
+    }
+    std::vector<std::size_t> references, values;
+    if (const auto* array = value.as<platform::Array>()) {
+      for (const platform::Value& element : *array) references.push_back(add(element));
+      return container(0xA, references);
+    }
+    for (const auto& [key, content] : *value.as<platform::Dictionary>()) {
+      references.push_back(counted(0x7, key.size(), key));
+      values.push_back(add(content));
+    }
+    references.insert(references.end(), values.begin(), values.end());
+    return container(0xD, references);
+  }
+
+  // The offset of the next object.
+  std::size_t offset() const { return bytes_.size(); }
+
+  // The file, with offsets of 4 bytes and the top level given.
+  std::string finish(std::size_t top) const {
+    std::string file = bytes_;
+    for (const std::size_t offset : offsets_) file += bigEndian(offset, 4);
+    return file + bigEndian(0, 6) + bigEndian(4, 1) + bigEndian(referenceSize_, 1) +
+           bigEndian(offsets_.size(), 8) + bigEndian(top, 8) + bigEndian(bytes_.size(), 8);
+  }
+
+  static std::string bigEndian(std::uint64_t value, std::size_t size) {
+    std::string bytes(size, '\0');
+    for (; size > 0; value >>= 8) bytes[--size] = static_cast<char>(value & 0xFF);
+    return bytes;
+  }
+
+ private:
+  std::size_t referenceSize_;
+  std::string bytes_ = "bplist00";
+  std::vector<std::size_t> offsets_;
+};
+
+}  // namespace support
