@@ -92,9 +92,11 @@ void PreferenceFile::load(int folder, bool evenIfUnchanged) {
       ::openat(folder, name_.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
   // The file that is read may be a newer one.
   if (!file || ::fstat(file.get(), &status_) != 0) return fail(State::unreadable, errorText(errno));
-  const auto bytes = readRegularFile(file.get(), kMaximumPropertyListSize + 1);
+  if (static_cast<std::size_t>(status_.st_size) > kMaximumPropertyListSize) {
+    return fail(State::broken, "larger than 16 MiB");
+  }
+  const auto bytes = readRegularFile(file.get(), kMaximumPropertyListSize);
   if (!bytes) return fail(State::unreadable, bytes.error);
-  if (bytes->size() > kMaximumPropertyListSize) return fail(State::broken, "larger than 16 MiB");
   auto value = codec_.read(*bytes);
   if (!value) return fail(State::broken, value.error);
   auto* dictionary = value->as<Dictionary>();

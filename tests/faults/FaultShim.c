@@ -84,11 +84,11 @@ static int isRegular(int file) {
 }
 
 // A call with a fault around it.
-#define AROUND(type, call)           \
+#define AROUND(call)                 \
   do {                               \
     const enum Kind fault = count(); \
     if (fault == FAIL) return -1;    \
-    const type result = (call);      \
+    const int result = (call);       \
     if (fault == KILL_AFTER) die();  \
     return result;                   \
   } while (0)
@@ -96,7 +96,7 @@ static int isRegular(int file) {
 #define ORIGINAL(name) (__extension__(__typeof__(&name)) original(#name))
 
 #define WRAPPED(name, parameters, arguments) \
-  EXPORTED int name parameters { AROUND(int, ORIGINAL(name) arguments); }
+  EXPORTED int name parameters { AROUND(ORIGINAL(name) arguments); }
 
 WRAPPED(fsync, (int file), (file))
 WRAPPED(fdatasync, (int file), (file))
@@ -134,7 +134,7 @@ WRAPPED(rmdir, (const char* path), (path))
       va_end(rest);                                                                  \
     }                                                                                \
     if (!makes && (flags & O_TRUNC) == 0) return ORIGINAL(name)(__VA_ARGS__, flags); \
-    AROUND(int, ORIGINAL(name)(__VA_ARGS__, flags, mode));                           \
+    AROUND(ORIGINAL(name)(__VA_ARGS__, flags, mode));                                \
   }
 
 OPENING(open, (const char* path, int flags, ...), path)

@@ -1,0 +1,64 @@
+// What a test of a file-backed service needs: a device root of its own, a clock to set, a log to
+// ask.
+#pragma once
+
+#include <sys/stat.h>
+
+#include <atomic>
+#include <string>
+
+#include "platform/Clock.h"
+#include "platform/host/DeviceRoot.h"
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/testing/RecordingLog.h"
+#include "support/TemporaryFolder.h"
+
+namespace support {
+
+struct SetClock final : platform::Clock {
+  std::atomic<double> seconds = 1795320000;  // 2026-11-22T04:00:00Z
+  platform::Date now() override { return {seconds}; }
+};
+
+struct HostServices {
+  TemporaryFolder folder;
+  platform::host::DeviceRoot root{folder.path().string()};
+  platform::host::HostPropertyListCodec codec;
+  SetClock clock;
+  platform::fakes::RecordingLog log;
+
+  std::string xml(const platform::Dictionary& dictionary) { return *codec.writeXML(dictionary); }
+};
+
+// What may stand in the place of a file. A link leads to "target", dangling or not.
+enum class Kind { link, danglingLink, fifo, folder };
+inline constexpr Kind kOtherKinds[] = {Kind::link, Kind::danglingLink, Kind::fifo, Kind::folder};
+
+inline void put(Kind kind, const std::filesystem::path& at, const std::filesystem::path& target) {
+  std::filesystem::create_directories(at.parent_path());
+  if (kind == Kind::link) std::ofstream(target) << "precious";
+  if (kind == Kind::link || kind == Kind::danglingLink) std::filesystem::create_symlink(target, at);
+  if (kind == Kind::fifo) ::mkfifo(at.c_str(), 0600);
+  if (kind == Kind::folder) std::filesystem::create_directory(at);
+}
+
+// Whether nothing was written through what put() left.
+inline bool untouched(Kind kind, const std::filesystem::path& at,
+                      const std::filesystem::path& target) {
+  const auto type = std::filesystem::symlink_status(at).type();
+  switch (kind) {
+    case Kind::link: {
+      std::ifstream file(target);
+      return std::string(std::istreambuf_iterator<char>(file), {}) == "precious";
+    }
+    case Kind::danglingLink:
+      return !std::filesystem::exists(target);
+    case Kind::fifo:
+      return type == std::filesystem::file_type::fifo;
+    case Kind::folder:
+      break;
+  }
+  return type == std::filesystem::file_type::directory;
+}
+
+}  // namespace support

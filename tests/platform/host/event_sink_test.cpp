@@ -1,0 +1,118 @@
+#include "platform/host/EventSink.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <future>
+
+#include "HostServices.h"
+
+namespace platform::host {
+namespace {
+
+constexpr char kEvents[] = "var/spool/morvend/events.jsonl";
+
+struct EventSinkTest : testing::Test, support::HostServices {
+  EventSink sink{root, codec, clock, log};
+
+  static Dictionary nothing() { return {}; }
+  std::ptrdiff_t lines() const {
+    const std::string text = folder.read(kEvents);
+    return std::count(text.begin(), text.end(), '\n');
+  }
+};
+
+TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
+  std::promise<void> go;
+  sink.EventraSendEventLazy("first", [wait = go.get_future().share()] {
+    wait.wait();
+    return Dictionary{{"a", 1}};
+  });
+  clock.seconds = clock.seconds + 1;
+  sink.EventraSendEventLazy("second", nothing);
+  clock.seconds = 0;
+  go.set_value();
+  sink.drain();
+  const std::string expected =
+      "{\"event\": \"first\", \"time\": \"2026-11-22T04:00:00Z\", \"payload\": {\"a\": 1}}\n"
+      "{\"event\": \"second\", \"time\": \"2026-11-22T04:00:01Z\", \"payload\": {}}\n";
+  EXPECT_EQ(folder.read(kEvents), expected);
+  EXPECT_TRUE(sink.EventraSendEventLazy("third", nothing));
+  sink.drain();
+  EXPECT_EQ(lines(), 3);
+}
+
+TEST_F(EventSinkTest, OnlyUsedEventsAreProduced) {
+  folder.write("device/analytics.plist", xml({{"UsedEvents", Array{"used", 7}}}));
+  const auto never = [] {
+    ADD_FAILURE();
+    return Dictionary{};
+  };
+  EXPECT_FALSE(sink.EventraIsEventUsed("unused"));
+  EXPECT_FALSE(sink.EventraSendEventLazy("unused", never));
+  EXPECT_TRUE(sink.offersLazySend());
+  EXPECT_TRUE(sink.EventraSendEventLazy("used", nothing));
+  sink.drain();
+  EXPECT_EQ(lines(), 1);
+  folder.write("device/analytics.plist", xml({{"Available", false}}));
+  EventSink absent(root, codec, clock, log);
+  EXPECT_FALSE(absent.offersLazySend());
+  EXPECT_TRUE(absent.EventraIsEventUsed("used"));
+  EXPECT_FALSE(absent.EventraSendEventLazy("used", never));
+}
+
+TEST_F(EventSinkTest, ABrokenConfigurationIsSaidOnceAndLeavesEveryEventUsed) {
+  folder.write("device/analytics.plist", "garbage");
+  EXPECT_TRUE(sink.EventraIsEventUsed("any"));
+  EXPECT_TRUE(sink.offersLazySend());
+  EXPECT_EQ(log.count("error: Could not read /device/analytics.plist: "), 1);
+}
+
+TEST_F(EventSinkTest, TheQueueIsBounded) {
+  std::promise<void> begun, go;
+  sink.EventraSendEventLazy("blocking", [&begun, wait = go.get_future().share()] {
+    begun.set_value();
+    wait.wait();
+    return Dictionary{};
+  });
+  begun.get_future().wait();
+  std::size_t queued = 0;
+  while (queued <= EventSink::kMaximumQueued && sink.EventraSendEventLazy("event", nothing)) {
+    ++queued;
+  }
+  EXPECT_EQ(queued, EventSink::kMaximumQueued);
+  go.set_value();
+  sink.drain();
+  EXPECT_EQ(lines(), static_cast<std::ptrdiff_t>(queued) + 1);
+}
+
+TEST_F(EventSinkTest, NoEventIsLostBetweenSendersProducersAndDrains) {
+  constexpr int kSenders = 4, kEach = 500;
+  std::vector<std::thread> senders;
+  for (int i = 0; i < kSenders; ++i) {
+    senders.emplace_back([this] {
+      for (int n = 0; n < kEach; ++n) {
+        sink.EventraSendEventLazy("outer", [this] {
+          sink.EventraSendEventLazy("inner", nothing);
+          return Dictionary{};
+        });
+      }
+    });
+  }
+  for (int n = 0; n < 50; ++n) sink.drain();
+  for (std::thread& sender : senders) sender.join();
+  sink.drain();
+  EXPECT_EQ(lines(), 2 * kSenders * kEach);
+}
+
+TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
+  std::filesystem::create_directories(folder / kEvents);
+  for (int n = 0; n < 3; ++n) {
+    EXPECT_TRUE(sink.EventraSendEventLazy("event", nothing));
+    sink.drain();
+  }
+  EXPECT_EQ(log.count("error: Could not write /var/spool/morvend/events.jsonl: "), 1);
+}
+
+}  // namespace
+}  // namespace platform::host

@@ -1,0 +1,226 @@
+#include "platform/host/PreferenceFiles.h"
+
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <limits>
+
+#include "HostServices.h"
+
+namespace platform::host {
+namespace {
+
+constexpr char kDomain[] = "com.example";
+constexpr char kFile[] = "var/preferences/mobile/com.example.plist";
+constexpr char kKept[] = "var/preferences/mobile/com.example.plist.corrupt";
+
+struct PreferenceFilesTest : testing::Test, support::HostServices {
+  std::optional<Dictionary> stored(const char* file = kFile) {
+    auto value = codec.read(folder.read(file));
+    return value ? std::optional(*value->as<Dictionary>()) : std::nullopt;
+  }
+  ino_t inode() const {
+    struct stat status {};
+    ::stat((folder / kFile).c_str(), &status);
+    return status.st_ino;
+  }
+};
+
+void set(PreferenceStore& store, const char* key, const Value& value) {
+  store.QNSPreferencesSetValue(key, &value, kDomain);
+}
+
+TEST_F(PreferenceFilesTest, WritesAreSeenAtOnceAndStoredWhenSynchronised) {
+  folder.write(kFile, xml({{"kept", 1}, {"removed", 2}, {"changed", 3}}));
+  {
+    PreferenceFiles files(root, codec, log);
+    set(files, "changed", true);
+    set(files, "new", "text");
+    files.QNSPreferencesSetValue("removed", nullptr, kDomain);
+    EXPECT_EQ(files.QNSPreferencesGetIntegerValue("kept", kDomain), 1);
+    EXPECT_EQ(files.QNSPreferencesGetValue("new", kDomain), Value("text"));
+    EXPECT_EQ(files.QNSPreferencesGetValue("removed", kDomain), std::nullopt);
+    EXPECT_EQ(stored()->size(), 3u);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(folder.read(kFile), xml({{"kept", 1}, {"changed", true}, {"new", "text"}}));
+    set(files, "late", 4);
+    EXPECT_EQ(stored()->find("late"), nullptr);
+  }
+  EXPECT_EQ(stored()->find("late")->as<Number>()->int64Value(), 4);
+  EXPECT_TRUE(log.lines().empty());
+}
+
+TEST_F(PreferenceFilesTest, ChangesOfOthersAreSeenAndKept) {
+  PreferenceFiles mine(root, codec, log), others(root, codec, log);
+  set(mine, "mine", 1);
+  mine.QNSPreferencesSynchronize(kDomain);
+  set(others, "theirs", 2);
+  EXPECT_EQ(mine.QNSPreferencesGetValue("theirs", kDomain), std::nullopt);
+  others.QNSPreferencesSynchronize(kDomain);
+  EXPECT_EQ(mine.QNSPreferencesGetIntegerValue("theirs", kDomain), 2);
+  others.QNSPreferencesSetValue("theirs", nullptr, kDomain);
+  others.QNSPreferencesSynchronize(kDomain);
+  EXPECT_EQ(mine.QNSPreferencesGetValue("theirs", kDomain), std::nullopt);
+  std::filesystem::remove_all(folder / "var");
+  EXPECT_EQ(mine.QNSPreferencesGetValue("mine", kDomain), std::nullopt);
+}
+
+TEST_F(PreferenceFilesTest, WhatIsStoredAlreadyIsNotWrittenAgainUnlessItsTypeDiffers) {
+  folder.write(kFile, xml({{"key", 1}}));
+  PreferenceFiles files(root, codec, log);
+  const ino_t before = inode();
+  set(files, "key", 1);
+  files.QNSPreferencesSetValue("absent", nullptr, kDomain);
+  files.QNSPreferencesSynchronize(kDomain);
+  EXPECT_EQ(inode(), before);
+  set(files, "key", true);
+  files.QNSPreferencesSynchronize(kDomain);
+  EXPECT_EQ(stored()->number("key")->type(), Number::Type::boolean);
+  files.deletePreference("key", "nobody", kDomain);
+  EXPECT_FALSE(std::filesystem::exists(folder / "var/preferences/nobody"));
+}
+
+TEST_F(PreferenceFilesTest, TwoProcessesLoseNoneOfEachOthersKeysAndAdditions) {
+  constexpr int kRounds = 25;
+  const auto work = [this](const char* prefix) {
+    for (int i = 0; i < kRounds; ++i) {
+      PreferenceFiles files(root, codec, log);
+      set(files, (prefix + std::to_string(i)).c_str(), i);
+      files.QNSPreferencesSynchronize(kDomain);
+      files.addToInteger("count", kDomain, 1);
+    }
+  };
+  const pid_t child = ::fork();
+  ASSERT_GE(child, 0);
+  if (child == 0) {
+    work("child");
+    ::_exit(0);
+  }
+  work("parent");
+  int status = -1;
+  ASSERT_EQ(::waitpid(child, &status, 0), child);
+  ASSERT_EQ(status, 0);
+  EXPECT_EQ(stored()->size(), 2u * kRounds + 1);
+  EXPECT_EQ(stored()->number("count")->int64Value(), 2 * kRounds);
+}
+
+TEST_F(PreferenceFilesTest, AdditionsSaturateAndBeginAtZero) {
+  folder.write(kFile, xml({{"full", std::numeric_limits<std::int64_t>::max()}, {"text", "7"}}));
+  PreferenceFiles files(root, codec, log);
+  set(files, "pending", 40);
+  for (const char* key : {"full", "text", "pending", "new"}) files.addToInteger(key, kDomain, 2);
+  EXPECT_EQ(folder.read(kFile), xml({{"full", std::numeric_limits<std::int64_t>::max()},
+                                     {"text", 2},
+                                     {"pending", 42},
+                                     {"new", 2}}));
+}
+
+TEST_F(PreferenceFilesTest, AFileCutAnywhereReadsAsEmptyIsKeptAndSaidOnce) {
+  const std::string whole = xml({{"key", 1}, {"list", Array{true}}});
+  const std::size_t end = whole.rfind('>');
+  for (std::size_t size = 0; size <= end; ++size) {
+    SCOPED_TRACE(size);
+    log.clear();
+    folder.write(kFile, whole.substr(0, size));
+    PreferenceFiles files(root, codec, log);
+    EXPECT_EQ(files.QNSPreferencesGetValue("key", kDomain), std::nullopt);
+    EXPECT_EQ(files.QNSPreferencesGetValue("list", kDomain), std::nullopt);
+    set(files, "new", 1);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(folder.read(kFile), xml({{"new", 1}}));
+    EXPECT_EQ(folder.read(kKept), whole.substr(0, size));
+    EXPECT_EQ(log.count("error: Could not read /var/preferences/mobile/com.example.plist: "), 1);
+    EXPECT_EQ(log.lines().size(), 1u);
+  }
+}
+
+TEST_F(PreferenceFilesTest, WhatIsNoPreferenceFileIsPutAside) {
+  const auto check = [this](const char* why) {
+    log.clear();
+    PreferenceFiles files(root, codec, log);
+    EXPECT_EQ(files.QNSPreferencesGetValue("key", kDomain), std::nullopt);
+    set(files, "new", 1);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(folder.read(kFile), xml({{"new", 1}}));
+    EXPECT_EQ(log.count(why), 1);
+    EXPECT_EQ(log.lines().size(), 1u);
+    std::filesystem::remove_all(folder / "var/preferences");
+  };
+  for (const support::Kind kind : support::kOtherKinds) {
+    support::put(kind, folder / kFile, folder / "target");
+    check("not a regular file");
+    EXPECT_TRUE(kind == support::Kind::link ? folder.read("target") == "precious"
+                                            : !std::filesystem::exists(folder / "target"));
+    std::filesystem::remove(folder / "target");
+  }
+  folder.write(kFile, *codec.writeXML(Array{1}));
+  check("the top level is not a dictionary");
+  folder.write(kFile, xml({{"key", 1}}));
+  std::filesystem::resize_file(folder / kFile, kMaximumPropertyListSize + 1);
+  check("larger than 16 MiB");
+}
+
+TEST_F(PreferenceFilesTest, AFailedWriteIsSaidOnceStaysVisibleAndIsTriedAgain) {
+  folder.write("var/preferences/mobile", "in the way");
+  {
+    PreferenceFiles files(root, codec, log);
+    set(files, "key", 1);
+    files.QNSPreferencesSynchronize(kDomain);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(log.count("error: Could not write /var/preferences/mobile/com.example.plist: "), 1);
+    EXPECT_EQ(files.QNSPreferencesGetIntegerValue("key", kDomain), 1);
+    std::filesystem::remove(folder / "var/preferences/mobile");
+  }
+  EXPECT_EQ(folder.read(kFile), xml({{"key", 1}}));
+}
+
+TEST_F(PreferenceFilesTest, AValueThatWouldMakeTheFileUnreadableIsRefused) {
+  folder.write(kFile, xml({{"key", 1}}));
+  Value deep("leaf");
+  for (int depth = 0; depth < kMaximumPropertyListDepth; ++depth) deep = Array{std::move(deep)};
+  for (const Value& value : {Value(std::string(kMaximumPropertyListSize, 'x')), deep}) {
+    PreferenceFiles files(root, codec, log);
+    set(files, "new", value);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(folder.read(kFile), xml({{"key", 1}}));
+  }
+  EXPECT_EQ(log.count("error: Could not write"), 2);
+}
+
+TEST_F(PreferenceFilesTest, NamesThatAreNoFileNamesAreRefused) {
+  PreferenceFiles files(root, codec, log);
+  const Value value(1);
+  int refused = 0;
+  for (const std::string& name :
+       {std::string(), std::string("."), std::string(".."), std::string("../mobile"),
+        std::string("a/b"), std::string("a\0b", 3), std::string(256, 'x')}) {
+    files.setPreference("key", name, kDomain, &value);
+    files.setPreference("key", "mobile", name, &value);
+    files.QNSPreferencesSetValue("key", &value, name);
+    EXPECT_EQ(files.getPreference("key", name), std::nullopt);
+    EXPECT_EQ(log.count("error: Refused preferences"), refused += 4);
+  }
+  files.flushAll();
+  EXPECT_FALSE(std::filesystem::exists(folder / "var"));
+  files.setPreference("key", "mobile", std::string(241, 'x'), &value);
+  EXPECT_TRUE(std::filesystem::exists(
+      folder / ("var/preferences/mobile/" + std::string(241, 'x') + ".plist")));
+}
+
+TEST_F(PreferenceFilesTest, EachViewHasItsUser) {
+  constexpr char kAnalytics[] = "var/preferences/__quenset__/com.norba.Varnhollow.plist";
+  folder.write(kAnalytics, xml({{"LogBlocklist", Array{"b", 7, "a"}}}));
+  PreferenceFiles files(root, codec, log);
+  EXPECT_EQ(files.logBlocklist(), (std::vector<std::string>{"b", "a"}));
+  const Value value(1);
+  files.setPreference("key", &value, "com.norba.Varnhollow", true);
+  EXPECT_EQ(stored(kAnalytics)->size(), 2u);
+  files.setPreference("key", "root", kDomain, &value);
+  EXPECT_EQ(stored("var/preferences/root/com.example.plist")->size(), 1u);
+  files.deletePreference("key", "root", kDomain);
+  EXPECT_EQ(stored("var/preferences/root/com.example.plist")->size(), 0u);
+}
+
+}  // namespace
+}  // namespace platform::host

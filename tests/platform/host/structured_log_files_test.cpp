@@ -1,0 +1,74 @@
+#include "platform/host/StructuredLogFiles.h"
+
+#include <gtest/gtest.h>
+
+#include "HostServices.h"
+
+namespace platform::host {
+namespace {
+
+constexpr char kStructured[] = "var/spool/morvend/structured/";
+constexpr char kSubmitted[] = "var/spool/morvend/submitted/";
+
+struct StructuredLogFilesTest : testing::Test, support::HostServices {
+  StructuredLogFiles logs{root, clock, log};
+
+  std::string structured(const std::string& name) const { return folder.read(kStructured + name); }
+  std::string submitted(const std::string& name) const { return folder.read(kSubmitted + name); }
+};
+
+TEST_F(StructuredLogFilesTest, ALineIsAppendedToTheFileOfItsDay) {
+  logs.logStructuredData(176, {{"wear", 3}, {"rate", 1.0}});
+  logs.logStructuredData(-1, {});
+  EXPECT_EQ(structured("2026-11-22.jsonl"),
+            "{\"type\": 176, \"time\": \"2026-11-22T04:00:00Z\", \"data\": {\"wear\": 3, "
+            "\"rate\": 1.0}}\n"
+            "{\"type\": -1, \"time\": \"2026-11-22T04:00:00Z\", \"data\": {}}\n");
+  const std::pair<double, const char*> days[] = {{-1e300, "0000-01-01"}, {1e300, "9999-12-31"}};
+  for (const auto& [seconds, day] : days) {
+    clock.seconds = seconds;
+    logs.logStructuredData(1, {});
+    EXPECT_NE(structured(std::string(day) + ".jsonl"), "");
+  }
+}
+
+TEST_F(StructuredLogFilesTest, EarlierDaysGoToTheSpoolAndNothingElseDoes) {
+  const char* earlier[] = {"0000-01-01.jsonl", "2026-11-20.jsonl", "2026-11-21.jsonl"};
+  const char* others[] = {"2026-11-22.jsonl", "2026-11-23.jsonl", "2026-1-1.jsonl", "x.jsonl",
+                          "2026-11-20.json",  "-026-11-20.jsonl", ".jsonl"};
+  for (const char* name : earlier) folder.write(kStructured + std::string(name), name);
+  for (const char* name : others) folder.write(kStructured + std::string(name), name);
+  folder.write(kSubmitted + std::string("structured-2026-11-20.jsonl"), "taken");
+  std::filesystem::create_directory(folder.path() / kSubmitted / "structured-2026-11-20-2.jsonl");
+  logs.dumpAllOldStructuredDataLogs();
+  EXPECT_EQ(submitted("structured-0000-01-01.jsonl"), earlier[0]);
+  EXPECT_EQ(submitted("structured-2026-11-20.jsonl"), "taken");
+  EXPECT_EQ(submitted("structured-2026-11-20-3.jsonl"), earlier[1]);
+  EXPECT_EQ(submitted("structured-2026-11-21.jsonl"), earlier[2]);
+  for (const char* name : earlier) EXPECT_EQ(structured(name), "");
+  for (const char* name : others) EXPECT_EQ(structured(name), name);
+  EXPECT_TRUE(log.lines().empty());
+}
+
+TEST_F(StructuredLogFilesTest, WhatIsNoFileOrTooLargeForTheSpoolStays) {
+  const auto at = folder.path() / kStructured / "2026-11-20.jsonl", target = folder / "target";
+  for (const support::Kind kind : support::kOtherKinds) {
+    support::put(kind, at, target);
+    logs.dumpAllOldStructuredDataLogs();
+    EXPECT_EQ(log.count("error: Could not move /var/spool/morvend/structured/2026-11-20.jsonl"), 1);
+    EXPECT_TRUE(support::untouched(kind, at, target));
+    std::filesystem::remove(at);
+    std::filesystem::remove(target);
+    log.clear();
+  }
+  folder.write(kSubmitted + std::string("kept"), "kept");
+  folder.write(kStructured + std::string("2026-11-20.jsonl"), "");
+  std::filesystem::resize_file(at, (64 << 20) + 1);
+  logs.dumpAllOldStructuredDataLogs();
+  EXPECT_EQ(log.count("error: "), 1);
+  EXPECT_TRUE(std::filesystem::exists(at));
+  EXPECT_EQ(submitted("kept"), "kept");
+}
+
+}  // namespace
+}  // namespace platform::host
