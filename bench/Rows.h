@@ -5,6 +5,15 @@
 
 namespace bench {
 
+// Start and end of the program, and whole reports, as processes.
+void addProcessRows(Table& table);
+
+// Reading and writing the counters store.
+void addCounterStoreRows(Table& table);
+
+// The whitelist lookup and the statistics of distributions.
+void addReportRows(Table& table);
+
 // Writing and reading a property list that looks like a report.
 void addPropertyListRows(Table& table);
 

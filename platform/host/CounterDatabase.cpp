@@ -112,7 +112,9 @@ bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error
   folderPath_ = *home + "/Library/Pelloran";
   folder_ = place_.root.openFolder(folderPath_, missing);
   if (folder_) return true;
-  if (creates || errno != ENOENT) error = folderPath_ + ": " + std::strerror(errno);
+  // EBADF: there is no device root.
+  if (!creates && (errno == ENOENT || errno == EBADF)) return false;
+  error = folderPath_ + ": " + std::strerror(errno);
   return false;
 }
 
@@ -193,10 +195,10 @@ void CounterDatabase::verify(Use use) {
   {
     const sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::read);
     sqlite::Statement userVersion(connection, "PRAGMA user_version");
-    if (userVersion.step()) version = userVersion.integer(0);
+    if (userVersion.step()) version = userVersion.column(0).integer();
     sqlite::Statement texts(connection,
                             "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL ORDER BY rowid");
-    while (texts.step()) schema.append(texts.text(0)).append(";");
+    while (texts.step()) schema.append(texts.column(0).bytes()).append(";");
   }
   if (connection.failure()) return;
   if (version > kVersion) {

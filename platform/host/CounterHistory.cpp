@@ -14,9 +14,6 @@ namespace {
 
 static_assert(std::endian::native == std::endian::little, "packed samples are little-endian");
 
-// Bounds of a query have 32 bits, so that a row's day does too, unless the column holds no integer.
-bool soundDayAndKey(const sqlite::Statement& rows) { return rows.isInteger(0) && rows.isText(1); }
-
 // The sound rows of a statement that delivers day, key and more, in the order of day and key.
 class Rows {
  public:
@@ -40,9 +37,11 @@ class Rows {
 
   void next() {
     while ((valid_ = statement_.step())) {
-      if (!soundDayAndKey(statement_) || !sound_(statement_)) continue;
-      day_ = static_cast<std::int32_t>(statement_.integer(0));
-      key_ = statement_.text(1);
+      const sqlite::Column day = statement_.column(0), key = statement_.column(1);
+      if (!day.isInteger() || !key.isText() || !sound_(statement_)) continue;
+      // The bounds of the query have 32 bits, and so has the day.
+      day_ = static_cast<std::int32_t>(day.integer());
+      key_ = key.bytes();
       if (key_.starts_with(keyPrefix_)) return;
     }
   }
@@ -73,12 +72,12 @@ class StoredSamples : public PLHistoryDistributionEnumerator {
 
   Samples getNextValues() override {
     for (; packedRows_.isAt(day_, key_); packedRows_.next(), unpacked_ = 0) {
-      if (const std::size_t count = unpack(packed_.blob(2))) return block(count);
+      if (const std::size_t count = unpack(packed_.column(2).bytes())) return block(count);
     }
     std::size_t count = 0;
     for (; count < kBlock && stagedRows_.isAt(day_, key_); stagedRows_.next(), ++count) {
-      values_[count] = staged_.real(3);
-      seconds_[count] = static_cast<std::int32_t>(staged_.integer(2));
+      values_[count] = staged_.column(3).real();
+      seconds_[count] = static_cast<std::int32_t>(staged_.column(2).integer());
     }
     return block(count);
   }
@@ -131,10 +130,10 @@ void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_
                            minDaysSince1970, maxDaysSince1970);
     bool stop = false;
     while (!stop && rows.step()) {
-      if (!soundDayAndKey(rows) || !rows.isInteger(2)) continue;
-      const std::string_view key = rows.text(1);
-      if (!key.starts_with(keyPrefix)) continue;
-      rowHandler(key, static_cast<std::int32_t>(rows.integer(0)), rows.integer(2), stop);
+      const sqlite::Column day = rows.column(0), key = rows.column(1), value = rows.column(2);
+      if (!day.isInteger() || !key.isText() || !value.isInteger()) continue;
+      if (!key.bytes().starts_with(keyPrefix)) continue;
+      rowHandler(key.bytes(), static_cast<std::int32_t>(day.integer()), value.integer(), stop);
     }
   });
 }
@@ -156,9 +155,11 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
         "ORDER BY day, key, rowid",
         minDaysSince1970, maxDaysSince1970);
     // The type of the data is known without reading them.
-    Rows packedRows(packed, keyPrefix, [](const sqlite::Statement& row) { return row.isBlob(2); });
-    Rows stagedRows(staged, keyPrefix,
-                    [](const sqlite::Statement& row) { return row.isInteger(2) && row.isReal(3); });
+    Rows packedRows(packed, keyPrefix,
+                    [](const sqlite::Statement& row) { return row.column(2).isBlob(); });
+    Rows stagedRows(staged, keyPrefix, [](const sqlite::Statement& row) {
+      return row.column(2).isInteger() && row.column(3).isReal();
+    });
     StoredSamples samples(packed, packedRows, staged, stagedRows);
     bool stop = false;
     while (!stop && (packedRows.valid() || stagedRows.valid())) {

@@ -1,7 +1,6 @@
 #include "platform/host/CounterStore.h"
 
 #include <cmath>
-#include <cstring>
 
 #include "platform/CivilDate.h"
 #include "platform/host/SQLite.h"
@@ -41,6 +40,11 @@ void record(sqlite::Connection& connection, const CounterChange& change) {
   }
 }
 
+template <typename T>
+void appendBytes(std::string& bytes, T value) {
+  bytes.append(reinterpret_cast<const char*>(&value), sizeof value);
+}
+
 // Moves the staged samples behind those that are packed already.
 void pack(sqlite::Connection& connection) {
   std::int64_t day = 0;
@@ -55,19 +59,17 @@ void pack(sqlite::Connection& connection) {
   sqlite::Statement staged(connection,
                            "SELECT day, key, seconds, value FROM staged ORDER BY day, key, rowid");
   while (staged.step()) {
-    if (!staged.isInteger(0) || !staged.isText(1) || !staged.isInteger(2) || !staged.isReal(3)) {
-      continue;
-    }
-    if (day != staged.integer(0) || key != staged.text(1) ||
+    const sqlite::Column itsDay = staged.column(0), itsKey = staged.column(1);
+    const sqlite::Column second = staged.column(2), value = staged.column(3);
+    if (!itsDay.isInteger() || !itsKey.isText() || !second.isInteger() || !value.isReal()) continue;
+    if (day != itsDay.integer() || key != itsKey.bytes() ||
         samples.size() == kMostSamplesInRow * kPackedSampleSize) {
       flush();
-      day = staged.integer(0);
-      key = staged.text(1);
+      day = itsDay.integer();
+      key = itsKey.bytes();
     }
-    const double value = staged.real(3);
-    const auto seconds = static_cast<std::int32_t>(staged.integer(2));
-    samples.append(reinterpret_cast<const char*>(&value), sizeof value);
-    samples.append(reinterpret_cast<const char*>(&seconds), sizeof seconds);
+    appendBytes(samples, value.real());
+    appendBytes(samples, static_cast<std::int32_t>(second.integer()));
   }
   flush();
   sqlite::Statement(connection, "DELETE FROM staged").run();
@@ -82,8 +84,8 @@ void dropOldDays(sqlite::Connection& connection) {
                              "SELECT max(day) AS day FROM scalars WHERE day < ?1 UNION ALL "
                              "SELECT max(day) FROM packed WHERE day < ?1)",
                              oldest);
-    if (!before.step() || !before.isInteger(0)) return;
-    oldest = before.integer(0);
+    if (!before.step() || !before.column(0).isInteger()) return;
+    oldest = before.column(0).integer();
   }
   sqlite::Statement(connection, "DELETE FROM scalars WHERE day < ?", oldest).run();
   sqlite::Statement(connection, "DELETE FROM packed WHERE day < ?", oldest).run();

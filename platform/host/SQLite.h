@@ -9,6 +9,7 @@
 #include <sqlite3.h>
 
 #include <concepts>
+#include <cstddef>
 #include <cstdint>
 #include <deque>
 #include <string>
@@ -81,6 +82,28 @@ struct Blob {
   std::string_view bytes;
 };
 
+// A value of a row. The value of another type than it has is not asked for.
+class Column {
+ public:
+  explicit Column(sqlite3_value* value) : value_(value) {}
+
+  bool isInteger() const { return sqlite3_value_type(value_) == SQLITE_INTEGER; }
+  bool isReal() const { return sqlite3_value_type(value_) == SQLITE_FLOAT; }
+  bool isText() const { return sqlite3_value_type(value_) == SQLITE_TEXT; }
+  bool isBlob() const { return sqlite3_value_type(value_) == SQLITE_BLOB; }
+
+  std::int64_t integer() const { return sqlite3_value_int64(value_); }
+  double real() const { return sqlite3_value_double(value_); }
+  // Of a text or a blob. A text is not copied for the sake of a closing NUL.
+  std::string_view bytes() const {
+    const void* start = sqlite3_value_blob(value_);
+    return {static_cast<const char*>(start), static_cast<std::size_t>(sqlite3_value_bytes(value_))};
+  }
+
+ private:
+  sqlite3_value* value_;
+};
+
 // One use of a prepared statement, reset at the end of its scope. The connection keeps the
 // statement for the next use under the address of its text, so that the text must be a constant.
 class Statement {
@@ -111,30 +134,10 @@ class Statement {
     }
   }
 
-  // The current row, columns from 0. Texts and blobs are borrowed until the next step.
-  bool isInteger(int column) const { return type(column) == SQLITE_INTEGER; }
-  bool isReal(int column) const { return type(column) == SQLITE_FLOAT; }
-  bool isText(int column) const { return type(column) == SQLITE_TEXT; }
-  bool isBlob(int column) const { return type(column) == SQLITE_BLOB; }
-  std::int64_t integer(int column) const { return sqlite3_column_int64(statement_, column); }
-  double real(int column) const { return sqlite3_column_double(statement_, column); }
-  std::string_view text(int column) const {
-    const void* bytes = sqlite3_column_text(statement_, column);
-    return view(bytes, column);
-  }
-  std::string_view blob(int column) const {
-    const void* bytes = sqlite3_column_blob(statement_, column);
-    return view(bytes, column);
-  }
+  // A column of the current row, from 0; borrowed until the next step.
+  Column column(int index) const { return Column(sqlite3_column_value(statement_, index)); }
 
  private:
-  int type(int column) const { return sqlite3_column_type(statement_, column); }
-  std::string_view view(const void* bytes, int column) const {
-    if (bytes == nullptr) return {};
-    return {static_cast<const char*>(bytes),
-            static_cast<std::size_t>(sqlite3_column_bytes(statement_, column))};
-  }
-
   template <std::integral Integer>
   int bind(int index, Integer value) {
     return sqlite3_bind_int64(statement_, index, value);

@@ -14,7 +14,7 @@ const std::string kLog = std::string(support::kDatabase) + "-wal";
 // A database with some pages of each kind, in the file and in the log.
 void fill(platform::host::CounterStore& store) {
   std::vector<std::string> keys;
-  for (int i = 0; i < 300; ++i) keys.push_back("some.counter." + std::to_string(i));
+  for (int i = 0; i < 80; ++i) keys.push_back("some.counter." + std::to_string(i));
   for (const bool early : {true, false}) {
     std::vector<CounterChange> changes;
     for (std::int32_t day = early ? 0 : 40; day < (early ? 50 : 70); day += 10) {
@@ -74,7 +74,12 @@ class Mutator {
   std::mt19937 random_;
 };
 
-TEST(CounterStoreDamage, NoDamageCrashesTheStoreAndWhatIsReportedIsSetAside) {
+constexpr unsigned kSeeds = 1000, kParts = 4;
+
+class SeededDamage : public testing::TestWithParam<unsigned> {};
+INSTANTIATE_TEST_SUITE_P(CounterStore, SeededDamage, testing::Range(0u, kParts));
+
+TEST_P(SeededDamage, NeverCrashesTheStoreAndWhatIsReportedIsSetAside) {
   std::string database, log;
   {
     const support::TemporaryFolder folder;
@@ -84,7 +89,7 @@ TEST(CounterStoreDamage, NoDamageCrashesTheStoreAndWhatIsReportedIsSetAside) {
     log = folder.read(kLog);
   }
   int setAside = 0, kept = 0;
-  for (unsigned seed = 0; seed < 1000; ++seed) {
+  for (unsigned seed = GetParam(); seed < kSeeds; seed += kParts) {
     SCOPED_TRACE(seed);
     Mutator mutator(seed);
     std::string damagedDatabase = database, damagedLog = log;
@@ -93,7 +98,7 @@ TEST(CounterStoreDamage, NoDamageCrashesTheStoreAndWhatIsReportedIsSetAside) {
 
     const support::TemporaryFolder folder;
     StoreFixture here(folder.path());
-    const bool whileOpen = seed % 4 == 0;
+    const bool whileOpen = mutator.below(4) == 0;
     if (whileOpen) {
       folder.write(support::kDatabase, database);
       folder.write(kLog, log);
@@ -114,10 +119,10 @@ TEST(CounterStoreDamage, NoDamageCrashesTheStoreAndWhatIsReportedIsSetAside) {
           here.rows();
           break;
         case 1:
-          writes(here.store.set("some.counter.100", 9, 40));
+          writes(here.store.set("some.counter.50", 9, 40));
           break;
         case 2:
-          writes(here.store.push("some.counter.100", 9, 60, 9));
+          writes(here.store.push("some.counter.50", 9, 60, 9));
           break;
         default:
           here.store.PLClientCheckpoint();
@@ -138,8 +143,8 @@ TEST(CounterStoreDamage, NoDamageCrashesTheStoreAndWhatIsReportedIsSetAside) {
     }
   }
   // Both kinds must be met, or the damage is of no use.
-  EXPECT_GT(setAside, 300);
-  EXPECT_GT(kept, 100);
+  EXPECT_GT(setAside, 75);
+  EXPECT_GT(kept, 25);
 }
 
 TEST(CounterStoreDamage, ASecondDamageReplacesTheFirstThatWasSetAside) {

@@ -1,0 +1,108 @@
+#include "tools/pelloran/Arguments.h"
+
+#include <charconv>
+#include <cmath>
+#include <limits>
+
+#include "platform/CivilDate.h"
+#include "platform/Convert.h"
+#include "platform/Text.h"
+
+namespace pelloran {
+
+using platform::Result;
+
+namespace {
+
+constexpr std::size_t kLongestKey = 1024;
+
+std::string quoted(std::string_view text) { return "'" + std::string(text) + "'"; }
+
+template <typename T>
+bool parsed(std::string_view text, T& value) {
+  const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+  return error == std::errc() && end == text.data() + text.size();
+}
+
+// Shortest forms only, no surrogates, nothing beyond U+10FFFF.
+bool isUtf8(std::string_view text) {
+  for (std::size_t i = 0; i < text.size();) {
+    const auto byte = [&](std::size_t at) -> std::uint32_t {
+      return at < text.size() ? static_cast<unsigned char>(text[at]) : 0;
+    };
+    const std::uint32_t first = byte(i++);
+    if (first < 0x80) continue;
+    const std::size_t more = first >= 0xf0 ? 3 : first >= 0xe0 ? 2 : 1;
+    if (first < 0xc2 || first > 0xf4) return false;
+    std::uint32_t character = first & (0x3fu >> more);
+    for (std::size_t n = 0; n < more; ++n, ++i) {
+      if ((byte(i) & 0xc0) != 0x80) return false;
+      character = character << 6 | (byte(i) & 0x3f);
+    }
+    if (more == 2 && (character < 0x800 || (character >= 0xd800 && character < 0xe000))) {
+      return false;
+    }
+    if (more == 3 && (character < 0x10000 || character > 0x10ffff)) return false;
+  }
+  return true;
+}
+
+}  // namespace
+
+std::string keyProblem(std::string_view key) {
+  if (key.empty()) return "the key is empty";
+  if (key.size() > kLongestKey) {
+    return platform::format("the key has %zu bytes, more than %zu", key.size(), kLongestKey);
+  }
+  if (key.find('\0') != std::string_view::npos) return "the key holds a NUL";
+  if (!isUtf8(key)) return "the key is not UTF-8";
+  return {};
+}
+
+Result<std::int32_t> parseDay(std::string_view text, std::int32_t today) {
+  if (text == "today") return Result<std::int32_t>::success(today);
+  if (text == "yesterday") return Result<std::int32_t>::success(platform::dayBefore(today));
+  std::int32_t day = 0;
+  if (parsed(text, day)) return Result<std::int32_t>::success(day);
+  return Result<std::int32_t>::failure(quoted(text) +
+                                       " is not a day: a day number, today or yesterday");
+}
+
+Result<std::int64_t> parseInteger(std::string_view text) {
+  std::int64_t value = 0;
+  if (parsed(text, value)) return Result<std::int64_t>::success(value);
+  return Result<std::int64_t>::failure(quoted(text) + " is not an integer of 64 bits");
+}
+
+Result<double> parseReal(std::string_view text) {
+  double value = 0;
+  if (parsed(text, value) && std::isfinite(value)) return Result<double>::success(value);
+  return Result<double>::failure(quoted(text) + " is not a finite number");
+}
+
+Result<std::int64_t> integral(double value) {
+  const double above = std::ldexp(1.0, 63);
+  if (std::trunc(value) != value || value < -above || value >= above) {
+    return Result<std::int64_t>::failure(platform::doubleText(value) +
+                                         " is not an integer of 64 bits");
+  }
+  return Result<std::int64_t>::success(platform::saturatingCast<std::int64_t>(value));
+}
+
+Result<std::int32_t> secondInDay(std::int64_t second) {
+  if (second >= 0 && second < platform::kSecondsPerDay) {
+    return Result<std::int32_t>::success(static_cast<std::int32_t>(second));
+  }
+  return Result<std::int32_t>::failure(std::to_string(second) +
+                                       " is not a second within a day, 0 to 86399");
+}
+
+Result<std::int32_t> dayOf(std::int64_t number) {
+  if (number >= std::numeric_limits<std::int32_t>::min() &&
+      number <= std::numeric_limits<std::int32_t>::max()) {
+    return Result<std::int32_t>::success(static_cast<std::int32_t>(number));
+  }
+  return Result<std::int32_t>::failure(std::to_string(number) + " is not a day number of 32 bits");
+}
+
+}  // namespace pelloran

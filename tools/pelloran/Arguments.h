@@ -1,0 +1,32 @@
+// The texts that a user names counters, days and values with. Pure functions; errors say what was
+// wrong with which text.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+#include "platform/Result.h"
+
+namespace pelloran {
+
+// What is wrong with a key, or the empty text. A key is 1 to 1,024 bytes of UTF-8 without a NUL.
+std::string keyProblem(std::string_view key);
+
+// A day number, or "today" or "yesterday".
+platform::Result<std::int32_t> parseDay(std::string_view text, std::int32_t today);
+
+platform::Result<std::int64_t> parseInteger(std::string_view text);
+
+// A finite number.
+platform::Result<double> parseReal(std::string_view text);
+
+// An integral number of the range as a 64-bit integer.
+platform::Result<std::int64_t> integral(double value);
+
+// A second within a day.
+platform::Result<std::int32_t> secondInDay(std::int64_t second);
+
+platform::Result<std::int32_t> dayOf(std::int64_t number);
+
+}  // namespace pelloran

@@ -1,0 +1,273 @@
+#include "tools/pelloran/Pelloran.h"
+
+#include <CLI/CLI.hpp>
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+#include <istream>
+#include <limits>
+#include <optional>
+#include <ostream>
+#include <unordered_set>
+
+#include "platform/Convert.h"
+#include "tools/pelloran/Arguments.h"
+#include "tools/pelloran/ImportLine.h"
+#include "tools/pelloran/MachineFigures.h"
+#include "tools/pelloran/Show.h"
+
+namespace pelloran {
+
+namespace {
+
+using platform::host::CounterChange;
+
+constexpr int kDone = 0, kFailed = 1, kUsage = 2;
+constexpr std::size_t kLongestLine = std::size_t{1} << 20;
+constexpr std::size_t kLinesBetweenProgress = 50000;
+constexpr double kLongestSampling = 366 * 86400.0;
+
+// One line on a terminal that is written over again and again.
+class Progress {
+ public:
+  explicit Progress(const Environment& environment)
+      : err_(environment.err), shown_(environment.errIsTerminal) {}
+  ~Progress() { clear(); }
+  void show(const std::string& text) {
+    if (shown_) err_ << "\r\x1b[K" << text << std::flush;
+  }
+  void clear() { show(""); }
+
+ private:
+  std::ostream& err_;
+  bool shown_;
+};
+
+// What the command line says, as text; each command looks at its own part.
+struct Arguments {
+  std::string key, value, prefix;
+  std::optional<std::string> day, seconds, file, every, lasting;
+  bool json = false;
+};
+
+class Command {
+ public:
+  Command(const Environment& environment, const Arguments& arguments)
+      : environment_(environment), arguments_(arguments), now_(momentOf(environment.clock.now())) {}
+
+  int change(CounterChange::Kind kind) {
+    CounterChange change{
+        .kind = kind, .key = arguments_.key, .day = now_.day, .seconds = now_.second};
+    if (const std::string problem = keyProblem(change.key); !problem.empty()) return usage(problem);
+    if (arguments_.day && !given(parseDay(*arguments_.day, now_.day), change.day)) return kUsage;
+    if (kind == CounterChange::Kind::push) {
+      if (!given(parseReal(arguments_.value), change.sample)) return kUsage;
+    } else if (!given(parseInteger(arguments_.value), change.amount)) {
+      return kUsage;
+    }
+    if (arguments_.seconds) {
+      std::int64_t seconds = 0;
+      if (!given(parseInteger(*arguments_.seconds), seconds)) return kUsage;
+      if (!given(secondInDay(seconds), change.seconds)) return kUsage;
+    }
+    return outcome(environment_.store.apply({&change, 1}));
+  }
+
+  int import() {
+    if (!arguments_.file) return import(environment_.in, "line ");
+    std::ifstream file(*arguments_.file, std::ios::binary);
+    if (!file) return failed(*arguments_.file + ": " + std::strerror(errno));
+    return import(file, *arguments_.file + ":");
+  }
+
+  int show() {
+    Shown shown{arguments_.prefix, std::numeric_limits<std::int32_t>::min(),
+                std::numeric_limits<std::int32_t>::max()};
+    if (arguments_.day) {
+      if (!given(parseDay(*arguments_.day, now_.day), shown.firstDay)) return kUsage;
+      shown.lastDay = shown.firstDay;
+    }
+    const auto history = environment_.store.history();
+    (arguments_.json ? showJsonLines : showTable)(*history, shown, environment_.out);
+    environment_.out.flush();
+    if (!environment_.out) return failed("the output can't be written");
+    // The log has said why.
+    return history->failed() ? kFailed : kDone;
+  }
+
+  int sample() {
+    if (arguments_.every.has_value() != arguments_.lasting.has_value()) {
+      return usage("--every and --for need each other");
+    }
+    double every = 1, lasting = 0;
+    if (arguments_.every) {
+      if (!given(parseReal(*arguments_.every), every)) return kUsage;
+      if (!given(parseReal(*arguments_.lasting), lasting)) return kUsage;
+      if (every < 0.1 || lasting < 0 || lasting > kLongestSampling) {
+        return usage("--every takes 0.1 seconds or more, --for up to a year");
+      }
+    }
+    const auto start = std::chrono::steady_clock::now();
+    const auto readings = platform::saturatingCast<std::int64_t>(lasting / every) + 1;
+    Progress progress(environment_);
+    for (std::int64_t reading = 1; reading <= readings; ++reading) {
+      if (const std::string error = record(readMachineFigures(environment_.figuresRoot));
+          !error.empty()) {
+        progress.clear();
+        return failed(error);
+      }
+      if (reading == readings) break;
+      progress.show("reading " + std::to_string(reading) + " of " + std::to_string(readings));
+      environment_.waitUntil(
+          start + std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                      std::chrono::duration<double>(every * static_cast<double>(reading))));
+    }
+    return kDone;
+  }
+
+ private:
+  int failed(const std::string& why) {
+    environment_.err << "pelloran: " << why << '\n';
+    return kFailed;
+  }
+  int usage(const std::string& why) {
+    failed(why);
+    return kUsage;
+  }
+  template <typename From, typename To>
+  bool given(const platform::Result<From>& result, To& value) {
+    if (!result) {
+      usage(result.error);
+      return false;
+    }
+    value = *result;
+    return true;
+  }
+  int outcome(const std::string& error) { return error.empty() ? kDone : failed(error); }
+
+  // Reads everything before anything is written: nobody else waits while lines trickle in.
+  int import(std::istream& in, const std::string& place) {
+    std::unordered_set<std::string> keys;
+    std::vector<CounterChange> changes;
+    std::string buffer(kLongestLine + 1, '\0');
+    std::size_t number = 0;
+    Progress progress(environment_);
+    const auto wrong = [&](const std::string& why) {
+      progress.clear();
+      return failed(place + std::to_string(number) + ": " + why);
+    };
+    while (in) {
+      ++number;
+      in.getline(buffer.data(), static_cast<std::streamsize>(buffer.size()));
+      auto length = static_cast<std::size_t>(in.gcount());
+      if (in.bad()) return wrong("it can't be read");
+      if (in.fail() && length > 0) return wrong("longer than 1 MiB");
+      if (in.good()) --length;  // the line feed
+      const std::string_view line(buffer.data(), length);
+      if (line.find_first_not_of(" \t\r") == std::string_view::npos) continue;
+      auto parsed = parseImportLine(line, now_);
+      if (!parsed) return wrong(parsed.error);
+      parsed->change.key = *keys.insert(std::move(parsed->key)).first;
+      changes.push_back(parsed->change);
+      if (number % kLinesBetweenProgress == 0)
+        progress.show(std::to_string(number) + " lines read");
+    }
+    if (changes.empty()) return kDone;
+    if (number >= kLinesBetweenProgress) {
+      progress.show("writing " + std::to_string(changes.size()) + " changes");
+    }
+    const std::string error = environment_.store.apply(changes);
+    progress.clear();
+    return outcome(error);
+  }
+
+  std::string record(const MachineFigures& figures) {
+    const Moment now = momentOf(environment_.clock.now());
+    std::vector<CounterChange> changes;
+    for (const auto& [key, count] : figures.counts) {
+      changes.push_back(
+          {.kind = CounterChange::Kind::set, .key = key, .day = now.day, .amount = count});
+    }
+    for (const auto& [key, value] : figures.measurements) {
+      changes.push_back({.kind = CounterChange::Kind::push,
+                         .key = key,
+                         .day = now.day,
+                         .sample = value,
+                         .seconds = now.second});
+    }
+    if (changes.empty()) return "this machine shows no figures";
+    return environment_.store.apply(changes);
+  }
+
+  const Environment& environment_;
+  const Arguments& arguments_;
+  Moment now_;
+};
+
+}  // namespace
+
+int runPelloran(const Environment& environment, int argc, const char* const* argv) {
+  Arguments arguments;
+  int (*work)(Command&) = nullptr;
+  const auto runs = [&work](CLI::App* command, int (*itsWork)(Command&)) {
+    command->callback([&work, itsWork] { work = itsWork; });
+  };
+
+  CLI::App app("Writes and reads the counters of a device.", "pelloran");
+  app.set_version_flag("--version", "pelloran " MORVEND_VERSION);
+  app.require_subcommand(1);
+
+  struct {
+    const char *name, *description, *valueDescription;
+    int (*work)(Command&);
+  } const writers[] = {
+      {"set", "Set a counter", "an integer",
+       [](Command& command) { return command.change(CounterChange::Kind::set); }},
+      {"add", "Add to a counter", "an integer",
+       [](Command& command) { return command.change(CounterChange::Kind::add); }},
+      {"push", "Add a sample to a distribution", "a number",
+       [](Command& command) { return command.change(CounterChange::Kind::push); }},
+  };
+  constexpr char dayDescription[] = "a day number, today or yesterday";
+  for (const auto& writer : writers) {
+    CLI::App* command = app.add_subcommand(writer.name, writer.description);
+    command->add_option("KEY", arguments.key, "the counter")->required();
+    command->add_option("VALUE", arguments.value, writer.valueDescription)->required();
+    command->add_option("--day", arguments.day, std::string(dayDescription) + "; default: today");
+    if (std::string_view(writer.name) == "push") {
+      command->add_option("--seconds", arguments.seconds, "second within the day; default: now");
+    }
+    runs(command, writer.work);
+  }
+
+  CLI::App* import = app.add_subcommand("import", "Record many changes at once, all or none");
+  import->add_option("FILE", arguments.file, "JSON Lines; default: standard input");
+  import->footer(
+      "Each line: {\"set\"|\"add\"|\"push\": KEY, \"value\": NUMBER, \"day\": D, \"seconds\": S}\n"
+      "The day and the seconds may be left out: now.");
+  runs(import, [](Command& command) { return command.import(); });
+
+  CLI::App* show = app.add_subcommand("show", "Print what is recorded");
+  show->add_option("--day", arguments.day, std::string(dayDescription) + "; default: all");
+  show->add_option("--prefix", arguments.prefix, "only keys that begin so");
+  show->add_flag("--json", arguments.json, "as JSON Lines, with every sample");
+  runs(show, [](Command& command) { return command.show(); });
+
+  CLI::App* sample = app.add_subcommand(
+      "sample", "Record this machine's own figures, under keys that begin with host.");
+  sample->add_option("--every", arguments.every, "seconds between two readings");
+  sample->add_option("--for", arguments.lasting, "seconds in which readings are made");
+  runs(sample, [](Command& command) { return command.sample(); });
+
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) return app.exit(error, environment.out, environment.err);
+    environment.err << "pelloran: " << error.what() << '\n';
+    return kUsage;
+  }
+  Command command(environment, arguments);
+  return work(command);
+}
+
+}  // namespace pelloran

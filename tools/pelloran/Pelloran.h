@@ -1,0 +1,29 @@
+// The command pelloran: writes and reads the counters.
+#pragma once
+
+#include <chrono>
+#include <functional>
+#include <iosfwd>
+#include <string>
+
+#include "platform/Clock.h"
+#include "platform/host/CounterStore.h"
+
+namespace pelloran {
+
+struct Environment {
+  platform::host::CounterStore& store;
+  platform::Clock& clock;
+  std::istream& in;
+  std::ostream& out;
+  std::ostream& err;
+  bool errIsTerminal;       // then long work shows its progress there
+  std::string figuresRoot;  // below which proc and sys lie; "/" for this machine
+  std::function<void(std::chrono::steady_clock::time_point)> waitUntil;
+};
+
+// Runs one command line. Returns the exit status: 0 done; 1 the work failed, with one line on `err`
+// or in the log; 2 wrong usage.
+int runPelloran(const Environment& environment, int argc, const char* const* argv);
+
+}  // namespace pelloran

@@ -1,0 +1,133 @@
+#include "tools/pelloran/Show.h"
+
+#include <algorithm>
+#include <array>
+#include <nlohmann/json.hpp>
+#include <ostream>
+#include <string>
+#include <tuple>
+#include <vector>
+
+#include "platform/CivilDate.h"
+#include "platform/Text.h"
+
+namespace pelloran {
+
+namespace {
+
+using platform::PLHistoryDistributionEnumerator;
+
+struct Row {
+  std::int32_t day;
+  std::string key, text;
+};
+
+// The rows with their values as text, ordered.
+template <typename ScalarText, typename DistributionText>
+std::vector<Row> rowsOf(platform::PLHistory& history, const Shown& shown, ScalarText scalarText,
+                        DistributionText distributionText) {
+  std::vector<Row> rows;
+  history.scalarsForKeyPrefix(
+      shown.prefix, shown.firstDay, shown.lastDay,
+      [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
+        rows.push_back({day, std::string(key), scalarText(value)});
+      });
+  history.distributionsForKeyPrefix(
+      shown.prefix, shown.firstDay, shown.lastDay,
+      [&](std::string_view key, std::int32_t day, PLHistoryDistributionEnumerator& samples, bool&) {
+        rows.push_back({day, std::string(key), distributionText(samples)});
+      });
+  std::stable_sort(rows.begin(), rows.end(), [](const Row& a, const Row& b) {
+    return std::tie(a.day, a.key) < std::tie(b.day, b.key);
+  });
+  return rows;
+}
+
+std::string jsonText(std::string_view text) {
+  return nlohmann::json(text).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+}
+
+// Always with a fraction or an exponent; what JSON has no number for is null.
+std::string jsonReal(double value) { return nlohmann::json(value).dump(); }
+
+std::string scalarText(std::int64_t value) { return std::to_string(value); }
+
+std::string samplesAsJson(PLHistoryDistributionEnumerator& samples) {
+  std::string text = "[";
+  for (auto block = samples.getNextValues(); !block.values.empty();
+       block = samples.getNextValues()) {
+    for (std::size_t i = 0; i < block.values.size(); ++i) {
+      if (text.size() > 1) text += ", ";
+      text += "[" + std::to_string(block.secondsInDayOffsets[i]) + ", " +
+              jsonReal(block.values[i]) + "]";
+    }
+  }
+  return text + "]";
+}
+
+std::string summary(PLHistoryDistributionEnumerator& samples) {
+  std::uint64_t count = 0;
+  double least = 0, most = 0, mean = 0;
+  for (auto block = samples.getNextValues(); !block.values.empty();
+       block = samples.getNextValues()) {
+    for (const double value : block.values) {
+      least = count == 0 ? value : std::min(least, value);
+      most = count == 0 ? value : std::max(most, value);
+      mean += (value - mean) / static_cast<double>(++count);
+    }
+  }
+  std::string text = "count " + std::to_string(count);
+  if (count == 0) return text;
+  return text + platform::format("  min %.6g  mean %.6g  max %.6g", least, mean, most);
+}
+
+// A key as a terminal may show it: nothing in it moves the cursor.
+std::string printable(std::string key) {
+  for (char& c : key) {
+    if (static_cast<unsigned char>(c) < 0x20 || c == 0x7f) c = '?';
+  }
+  return key;
+}
+
+std::string dateText(std::int32_t day) {
+  const platform::CivilDate date = platform::civilFromDays(day);
+  return platform::format("%04lld-%02d-%02d", static_cast<long long>(date.year), date.month,
+                          date.day);
+}
+
+}  // namespace
+
+void showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
+  std::vector<std::array<std::string, 4>> lines = {{"DAY", "DATE", "KEY", "VALUE"}};
+  for (Row& row : rowsOf(history, shown, scalarText, summary)) {
+    lines.push_back({std::to_string(row.day), dateText(row.day), printable(std::move(row.key)),
+                     std::move(row.text)});
+  }
+  if (lines.size() == 1) return;
+  std::array<std::size_t, 3> widths{};
+  for (const auto& line : lines) {
+    for (std::size_t i = 0; i < widths.size(); ++i) {
+      widths[i] = std::max(widths[i], line[i].size());
+    }
+  }
+  for (const auto& line : lines) {
+    for (std::size_t i = 0; i < widths.size(); ++i) {
+      out << line[i] << std::string(widths[i] - line[i].size() + 2, ' ');
+    }
+    out << line.back() << '\n';
+  }
+}
+
+void showJsonLines(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
+  const auto rows = rowsOf(
+      history, shown, [](std::int64_t value) { return "\"value\": " + std::to_string(value); },
+      [](PLHistoryDistributionEnumerator& samples) {
+        return "\"samples\": " + samplesAsJson(samples);
+      });
+  for (const Row& row : rows) {
+    out << "{\"day\": " << row.day << ", \"key\": " << jsonText(row.key) << ", " << row.text
+        << "}\n";
+  }
+}
+
+}  // namespace pelloran
