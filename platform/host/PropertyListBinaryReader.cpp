@@ -19,7 +19,7 @@ constexpr std::uint64_t kTrailerSize = 32;
 constexpr double kSecondsFrom1970To2001 = 978307200;
 
 // What a file may expand to: shared objects are read once for each reference.
-constexpr std::uint64_t kFreeObjects = 65536;  // plus one for each byte of the file
+constexpr std::uint64_t kFreeObjects = 4096;  // plus one for each byte of the file
 constexpr std::uint64_t kMaximumObjects = std::uint64_t{4} << 20;
 constexpr std::uint64_t kMaximumContent = std::uint64_t{64} << 20;  // bytes of text and data
 
