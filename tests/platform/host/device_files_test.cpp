@@ -1,0 +1,313 @@
+// The services that answer from files below device/, and from the host where those are missing.
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "platform/FaultwatchSupport.h"
+#include "platform/host/DeviceFile.h"
+#include "platform/host/HostApplications.h"
+#include "platform/host/HostDeviceProperties.h"
+#include "platform/host/HostKernel.h"
+#include "platform/host/HostLibraryLoader.h"
+#include "platform/host/HostLocale.h"
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/HostSystemVersion.h"
+#include "platform/host/MD5Digest.h"
+#include "platform/testing/RecordingLog.h"
+#include "support/TemporaryFolder.h"
+
+namespace {
+
+using namespace platform;
+using namespace platform::host;
+using BundleType = InstalledApplications::BundleType;
+using Texts = std::vector<std::string>;
+
+class DeviceFiles : public testing::Test {
+ protected:
+  void writePlist(const char* path, const Value& value) {
+    folder.write(path, *codec.writeXML(value));
+  }
+
+  support::TemporaryFolder folder;
+  DeviceRoot root{folder.path().string()};
+  HostPropertyListCodec codec;
+  fakes::RecordingLog log;
+};
+
+TEST_F(DeviceFiles, ABrokenFileIsSaidOnceAndCountsAsMissing) {
+  folder.write("device/broken.plist", "<plist><dict>");
+  std::filesystem::create_directories(folder / "device/folder.plist");
+  ASSERT_EQ(::mkfifo((folder / "device/fifo.plist").c_str(), 0600), 0);
+  std::filesystem::create_symlink("loop.plist", folder / "device/loop.plist");
+  std::ofstream(folder / "device/long.plist");
+  std::filesystem::resize_file(folder / "device/long.plist", kMaximumPropertyListSize + 1);
+  for (const char* name : {"broken", "folder", "fifo", "loop", "long"}) {
+    const std::string path = std::string("device/") + name + ".plist";
+    DeviceFile file(root, codec, log, path);
+    for (int i = 0; i < 2; ++i) EXPECT_EQ(file.value(), nullptr) << name;
+    EXPECT_EQ(log.count("error: " + path + ": "), 1) << name;
+  }
+  log.clear();
+  DeviceFile missing(root, codec, log, "device/missing.plist");
+  EXPECT_EQ(missing.value(), nullptr);
+  const DeviceRoot nowhere("/nonexistent");
+  DeviceFile rootless(nowhere, codec, log, "device/missing.plist");
+  EXPECT_EQ(rootless.value(), nullptr);
+  EXPECT_TRUE(log.lines().empty());
+}
+
+TEST_F(DeviceFiles, KernelValuesComeInTheirForms) {
+  writePlist("device/kernel.plist", Dictionary{{"integer", std::int64_t{0x0102030405060708}},
+                                               {"negative", std::int64_t{-2}},
+                                               {"data", Data{9, 8, 7}},
+                                               {"text", "abc"},
+                                               {"busy", Dictionary{{"Error", std::int64_t{EBUSY}}}},
+                                               {"no number", Dictionary{{"Error", "x"}}},
+                                               {"success?", Dictionary{{"Error", std::int64_t{0}}}},
+                                               {"hw.pagesize", std::int64_t{16384}}});
+  HostKernel kernel(root, codec, log);
+  const struct {
+    const char* name;
+    std::size_t room;
+    int error;
+    std::string bytes;
+  } rows[] = {
+      {"integer", 4, 0, "\x08\x07\x06\x05"},
+      {"integer", 8, 0, "\x08\x07\x06\x05\x04\x03\x02\x01"},
+      {"integer", 12, 0, "\x08\x07\x06\x05\x04\x03\x02\x01"},
+      {"negative", 4, 0, "\xFE\xFF\xFF\xFF"},
+      {"data", 3, 0, "\x09\x08\x07"},
+      {"data", 2, ENOMEM, ""},
+      {"text", 4, 0, std::string("abc", 4)},
+      {"text", 3, ENOMEM, ""},
+      {"busy", 8, EBUSY, ""},
+      {"no number", 8, EIO, ""},
+      {"success?", 8, EIO, ""},
+      {"unknown", 8, ENOENT, ""},
+      {"kern.next_ecc_event", 72, ENOENT, ""},
+  };
+  for (const auto& row : rows) {
+    std::string buffer(16, '#');
+    const auto result = kernel.sysctlbyname(
+        row.name,
+        std::as_writable_bytes(std::span(buffer).first(std::min<std::size_t>(row.room, 16))));
+    EXPECT_EQ(result.error, row.error) << row.name << " " << row.room;
+    EXPECT_EQ(result.length, row.bytes.size()) << row.name << " " << row.room;
+    EXPECT_EQ(buffer, row.bytes + std::string(16 - row.bytes.size(), '#')) << row.name;
+  }
+  EXPECT_EQ(kernel.pageSize(), 16384u);
+}
+
+TEST_F(DeviceFiles, TheHostAnswersForTheKernelWhereItCan) {
+  HostKernel kernel(root, codec, log);
+  std::string text(64, '#');
+  EXPECT_EQ(
+      kernel.sysctlbyname("kern.bootsessionuuid", std::as_writable_bytes(std::span(text))).length,
+      37u);
+  EXPECT_EQ(text.find_first_not_of("0123456789ABCDEF-"), 36u);
+  for (const auto& [room, length] : {std::pair{32u, 32u}, {40u, 32u}, {31u, 8u}, {8u, 8u}}) {
+    std::vector<std::byte> record(room);
+    EXPECT_EQ(kernel.sysctlbyname("vm.swapusage", record).length, length) << room;
+  }
+  EXPECT_EQ(kernel.pageSize(), static_cast<std::uint64_t>(::sysconf(_SC_PAGESIZE)));
+  const auto before = kernel.absoluteTime();
+  EXPECT_GE(kernel.absoluteTime(), before);
+}
+
+TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
+  writePlist("device/kernel.plist",
+             Dictionary{{"kern.next_ecc_event", Dictionary{{"Error", std::int64_t{EBUSY}}}}});
+  folder.write("device/ecc-events/2", "two");
+  folder.write("device/ecc-events/10", "ten");
+  folder.write("device/ecc-events/3", std::string(73, '3'));
+  folder.write("outside", "outside");
+  std::filesystem::create_symlink("../../outside", folder / "device/ecc-events/1-link");
+  std::filesystem::create_directories(folder / "device/ecc-events/1-folder");
+  HostKernel kernel(root, codec, log);
+  std::string buffer(72, '\0');
+  const auto read = [&] {
+    return kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
+  };
+  for (const std::string_view expected : {"ten", "two"}) {
+    EXPECT_EQ(read().length, expected.size());
+    EXPECT_TRUE(buffer.starts_with(expected)) << expected;
+  }
+  EXPECT_EQ(read().error, ENOMEM);
+  std::filesystem::remove(folder / "device/ecc-events/3");
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(folder.read("outside"), "outside");
+}
+
+TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
+  DeviceFile file(root, codec, log, "device/properties.plist");
+  HostDeviceProperties none(root, file);
+  EXPECT_FALSE(none.booleanProperty("InternalBuild"));
+  EXPECT_EQ(none.multiUserIndicator(), std::nullopt);
+  writePlist("device/properties.plist",
+             Dictionary{{"InternalBuild", true}, {"MultiUser", std::int64_t{1}}});
+  DeviceFile written(root, codec, log, "device/properties.plist");
+  HostDeviceProperties properties(root, written);
+  EXPECT_TRUE(properties.booleanProperty("InternalBuild"));
+  EXPECT_EQ(properties.multiUserIndicator(), 1u);
+
+  folder.write("var/containers/systemgroup/there/file", "");
+  std::uint64_t error = 1;
+  EXPECT_EQ(properties.systemGroupContainerPath("there", error),
+            "/var/containers/systemgroup/there");
+  EXPECT_EQ(error, 1u);
+  for (const auto name : {std::string_view("absent"), std::string_view(), std::string_view("."),
+                          std::string_view(".."), std::string_view("there/file"),
+                          std::string_view("../systemgroup"), std::string_view("there\0x", 7)}) {
+    error = 1;
+    EXPECT_EQ(properties.systemGroupContainerPath(name, error), std::nullopt) << name;
+    EXPECT_EQ(error, 2u) << name;
+  }
+}
+
+TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesElseTheHosts) {
+  const struct {
+    const char *release, *text;
+  } rows[] = {
+      {"NAME=x\nVERSION_ID=\"12\"\nBUILD_ID='b\\'1'\n", "12 (b'1)"},
+      {"VERSION_ID=12", "12 (12)"},
+      {"BUILD_ID=rolling\nXVERSION_ID=1\nVERSION_IDX=2\n", "rolling"},
+      {"", ""},
+  };
+  const std::string release = (folder / "os-release").string();
+  for (const auto& row : rows) {
+    folder.write("os-release", row.release);
+    EXPECT_EQ(HostSystemVersion(root, codec, log, release).operatingSystemVersion(), row.text);
+  }
+  EXPECT_EQ(HostSystemVersion(root, codec, log, release).systemVersionDictionary(), std::nullopt);
+  writePlist("device/system-version.plist",
+             Dictionary{{"ProductVersion", "7.1"}, {"ProductBuildVersion", "7B2"}});
+  EXPECT_EQ(HostSystemVersion(root, codec, log).operatingSystemVersion(), "7.1 (7B2)");
+}
+
+TEST_F(DeviceFiles, LanguagesComeFromTheEnvironmentUnlessTheDeviceSaysThem) {
+  const struct {
+    const char *language, *lang;
+    Texts preferred;
+    std::optional<std::string> country;
+  } rows[] = {
+      {"", "de_AT.UTF-8@euro", {"de-AT"}, "AT"},
+      {"fr_CA:fr:en", "de_AT", {"fr-CA", "fr", "en"}, "AT"},
+      {"", "C.UTF-8", {}, std::nullopt},
+      {"::", "POSIX", {}, std::nullopt},
+      {"", "eo", {"eo"}, std::nullopt},
+      {"", "", {}, std::nullopt},
+  };
+  for (const auto& row : rows) {
+    ::setenv("LANGUAGE", row.language, 1);
+    ::setenv("LANG", row.lang, 1);
+    HostLocale locale(root, codec, log);
+    EXPECT_EQ(locale.preferredLanguages(), row.preferred) << row.lang;
+    EXPECT_EQ(locale.countryCode(), row.country) << row.lang;
+    EXPECT_EQ(locale.systemLocalizations(), Texts{"en"});
+  }
+  ::setenv("LANG", "de_AT", 1);
+  writePlist("device/locale.plist",
+             Dictionary{{"PreferredLanguages", Array{"ja", std::int64_t{1}}}});
+  HostLocale locale(root, codec, log);
+  EXPECT_EQ(locale.preferredLanguages(), Texts{"ja"});
+  EXPECT_EQ(locale.systemLocalizations(), Texts{});
+  EXPECT_EQ(locale.countryCode(), std::nullopt);
+}
+
+TEST_F(DeviceFiles, TheBestMatchIsTheLongestPrefixOfEachLanguage) {
+  const struct {
+    Texts localizations, preferred, best;
+  } rows[] = {
+      {{"en", "de", "de-AT"}, {"de-AT"}, {"de-AT"}},
+      {{"en", "zh", "zh-hant"}, {"zh-Hant-TW"}, {"zh-hant"}},
+      {{"en", "d", "de"}, {"den", "de-CH", "DE"}, {"de"}},
+      {{"fr", "en"}, {"ja", "en-US", "fr"}, {"en", "fr"}},
+      {{"fr", "en"}, {"ja"}, {"fr"}},
+      {{"fr", "en"}, {}, {"fr"}},
+      {{}, {"en"}, {}},
+      {{""}, {"en", ""}, {""}},
+  };
+  HostLocale locale(root, codec, log);
+  for (const auto& row : rows) {
+    EXPECT_EQ(locale.bestMatch(row.localizations, row.preferred), row.best);
+  }
+}
+
+TEST_F(DeviceFiles, ApplicationsAreTheDictionariesOfTheArray) {
+  std::vector<BundleType> types;
+  const auto collect = [&](BundleType type) { types.push_back(type); };
+  HostApplications(root, codec, log).enumerateBundles(collect);
+  EXPECT_TRUE(types.empty());
+  writePlist("device/applications.plist",
+             Array{Dictionary{{"Type", "User"}}, Dictionary{{"Type", "user"}}, "x", Dictionary{}});
+  HostApplications(root, codec, log).enumerateBundles(collect);
+  EXPECT_EQ(types, (std::vector{BundleType::user, BundleType::system, BundleType::system}));
+}
+
+struct CountingPreferences : PreferenceStore {
+  std::optional<Value> QNSPreferencesGetValue(std::string_view key,
+                                              std::string_view domain) override {
+    EXPECT_EQ(std::string(domain) + " " + std::string(key), "domain key");
+    return value;
+  }
+  void QNSPreferencesSetValue(std::string_view, const Value* newValue, std::string_view) override {
+    value = *newValue;
+  }
+  void QNSPreferencesSynchronize(std::string_view) override {}
+
+  Value value = std::int64_t{41};
+};
+
+TEST_F(DeviceFiles, ALibraryOfTheDeviceActsOnThisProcessesPreferences) {
+  CountingPreferences preferences;
+  HostLibraryLoader loader(root, preferences);
+  EXPECT_EQ(loader.load(kFaultwatchSupportPath), nullptr);
+  const auto place = folder / std::string_view(kFaultwatchSupportPath).substr(1);
+  std::filesystem::create_directories(place.parent_path());
+  // A link leads nowhere outside the root.
+  std::filesystem::create_symlink(FAULTWATCH_SUPPORT_MODULE, place);
+  EXPECT_EQ(loader.load(kFaultwatchSupportPath), nullptr);
+  std::filesystem::remove(place);
+  folder.write("not-a-library", "text");
+  EXPECT_EQ(loader.load("/not-a-library"), nullptr);
+  EXPECT_EQ(loader.load("/System"), nullptr);
+
+  std::filesystem::copy_file(FAULTWATCH_SUPPORT_MODULE, place);
+  void* library = loader.load(kFaultwatchSupportPath);
+  ASSERT_NE(library, nullptr);
+  EXPECT_EQ(loader.load(kFaultwatchSupportPath), library);
+  auto* get = reinterpret_cast<QNSPreferencesGetIntegerValueFunction*>(
+      loader.symbol(library, "QNSPreferencesGetIntegerValue"));
+  auto* set = reinterpret_cast<QNSPreferencesSetValueFunction*>(
+      loader.symbol(library, "QNSPreferencesSetValue"));
+  ASSERT_TRUE(get != nullptr && set != nullptr);
+  bool found = false;
+  EXPECT_EQ(get("key", "domain", &found), 41);
+  EXPECT_TRUE(found);
+  const Value zero(std::int64_t{0});
+  set("key", &zero, "domain");
+  EXPECT_EQ(preferences.value, zero);
+  EXPECT_EQ(loader.symbol(library, "QNSPreferencesSynchronize"), nullptr);
+}
+
+TEST(MD5, TheVectorsOfItsDefinition) {
+  const struct {
+    const char *text, *digest;
+  } rows[] = {{"", "d41d8cd98f00b204e9800998ecf8427e"},
+              {"abc", "900150983cd24fb0d6963f7d28e17f72"},
+              {"12345678901234567890123456789012345678901234567890123456789012345678901234567890",
+               "57edf4a22be3c955ac49da2e2107b67a"}};
+  for (const auto& row : rows) {
+    std::string hex;
+    for (const int byte : MD5Digest().md5(row.text)) {
+      hex += {"0123456789abcdef"[byte >> 4], "0123456789abcdef"[byte & 15]};
+    }
+    EXPECT_EQ(hex, row.digest);
+  }
+}
+
+}  // namespace
