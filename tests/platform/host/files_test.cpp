@@ -97,15 +97,5 @@ TEST(Files, AnUnfinishedLineIsRemovedBeforeOneIsAppended) {
   }
 }
 
-TEST(Files, NamesThatLeaveTheirFolderAreNotPlain) {
-  for (const std::string_view name :
-       {std::string_view(""), std::string_view("."), std::string_view(".."),
-        std::string_view("a/b"), std::string_view("/"), std::string_view("a\0b", 3),
-        std::string_view("five5")}) {
-    EXPECT_FALSE(isPlainFileName(name, 4)) << name;
-  }
-  for (const char* name : {"a", "...", ".a", "a..", " "}) EXPECT_TRUE(isPlainFileName(name, 4));
-}
-
 }  // namespace
 }  // namespace platform::host
