@@ -1,6 +1,5 @@
 #include "platform/host/Bus.h"
 
-#include <poll.h>
 #include <systemd/sd-bus.h>
 #include <systemd/sd-event.h>
 
@@ -161,12 +160,19 @@ void Bus::Listener::deliver(sd_bus_message* message) {
 std::unique_ptr<NamedServiceListener> Bus::listen(std::string_view serviceName) {
   if (listener_ != nullptr || !connect()) return nullptr;
   auto listener = std::make_unique<Listener>(*this, serviceName);
-  int result = listener->addObject();
-  if (result >= 0) result = listener->takeName();
-  if (result >= 0) return listener;
-  failed(LogLevel::error, "can't take the name of the service", result);
+  if (const int result = listener->addObject(); result < 0) {
+    failed(LogLevel::error, "can't serve the object", result);
+    return nullptr;
+  }
+  if (!openService()) return nullptr;
+  return listener;
+}
+
+bool Bus::openService() {
+  const int result = listener_->takeName();
+  if (result < 0) failed(LogLevel::error, "can't take the name of the service", result);
   if (result == -ETIMEDOUT) disconnect();
-  return nullptr;
+  return result >= 0;
 }
 
 bool Bus::closeService() {
@@ -187,19 +193,13 @@ bool Bus::closeService() {
       disconnect();
     }
   }
-  if (served && bus_) {
-    const int result = listener_->takeName();
-    if (result < 0) failed(LogLevel::error, "can't take the name of the service again", result);
-  }
+  if (served && bus_) openService();
   return served;
 }
 
 // ---- The event loop ---------------------------------------------------------------------------
 
-Bus::Bus(SystemLog& log, std::chrono::milliseconds patience) : log_(log), patience_(patience) {
-  sd_event* loop = nullptr;
-  if (sd_event_new(&loop) >= 0) loop_.reset(loop);
-}
+Bus::Bus(SystemLog& log, std::chrono::milliseconds patience) : log_(log), patience_(patience) {}
 
 Bus::~Bus() { flush(); }
 
@@ -216,8 +216,14 @@ Bus::RunResult Bus::run(double seconds, bool returnAfterSourceHandled) {
   return closeService() ? RunResult::handledSource : RunResult::timedOut;
 }
 
+bool Bus::haveLoop() {
+  sd_event* loop = nullptr;
+  if (!loop_ && sd_event_new(&loop) >= 0) loop_.reset(loop);
+  return loop_ != nullptr;
+}
+
 void Bus::serve(Clock::duration atMost) {
-  if (!loop_ || sd_event_run(loop_.get(), microseconds(atMost)) < 0) {
+  if (!haveLoop() || sd_event_run(loop_.get(), microseconds(atMost)) < 0) {
     std::this_thread::sleep_for(atMost);
   }
   if (bus_ && sd_bus_is_open(bus_.get()) <= 0) {
@@ -229,7 +235,7 @@ void Bus::serve(Clock::duration atMost) {
 // ---- The connection ---------------------------------------------------------------------------
 
 bool Bus::connect() {
-  if (std::exchange(tried_, true) || !loop_) return bus_ != nullptr;
+  if (std::exchange(tried_, true) || !haveLoop()) return bus_ != nullptr;
   sd_bus* bus = nullptr;
   int result = sd_bus_open_system(&bus);
   if (result >= 0) {

@@ -61,14 +61,16 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   bool connect();
   int finishHandshake();
   void disconnect();
+  bool haveLoop();
   void serve(Clock::duration atMost);
+  bool openService();
   bool closeService();
   void flush();
   void failed(LogLevel level, const char* what, int error);
 
   SystemLog& log_;
   std::chrono::milliseconds patience_;
-  std::unique_ptr<sd_event, FreeLoop> loop_;  // null if the system couldn't make one
+  std::unique_ptr<sd_event, FreeLoop> loop_;  // made when it is first needed
   std::unique_ptr<sd_bus, CloseBus> bus_;
   bool tried_ = false;  // whether connecting was tried
   Listener* listener_ = nullptr;
