@@ -208,7 +208,7 @@ void addAppendRow(bench::Table& table) {
 
 }  // namespace
 
-void addCounterStoreRows(bench::Table& table) {
+void bench::addCounterStoreRows(Table& table) {
   addQueryRows(table);
   addAppendRow(table);
 }

@@ -241,8 +241,9 @@ Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std
   return {0, length};
 }
 
-FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest)
-    : platform{log,          clock,       digest,      codec,       files,      counters,
+FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest)
+    : log(lowest),
+      platform{log,          clock,       digest,      codec,       files,      counters,
                history,      preferences, preferences, preferences, submission, housekeeping,
                housekeeping, service,     service,     service,     eventra,    device,
                device,       kernel,      device,      device,      device,     runLock} {}

@@ -218,7 +218,7 @@ class FakeRunLock : public RunLock {
 // All of them, assembled. The codec and the digest have no state: tests bring the real ones.
 class FakePlatform {
  public:
-  FakePlatform(PropertyListCodec& codec, Digest& digest);
+  FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest = LogLevel::debug);
 
   Journal journal;
   RecordingLog log;

@@ -16,7 +16,8 @@ struct RealCodecs {
 
 class TestPlatform : private RealCodecs, public platform::fakes::FakePlatform {
  public:
-  TestPlatform() : FakePlatform(codec, digest) {}
+  explicit TestPlatform(platform::LogLevel lowest = platform::LogLevel::debug)
+      : FakePlatform(codec, digest, lowest) {}
 
   static constexpr char kWhitelist[] = "/Library/Application Support/Pelloran/Whitelist_Vrn.plist";
 

@@ -1,0 +1,2 @@
+// Does nothing, with the libraries that morvend is linked with.
+int main() { return 0; }
