@@ -75,27 +75,29 @@ void addStartRows(bench::Table& table) {
 }
 
 // A device whose history holds three days up to yesterday, and a whitelist that lets it all
-// through: half by exact keys, half by prefixes, with roundings and, for every fifth distribution,
-// a histogram.
+// through: a tenth by exact keys, the rest by prefixes, as families of counters are whitelisted;
+// with roundings and, for every tenth distribution, a histogram.
 class ReportDevice {
  public:
   ReportDevice(int scalars, int distributions, int samples) {
     writePropertyList("var/preferences/mobile/com.norba.quenset.plist",
                       Dictionary{{"DiagnosticLogSubmissionEnabled", true}});
     const Dictionary rounding{{"bucket_interval", 10}, {"sig_fig", 3}};
-    Dictionary exact, distributionKeys;
-    for (int i = 0; i < scalars; i += 2) exact.set(scalarKey(i), rounding);
-    for (int i = 0; i < distributions; ++i) {
-      distributionKeys.set(
-          distributionKey(i),
-          i % 5 == 0 ? Dictionary{{"intervals", Array{Value(100), Value(1000)}}} : Dictionary());
+    const Dictionary counted{{"intervals", Array{Value(100), Value(1000)}}};
+    Dictionary scalarKeys, scalarPrefixes, distributionKeys;
+    for (int i = 0; i < scalars; i += 10) scalarKeys.set(scalarKey(i), rounding);
+    for (int family = 0; family < kFamilies; ++family) {
+      scalarPrefixes.set(familyPrefix(family), rounding);
     }
+    for (int i = 0; i < distributions; i += 10) distributionKeys.set(distributionKey(i), counted);
     writePropertyList(
         "Library/Application Support/Pelloran/Whitelist_Vrn.plist",
         Dictionary{
-            {"Group", Dictionary{{"ScalarKeys", std::move(exact)},
-                                 {"ScalarKeyPrefixes", Dictionary{{"com.example.odd.", rounding}}},
-                                 {"DistributionKeys", std::move(distributionKeys)}}}});
+            {"Group", Dictionary{{"ScalarKeys", std::move(scalarKeys)},
+                                 {"ScalarKeyPrefixes", std::move(scalarPrefixes)},
+                                 {"DistributionKeys", std::move(distributionKeys)},
+                                 {"DistributionKeyPrefixes",
+                                  Dictionary{{"com.example.distribution", Dictionary()}}}}}});
     fill(scalars, distributions, samples);
   }
 
@@ -113,9 +115,13 @@ class ReportDevice {
   }
 
  private:
+  static constexpr int kFamilies = 50;
+
+  static std::string familyPrefix(int family) {
+    return "com.example.family" + std::to_string(family) + ".";
+  }
   static std::string scalarKey(int i) {
-    return (i % 2 == 0 ? "com.example.even.counter" : "com.example.odd.counter") +
-           std::to_string(i);
+    return familyPrefix(i % kFamilies) + "counter" + std::to_string(i);
   }
   static std::string distributionKey(int i) {
     return "com.example.distribution" + std::to_string(i);

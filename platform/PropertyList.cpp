@@ -3,10 +3,10 @@
 #include <array>
 #include <cmath>
 #include <cstring>
-#include <random>
 
 #include "platform/CivilDate.h"
 #include "platform/Convert.h"
+#include "platform/KeyIndex.h"
 #include "platform/Text.h"
 
 namespace platform {
@@ -57,40 +57,19 @@ namespace {
 // Up to this size a walk over the keys is as fast as a hash.
 constexpr std::size_t kUnindexed = 8;
 
-std::uint64_t load(const char* bytes, std::size_t count) {
-  std::uint64_t word = 0;
-  std::memcpy(&word, bytes, count);
-  return word;
-}
-
-std::uint64_t mix(std::uint64_t a, std::uint64_t b) {
-  __extension__ using Wide = unsigned __int128;
-  const Wide product = static_cast<Wide>(a) * b;
-  return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
-}
-
-// Seeded for each process: keys come from files and messages, and nobody outside shall be able to
-// choose keys that collide.
-std::uint32_t hashOf(std::string_view key) {
-  static const std::uint64_t seed = [] {
-    std::random_device device;
-    return (static_cast<std::uint64_t>(device()) << 32) | device();
-  }();
-  constexpr std::uint64_t kFactor = 0x9e3779b97f4a7c15u;
-  std::uint64_t hash = seed ^ key.size();
-  const char* bytes = key.data();
-  std::size_t left = key.size();
-  for (; left >= 8; left -= 8, bytes += 8) hash = mix(hash ^ load(bytes, 8), kFactor);
-  if (left > 0) hash = mix(hash ^ load(bytes, left), kFactor);
-  return static_cast<std::uint32_t>(mix(hash, seed | 1));
-}
-
 }  // namespace
 
+struct Dictionary::Index {
+  KeyIndex keys;
+  std::size_t expected = 0;  // the place after the last one set: keys often come in the same order
+};
+
 Dictionary::Dictionary() = default;
-Dictionary::Dictionary(const Dictionary& other) = default;
+Dictionary::Dictionary(const Dictionary& other)
+    : entries_(other.entries_),
+      index_(other.index_ ? std::make_unique<Index>(*other.index_) : nullptr) {}
 Dictionary::Dictionary(Dictionary&& other) noexcept = default;
-Dictionary& Dictionary::operator=(const Dictionary& other) = default;
+Dictionary& Dictionary::operator=(const Dictionary& other) { return *this = Dictionary(other); }
 Dictionary& Dictionary::operator=(Dictionary&& other) noexcept = default;
 Dictionary::~Dictionary() = default;
 
@@ -100,51 +79,43 @@ Dictionary::Dictionary(std::initializer_list<Entry> entries) {
 
 // The key's place in entries_, or the size if it isn't there. The hash is read only with an index.
 std::size_t Dictionary::place(std::string_view key, std::uint32_t hash) const {
-  if (index_.empty()) {
+  if (!index_) {
     std::size_t i = 0;
     while (i < entries_.size() && entries_[i].key != key) ++i;
     return i;
   }
-  const std::size_t mask = index_.size() - 1;
-  for (std::size_t slot = hash & mask; index_[slot].entry != 0; slot = (slot + 1) & mask) {
-    const std::size_t entry = index_[slot].entry - 1;
-    if (index_[slot].hash == hash && entries_[entry].key == key) return entry;
-  }
-  return entries_.size();
+  const std::uint32_t found =
+      index_->keys.find(hash, [&](std::uint32_t entry) { return entries_[entry].key == key; });
+  return found == KeyIndex::kNone ? entries_.size() : found;
 }
 
-void Dictionary::insertIntoIndex(std::uint32_t hash, std::uint32_t entry) {
-  const std::size_t mask = index_.size() - 1;
-  std::size_t slot = hash & mask;
-  while (index_[slot].entry != 0) slot = (slot + 1) & mask;
-  index_[slot] = {hash, entry + 1};
-}
-
-void Dictionary::buildIndex(std::size_t slots) {
-  index_.assign(slots, Slot{0, 0});
+void Dictionary::buildIndex() {
+  index_ = std::make_unique<Index>(Index{KeyIndex(2 * entries_.size())});
   for (std::size_t i = 0; i < entries_.size(); ++i) {
-    insertIntoIndex(hashOf(entries_[i].key), static_cast<std::uint32_t>(i));
+    index_->keys.insert(keyHash(entries_[i].key), static_cast<std::uint32_t>(i));
   }
 }
 
 template <typename Key>
 Value& Dictionary::setKey(Key&& key, Value&& value) {
-  std::uint32_t hash = index_.empty() ? 0 : hashOf(key);
-  const std::size_t found = place(key, hash);
+  std::uint32_t hash = 0;
+  std::size_t found = 0;
+  if (index_ && index_->expected < entries_.size() && entries_[index_->expected].key == key) {
+    found = index_->expected;
+  } else {
+    if (index_) hash = keyHash(key);
+    found = place(key, hash);
+  }
+  if (index_) index_->expected = found + 1;
   if (found < entries_.size()) return entries_[found].value = std::move(value);
   if (entries_.empty()) entries_.reserve(kUnindexed / 2);
   entries_.emplace_back(std::string(std::forward<Key>(key)), std::move(value));
-  if (index_.empty()) {
-    if (entries_.size() > kUnindexed) buildIndex(4 * kUnindexed);
-  } else if (entries_.size() * 2 > index_.size()) {
-    std::vector<Slot> old(index_.size() * 2, Slot{0, 0});
-    old.swap(index_);
-    for (const Slot& slot : old) {
-      if (slot.entry != 0) insertIntoIndex(slot.hash, slot.entry - 1);
-    }
-    insertIntoIndex(hash, static_cast<std::uint32_t>(entries_.size() - 1));
-  } else {
-    insertIntoIndex(hash, static_cast<std::uint32_t>(entries_.size() - 1));
+  if (index_) {
+    index_->keys.insert(hash, static_cast<std::uint32_t>(found));
+    // A key that is new at the end may be followed by one that is first in the list.
+    index_->expected = 0;
+  } else if (entries_.size() > kUnindexed) {
+    buildIndex();
   }
   return entries_.back().value;
 }
@@ -158,15 +129,15 @@ Value& Dictionary::set(std::string&& key, Value value) {
 }
 
 bool Dictionary::remove(std::string_view key) {
-  const std::size_t found = place(key, index_.empty() ? 0 : hashOf(key));
+  const std::size_t found = place(key, index_ ? keyHash(key) : 0);
   if (found == entries_.size()) return false;
   entries_.erase(entries_.begin() + static_cast<std::ptrdiff_t>(found));
-  if (!index_.empty()) buildIndex(index_.size());
+  if (index_) buildIndex();
   return true;
 }
 
 const Value* Dictionary::find(std::string_view key) const {
-  const std::size_t found = place(key, index_.empty() ? 0 : hashOf(key));
+  const std::size_t found = place(key, index_ ? keyHash(key) : 0);
   return found < entries_.size() ? &entries_[found].value : nullptr;
 }
 

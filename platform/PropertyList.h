@@ -105,19 +105,15 @@ class Dictionary {
   bool operator==(const Dictionary& other) const;
 
  private:
-  struct Slot {
-    std::uint32_t hash;
-    std::uint32_t entry;  // place in entries_ plus one; 0 is a free slot
-  };
+  struct Index;
 
   std::size_t place(std::string_view key, std::uint32_t hash) const;
   template <typename Key>
   Value& setKey(Key&& key, Value&& value);
-  void buildIndex(std::size_t slots);
-  void insertIntoIndex(std::uint32_t hash, std::uint32_t entry);
+  void buildIndex();
 
   std::vector<Entry> entries_;
-  std::vector<Slot> index_;  // open addressing, a power of two; empty while the dictionary is small
+  std::unique_ptr<Index> index_;  // null while the dictionary is small
 };
 
 class Value {

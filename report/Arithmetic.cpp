@@ -1,6 +1,7 @@
 #include "report/Arithmetic.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <limits>
 #include <new>
@@ -31,13 +32,32 @@ std::int64_t roundToBucket(std::int64_t value, std::uint64_t interval) {
   return static_cast<std::int64_t>(std::uint64_t{0} - sum / interval * interval);
 }
 
+// 10^0 to 10^22, which doubles hold exactly.
+constexpr std::array<double, 23> kPowersOfTen = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,
+                                                 1e8,  1e9,  1e10, 1e11, 1e12, 1e13, 1e14, 1e15,
+                                                 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
+
+// ceil(log10(number)), for a number above 0. Up to 10^14 the logarithm is never off by so much that
+// counting the powers below the number gives another answer, and counting is cheaper.
+std::uint64_t digitsOf(double number) {
+  if (number > 1e14) return platform::saturatingCast<std::uint64_t>(std::ceil(std::log10(number)));
+  std::uint64_t digits = 0;
+  while (kPowersOfTen[digits] < number) ++digits;
+  return digits;
+}
+
+double powerOfTen(std::int64_t exponent) {
+  const auto index = static_cast<std::size_t>(exponent);
+  return index < kPowersOfTen.size() ? kPowersOfTen[index]
+                                     : std::pow(10.0, static_cast<double>(exponent));
+}
+
 std::int64_t roundToSignificantFigures(std::int64_t value, std::uint64_t figures) {
   if (value == 0) return 0;
-  const double digits = std::ceil(std::log10(static_cast<double>(magnitude(value))));
   const auto excess =
-      static_cast<std::int64_t>(platform::saturatingCast<std::uint64_t>(digits) - figures);
+      static_cast<std::int64_t>(digitsOf(static_cast<double>(magnitude(value))) - figures);
   if (excess < 1) return value;
-  const double power = std::pow(10.0, static_cast<double>(excess));
+  const double power = powerOfTen(excess);
   const double rounded = std::round(static_cast<double>(value) / power);
   return platform::saturatingCast<std::int64_t>(power * rounded);
 }

@@ -26,11 +26,9 @@ std::string hexadecimal(const std::array<std::uint8_t, 16>& digest) {
 
 // Merges key groups; a later entry replaces an earlier one of the same key.
 struct PLConfig::Loader {
-  using Prefixes = std::unordered_map<std::string, CounterOptions>;
-
   platform::Platform& platform;
   PLConfig& config;
-  Prefixes scalarPrefixes{}, distributionPrefixes{};
+  OptionsTable scalarPrefixes{}, distributionPrefixes{};
 
   void skip(const std::string& what) {
     platform.log.log(LogLevel::error, "Whitelist: skipping %s, it has the wrong type",
@@ -47,8 +45,7 @@ struct PLConfig::Loader {
     return false;
   }
 
-  template <typename Map>
-  void mergeSection(Map& into, const std::string& group, const Dictionary& sections,
+  void mergeSection(OptionsTable& into, const std::string& group, const Dictionary& sections,
                     const char* name) {
     const Value* section = sections.find(name);
     if (section == nullptr) return;
@@ -56,7 +53,7 @@ struct PLConfig::Loader {
     if (entries == nullptr) return skip(group + "/" + name);
     for (const Dictionary::Entry& entry : *entries) {
       if (auto options = parseCounterOptions(entry.value)) {
-        into.insert_or_assign(entry.key, std::move(*options));
+        into.set(entry.key, std::move(*options));
       } else {
         skip(group + "/" + name + "/" + entry.key);
       }
@@ -105,7 +102,7 @@ std::unique_ptr<PLConfig> PLConfig::init(platform::Platform& platform,
 
 const CounterOptions* PLConfig::optionsForKey(const Table& table, std::string_view key) const {
   static const CounterOptions kUnrounded;
-  if (const auto exact = table.keys.find(key); exact != table.keys.end()) return &exact->second;
+  if (const auto* exact = table.keys.find(key)) return exact;
   const int length = static_cast<int>(key.size());
   if (const auto match = table.prefixes.longestPrefix(key); match.options != nullptr) {
     log_.log(LogLevel::debug, "prefix match %.*s for %.*s", static_cast<int>(match.prefix.size()),

@@ -7,11 +7,10 @@
 #include <memory>
 #include <string>
 #include <string_view>
-#include <unordered_map>
 
 #include "daemon/context/DeviceContext.h"
 #include "platform/Platform.h"
-#include "report/CounterOptions.h"
+#include "report/OptionsTable.h"
 #include "report/PrefixTable.h"
 
 namespace report {
@@ -33,15 +32,9 @@ class PLConfig {
   const std::string& configFileDigest() const { return configFileDigest_; }
 
  private:
-  struct Hash {
-    using is_transparent = void;
-    std::size_t operator()(std::string_view key) const {
-      return std::hash<std::string_view>()(key);
-    }
-  };
   // The entries for scalars, or for distributions.
   struct Table {
-    std::unordered_map<std::string, CounterOptions, Hash, std::equal_to<>> keys;
+    OptionsTable keys;
     PrefixTable prefixes;
   };
   struct Loader;

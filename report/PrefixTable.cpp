@@ -17,10 +17,9 @@ std::size_t commonLength(std::string_view a, std::string_view b) {
 
 }  // namespace
 
-PrefixTable::PrefixTable(std::unordered_map<std::string, CounterOptions> prefixes)
-    : prefixes_(std::move(prefixes)) {
+PrefixTable::PrefixTable(OptionsTable prefixes) : prefixes_(std::move(prefixes)) {
   std::vector<std::pair<std::string_view, const CounterOptions*>> sorted;
-  for (const auto& [text, options] : prefixes_) sorted.emplace_back(text, &options);
+  for (const auto& [text, options] : prefixes_.entries()) sorted.emplace_back(text, &options);
   std::sort(sorted.begin(), sorted.end());
 
   // Breadth first, so that a node's children come to stand together. A range of the sorted texts

@@ -5,10 +5,9 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
-#include <unordered_map>
 #include <vector>
 
-#include "report/CounterOptions.h"
+#include "report/OptionsTable.h"
 
 namespace report {
 
@@ -19,8 +18,7 @@ class PrefixTable {
     const CounterOptions* options;  // borrowed; null when no prefix matches
   };
 
-  PrefixTable() : PrefixTable(std::unordered_map<std::string, CounterOptions>()) {}
-  explicit PrefixTable(std::unordered_map<std::string, CounterOptions> prefixes);
+  explicit PrefixTable(OptionsTable prefixes = {});
   PrefixTable(PrefixTable&&) = default;
   PrefixTable& operator=(PrefixTable&&) = default;
 
@@ -35,9 +33,9 @@ class PrefixTable {
     std::uint32_t firstChild, childCount;
   };
 
-  std::unordered_map<std::string, CounterOptions> prefixes_;  // owns the texts and the options
-  std::vector<Node> nodes_;                                   // the root first, its label empty
-  std::string firstBytes_;                                    // of each node's label
+  OptionsTable prefixes_;    // owns the texts and the options
+  std::vector<Node> nodes_;  // the root first, its label empty
+  std::string firstBytes_;   // of each node's label
 };
 
 }  // namespace report

@@ -58,7 +58,9 @@ void pack(sqlite::Connection& connection) {
   };
   sqlite::Statement staged(connection,
                            "SELECT day, key, seconds, value FROM staged ORDER BY day, key, rowid");
+  bool any = false;
   while (staged.step()) {
+    any = true;
     const sqlite::Column itsDay = staged.column(0), itsKey = staged.column(1);
     const sqlite::Column second = staged.column(2), value = staged.column(3);
     if (!itsDay.isInteger() || !itsKey.isText() || !second.isInteger() || !value.isReal()) continue;
@@ -72,7 +74,8 @@ void pack(sqlite::Connection& connection) {
     appendBytes(samples, static_cast<std::int32_t>(second.integer()));
   }
   flush();
-  sqlite::Statement(connection, "DELETE FROM staged").run();
+  // A day without new samples writes nothing.
+  if (any) sqlite::Statement(connection, "DELETE FROM staged").run();
 }
 
 // Samples are packed before this, so that none is staged. Each step back is one seek in each table.

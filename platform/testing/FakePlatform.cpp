@@ -242,10 +242,10 @@ Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std
 }
 
 FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest)
-    : log(lowest),
-      platform{log,          clock,       digest,      codec,       files,      counters,
-               history,      preferences, preferences, preferences, submission, housekeeping,
-               housekeeping, service,     service,     service,     eventra,    device,
-               device,       kernel,      device,      device,      device,     runLock} {}
+    : log(lowest), platform{log,        clock,        digest,       codec,       files,
+                            counters,   history,      preferences,  preferences, preferences,
+                            submission, housekeeping, housekeeping, service,     service,
+                            service,    eventra,      device,       device,      kernel,
+                            device,     device,       device,       runLock} {}
 
 }  // namespace platform::fakes

@@ -90,6 +90,32 @@ TEST(RoundScalar, CountsTheDigitsOfEveryPowerOfTen) {
   }
 }
 
+// The definition, word for word.
+std::int64_t significant(std::int64_t value, std::uint64_t figures) {
+  const double d = std::ceil(std::log10(std::fabs(static_cast<double>(value))));
+  const auto x = static_cast<std::int64_t>(static_cast<std::uint64_t>(d) - figures);
+  if (x < 1) return value;
+  const double p = std::pow(10, static_cast<double>(x));
+  return static_cast<std::int64_t>(p * std::round(static_cast<double>(value) / p));
+}
+
+TEST(RoundScalar, AgreesWithTheLogarithmAroundEveryPowerAndAtRandom) {
+  std::mt19937_64 random(5);
+  std::vector<std::int64_t> values;
+  for (std::int64_t power = 10; power <= 100'000'000'000'000'000; power *= 10) {
+    for (std::int64_t offset = -3; offset <= 3; ++offset) values.push_back(power + offset);
+  }
+  for (int i = 0; i < 20000; ++i) {
+    values.push_back(static_cast<std::int64_t>(random() >> (2 + random() % 61)) + 1);
+  }
+  for (const std::int64_t value : values) {
+    for (std::uint64_t figures = 0; figures <= 6; ++figures) {
+      ASSERT_EQ(roundScalar(value, options({}, figures)), significant(value, figures)) << value;
+      ASSERT_EQ(roundScalar(-value, options({}, figures)), significant(-value, figures)) << value;
+    }
+  }
+}
+
 std::vector<double> doubles(const platform::Array& statistics) {
   std::vector<double> values;
   for (const auto& value : statistics) values.push_back(value.as<Number>()->doubleValue());

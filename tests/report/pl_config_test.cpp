@@ -163,26 +163,25 @@ TEST(PrefixTable, FindsTheLongestPrefixThatASearchThroughAllFinds) {
     return text;
   };
   for (int round = 0; round < 200; ++round) {
-    std::unordered_map<std::string, CounterOptions> prefixes;
+    OptionsTable prefixes;
     const std::size_t count = random() % 40;
-    while (prefixes.size() < count) {
-      prefixes[word(7)] = CounterOptions{prefixes.size(), {}, {}};
+    while (prefixes.entries().size() < count) {
+      prefixes.set(word(7), CounterOptions{prefixes.entries().size(), {}, {}});
     }
-    const auto copy = prefixes;
+    const auto copy = prefixes.entries();
     const PrefixTable table(std::move(prefixes));
     for (int i = 0; i < 50; ++i) {
       const std::string key = word(9);
-      std::optional<std::string> longest;
-      for (const auto& [prefix, options] : copy) {
-        if (key.starts_with(prefix) && (!longest || prefix.size() > longest->size())) {
-          longest = prefix;
-        }
+      const OptionsTable::Entry* longest = nullptr;
+      for (const auto& entry : copy) {
+        const bool longer = longest == nullptr || entry.key.size() > longest->key.size();
+        if (key.starts_with(entry.key) && longer) longest = &entry;
       }
       const auto match = table.longestPrefix(key);
-      ASSERT_EQ(match.options != nullptr, longest.has_value());
-      if (!longest) continue;
-      EXPECT_EQ(match.prefix, *longest);
-      EXPECT_EQ(match.options->bucketInterval, copy.at(*longest).bucketInterval);
+      ASSERT_EQ(match.options != nullptr, longest != nullptr);
+      if (longest == nullptr) continue;
+      EXPECT_EQ(match.prefix, longest->key);
+      EXPECT_EQ(match.options->bucketInterval, longest->options.bucketInterval);
     }
   }
 }
