@@ -33,6 +33,25 @@ void appendText(std::string& out, std::string_view text) {
   });
 }
 
+// About the length of what will be written, for one reservation instead of many: texts as they are,
+// tags and indentation by their usual lengths.
+std::size_t estimatedLength(const Value& value) {
+  constexpr std::size_t kElement = 32, kKey = 20;
+  std::size_t length = kElement;
+  if (const auto* text = value.as<std::string>()) {
+    length += text->size();
+  } else if (const auto* array = value.as<Array>()) {
+    for (const Value& element : *array) length += estimatedLength(element);
+  } else if (const auto* dictionary = value.as<Dictionary>()) {
+    for (const Dictionary::Entry& entry : *dictionary) {
+      length += kKey + entry.key.size() + estimatedLength(entry.value);
+    }
+  } else if (const auto* data = value.as<Data>()) {
+    length += data->size() / 3 * 4;
+  }
+  return length;
+}
+
 class Writer {
  public:
   // `depth` is the number of containers around the value; it is the indentation too.
@@ -135,6 +154,7 @@ class Writer {
 
 Result<std::string> writeXMLPropertyList(const Value& value) {
   Writer writer;
+  writer.out.reserve(128 + estimatedLength(value));
   writer.out =
       "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
       "<plist version=\"1.0\">\n";
