@@ -204,6 +204,8 @@ void CounterDatabase::verify(Use use) {
   if (version > kVersion) {
     connection.fail(Failure::Kind::other,
                     format("made by a newer version of the store (%d)", static_cast<int>(version)));
+  } else if (use != Use::read && connection.headerForbidsWriting()) {
+    connection.fail(Failure::Kind::damaged, "its header forbids writing");
   } else if (version == 0 && schema.empty()) {
     if (use != Use::create) {
       connection_.reset();
@@ -215,9 +217,6 @@ void CounterDatabase::verify(Use use) {
   } else if (version != kVersion || schema != kSchema) {
     connection.fail(Failure::Kind::damaged, "its tables are not the store's");
   } else if (use != Use::read) {
-    if (connection.readOnly() && ::faccessat(folder_.get(), kName, W_OK, AT_EACCESS) == 0) {
-      connection.fail(Failure::Kind::damaged, "its header forbids writing");
-    }
     connection.execute("PRAGMA journal_mode = WAL");
   }
 }

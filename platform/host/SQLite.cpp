@@ -1,5 +1,7 @@
 #include "platform/host/SQLite.h"
 
+#include <cstring>
+
 namespace platform::host::sqlite {
 
 namespace {
@@ -49,6 +51,7 @@ Connection::Connection(const std::string& path, Access access) {
                               common | SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr)
             : sqlite3_open_v2(path.c_str(), &database_, common | SQLITE_OPEN_READWRITE, nullptr));
   if (failure_) return;
+  openedReadOnly_ = readOnly();
   sqlite3_busy_timeout(database_, kBusyMilliseconds);
   sqlite3_db_config(database_, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
   sqlite3_db_config(database_, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
@@ -74,8 +77,28 @@ void Connection::fail(Failure::Kind kind, std::string text) {
 }
 
 void Connection::failWithCode(int code) {
+  const Failure::Kind kind = kindOf(code);
   const bool explained = database_ != nullptr && sqlite3_errcode(database_) != SQLITE_OK;
-  fail(kindOf(code), explained ? sqlite3_errmsg(database_) : sqlite3_errstr(code));
+  std::string text = explained ? sqlite3_errmsg(database_) : sqlite3_errstr(code);
+  // SQLite reports a disk that fails to read as a damaged database.
+  if (const int error = kind == Failure::Kind::damaged ? errorOfFiles() : 0; error != 0) {
+    fail(Failure::Kind::other, std::strerror(error));
+  } else {
+    fail(kind, std::move(text));
+  }
+}
+
+// The last error number of a system call on the database file or its log, or 0.
+int Connection::errorOfFiles() const {
+  for (const int which : {SQLITE_FCNTL_FILE_POINTER, SQLITE_FCNTL_JOURNAL_POINTER}) {
+    sqlite3_file* file = nullptr;
+    sqlite3_file_control(database_, "main", which, &file);
+    if (file == nullptr || file->pMethods == nullptr) continue;
+    int error = 0;
+    file->pMethods->xFileControl(file, SQLITE_FCNTL_LAST_ERRNO, &error);
+    if (error != 0) return error;
+  }
+  return 0;
 }
 
 void Connection::execute(const char* sql) {

@@ -47,8 +47,9 @@ class Connection {
   // Runs statements that deliver nothing.
   void execute(const char* sql);
 
-  // True when the file was opened for reading only, or its header asks for that.
-  bool readOnly() const { return sqlite3_db_readonly(database_, "main") == 1; }
+  // True when the header of a file that was opened for writing forbids that. Known once something
+  // has been read.
+  bool headerForbidsWriting() const { return !openedReadOnly_ && readOnly(); }
   bool inTransaction() const { return sqlite3_get_autocommit(database_) == 0; }
 
   // Pages in the write-ahead log after the last commit on this connection.
@@ -70,8 +71,11 @@ class Connection {
     if (code != SQLITE_OK) failWithCode(code);
   }
   void failWithCode(int code);
+  int errorOfFiles() const;
+  bool readOnly() const { return sqlite3_db_readonly(database_, "main") == 1; }
 
   sqlite3* database_ = nullptr;
+  bool openedReadOnly_ = false;
   std::deque<Prepared> prepared_;
   int pagesInLog_ = 0;
   Failure failure_;

@@ -16,7 +16,7 @@ namespace {
 
 constexpr std::size_t kLongestKey = 1024;
 
-std::string quoted(std::string_view text) { return "'" + std::string(text) + "'"; }
+std::string quoted(std::string_view text) { return std::string("'").append(text).append("'"); }
 
 template <typename T>
 bool parsed(std::string_view text, T& value) {

@@ -95,7 +95,7 @@ class Fields : public nlohmann::json_sax<nlohmann::json> {
 
 template <typename T>
 Result<T> failure(std::string_view field, const std::string& why) {
-  return Result<T>::failure("\"" + std::string(field) + "\": " + why);
+  return Result<T>::failure(std::string("\"").append(field).append("\": ").append(why));
 }
 
 Result<std::int64_t> integerFrom(const Scalar& scalar) {

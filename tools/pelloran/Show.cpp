@@ -58,8 +58,8 @@ std::string samplesAsJson(PLHistoryDistributionEnumerator& samples) {
        block = samples.getNextValues()) {
     for (std::size_t i = 0; i < block.values.size(); ++i) {
       if (text.size() > 1) text += ", ";
-      text += "[" + std::to_string(block.secondsInDayOffsets[i]) + ", " +
-              jsonReal(block.values[i]) + "]";
+      text.append("[").append(std::to_string(block.secondsInDayOffsets[i])).append(", ");
+      text.append(jsonReal(block.values[i])).append("]");
     }
   }
   return text + "]";
@@ -78,7 +78,7 @@ std::string summary(PLHistoryDistributionEnumerator& samples) {
   }
   std::string text = "count " + std::to_string(count);
   if (count == 0) return text;
-  return text + platform::format("  min %.6g  mean %.6g  max %.6g", least, mean, most);
+  return text + platform::format("  min %.10g  mean %.10g  max %.10g", least, mean, most);
 }
 
 // A key as a terminal may show it: nothing in it moves the cursor.
