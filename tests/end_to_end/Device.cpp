@@ -1,0 +1,197 @@
+#include "end_to_end/Device.h"
+
+#include <algorithm>
+#include <filesystem>
+
+#include "platform/CivilDate.h"
+#include "platform/Text.h"
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/SystemClock.h"
+
+namespace end_to_end {
+
+using platform::format;
+
+namespace {
+
+// A host on the root, for the test itself.
+struct TestHost {
+  explicit TestHost(const std::string& root) : host({.root = root}) {
+    host.keepCountersBelow([this] { return &home; });
+  }
+  std::string home = "/var/mobile";
+  platform::host::Host host;
+};
+
+Dictionary setting(const char* user, const char* key) {
+  return {{"Domain", "com.example"}, {"User", user}, {"Key", key}, {"Value", key}};
+}
+
+}  // namespace
+
+Device::Device()
+    : root_(std::make_unique<support::TemporaryFolder>()),
+      today_(platform::dayNumber(platform::host::SystemClock().now().secondsSince1970)) {}
+
+void Device::fill() {
+  TestHost test(root_->path());
+  for (std::int32_t day = today_ - 3; day < today_; ++day) {
+    for (const char* key : {"exact", "family.a", "family.b", "secret"}) {
+      test.host.counters().set(key, 1000 * (day % 7) + 123, day);
+    }
+    for (int i = 0; i < 40; ++i) test.host.counters().push("samples", i * 0.5, day, i);
+    if (day == today_ - 3) test.host.counters().PLClientCheckpoint();
+  }
+  const Dictionary rounded{{"bucket_interval", 10}, {"sig_fig", 2}};
+  writePropertyList(
+      kWhitelist,
+      Dictionary{
+          {"Group",
+           Dictionary{
+               {"ScalarKeys",
+                Dictionary{{"exact", Dictionary()},
+                           {"com.norba.quenset.prnd.database.corruptions", Dictionary()}}},
+               {"ScalarKeyPrefixes", Dictionary{{"family.", rounded}}},
+               {"DistributionKeys",
+                Dictionary{{"samples", Dictionary{{"intervals", Array{Value(5), Value(10)}}}}}}}}});
+  writePropertyList("var/preferences/mobile/com.norba.quenset.plist",
+                    Dictionary{{"DiagnosticLogSubmissionEnabled", true}});
+  writePropertyList(
+      "var/preferences/__quenset__/com.norba.Varnhollow.plist",
+      Dictionary{
+          {"LogBlocklist", Array{"110", "193"}},
+          {"ScheduledTasking",
+           Dictionary{{"TaskingID", "T1"},
+                      {"TaskingDigest", "D1"},
+                      {"TaskingPayload", Array{setting("mobile", "m"), setting("__quenset__", "q"),
+                                               setting("guest", "g")}}}}});
+  writePropertyList("device/system-version.plist",
+                    Dictionary{{"ProductBuildVersion", "A1"}, {"ProductVersion", "1.0"}});
+  writePropertyList("device/kernel.plist", Dictionary());
+  writePropertyList("device/locale.plist", Dictionary{{"PreferredLanguages", Array{"de-AT"}},
+                                                      {"Localizations", Array{"en", "de"}},
+                                                      {"CountryCode", "AT"}});
+  root_->write("var/log/servita/a.log", "new\n");
+  root_->write("var/log/servita/a.log.1", "old\n");
+  root_->write("var/spool/morvend/structured/2020-01-01.jsonl", "{\"type\": 1}\n");
+  std::filesystem::create_directories((*root_ / kModule).parent_path());
+  std::filesystem::copy_file(FAULTWATCH_SUPPORT_MODULE, *root_ / kModule);
+}
+
+faults::Strings Device::environment(const std::string& bus) const {
+  return {"MORVEND_ROOT=" + root_->path().string(),
+          "DBUS_SYSTEM_BUS_ADDRESS=" + (bus.empty() ? "unix:path=/nonexistent" : bus)};
+}
+
+faults::Outcome Device::run(const std::string& program, faults::Strings arguments,
+                            const faults::Fault& fault, const std::string& bus) const {
+  arguments.insert(arguments.begin(), PROGRAMS "/" + program);
+  return faults::run(arguments, environment(bus), fault);
+}
+
+std::size_t Device::countCalls(const std::string& program, faults::Strings arguments) const {
+  arguments.insert(arguments.begin(), PROGRAMS "/" + program);
+  return faults::count(arguments, environment(""));
+}
+
+void Device::become(const Device& other) {
+  root_ = std::make_unique<support::TemporaryFolder>();
+  std::filesystem::copy(
+      other.root_->path(), root_->path(),
+      std::filesystem::copy_options::recursive | std::filesystem::copy_options::copy_symlinks);
+}
+
+void Device::writePropertyList(const std::string& path, const Value& value) const {
+  root_->write(path, *platform::host::HostPropertyListCodec().writeXML(value));
+}
+
+std::optional<Value> Device::readPropertyList(const std::string& path) const {
+  return platform::host::HostPropertyListCodec().read(root_->read(path)).value;
+}
+
+std::optional<Value> Device::record(const std::string& key) const {
+  const auto domain = readPropertyList("var/preferences/mobile/" + std::string(kDomain) + ".plist");
+  const auto* dictionary = domain ? domain->as<Dictionary>() : nullptr;
+  const Value* value = dictionary != nullptr ? dictionary->find(key) : nullptr;
+  return value != nullptr ? std::optional(*value) : std::nullopt;
+}
+
+Lines Device::names(const std::string& folder) const {
+  Lines names;
+  std::error_code ignored;
+  for (const auto& entry : std::filesystem::directory_iterator(*root_ / folder, ignored)) {
+    names.push_back(entry.path().filename());
+  }
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+std::vector<Dictionary> Device::dailyLogs() const {
+  std::vector<Dictionary> logs;
+  for (const std::string& name : names(kSubmitted)) {
+    if (!name.starts_with("log-pellorand.193.") || name.ends_with(".options.plist")) continue;
+    const auto log = readPropertyList(std::string(kSubmitted) + "/" + name);
+    const auto* dictionary = log ? log->as<Dictionary>() : nullptr;
+    logs.push_back(dictionary != nullptr ? *dictionary : Dictionary());
+  }
+  return logs;
+}
+
+Dictionary Device::expectedSections() const {
+  const std::int64_t value = 1000 * ((today_ - 1) % 7) + 123;
+  // To tens, then to two figures, which here is to hundreds but for values below a thousand.
+  const std::int64_t rounded = value < 1000 ? 120 : (value + 23) / 100 * 100;
+  return {
+      {"PLScalars", Dictionary{{"exact", value},
+                               {"family.a", rounded},
+                               {"family.b", rounded},
+                               {"com.norba.quenset.prnd.database.corruptions", std::int64_t{0}}}},
+      {"PLDistributions", Dictionary{{"samples", Array{Value(0.0), Value(19.5), Value(9.75),
+                                                       Value(1332.5), Value(40)}}}},
+      {"PLDistributionsHistogram",
+       Dictionary{{"samples", Dictionary{{"(-inf, 5]", 11}, {"(5, 10]", 10}, {"(10, inf)", 19}}}}},
+      {"PLStartDate", platform::Date{(today_ - 1) * 86400.0}}};
+}
+
+Lines Device::history() const {
+  TestHost test(root_->path());
+  Lines rows;
+  const auto history = test.host.platform().history.initWithDefaultPath();
+  history->scalarsForKeyPrefix(
+      "", INT32_MIN, INT32_MAX,
+      [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
+        rows.push_back(
+            format("%d %s %lld", day, std::string(key).c_str(), static_cast<long long>(value)));
+      });
+  history->distributionsForKeyPrefix(
+      "", INT32_MIN, INT32_MAX, [&](std::string_view key, std::int32_t day, auto& samples, bool&) {
+        std::string row = format("%d %s", day, std::string(key).c_str());
+        for (auto block = samples.getNextValues(); !block.values.empty();
+             block = samples.getNextValues()) {
+          for (const double value : block.values) row += format(" %g", value);
+        }
+        rows.push_back(row);
+      });
+  return rows;
+}
+
+Lines linesOf(const std::string& standardError) {
+  Lines lines;
+  std::size_t start = 0;
+  while (start < standardError.size()) {
+    const auto end = std::min(standardError.find('\n', start), standardError.size());
+    std::string line = standardError.substr(start, end - start);
+    if (line.size() > 3 && line[0] == '<' && line[2] == '>') line.erase(0, 3);
+    lines.push_back(line);
+    start = end + 1;
+  }
+  return lines;
+}
+
+bool ended(const faults::Outcome& outcome) {
+  const Lines lines = linesOf(outcome.standardError);
+  return outcome.status == 0 &&
+         std::find(lines.begin(), lines.end(), "morvend ended") != lines.end();
+}
+
+}  // namespace end_to_end

@@ -1,0 +1,202 @@
+// The built programs, run by hand or by a timer.
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <filesystem>
+#include <fstream>
+#include <thread>
+
+#include "end_to_end/Device.h"
+
+namespace end_to_end {
+namespace {
+
+constexpr char kGateRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
+
+bool holds(const Lines& lines, const std::string& text) {
+  return std::any_of(lines.begin(), lines.end(),
+                     [&](const std::string& line) { return line.find(text) != std::string::npos; });
+}
+
+TEST(DailyRun, SubmitsTheDayOnceAndLeavesTheRecordsBehind) {
+  Device device;
+  device.fill();
+  const std::string day = std::to_string(device.today() - 1);
+  const auto first = device.run("morvend", {"-d"});
+  EXPECT_EQ(first.status, 0);
+  EXPECT_EQ(linesOf(first.standardError),
+            (Lines{"morvend started", "daily tasks for day " + day,
+                   "OS change since last run ((null) -> A1)", "morvend ended"}));
+  ASSERT_EQ(device.dailyLogs().size(), 1u);
+  const Dictionary log = device.dailyLogs()[0];
+  Dictionary expected = device.expectedSections();
+  expected.set("PLCrashLogVersion", 1);
+  expected.set("PLLogCreationDate", *log.find("PLLogCreationDate"));
+  expected.set("PLMetadata", Dictionary{{"PLUserInterfaceLanguage", "de"},
+                                        {"PLPreferredUserInterfaceLanguage", "de-AT"},
+                                        {"PLUserSetRegionFormat", "AT"}});
+  // The tasking is applied after the report.
+  expected.set("PLTasking", Array());
+  expected.set("PLTaskID", "(no tasking id)");
+  expected.set("PLTaskDigest", "(no tasking digest)");
+  expected.set("PLWhitelistDigest", *log.find("PLWhitelistDigest"));
+  EXPECT_EQ(log, expected);
+  EXPECT_EQ(log.text("PLWhitelistDigest")->size(), 32u);
+  const Lines spool = device.names(kSubmitted);
+  ASSERT_EQ(spool.size(), 3u);
+  EXPECT_EQ(spool[1], spool[0] + ".options.plist");
+  EXPECT_EQ(spool[2], "structured-2020-01-01.jsonl");
+  EXPECT_EQ(device.readPropertyList(std::string(kSubmitted) + "/" + spool[1]),
+            Value(Dictionary{{"previous_os_version", "<unknown>"}}));
+  EXPECT_EQ(device.record(kGateRecord), Value(device.today() - 1));
+  EXPECT_EQ(device.record("TaskingID"), Value("T1"));
+  EXPECT_EQ(device.record("LastOSVersion"), Value("1.0 (A1)"));
+  for (const char* user : {"mobile", "__quenset__", "guest"}) {
+    EXPECT_TRUE(
+        device.readPropertyList("var/preferences/" + std::string(user) + "/com.example.plist"))
+        << user;
+  }
+  EXPECT_EQ(device.names("var/log/servita"), (Lines{"a.log.1", "a.log.2"}));
+  const std::string events = device.root().read("var/spool/morvend/events.jsonl");
+  EXPECT_EQ(std::count(events.begin(), events.end(), '\n'), 3);
+
+  const auto second = device.run("morvend", {"-d"});
+  EXPECT_EQ(linesOf(second.standardError),
+            (Lines{"morvend started", "Day unchanged since last run", "morvend ended"}));
+  device.run("morvend", {"-f"});
+  const auto logs = device.dailyLogs();
+  ASSERT_EQ(logs.size(), 2u);
+  EXPECT_EQ(logs[1].text("PLTaskID") != nullptr ? *logs[1].text("PLTaskID") : "", "T1");
+  EXPECT_EQ(device.names(kSubmitted).size(), 4u) << "the same version carries no options";
+}
+
+TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
+  Device empty, missing;
+  std::filesystem::remove(missing.root().path());
+  for (const Device* device : {&empty, &missing}) {
+    for (const char* option : {"-d", "-f", "-t", "-x"}) {
+      const auto outcome = device->run("morvend", {option});
+      EXPECT_EQ(outcome.status, 0) << outcome.standardError;
+      EXPECT_TRUE(ended(outcome));
+    }
+  }
+  EXPECT_FALSE(std::filesystem::exists(missing.root().path()));
+  EXPECT_EQ(empty.record(kGateRecord), Value(empty.today() - 1));
+  EXPECT_TRUE(empty.names("var/mobile").empty()) << "reading made a database";
+}
+
+// A timer's run beside another one: the second waits, and then finds the gate closed.
+TEST(DailyRun, MakesOneLogWhenSeveralRunAtOnce) {
+  Device device;
+  device.fill();
+  std::vector<faults::Outcome> outcomes(4);
+  std::vector<std::thread> runs;
+  for (auto& outcome : outcomes) {
+    runs.emplace_back([&] { outcome = device.run("morvend", {"-d"}); });
+  }
+  for (auto& run : runs) run.join();
+  int closed = 0;
+  for (const auto& outcome : outcomes) {
+    EXPECT_EQ(outcome.status, 0);
+    closed += holds(linesOf(outcome.standardError), "Day unchanged since last run") ? 1 : 0;
+  }
+  EXPECT_EQ(closed, 3);
+  ASSERT_EQ(device.dailyLogs().size(), 1u);
+  EXPECT_FALSE(device.dailyLogs()[0].empty());
+}
+
+// Damage is set aside, counted, and told by the next report.
+TEST(DailyRun, ReportsADamagedDatabaseTheNextDay) {
+  Device device;
+  device.fill();
+  {
+    std::fstream file(device.root() / kDatabase);
+    file.seekp(100);
+    file << std::string(3000, '\xff');
+  }
+  const auto damaged = device.run("morvend", {"-f"});
+  EXPECT_EQ(damaged.status, 0);
+  EXPECT_TRUE(holds(linesOf(damaged.standardError), "set aside as PLDataStore.sqlitedb.corrupt"))
+      << damaged.standardError;
+  EXPECT_TRUE(std::filesystem::exists(device.root() / (std::string(kDatabase) + ".corrupt")));
+  EXPECT_TRUE(device.dailyLogs().empty());
+  EXPECT_EQ(device.run("pelloran", {"set", "exact", "7", "--day", "yesterday"}).status, 0);
+  device.run("morvend", {"-f"});
+  device.run("morvend", {"-f"});
+  const auto logs = device.dailyLogs();
+  ASSERT_EQ(logs.size(), 2u);
+  constexpr char kCount[] = "com.norba.quenset.prnd.database.corruptions";
+  EXPECT_EQ(*logs[0].dictionary("PLScalars")->find(kCount), Value(1));
+  EXPECT_EQ(*logs[1].dictionary("PLScalars")->find(kCount), Value(0));
+}
+
+// A link in the place of a file or a folder that is written must lead nothing out of the root, and
+// a FIFO must not stop the run.
+TEST(DailyRun, TouchesNothingOutsideItsRoot) {
+  const std::string written[] = {"var/run/morvend.lock",
+                                 "var/run",
+                                 "var/preferences/mobile/com.norba.pellorand.morvend.plist",
+                                 "var/preferences/mobile",
+                                 "var/preferences/guest/com.example.plist",
+                                 "var/preferences/guest",
+                                 "var/spool/morvend/events.jsonl",
+                                 "var/spool/morvend/submitted",
+                                 "var/spool/morvend",
+                                 "var/spool",
+                                 "var/log/servita/a.log",
+                                 "var/log/servita/a.log.2",
+                                 kDatabase,
+                                 std::string(kDatabase) + "-wal",
+                                 "var/mobile/Library/Pelloran"};
+  Device filled;
+  filled.fill();
+  for (const std::string& path : written) {
+    for (const std::string kind : {"link to a file", "link to a folder", "FIFO", "folder"}) {
+      Device device;
+      device.become(filled);
+      const support::TemporaryFolder outside;
+      outside.write("file", "untouched");
+      outside.write("folder/file", "untouched");
+      const auto place = device.root() / path;
+      std::filesystem::remove_all(place);
+      std::filesystem::create_directories(place.parent_path());
+      if (kind == "link to a file") {
+        std::filesystem::create_symlink(outside / "file", place);
+      } else if (kind == "link to a folder") {
+        std::filesystem::create_symlink(outside / "folder", place);
+      } else if (kind == "FIFO") {
+        ASSERT_EQ(::mkfifo(place.c_str(), 0600), 0);
+      } else {
+        std::filesystem::create_directory(place);
+      }
+      const auto outcome = device.run("morvend", {"-d"});
+      EXPECT_EQ(outcome.status, 0) << path << " " << kind;
+      EXPECT_TRUE(ended(outcome)) << path << " " << kind;
+      EXPECT_EQ(outside.read("file"), "untouched") << path << " " << kind;
+      EXPECT_EQ(outside.read("folder/file"), "untouched") << path << " " << kind;
+      const auto entries = [](const std::filesystem::path& folder) {
+        return std::distance(std::filesystem::directory_iterator(folder), {});
+      };
+      EXPECT_EQ(entries(outside.path()), 2) << path << " " << kind;
+      EXPECT_EQ(entries(outside / "folder"), 1) << path << " " << kind;
+    }
+  }
+}
+
+TEST(Pelloran, WritesAndReadsWhatMorvendReports) {
+  Device device;
+  device.fill();
+  EXPECT_EQ(device.run("pelloran", {"set", "exact", "41", "--day", "yesterday"}).status, 0);
+  EXPECT_EQ(device.run("pelloran", {"add", "exact", "1", "--day", "yesterday"}).status, 0);
+  EXPECT_EQ(device.run("pelloran", {"push", "samples", "1000", "--day", "yesterday"}).status, 0);
+  EXPECT_EQ(device.run("pelloran", {"set", "exact", "x"}).status, 2);
+  EXPECT_EQ(device.run("pelloran", {"import", "/nonexistent"}).status, 1);
+  device.run("morvend", {"-f"});
+  const auto log = device.dailyLogs().at(0);
+  EXPECT_EQ(*log.dictionary("PLScalars")->find("exact"), Value(42));
+  EXPECT_EQ(log.dictionary("PLDistributions")->array("samples")->at(1), Value(1000.0));
+}
+
+}  // namespace
+}  // namespace end_to_end
