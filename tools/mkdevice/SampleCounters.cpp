@@ -47,7 +47,7 @@ double sampleAround(double level, double spread, Shape shape, Random& random) {
     case Shape::bell:
       return level * (1 + spread * random.bell());
     case Shape::longTail:
-      return level * (1 - spread + spread * u / (1.03 - u));
+      return level * (1 - spread + spread * u / (1.15 - u));
   }
   return level;
 }

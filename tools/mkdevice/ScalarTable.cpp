@@ -11,7 +11,7 @@ using enum Daily;
 // clang-format off
 constexpr ScalarRow kScalars[] = {
     {"com.norba.battery.charge_cycles", battery, {}, 412, growing},
-    {"com.norba.battery.full_charge_capacity_mah", battery, {.bucketInterval = 10}, 3046, steady},
+    {"com.norba.battery.full_charge_capacity_mah", battery, {.bucketInterval = 10}, 3046, constant},
     {"com.norba.battery.design_capacity_mah", battery, {}, 3227, constant},
     {"com.norba.battery.plugged_in_minutes", battery, {.bucketInterval = 15}, 342, weekends},
     {"com.norba.battery.plug_ins", battery, {}, 3, workdays},
