@@ -1,0 +1,103 @@
+#include "tools/demo/Device.h"
+
+#include <fcntl.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "platform/host/Files.h"
+
+namespace demo {
+
+using platform::Dictionary;
+using platform::Result;
+using platform::host::FileDescriptor;
+
+namespace {
+
+constexpr char kSubmitted[] = "var/spool/morvend/submitted";
+constexpr std::string_view kOptions = ".options.plist";
+constexpr std::size_t kLargestFile = std::size_t{64} << 20;
+
+Result<std::string> readHostFile(const std::string& path) {
+  const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
+  if (!file) return Result<std::string>::failure(std::strerror(errno));
+  return platform::host::readRegularFile(file.get(), kLargestFile);
+}
+
+}  // namespace
+
+Device::Device(std::string root)
+    : root_(std::move(root)),
+      host_({.root = root_, .lowestLevel = platform::LogLevel::error}),
+      context_(host_.platform()) {
+  host_.keepCountersBelow([this] { return context_.GetHomeDirectoryPath(); });
+  whitelist_ = report::PLConfig::init(host_.platform(), context_);
+}
+
+std::vector<std::string> Device::logs() {
+  std::vector<std::string> paths;
+  for (const std::string& name : namesIn(kSubmitted)) {
+    if (!name.starts_with("log-pellorand.193.") || name.ends_with(kOptions)) continue;
+    paths.push_back(pathOf(std::string(kSubmitted) + "/" + name));
+  }
+  return paths;
+}
+
+Result<SubmittedLog> Device::readLog(const std::string& path) {
+  const auto failure = [&](const std::string& why) {
+    return Result<SubmittedLog>::failure(path + ": " + why);
+  };
+  const auto bytes = readHostFile(path);
+  if (!bytes) return failure(bytes.error);
+  platform::PropertyListCodec& codec = host_.platform().propertyLists;
+  auto parsed = codec.read(*bytes);
+  if (!parsed) return failure(parsed.error);
+  auto* content = parsed->as<Dictionary>();
+  if (content == nullptr) return failure("not a dictionary");
+  SubmittedLog log{path, bytes->size(), std::move(*content), std::nullopt};
+  if (const auto beside = readHostFile(path + std::string(kOptions))) {
+    const auto options = codec.read(*beside);
+    const auto* dictionary = options ? options->as<Dictionary>() : nullptr;
+    const std::string* version =
+        dictionary != nullptr ? dictionary->text("previous_os_version") : nullptr;
+    if (version != nullptr) log.previousVersion = *version;
+  }
+  return Result<SubmittedLog>::success(std::move(log));
+}
+
+Recorded Device::recordedFor(std::int32_t day) {
+  Recorded recorded;
+  const auto history = host_.counters().initWithDefaultPath();
+  history->scalarsForKeyPrefix("", day - 1, day,
+                               [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
+                                 recorded.scalars.insert_or_assign(std::string(key), value);
+                               });
+  history->distributionsForKeyPrefix("", day - 1, day,
+                                     [&](std::string_view key, std::int32_t, auto&, bool&) {
+                                       recorded.distributions.emplace(key);
+                                     });
+  return recorded;
+}
+
+std::vector<std::string> Device::namesIn(const std::string& folder) {
+  std::vector<std::string> names;
+  const FileDescriptor opened =
+      host_.root().openFolder(folder, platform::host::DeviceRoot::Missing::fails);
+  if (opened) platform::host::namesInFolder(opened.get(), names);
+  return names;
+}
+
+std::optional<std::string> Device::bytes(const std::string& path) {
+  return host_.root().readFile(path, kLargestFile).value;
+}
+
+std::optional<Dictionary> Device::propertyList(const std::string& path) {
+  const auto content = bytes(path);
+  if (!content) return std::nullopt;
+  auto parsed = host_.platform().propertyLists.read(*content);
+  auto* dictionary = parsed ? parsed->as<Dictionary>() : nullptr;
+  return dictionary != nullptr ? std::optional(std::move(*dictionary)) : std::nullopt;
+}
+
+}  // namespace demo

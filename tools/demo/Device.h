@@ -1,0 +1,63 @@
+// A device root that a daily run has gone over, opened to be shown.
+#pragma once
+
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <optional>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "daemon/context/DeviceContext.h"
+#include "platform/Result.h"
+#include "platform/host/Host.h"
+#include "report/PLConfig.h"
+
+namespace demo {
+
+// A submitted report as it was written.
+struct SubmittedLog {
+  std::string path;  // of the host
+  std::size_t size;
+  platform::Dictionary content;
+  std::optional<std::string> previousVersion;  // from the options that were submitted with it
+};
+
+// What was recorded on a day and the one before, the later value of each key.
+struct Recorded {
+  std::map<std::string, std::int64_t, std::less<>> scalars;
+  std::set<std::string, std::less<>> distributions;
+};
+
+class Device {
+ public:
+  explicit Device(std::string root);
+
+  // The submitted reports, the oldest first: paths of the host.
+  std::vector<std::string> logs();
+
+  platform::Result<SubmittedLog> readLog(const std::string& path);
+  Recorded recordedFor(std::int32_t day);
+
+  // Null, with a line on standard error, when it can't be read.
+  const report::PLConfig* whitelist() const { return whitelist_.get(); }
+
+  // The names in a folder of the device, in bytewise order; a missing folder has none.
+  std::vector<std::string> namesIn(const std::string& folder);
+
+  // A file of the device: its bytes, or the property list that it is. None if there is none.
+  std::optional<std::string> bytes(const std::string& path);
+  std::optional<platform::Dictionary> propertyList(const std::string& path);
+
+  // The host's path of a path of the device.
+  std::string pathOf(const std::string& path) const { return root_ + "/" + path; }
+
+ private:
+  std::string root_;
+  platform::host::Host host_;
+  morvend::DeviceContext context_;
+  std::unique_ptr<report::PLConfig> whitelist_;
+};
+
+}  // namespace demo

@@ -1,0 +1,62 @@
+// The process of the command mkdevice.
+
+#include <unistd.h>
+
+#include <CLI/CLI.hpp>
+#include <filesystem>
+#include <iostream>
+
+#include "platform/CivilDate.h"
+#include "platform/host/SystemClock.h"
+#include "tools/mkdevice/DeviceMaker.h"
+
+namespace {
+
+// In the folder lib beside the one that this program stands in.
+std::string moduleBesideProgram() {
+  std::error_code error;
+  const auto program = std::filesystem::read_symlink("/proc/self/exe", error);
+  return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  constexpr int kDone = 0, kFailed = 1, kUsage = 2;
+  mkdevice::MakingOptions options;
+  options.module = moduleBesideProgram();
+
+  CLI::App app("Makes a complete sample device root, with some weeks of counters up to yesterday.",
+               "mkdevice");
+  app.set_version_flag("--version", "mkdevice " MORVEND_VERSION);
+  app.add_option("DIR", options.folder, "the root's folder: empty, or not there yet")->required();
+  app.add_option("--seed", options.sample.seed,
+                 "the same number on the same day makes the same device; default: 1");
+  app.add_option("--scale", options.sample.scale, "so many times the usual counters; default: 1")
+      ->check(CLI::Range(1, mkdevice::kLargestScale));
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) return app.exit(error);
+    std::cerr << "mkdevice: " << error.what() << '\n';
+    return kUsage;
+  }
+
+  const bool terminal = ::isatty(STDERR_FILENO) == 1;
+  const char* const clearLine = terminal ? "\r\x1b[K" : "";
+  options.sample.today = platform::dayNumber(platform::host::SystemClock().now().secondsSince1970);
+  const std::string error =
+      mkdevice::makeDevice(options, {.progress =
+                                         [&](const std::string& text) {
+                                           if (terminal)
+                                             std::cerr << clearLine << text << std::flush;
+                                         },
+                                     .warning =
+                                         [&](const std::string& text) {
+                                           std::cerr << clearLine << "mkdevice: " << text << '\n';
+                                         }});
+  std::cerr << clearLine;
+  if (error.empty()) return kDone;
+  std::cerr << "mkdevice: " << error << '\n';
+  return kFailed;
+}
