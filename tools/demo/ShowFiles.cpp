@@ -43,11 +43,11 @@ std::string linesOf(Device& device, const std::string& path, const char* kind,
 }
 
 std::string structuredLogsOf(Device& device) {
-  const std::string folder = "var/spool/morvend/submitted";
+  const std::string folder = "var/spool/morvend/submitted/";
   std::string shown;
   for (const std::string& name : device.namesIn(folder)) {
     if (name.starts_with("structured-")) {
-      shown += linesOf(device, folder + "/" + name, "type", "data");
+      shown += linesOf(device, std::string(folder).append(name), "type", "data");
     }
   }
   return shown;

@@ -173,10 +173,10 @@ class LogText {
       part.push_back(&scalar);
     }
     text_ += "\n" + heading("Scalars: " + std::to_string(scalars.size()) + " reported" + keyNote());
-    addRows("recorded, and whitelisted by their own key", own, atMost(kMostOwnRows));
+    addRows("recorded, and whitelisted by their own key", own, kMostOwnRows);
     addRows("recorded, and whitelisted by the prefix in brackets", byPrefix,
             atMost(kMostPrefixRows));
-    addRows("collected by the report itself", collected, atMost(kMostCollectedRows));
+    addRows("collected by the report itself", collected, kMostCollectedRows);
     addWithheld(recorded_.scalars, "PLScalars",
                 [](const auto& entry) -> const std::string& { return entry.first; });
   }
