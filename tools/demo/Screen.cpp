@@ -60,19 +60,18 @@ std::string shortKey(std::string_view key) {
                                   : std::string(key);
 }
 
-std::string wrapped(const std::vector<std::string>& names, std::size_t most) {
-  std::string text, line;
-  std::size_t lines = 0;
-  for (std::size_t i = 0; i < names.size(); ++i) {
-    if (!line.empty() && kIndent + kGap + line.size() + 1 + names[i].size() > screenWidth()) {
-      text += std::string(kIndent + kGap, ' ') + line + '\n';
-      line.clear();
-      if (++lines == most) return text + "  … and " + std::to_string(names.size() - i) + " more\n";
+std::string wrapped(const std::vector<std::string>& names) {
+  const std::string indent(kIndent, ' ');
+  std::string text, line = indent;
+  for (const std::string& name : names) {
+    if (line.size() > kIndent && line.size() + 1 + name.size() > screenWidth()) {
+      text += line + '\n';
+      line = indent;
     }
-    if (!line.empty()) line += ' ';
-    line += names[i];
+    if (line.size() > kIndent) line += ' ';
+    line += name;
   }
-  return line.empty() ? text : text + std::string(kIndent + kGap, ' ') + line + '\n';
+  return line.size() > kIndent ? text + line + '\n' : text;
 }
 
 std::string bar(double share, std::size_t width) {

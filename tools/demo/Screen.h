@@ -21,8 +21,8 @@ std::string elided(std::string_view text, std::size_t width);
 // A key without the beginning that nearly all have: "~" stands for "com.norba".
 std::string shortKey(std::string_view key);
 
-// Names one after the other in indented lines; past `most` lines, how many more there are.
-std::string wrapped(const std::vector<std::string>& names, std::size_t most);
+// Names one after the other, in indented lines.
+std::string wrapped(const std::vector<std::string>& names);
 
 // A bar for a share of 1, `width` columns long for all of it, in steps of an eighth of a column.
 // What is more than nothing is seen.

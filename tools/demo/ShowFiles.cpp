@@ -43,11 +43,11 @@ std::string linesOf(Device& device, const std::string& path, const char* kind,
 }
 
 std::string structuredLogsOf(Device& device) {
-  const std::string folder = "var/spool/morvend/submitted";
+  const std::string folder = "var/spool/morvend/submitted/";
   std::string shown;
   for (const std::string& name : device.namesIn(folder)) {
     if (name.starts_with("structured-")) {
-      shown += linesOf(device, folder + "/" + name, "type", "data");
+      shown += linesOf(device, std::string(folder).append(name), "type", "data");
     }
   }
   return shown;
@@ -68,20 +68,23 @@ std::string settingsOf(Device& device, const Array& payload) {
     const std::string* domain = item != nullptr ? item->text("Domain") : nullptr;
     const std::string* key = item != nullptr ? item->text("Key") : nullptr;
     if (user == nullptr || domain == nullptr || key == nullptr) continue;
-    const std::string path = preferencesPath(*user, *domain);
-    const auto preferences = device.propertyList(path);
+    const auto preferences = device.propertyList(preferencesPath(*user, *domain));
     table.addRow(
-        {device.pathOf(path),
+        {"  " + *user + "/" + *domain + ".plist",
          *key + " = " + platform::description(preferences ? preferences->find(*key) : nullptr)});
   }
   return "  " + device.pathOf("var/preferences") + "\n" + table.text();
 }
 
-std::string onOneLine(const std::string& text) {
-  std::istringstream words(text);
-  std::string line;
-  for (std::string word; words >> word;) line += (line.empty() ? "" : " ") + word;
-  return line;
+std::string inShort(const Value& value) {
+  if (const auto* array = value.as<Array>()) return format("%zu settings", array->size());
+  const auto* dictionary = value.as<Dictionary>();
+  if (dictionary == nullptr) return platform::description(value);
+  std::string text;
+  for (const auto& [key, content] : *dictionary) {
+    text += (text.empty() ? "" : ", ") + key + " " + inShort(content);
+  }
+  return text;
 }
 
 std::string records(Device& device) {
@@ -91,10 +94,7 @@ std::string records(Device& device) {
   if (!preferences) return shown + "    (not there)\n";
   Table table({{"", Align::left}, {"", Align::left}});
   for (const auto& [key, value] : *preferences) {
-    const auto* array = value.as<Array>();
-    std::string text =
-        array != nullptr ? format("%zu settings", array->size()) : platform::description(value);
-    table.addRow({key, onOneLine(text)});
+    table.addRow({key, inShort(value)});
   }
   return shown + table.text();
 }

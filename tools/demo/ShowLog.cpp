@@ -19,8 +19,8 @@ using Align = Table::Align;
 
 namespace {
 
-constexpr std::size_t kMostOwnRows = 10, kMostPrefixRows = 8, kMostCollectedRows = 8;
-constexpr std::size_t kMostDistributions = 25, kMostHistograms = 3, kMostLinesOfNames = 2;
+constexpr std::size_t kMostOwnRows = 12, kMostPrefixRows = 8, kMostCollectedRows = 8;
+constexpr std::size_t kMostDistributions = 25, kMostHistograms = 3, kMostNames = 8;
 constexpr std::size_t kAll = SIZE_MAX;
 
 // The key; in brackets the prefix that let it through.
@@ -173,10 +173,10 @@ class LogText {
       part.push_back(&scalar);
     }
     text_ += "\n" + heading("Scalars: " + std::to_string(scalars.size()) + " reported" + keyNote());
-    addRows("recorded, and whitelisted by their own key", own, atMost(kMostOwnRows));
+    addRows("recorded, and whitelisted by their own key", own, kMostOwnRows);
     addRows("recorded, and whitelisted by the prefix in brackets", byPrefix,
             atMost(kMostPrefixRows));
-    addRows("collected by the report itself", collected, atMost(kMostCollectedRows));
+    addRows("collected by the report itself", collected, kMostCollectedRows);
     addWithheld(recorded_.scalars, "PLScalars",
                 [](const auto& entry) -> const std::string& { return entry.first; });
   }
@@ -188,14 +188,17 @@ class LogText {
   template <typename Rows, typename KeyOf>
   void addWithheld(const Rows& rows, const char* sectionName, const KeyOf& keyOf) {
     const Dictionary& reported = section(sectionName);
-    std::vector<std::string> names;
+    std::vector<std::string> withheld, shown;
     for (const auto& row : rows) {
       const std::string& key = keyOf(row);
-      if (isAskedFor(key) && reported.find(key) == nullptr) names.push_back(shortKey(key));
+      if (isAskedFor(key) && reported.find(key) == nullptr) withheld.push_back(shortKey(key));
     }
-    if (names.empty()) return;
-    text_ += format("\n  recorded, and withheld by the whitelist: %zu\n", names.size());
-    text_ += wrapped(names, options_.all ? kAll : kMostLinesOfNames);
+    if (withheld.empty()) return;
+    for (const std::size_t i : evenlySpread(withheld.size(), atMost(kMostNames))) {
+      shown.push_back(withheld[i]);
+    }
+    text_ += format("\n  recorded, and withheld by the whitelist: %zu\n", withheld.size());
+    text_ += wrapped(shown) + more(withheld.size(), shown.size());
   }
 
   void addDistributions() {
