@@ -167,9 +167,11 @@ TEST(CounterStoreDamage, ASecondDamageReplacesTheFirstThatWasSetAside) {
 TEST(CounterStoreDamage, AHeaderThatForbidsWritingDoesNotDisableTheStoreForever) {
   for (const bool empty : {true, false}) {
     const support::TemporaryFolder folder;
-    StoreFixture original(folder.path());
-    original.store.set("k", 1, 1);
-    if (!empty) original.store.PLClientCheckpoint();
+    {
+      StoreFixture original(folder.path());
+      original.store.set("k", 1, 1);
+      if (!empty) original.store.PLClientCheckpoint();
+    }
     std::string database = folder.read(support::kDatabase);
     database[18] = 7;  // the write version
     folder.write(support::kDatabase, database);
