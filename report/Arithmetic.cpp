@@ -11,8 +11,6 @@
 
 namespace report {
 
-using platform::Number;
-
 namespace {
 
 std::uint64_t magnitude(std::int64_t value) {

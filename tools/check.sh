@@ -28,7 +28,7 @@ layering daemon "platform/host/|platform/testing/|tools/|$libraries" '^daemon/ma
 echo "== clang-tidy"
 cmake --preset release >/dev/null
 git ls-files -- '*.cpp' | grep -E '^(platform|report|daemon|tools)/' |
-  xargs -P 2 -n 4 clang-tidy --quiet -p build/release 2>/dev/null || failed=1
+  xargs -P 2 -n 4 clang-tidy --quiet --extra-arg=-Wno-unknown-warning-option -p build/release 2>/dev/null || failed=1
 
 [ $failed -eq 0 ] && echo "all checks passed"
 exit $failed

@@ -149,7 +149,7 @@ class Reader {
     if (!error_.empty()) return;
     error_ = format("XML property list, line %llu, column %llu: %.*s",
                     static_cast<unsigned long long>(XML_GetCurrentLineNumber(parser_.get())),
-                    static_cast<unsigned long long>(XML_GetCurrentColumnNumber(parser_.get()) + 1),
+                    static_cast<unsigned long long>(XML_GetCurrentColumnNumber(parser_.get())) + 1,
                     static_cast<int>(text.size()), text.data());
     XML_StopParser(parser_.get(), XML_FALSE);
   }

@@ -42,7 +42,7 @@ std::optional<double> secondsFromTimestamp(std::string_view text) {
   }
   const std::int64_t day = daysFromCivil(date);
   if (civilFromDays(day) != date) return std::nullopt;
-  const std::int64_t seconds = day * kSecondsPerDay + (hour * 60 + minute) * 60 + second;
+  const std::int64_t seconds = day * kSecondsPerDay + hour * 3600L + minute * 60L + second;
   const auto instant = static_cast<double>(seconds);
   return std::fabs(instant) <= 1e14 ? std::optional(instant) : std::nullopt;
 }

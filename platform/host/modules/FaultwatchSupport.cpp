@@ -1,5 +1,5 @@
-// The module that a device root carries at the place of the crash-reporting support library. It acts
-// on the preferences of the process that loads it, so that both see one state of every domain.
+// The module that a device root carries at the place of the crash-reporting support library. It
+// acts on the preferences of the process that loads it, so that both see one state of every domain.
 
 #include "platform/FaultwatchSupport.h"
 #include "platform/PreferenceStore.h"
