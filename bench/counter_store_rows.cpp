@@ -1,54 +1,26 @@
 // The counters store beside bare SQLite: querying two of sixty days, and adding a sample.
 #include <sqlite3.h>
-#include <stdlib.h>
 
-#include <cstdio>
 #include <cstring>
-#include <filesystem>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "bench/Rows.h"
-#include "platform/host/CounterStore.h"
+#include "support/HostOnRoot.h"
+#include "support/TemporaryFolder.h"
 
 namespace {
 
 constexpr std::int32_t kDays = 60;
 constexpr int kScalars = 5000, kDistributions = 1000, kSamples = 100;
 constexpr int kAppends = 2000;
-constexpr char kDatabase[] = "/var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
-
-class StandardErrorLog : public platform::SystemLog {
- public:
-  StandardErrorLog() : SystemLog(platform::LogLevel::standard) {}
-
- private:
-  void write(platform::LogLevel, std::string_view message) override {
-    std::fprintf(stderr, "%.*s\n", static_cast<int>(message.size()), message.data());
-  }
-};
-
-struct StoppedClock : platform::Clock {
-  platform::Date now() override { return {86400.0 * kDays}; }
-};
-
-std::string temporaryFolder() {
-  std::string folder = (std::filesystem::temp_directory_path() / "bench-XXXXXX").string();
-  if (::mkdtemp(folder.data()) == nullptr) throw std::runtime_error("mkdtemp failed");
-  return folder;
-}
 
 // A device root in a temporary folder, with a store.
 struct Device {
-  ~Device() { std::filesystem::remove_all(folder); }
-
-  std::string folder = temporaryFolder();
-  platform::host::DeviceRoot root{folder};
-  StoppedClock clock;
-  StandardErrorLog log;
-  platform::host::CounterStore store{root, clock, log, [] { return std::string("/var/mobile"); },
-                                     [] {}};
+  support::TemporaryFolder root;
+  support::HostOnRoot host{root.path()};
+  platform::host::CounterStore& store = host.counters();
 };
 
 // Bare SQLite, on the store's file or on one of its own.
@@ -107,8 +79,8 @@ void fill(Device& device) {
 void addQueryRows(bench::Table& table) {
   Device device;
   fill(device);
-  Bare bare(device.folder + kDatabase, "PRAGMA cell_size_check = ON");
-  Bare bareSamples(device.folder + kDatabase, "PRAGMA cell_size_check = ON");
+  Bare bare(device.root / support::kCountersDatabase, "PRAGMA cell_size_check = ON");
+  Bare bareSamples(device.root / support::kCountersDatabase, "PRAGMA cell_size_check = ON");
   const auto history = device.store.initWithDefaultPath();
 
   sqlite3_stmt* scan = bare.prepare(
@@ -178,7 +150,7 @@ void addQueryRows(bench::Table& table) {
 
 void addAppendRow(bench::Table& table) {
   Device device;
-  Bare bare(device.folder + "/bare.sqlitedb",
+  Bare bare(device.root / "bare.sqlitedb",
             "PRAGMA journal_mode = WAL; PRAGMA synchronous = NORMAL; PRAGMA mmap_size = 0;"
             "PRAGMA cell_size_check = ON; PRAGMA wal_autocheckpoint = 1000;"
             "CREATE TABLE staged(day INTEGER NOT NULL, key TEXT NOT NULL, "

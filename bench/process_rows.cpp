@@ -16,7 +16,7 @@
 
 #include "bench/Rows.h"
 #include "platform/CivilDate.h"
-#include "platform/host/Host.h"
+#include "support/HostOnRoot.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
@@ -127,9 +127,7 @@ class ReportDevice {
     return "com.example.distribution" + std::to_string(i);
   }
 
-  std::string database() const {
-    return root_ / "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
-  }
+  std::string database() const { return root_ / support::kCountersDatabase; }
 
   void writePropertyList(const char* path, const Dictionary& dictionary) {
     root_.write(path, *host_.platform().propertyLists.writeXML(dictionary));
@@ -137,8 +135,6 @@ class ReportDevice {
 
   void fill(int scalars, int distributions, int samples) {
     using platform::host::CounterChange;
-    const std::string home = "/var/mobile";
-    host_.keepCountersBelow([&] { return &home; });
     yesterday_ = platform::dayBefore(host_.counters().PLDaysSince1970());
     std::vector<std::string> keys;
     for (int i = 0; i < scalars; ++i) keys.push_back(scalarKey(i));
@@ -169,7 +165,7 @@ class ReportDevice {
   }
 
   support::TemporaryFolder root_;
-  platform::host::Host host_{{.root = root_.path().string()}};
+  support::HostOnRoot host_{root_.path()};
   std::int32_t yesterday_ = 0;
 };
 

@@ -7,21 +7,13 @@
 #include "platform/Text.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/host/SystemClock.h"
+#include "support/HostOnRoot.h"
 
 namespace end_to_end {
 
 using platform::format;
 
 namespace {
-
-// A host on the root, for the test itself.
-struct TestHost {
-  explicit TestHost(const std::string& root) : host({.root = root}) {
-    host.keepCountersBelow([this] { return &home; });
-  }
-  std::string home = "/var/mobile";
-  platform::host::Host host;
-};
 
 Dictionary setting(const char* user, const char* key) {
   return {{"Domain", "com.example"}, {"User", user}, {"Key", key}, {"Value", key}};
@@ -34,13 +26,13 @@ Device::Device()
       today_(platform::dayNumber(platform::host::SystemClock().now().secondsSince1970)) {}
 
 void Device::fill() {
-  TestHost test(root_->path());
+  support::HostOnRoot host(root_->path());
   for (std::int32_t day = today_ - 3; day < today_; ++day) {
     for (const char* key : {"exact", "family.a", "family.b", "secret"}) {
-      test.host.counters().set(key, 1000 * (day % 7) + 123, day);
+      host.counters().set(key, 1000 * (day % 7) + 123, day);
     }
-    for (int i = 0; i < 40; ++i) test.host.counters().push("samples", i * 0.5, day, i);
-    if (day == today_ - 3) test.host.counters().PLClientCheckpoint();
+    for (int i = 0; i < 40; ++i) host.counters().push("samples", i * 0.5, day, i);
+    if (day == today_ - 3) host.counters().PLClientCheckpoint();
   }
   const Dictionary rounded{{"bucket_interval", 10}, {"sig_fig", 2}};
   writePropertyList(
@@ -154,9 +146,9 @@ Dictionary Device::expectedSections() const {
 }
 
 Lines Device::history() const {
-  TestHost test(root_->path());
+  support::HostOnRoot host(root_->path());
   Lines rows;
-  const auto history = test.host.platform().history.initWithDefaultPath();
+  const auto history = host.platform().history.initWithDefaultPath();
   history->scalarsForKeyPrefix(
       "", INT32_MIN, INT32_MAX,
       [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {

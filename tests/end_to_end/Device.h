@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "faults/FaultRun.h"
-#include "platform/host/Host.h"
+#include "platform/PropertyList.h"
 #include "support/TemporaryFolder.h"
 
 namespace end_to_end {
@@ -19,7 +19,6 @@ using Lines = std::vector<std::string>;
 
 inline constexpr char kDomain[] = "com.norba.pellorand.morvend";
 inline constexpr char kWhitelist[] = "Library/Application Support/Pelloran/Whitelist_Vrn.plist";
-inline constexpr char kDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
 inline constexpr char kSubmitted[] = "var/spool/morvend/submitted";
 inline constexpr char kModule[] =
     "System/Library/PrivateFrameworks/FaultwatchSupport.framework/FaultwatchSupport";

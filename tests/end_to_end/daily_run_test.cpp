@@ -8,6 +8,7 @@
 #include <thread>
 
 #include "end_to_end/Device.h"
+#include "support/HostOnRoot.h"
 
 namespace end_to_end {
 namespace {
@@ -111,7 +112,7 @@ TEST(DailyRun, ReportsADamagedDatabaseTheNextDay) {
   Device device;
   device.fill();
   {
-    std::fstream file(device.root() / kDatabase);
+    std::fstream file(device.root() / support::kCountersDatabase);
     file.seekp(100);
     file << std::string(3000, '\xff');
   }
@@ -119,7 +120,8 @@ TEST(DailyRun, ReportsADamagedDatabaseTheNextDay) {
   EXPECT_EQ(damaged.status, 0);
   EXPECT_TRUE(holds(linesOf(damaged.standardError), "set aside as PLDataStore.sqlitedb.corrupt"))
       << damaged.standardError;
-  EXPECT_TRUE(std::filesystem::exists(device.root() / (std::string(kDatabase) + ".corrupt")));
+  EXPECT_TRUE(std::filesystem::exists(device.root() /
+                                      (std::string(support::kCountersDatabase) + ".corrupt")));
   EXPECT_TRUE(device.dailyLogs().empty());
   EXPECT_EQ(device.run("pelloran", {"set", "exact", "7", "--day", "yesterday"}).status, 0);
   device.run("morvend", {"-f"});
@@ -146,8 +148,8 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
                                  "var/spool",
                                  "var/log/servita/a.log",
                                  "var/log/servita/a.log.2",
-                                 kDatabase,
-                                 std::string(kDatabase) + "-wal",
+                                 support::kCountersDatabase,
+                                 std::string(support::kCountersDatabase) + "-wal",
                                  "var/mobile/Library/Pelloran"};
   Device filled;
   filled.fill();
