@@ -171,6 +171,11 @@ Failure CounterDatabase::connect(Use use) {
   }
   opened_ = *now;
   const std::string path = pathOnHost();
+  // SQLite takes a missing path for a temporary database.
+  if (path.empty()) {
+    return {Failure::Kind::other,
+            format("its path can't be read from /proc: %s", errorText(errno))};
+  }
   connection_ = std::make_unique<Connection>(path, Connection::Access::readWrite);
   verify(use);
   if (use == Use::read && connection_ && connection_->failure().kind == Failure::Kind::unwritable) {
