@@ -17,4 +17,8 @@ void addReportRows(Table& table);
 // Writing and reading a property list that looks like a report.
 void addPropertyListRows(Table& table);
 
+// Decoding controller buffers, and renaming and filtering what they hold.
+void addStorageParserRows(Table& table);
+void addStorageTableRows(Table& table);
+
 }  // namespace bench

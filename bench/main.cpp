@@ -8,6 +8,8 @@ int main() {
   bench::addCounterStoreRows(table);
   bench::addReportRows(table);
   bench::addPropertyListRows(table);
+  bench::addStorageParserRows(table);
+  bench::addStorageTableRows(table);
   table.finish();
   return 0;
 }

@@ -20,6 +20,13 @@ class DeviceProperties {
   // The multi-user indicator, or none when the query fails.
   virtual std::optional<std::uint32_t> multiUserIndicator() = 0;
 
+  // The device's disk usage; an entry that the device doesn't know is 0. None when it has no
+  // answer.
+  struct DiskUsage {
+    std::uint64_t totalDiskCapacity, totalDataAvailable, amountDataAvailable;  // bytes
+  };
+  virtual std::optional<DiskUsage> diskUsage() = 0;
+
   // The path of a system group container. None when there is none, with the error code set.
   virtual std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
                                                               std::uint64_t& error) = 0;

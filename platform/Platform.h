@@ -4,6 +4,7 @@
 #include "platform/Clock.h"
 #include "platform/CountersService.h"
 #include "platform/DeviceProperties.h"
+#include "platform/DeviceRegistry.h"
 #include "platform/Digest.h"
 #include "platform/EventLoop.h"
 #include "platform/Eventra.h"
@@ -11,14 +12,17 @@
 #include "platform/FileSystem.h"
 #include "platform/InstalledApplications.h"
 #include "platform/Kernel.h"
+#include "platform/KernelSnapshots.h"
 #include "platform/LibraryLoader.h"
 #include "platform/LocaleService.h"
 #include "platform/LogSubmission.h"
 #include "platform/PLHistory.h"
 #include "platform/PreferenceStore.h"
 #include "platform/PropertyListCodec.h"
+#include "platform/PurgeableSpace.h"
 #include "platform/RunLock.h"
 #include "platform/ServitaLogs.h"
+#include "platform/StandardStreams.h"
 #include "platform/SystemLog.h"
 
 namespace platform {
@@ -26,6 +30,7 @@ namespace platform {
 // References only: whoever makes a Platform keeps the services alive longer than its users.
 struct Platform {
   SystemLog& log;
+  StandardStreams& streams;
   Clock& clock;
   Digest& digest;
   PropertyListCodec& propertyLists;
@@ -45,6 +50,10 @@ struct Platform {
   DeviceProperties& deviceProperties;
   SystemVersion& systemVersion;
   Kernel& kernel;
+  KernelSnapshots& snapshots;
+  DeviceRegistry& registry;
+  DriverConnections& drivers;
+  PurgeableSpace& purgeableSpace;
   InstalledApplications& applications;
   LocaleService& locale;
   LibraryLoader& libraries;

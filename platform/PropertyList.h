@@ -13,7 +13,9 @@
 #include <variant>
 #include <vector>
 
-namespace platform {
+#include "platform/Exported.h"
+
+namespace platform MORVEND_EXPORTED {
 
 class Value;
 
@@ -181,4 +183,4 @@ inline const Dictionary::Entry* Dictionary::end() const {
   return entries_.data() + entries_.size();
 }
 
-}  // namespace platform
+}  // namespace MORVEND_EXPORTED

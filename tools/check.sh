@@ -22,12 +22,13 @@ layering platform "platform/host/|platform/testing/|report/|daemon/|tools/|$libr
   '^platform/(host|testing)/'
 layering platform/testing "platform/host/|report/|daemon/|tools/|$libraries"
 layering platform/host 'platform/testing/|report/|daemon/|tools/'
+layering NANDInfo "platform/host/|platform/testing/|report/|daemon/|tools/|$libraries"
 layering report "platform/host/|platform/testing/|daemon/[^c]|tools/|$libraries"
 layering daemon "platform/host/|platform/testing/|tools/|$libraries" '^daemon/main\.cpp$'
 
 echo "== clang-tidy"
 cmake --preset release -DMORVEND_TESTS=ON >/dev/null
-git ls-files -- '*.cpp' | grep -E '^(platform|report|daemon|tools)/' |
+git ls-files -- '*.cpp' | grep -E '^(platform|NANDInfo|report|daemon|tools)/' |
   xargs -P 2 -n 4 clang-tidy --quiet --extra-arg=-Wno-unknown-warning-option -p build/release 2>/dev/null || failed=1
 
 [ $failed -eq 0 ] && echo "all checks passed"

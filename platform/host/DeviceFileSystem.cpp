@@ -11,6 +11,10 @@ std::optional<std::uint64_t> DeviceFileSystem::fileStatus(std::string_view path)
   return static_cast<std::uint64_t>(status.st_size);
 }
 
+std::optional<FileSystem::Statistics> DeviceFileSystem::statfs(std::string_view) {
+  return std::nullopt;
+}
+
 std::optional<std::string> DeviceFileSystem::readFile(std::string_view path, std::size_t maximum) {
   return root_.readFile(path, maximum).value;
 }

@@ -12,6 +12,7 @@ class DeviceFileSystem final : public FileSystem {
   explicit DeviceFileSystem(const DeviceRoot& root) : root_(root) {}
 
   std::optional<std::uint64_t> fileStatus(std::string_view path) override;
+  std::optional<Statistics> statfs(std::string_view path) override;
   std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override;
 
  private:

@@ -9,10 +9,14 @@
 #include "platform/host/EventSink.h"
 #include "platform/host/HostApplications.h"
 #include "platform/host/HostDeviceProperties.h"
+#include "platform/host/HostDeviceRegistry.h"
 #include "platform/host/HostKernel.h"
+#include "platform/host/HostKernelSnapshots.h"
 #include "platform/host/HostLibraryLoader.h"
 #include "platform/host/HostLocale.h"
 #include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/HostPurgeableSpace.h"
+#include "platform/host/HostStandardStreams.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
 #include "platform/host/PreferenceFiles.h"
@@ -44,6 +48,7 @@ struct Host::Services {
 
   DeviceRoot root;
   StandardErrorLog log;
+  HostStandardStreams streams;
   SystemClock clock;
   MD5Digest digest;
   HostPropertyListCodec codec;
@@ -65,16 +70,20 @@ struct Host::Services {
   HostDeviceProperties deviceProperties{root, propertiesFile};
   HostSystemVersion systemVersion{root, codec, log};
   HostKernel kernel{root, codec, log};
+  HostKernelSnapshots snapshots{root};
+  HostDeviceRegistry registry{root, codec, log};
+  HostPurgeableSpace purgeableSpace{root, codec, log};
   HostApplications applications{root, codec, log};
   HostLocale locale{root, codec, log};
   HostLibraryLoader libraries{root, preferences};
   RunLockFile runLock{root, log};
 
-  Platform platform{log,          clock,          digest,           codec,         files,
-                    counters,     counters,       preferences,      preferences,   preferences,
-                    submission,   structuredLogs, servitaLogs,      bus,           bus,
-                    bus,          eventSink,      deviceProperties, systemVersion, kernel,
-                    applications, locale,         libraries,        runLock};
+  Platform platform{log,          streams,    clock,          digest,           codec,
+                    files,        counters,   counters,       preferences,      preferences,
+                    preferences,  submission, structuredLogs, servitaLogs,      bus,
+                    bus,          bus,        eventSink,      deviceProperties, systemVersion,
+                    kernel,       snapshots,  registry,       registry,         purgeableSpace,
+                    applications, locale,     libraries,      runLock};
 };
 
 Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {

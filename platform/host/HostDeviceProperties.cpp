@@ -29,6 +29,10 @@ std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {
   return static_cast<std::uint32_t>(value->uint64Value());
 }
 
+std::optional<DeviceProperties::DiskUsage> HostDeviceProperties::diskUsage() {
+  return std::nullopt;
+}
+
 std::optional<std::string> HostDeviceProperties::systemGroupContainerPath(
     std::string_view identifier, std::uint64_t& error) {
   if (isPlainName(identifier)) {

@@ -15,6 +15,10 @@ class HostDeviceProperties : public DeviceProperties {
   bool booleanProperty(std::string_view name) override;
   std::optional<std::uint32_t> multiUserIndicator() override;
 
+  // Without the entry, the figures of the file system that holds the root; with one of another type
+  // than a dictionary, no answer.
+  std::optional<DiskUsage> diskUsage() override;
+
   // /var/containers/systemgroup/<identifier>, a path of the device, where that folder exists; else
   // error 2. An identifier that is not a plain name has no container.
   std::optional<std::string> systemGroupContainerPath(std::string_view identifier,

@@ -13,6 +13,12 @@ std::optional<std::uint64_t> FakeFileSystem::fileStatus(std::string_view path) {
                                  : std::nullopt;
 }
 
+std::optional<FileSystem::Statistics> FakeFileSystem::statfs(std::string_view path) {
+  const auto volume = volumes.find(path);
+  if (volume == volumes.end()) return std::nullopt;
+  return volume->second;
+}
+
 std::optional<std::string> FakeFileSystem::readFile(std::string_view path, std::size_t maximum) {
   const auto found = contents.find(path);
   if (found == contents.end()) return std::nullopt;
@@ -242,10 +248,11 @@ Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std
 }
 
 FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest)
-    : log(lowest), platform{log,        clock,        digest,       codec,       files,
-                            counters,   history,      preferences,  preferences, preferences,
-                            submission, housekeeping, housekeeping, service,     service,
-                            service,    eventra,      device,       device,      kernel,
-                            device,     device,       device,       runLock} {}
+    : log(lowest), platform{log,         streams,    clock,        digest,       codec,
+                            files,       counters,   history,      preferences,  preferences,
+                            preferences, submission, housekeeping, housekeeping, service,
+                            service,     service,    eventra,      device,       device,
+                            kernel,      snapshots,  registry,     registry,     purgeableSpace,
+                            device,      device,     device,       runLock} {}
 
 }  // namespace platform::fakes

@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "platform/Platform.h"
+#include "platform/testing/FakeDeviceRegistry.h"
 #include "platform/testing/RecordingLog.h"
 
 namespace platform::fakes {
@@ -30,7 +31,9 @@ class FakeClock : public Clock {
 class FakeFileSystem : public FileSystem {
  public:
   std::map<std::string, std::string, std::less<>> contents;
+  std::map<std::string, Statistics, std::less<>> volumes;  // by the path that is asked for
   std::optional<std::uint64_t> fileStatus(std::string_view path) override;
+  std::optional<Statistics> statfs(std::string_view path) override;
   std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override;
 };
 
@@ -175,6 +178,8 @@ class FakeDevice : public DeviceProperties,
   bool libraryLoads = true;
   int loads = 0;
 
+  std::optional<DiskUsage> usage;
+  std::optional<DiskUsage> diskUsage() override { return usage; }
   bool booleanProperty(std::string_view name) override;
   std::optional<std::uint32_t> multiUserIndicator() override { return multiUser; }
   std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
@@ -208,6 +213,37 @@ class FakeKernel : public Kernel {
   std::optional<Timebase> timebase() override { return ratio; }
 };
 
+class FakeSnapshots : public KernelSnapshots {
+ public:
+  std::optional<std::vector<std::byte>> snapshot;
+  std::uint32_t flags = 0;  // of the last capture
+  std::optional<std::vector<std::byte>> capture(std::uint32_t wanted) override {
+    flags = wanted;
+    return snapshot;
+  }
+};
+
+class FakePurgeableSpace : public PurgeableSpace {
+ public:
+  bool present = false;
+  std::optional<Dictionary> answer;
+  Dictionary lastQuery;
+  bool isPresent() override { return present; }
+  std::optional<Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
+      const Dictionary& query) override {
+    lastQuery = query;
+    return answer;
+  }
+};
+
+class FakeStreams : public StandardStreams {
+ public:
+  std::vector<std::string> errors;
+  std::string output;
+  void writeError(std::string_view text) override { errors.emplace_back(text); }
+  void writeOutput(std::string_view text) override { output += text; }
+};
+
 class FakeRunLock : public RunLock {
  public:
   int held = 0, taken = 0;
@@ -222,6 +258,7 @@ class FakePlatform {
 
   Journal journal;
   RecordingLog log;
+  FakeStreams streams;
   FakeClock clock;
   FakeFileSystem files;
   FakeCounters counters{journal};
@@ -233,6 +270,9 @@ class FakePlatform {
   FakeEventra eventra;
   FakeDevice device;
   FakeKernel kernel;
+  FakeSnapshots snapshots;
+  FakeDeviceRegistry registry;
+  FakePurgeableSpace purgeableSpace;
   FakeRunLock runLock;
   Platform platform;
 };

@@ -18,6 +18,9 @@ struct Files : FileSystem {
   std::optional<std::uint64_t> fileStatus(std::string_view path) override {
     return plan.fails() ? std::nullopt : inner.fileStatus(path);
   }
+  std::optional<Statistics> statfs(std::string_view path) override {
+    return plan.fails() ? std::nullopt : inner.statfs(path);
+  }
   std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override {
     return plan.fails() ? std::nullopt : inner.readFile(path, maximum);
   }
@@ -111,6 +114,9 @@ struct Device : DeviceProperties, SystemVersion, LibraryLoader {
   std::optional<std::uint32_t> multiUserIndicator() override {
     return plan.fails() ? std::nullopt : inner.deviceProperties.multiUserIndicator();
   }
+  std::optional<DiskUsage> diskUsage() override {
+    return plan.fails() ? std::nullopt : inner.deviceProperties.diskUsage();
+  }
   std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
                                                       std::uint64_t& error) override {
     if (plan.fails()) return std::nullopt;
@@ -158,6 +164,7 @@ struct FaultInjector::Services {
         device(inner, plan),
         kernel(inner.kernel, plan),
         platform{inner.log,
+                 inner.streams,
                  inner.clock,
                  inner.digest,
                  propertyLists,
@@ -177,6 +184,10 @@ struct FaultInjector::Services {
                  device,
                  device,
                  kernel,
+                 inner.snapshots,
+                 inner.registry,
+                 inner.drivers,
+                 inner.purgeableSpace,
                  inner.applications,
                  inner.locale,
                  device,

@@ -1,0 +1,28 @@
+#include "NANDInfo/APIErrorMessage.h"
+
+#include <cstdarg>
+#include <cstdio>
+
+namespace NANDInfo {
+
+namespace {
+
+char message[1024];
+bool recorded = false;
+
+}  // namespace
+
+void SetAPIErrorMessage(const char* format, ...) {
+  if (recorded) return;
+  std::va_list arguments;
+  va_start(arguments, format);
+  std::vsnprintf(message, sizeof message, format, arguments);
+  va_end(arguments);
+  recorded = true;
+}
+
+const char* GetAPIErrorMessage() { return recorded ? message : "NA"; }
+
+void ResetAPIErrorMessage() { recorded = false; }
+
+}  // namespace NANDInfo

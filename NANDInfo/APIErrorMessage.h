@@ -1,0 +1,18 @@
+// The library's one error channel: the first message that the process ever recorded.
+#pragma once
+
+#include "platform/Exported.h"
+
+namespace NANDInfo MORVEND_EXPORTED {
+
+// Records a message, cut to 1,023 bytes, if none is recorded yet; else does nothing, not even
+// format.
+void SetAPIErrorMessage(const char* format, ...) __attribute__((format(printf, 1, 2)));
+
+// The recorded message, or "NA". It stays as it is for the rest of the process's life.
+const char* GetAPIErrorMessage();
+
+// Forgets the message: the state of a process that has just begun.
+void ResetAPIErrorMessage();
+
+}  // namespace MORVEND_EXPORTED

@@ -1,0 +1,72 @@
+// What every decoder of a counter buffer fills: an ordered list of named unsigned 64-bit values.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory_resource>
+#include <span>
+#include <string_view>
+#include <vector>
+
+#include "platform/Exported.h"
+#include "platform/PropertyList.h"
+
+namespace NANDInfo MORVEND_EXPORTED {
+
+class NameTable;
+
+// The longest name that is kept; what is longer is cut to it.
+inline constexpr std::size_t kLongestFieldName = 98;
+
+// Fields in the order in which they were added; names may occur more than once. An allocation that
+// fails leaves the context as it was.
+class GenericParserCxt {
+ public:
+  struct Field {
+    std::string_view name;  // borrowed until the context changes
+    std::uint64_t value;
+  };
+
+  explicit GenericParserCxt(std::pmr::memory_resource* memory = std::pmr::get_default_resource());
+
+  std::size_t size() const;
+  bool empty() const { return size() == 0; }
+  Field operator[](std::size_t place) const;
+
+ private:
+  friend bool AddSingleValueToGenericContext(GenericParserCxt* context, std::string_view prefix,
+                                             std::string_view suffix, std::uint64_t value);
+  friend void ReleaseGenericParserCxt(GenericParserCxt* context);
+
+  struct Record {
+    std::uint64_t value;
+    std::uint32_t nameStart;
+    std::uint32_t nameLength;
+  };
+
+  std::pmr::vector<Record> records_;
+  std::pmr::vector<char> names_;  // of all records, one after the other
+};
+
+// Appends one field named prefix followed by suffix. False when the context is null or memory is
+// refused.
+bool AddSingleValueToGenericContext(GenericParserCxt* context, std::string_view prefix,
+                                    std::string_view suffix, std::uint64_t value);
+
+// Appends `count` fields of `elementSize` bytes each (1 to 8, little-endian) from the source: one
+// alone under the name itself, several under the name followed by the index. Nothing to add is a
+// success; elements beyond the 65,535th, or beyond the source, are dropped. False when an element
+// is wider than 8 bytes or memory was refused for one; the others are added all the same.
+bool AddMultipleFieldsToGenericContext(GenericParserCxt* context, std::string_view name,
+                                       std::span<const std::byte> source, std::uint32_t elementSize,
+                                       std::uint32_t count);
+
+// Frees all fields; null is accepted.
+void ReleaseGenericParserCxt(GenericParserCxt* context);
+
+// The fields as a dictionary of unsigned 64-bit numbers, the later of two equal names winning; with
+// a table, only the names that it holds.
+platform::Dictionary CreateDictFromCxt(const GenericParserCxt& context,
+                                       const NameTable* allowedKeys = nullptr);
+
+}  // namespace MORVEND_EXPORTED

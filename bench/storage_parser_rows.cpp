@@ -1,0 +1,3 @@
+#include "bench/Rows.h"
+
+void bench::addStorageParserRows(Table&) {}

@@ -1,0 +1,5 @@
+// Marks what the storage library shows to programs that load it: everything else is compiled with
+// hidden visibility.
+#pragma once
+
+#define MORVEND_EXPORTED __attribute__((visibility("default")))
