@@ -1,6 +1,8 @@
 // Little-endian numbers and runs of bytes out of foreign bytes, one after the other.
 #pragma once
 
+#include <algorithm>
+#include <array>
 #include <bit>
 #include <concepts>
 #include <cstddef>
@@ -18,6 +20,13 @@ T littleEndian(std::span<const std::byte, sizeof(T)> bytes) {
   T value;
   std::memcpy(&value, bytes.data(), sizeof value);
   return value;
+}
+
+// The number that at most eight bytes hold.
+inline std::uint64_t littleEndianOfAnyWidth(std::span<const std::byte> bytes) {
+  std::array<std::byte, sizeof(std::uint64_t)> extended = {};
+  std::memcpy(extended.data(), bytes.data(), std::min(bytes.size(), extended.size()));
+  return littleEndian<std::uint64_t>(extended);
 }
 
 // A place in bytes that somebody else keeps. Nothing beyond their end is read: what doesn't fit in
