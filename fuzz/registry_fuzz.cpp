@@ -77,7 +77,7 @@ void askDriver(HostDeviceRegistry& registry, DriverConnection connection) {
       }
     }
   }
-  for (const std::size_t capacity : {0, 1, 4}) callStruct(registry, connection, 5, {}, capacity);
+  for (const std::size_t capacity : {0u, 1u, 4u}) callStruct(registry, connection, 5, {}, capacity);
   callStruct(registry, connection, 9, std::span(block).first(23), 4);
   for (const std::uint64_t code : {0x64424943ull, 0ull, ~0ull}) {
     std::uint64_t output[2] = {1, 2};
