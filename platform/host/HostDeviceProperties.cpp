@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <sys/utsname.h>
 
+#include "platform/host/DeviceFileSystem.h"
 #include "platform/host/Files.h"
 
 namespace platform::host {
@@ -29,6 +30,14 @@ std::optional<std::string> firstLine(const std::string& path) {
 std::optional<std::string> machineName() {
   utsname host;
   return ::uname(&host) == 0 ? std::optional<std::string>(host.machine) : std::nullopt;
+}
+
+// A size in bytes; what is missing or negative is 0.
+std::uint64_t bytes(const Dictionary& usage, const char* key) {
+  const Number* size = usage.number(key);
+  const bool negative =
+      size != nullptr && size->type() != Number::Type::uint64 && size->int64Value() < 0;
+  return size != nullptr && !negative ? size->uint64Value() : 0;
 }
 
 }  // namespace
@@ -61,7 +70,18 @@ std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {
 }
 
 std::optional<DeviceProperties::DiskUsage> HostDeviceProperties::diskUsage() {
-  return std::nullopt;
+  const Dictionary* properties = properties_.dictionary();
+  const Value* given = properties != nullptr ? properties->find("DiskUsage") : nullptr;
+  if (given == nullptr) {
+    const auto host = DeviceFileSystem(root_).statfs("/");
+    if (!host) return std::nullopt;
+    const std::uint64_t available = host->blocksAvailable * host->blockSize;
+    return DiskUsage{host->blocks * host->blockSize, available, available};
+  }
+  const auto* usage = given->as<Dictionary>();
+  if (usage == nullptr) return std::nullopt;
+  return DiskUsage{bytes(*usage, "TotalDiskCapacity"), bytes(*usage, "TotalDataAvailable"),
+                   bytes(*usage, "AmountDataAvailable")};
 }
 
 std::optional<std::string> HostDeviceProperties::systemGroupContainerPath(
