@@ -185,7 +185,7 @@ bool DumpStorageStructuredLog(Platform& platform, bool flag) {
     return false;
   }
   DriverHandle connection(platform, service.get());
-  if (connection.status() != 0) {
+  if (connection.status() != 0 || connection.get() == 0) {
     platform.streams.writeError("Could not get connection to service\n");
     return false;
   }

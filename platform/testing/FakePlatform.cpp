@@ -161,6 +161,7 @@ class StringHandle : public LogHandle {
 
 bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                               const Dictionary* options, const Writer& writer) {
+  beforeLog();
   Log log{std::string(logType), std::string(logName), {}, {}};
   if (options != nullptr) log.options = *options;
   StringHandle handle(log.contents);

@@ -106,6 +106,7 @@ class FakeSubmission : public LogSubmission {
   explicit FakeSubmission(Journal& journal) : journal_(journal) {}
   bool allowed = true;
   std::vector<Log> logs;
+  std::function<void()> beforeLog = [] {};  // may throw
 
   bool DiagnosticLogSubmissionEnabled() override { return allowed; }
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,

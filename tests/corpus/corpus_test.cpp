@@ -12,6 +12,7 @@ extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
 FuzzTarget binary_property_list_fuzz, bus_message_fuzz, import_lines_fuzz, registry_fuzz,
     xml_property_list_fuzz;
+FuzzTarget defects_list_fuzz, telemetry_list_fuzz, validity_list_fuzz;
 }
 
 namespace {
@@ -24,8 +25,11 @@ struct Row {
 constexpr Row kTargets[] = {
     {"binary_property_list_fuzz", binary_property_list_fuzz},
     {"bus_message_fuzz", bus_message_fuzz},
+    {"defects_list_fuzz", defects_list_fuzz},
     {"import_lines_fuzz", import_lines_fuzz},
     {"registry_fuzz", registry_fuzz},
+    {"telemetry_list_fuzz", telemetry_list_fuzz},
+    {"validity_list_fuzz", validity_list_fuzz},
     {"xml_property_list_fuzz", xml_property_list_fuzz},
 };
 
