@@ -8,6 +8,7 @@
 
 #include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDLogWriter.h"
+#include "NANDInfo/StructuredLogState.h"
 #include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/Utilities.h"

@@ -13,6 +13,7 @@
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/ListHandlers.h"
+#include "NANDInfo/StructuredLogState.h"
 #include "NANDInfo/WriteAmplification.h"
 #include "platform/Platform.h"
 #include "platform/Text.h"
@@ -20,15 +21,6 @@
 namespace NANDInfo {
 
 using platform::Platform;
-
-bool gForceCollectionSet = false;
-bool gNeedValidityList = false;
-double gCurrentUserWamp = 0, gCurrentSysWamp = 0;
-
-void ResetStructuredLogs() {
-  gForceCollectionSet = gNeedValidityList = false;
-  gCurrentUserWamp = gCurrentSysWamp = 0;
-}
 
 namespace {
 

@@ -19,12 +19,4 @@ bool DumpStorageStructuredLog(platform::Platform& platform, bool flag);
 // can't be had.
 void DumpNANDInfo(platform::Platform& platform, platform::Dictionary& dictionary);
 
-// What a run works out before it fetches the lists; it holds until the next run.
-extern bool gForceCollectionSet;  // the validity list is wanted always; nothing here sets it
-extern bool gNeedValidityList;
-extern double gCurrentUserWamp, gCurrentSysWamp;
-
-// Sets the four to what they are when the process begins.
-void ResetStructuredLogs();
-
 }  // namespace MORVEND_EXPORTED

@@ -1,6 +1,8 @@
 // Validity lists: what is kept came from records that lie within the buffer.
 #include <cstdint>
 #include <cstdlib>
+#include <cstring>
+#include <span>
 
 #include "NANDInfo/ValidityList.h"
 
@@ -15,8 +17,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
       if (number == nullptr || number->int64Value() < 0 || number->int64Value() > 255) std::abort();
     }
   }
-  const std::uint32_t claimed =
-      bytes[0] | bytes[1] << 8 | bytes[2] << 16 | static_cast<std::uint32_t>(bytes[3]) << 24;
+  std::uint32_t claimed;
+  std::memcpy(&claimed, bytes, sizeof claimed);
   if (claimed == 0 || claimed > size / 20 || values > claimed) std::abort();
   return 0;
 }

@@ -14,6 +14,7 @@
 #include "NANDInfo/DefectsList.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/ListHandlers.h"
+#include "NANDInfo/StructuredLogState.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
 #include "NANDInfo/WriteAmplification.h"
@@ -222,7 +223,7 @@ class StructuredLogsTest : public ::testing::Test {
   // wanted: erases without host writes.
   void restart(const char* className = kEmbedded) {
     ResetExporters();
-    ResetStructuredLogs();
+    ResetStructuredLogState();
     registry = FakeDeviceRegistry();
     registry.add({.className = "Bus",
                   .properties = {{"Controller Characteristics", characteristics}},
