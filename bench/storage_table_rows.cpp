@@ -86,9 +86,9 @@ void addStorageTableRows(Table& table) {
       "first use of the FTL whitelist", "a hash table of its names", 1.0, 1,
       [] { keep(NANDInfo::NameTable(NANDInfo::ftlSignificantDigitsRows())); },
       [&] {
-        std::unordered_map<std::string, std::uint8_t> names(whitelist.size());
-        for (const auto& [name, digits] : whitelist) names.emplace(name, digits);
-        keep(names);
+        std::unordered_map<std::string, std::uint8_t> hashed(whitelist.size());
+        for (const auto& [name, digits] : whitelist) hashed.emplace(name, digits);
+        keep(hashed);
       },
       51);
 }
