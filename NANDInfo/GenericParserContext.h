@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <memory_resource>
 #include <span>
+#include <string>
 #include <string_view>
 #include <vector>
 
@@ -27,25 +28,25 @@ class GenericParserCxt {
     std::uint64_t value;
   };
 
-  explicit GenericParserCxt(std::pmr::memory_resource* memory = std::pmr::get_default_resource());
+  GenericParserCxt() = default;
+  explicit GenericParserCxt(std::pmr::memory_resource* memory) : records_(memory), names_(memory) {}
 
-  std::size_t size() const;
+  std::size_t size() const { return records_.size(); }
   bool empty() const { return size() == 0; }
   Field operator[](std::size_t place) const;
 
- private:
-  friend bool AddSingleValueToGenericContext(GenericParserCxt* context, std::string_view prefix,
-                                             std::string_view suffix, std::uint64_t value);
-  friend void ReleaseGenericParserCxt(GenericParserCxt* context);
+  // What the functions below do to a context that is there.
+  bool add(std::string_view prefix, std::string_view suffix, std::uint64_t value);
+  void release();
 
+ private:
   struct Record {
     std::uint64_t value;
-    std::uint32_t nameStart;
-    std::uint32_t nameLength;
+    std::size_t nameEnd;  // in the names; it begins where the name before it ends
   };
 
   std::pmr::vector<Record> records_;
-  std::pmr::vector<char> names_;  // of all records, one after the other
+  std::pmr::string names_;  // of all records, one after the other
 };
 
 // Appends one field named prefix followed by suffix. False when the context is null or memory is
