@@ -19,7 +19,8 @@ struct NameRow {
   std::uint8_t number;  // whatever the table says of its names; 0 where it says nothing
 };
 
-// The names that a table's rows stand for, in the order of the rows, found in constant time.
+// The names that a table's rows stand for, in the order of the rows, found in constant time. Of
+// rows with the same name the first holds.
 class NameTable {
  public:
   struct Entry {

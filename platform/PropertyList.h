@@ -86,6 +86,11 @@ class Dictionary {
   // Removes a key; true if it was there.
   bool remove(std::string_view key);
 
+  // Keeps the entries for which `keep(key, value)` is true, in their order; it may change the
+  // value. Takes time in proportion to the size.
+  template <typename Keep>
+  void keepIf(Keep keep);
+
   // The value of a key, or null. Borrowed until the next change.
   const Value* find(std::string_view key) const;
   Value* find(std::string_view key);
@@ -175,6 +180,19 @@ std::string description(const Value* value);
 template <typename T>
 std::string description(const std::optional<T>& value) {
   return value ? description(Value(*value)) : description(static_cast<const Value*>(nullptr));
+}
+
+template <typename Keep>
+void Dictionary::keepIf(Keep keep) {
+  auto end = entries_.begin();
+  for (Entry& entry : entries_) {
+    if (!keep(std::string_view(entry.key), entry.value)) continue;
+    if (&entry != &*end) *end = std::move(entry);
+    ++end;
+  }
+  if (end == entries_.end()) return;
+  entries_.erase(end, entries_.end());
+  if (index_) buildIndex();
 }
 
 inline std::size_t Dictionary::size() const { return entries_.size(); }
