@@ -7,6 +7,7 @@
 #include <string_view>
 #include <vector>
 
+#include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/NANDInfo.h"
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
@@ -175,32 +176,27 @@ class Capture {
 
   void captureEAN(Array& entries) {
     constexpr char kName[] = "EAN service";
-    const platform::RegistryObject service =
-        platform_.registry.DrvGetMatchingService(NANDInfo::kEANClassName);
-    if (service == 0) return leaveOut(kName, "the registry has no such service");
-    const auto opened = platform_.drivers.DrvServiceOpen(service, 0);
-    if (opened.status == 0) {
-      Dictionary scalars;
-      for (const NANDInfo::EANQuery& query : NANDInfo::EANQueries()) {
-        const std::uint32_t method = query.query == NANDInfo::GetEANImageSize ? 3 : 7;
-        const std::string key = platform::format("%u:%s", method, lettersOf(query.code).c_str());
-        const std::uint64_t input[] = {query.code};
-        std::uint64_t output[] = {0};
-        const auto status =
-            platform_.drivers.DrvCallMethod(opened.connection, method, input, output);
-        if (status == 0) {
-          scalars.set(key, output[0]);
-        } else {
-          leaveOut(kName + (" " + key), statusText(status));
-        }
+    const NANDInfo::RegistryHandle service(
+        platform_, platform_.registry.DrvGetMatchingService(NANDInfo::kEANClassName));
+    if (service.get() == 0) return leaveOut(kName, "the registry has no such service");
+    const NANDInfo::DriverHandle connection(platform_, service.get());
+    if (connection.status() != 0) return leaveOut(kName, statusText(connection.status()));
+    Dictionary scalars;
+    for (const NANDInfo::EANQuery& query : NANDInfo::EANQueries()) {
+      const std::uint32_t method = query.query == NANDInfo::GetEANImageSize ? 3 : 7;
+      const std::string key = platform::format("%u:%s", method, lettersOf(query.code).c_str());
+      const std::uint64_t input[] = {query.code};
+      std::uint64_t output[] = {0};
+      const auto status =
+          platform_.drivers.DrvCallMethod(connection.get(), method, input, output);
+      if (status == 0) {
+        scalars.set(key, output[0]);
+      } else {
+        leaveOut(kName + (" " + key), statusText(status));
       }
-      entries.push_back(Dictionary{{"Class", NANDInfo::kEANClassName},
-                                   {"Driver", Dictionary{{"Scalars", std::move(scalars)}}}});
-    } else {
-      leaveOut(kName, statusText(opened.status));
     }
-    if (opened.connection != 0) platform_.drivers.DrvServiceClose(opened.connection);
-    platform_.registry.release(service);
+    entries.push_back(Dictionary{{"Class", NANDInfo::kEANClassName},
+                                 {"Driver", Dictionary{{"Scalars", std::move(scalars)}}}});
   }
 
   static std::string statusText(platform::DriverStatus status) {

@@ -4,6 +4,7 @@
 #include <optional>
 #include <string_view>
 
+#include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/NANDInfo.h"
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
@@ -55,11 +56,10 @@ class Progress {
 
 bool hasController(platform::Platform& platform) {
   for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
-    const auto service =
-        NANDInfo::FindServiceUsingIterator(platform, NANDInfo::nand_exporters_tunnel[i].className);
-    if (service == 0) continue;
-    platform.registry.release(service);
-    return true;
+    const char* className = NANDInfo::nand_exporters_tunnel[i].className;
+    const NANDInfo::RegistryHandle service(
+        platform, NANDInfo::FindServiceUsingIterator(platform, className));
+    if (service.get() != 0) return true;
   }
   return false;
 }
