@@ -150,6 +150,7 @@ void appendNumbers(std::string& out, const Array& array) {
 }
 
 void appendArray(std::string& out, const Array& array, std::size_t width) {
+  if (array.empty()) return;
   if (holdsOnly<Dictionary>(array)) return appendRecords(out, array, width);
   if (holdsOnly<Number>(array)) return appendNumbers(out, array);
   Grid grid;
