@@ -33,8 +33,11 @@ void mspStep(StorageDevice& device, std::uint32_t index, std::optional<std::uint
     const auto row = std::find_if(table.begin(), table.end(), [](const MSPTag& tag) {
       return std::string_view(tag.name) == "fw_version_identifier";
     });
-    registry.willTunnel(9, 221, index,
-                        records({{row->tag, row->width, {*version}}, {0x1000, 4, {1234567}}}));
+    // The first one has a counter that the others don't have.
+    const std::uint16_t tag = index == 0 ? 0x1001 : 0xFFF;
+    registry.willTunnel(
+        9, 221, index,
+        records({{row->tag, row->width, {*version}}, {0x1000, 4, {1234567}}, {tag, 4, {5}}}));
   }
 }
 
@@ -71,6 +74,7 @@ TEST(MSPInfo, EachExchange) {
       const auto* msp = info.dictionary(std::to_string(i));
       ASSERT_NE(msp, nullptr);
       EXPECT_EQ(msp->number("passWithTmodeHard")->uint64Value(), 1200000u);
+      EXPECT_EQ(msp->find("passWithTmodeFS1_2b") != nullptr, i == 0);
       EXPECT_EQ(msp->number("TLM_hostWrites")->uint64Value(), 7u);
       for (int part = 0; part < 4; ++part) {
         const auto key = "fw_version_identifier_" + std::to_string(part);
