@@ -96,12 +96,12 @@ TEST(NandinfoProgram, ACaptureIsWholeOrNotThere) {
   if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
   const Device device = deviceWithController();
   const std::string folder = device.root() / "capture";
-  const std::size_t calls = device.countCalls("nandinfo", {"capture", folder});
+  const std::size_t calls = device.countCalls("nandinfo", {"capture", folder, "--compact"});
   const Lines whole = device.names("capture");
   ASSERT_GT(whole.size(), 5u);
   for (std::size_t at = 1; at <= calls; ++at) {
     std::filesystem::remove_all(folder);
-    const auto outcome = device.run("nandinfo", {"capture", folder}, {at, "ENOSPC"});
+    const auto outcome = device.run("nandinfo", {"capture", folder, "--compact"}, {at, "ENOSPC"});
     if (outcome.status == 0) {
       EXPECT_EQ(device.names("capture"), whole) << at;
     } else {
