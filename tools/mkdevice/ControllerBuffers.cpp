@@ -118,8 +118,8 @@ std::string kernelSnapshot(const Wear& wear) {
       kThreadKind("\x03\0\0\0", 4);
   const struct {
     std::string_view name;
-    double bytesADay;
-  } kThreads[] = {{"VM_pageout_scan", 0}, {"VM_swapout", 4e8}, {"VM_swapin", 0}};
+    std::uint64_t bytesAnHour;
+  } kThreads[] = {{"VM_pageout_scan", 0}, {"VM_swapout", 4096 * 4096}, {"VM_swapin", 0}};
   BufferWriter writer, time;
   time.number(wear.time * 1'000'000, 8);
   writer.chunk(kTime, 0, time.bytes());
@@ -127,8 +127,8 @@ std::string kernelSnapshot(const Wear& wear) {
   for (const std::uint64_t task : {100u, 200u}) {
     writer.chunk(kBegin, task, kTaskKind);
     for (std::uint64_t i = 0; task == 100 && i < std::size(kThreads); ++i) {
-      const auto& [name, bytesADay] = kThreads[i];
-      const std::uint64_t written = wear.sinceFormat(bytesADay) & ~std::uint64_t{4095};
+      const auto& [name, bytesAnHour] = kThreads[i];
+      const std::uint64_t written = bytesAnHour * (1 + wear.hours % kHoursPerBoot);
       BufferWriter statistics;
       for (const std::uint64_t counter : {written / 65536, written, std::uint64_t{0}, written}) {
         statistics.number(counter, 8);

@@ -25,7 +25,7 @@ std::string defectsList(const Wear& wear);
 // What has no known format: random bytes that are always the same.
 std::string unknownBuffer(const Wear& wear, const char* name, std::size_t size);
 
-// A kernel snapshot whose swap-out thread has written some of the device's bytes.
+// A kernel snapshot whose swap-out thread has written something in every hour since the last boot.
 std::string kernelSnapshot(const Wear& wear);
 
 }  // namespace mkdevice

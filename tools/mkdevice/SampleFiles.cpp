@@ -25,7 +25,7 @@ std::string hexadecimal(Random& random, int digits) {
 }
 
 Dictionary properties(Random& random) {
-  const std::int64_t capacity = 128 * kGiB, free = random.between(20 * kGiB, 60 * kGiB);
+  const std::int64_t capacity = 119 * kGiB, free = random.between(20 * kGiB, 60 * kGiB);
   return {{"InternalBuild", false},
           {"HardwareModel", "Vrn12,3"},
           {"SystemIdentifier", hexadecimal(random, 40)},

@@ -21,6 +21,7 @@ inline constexpr std::uint64_t kFirstFastBand = 4;
 inline constexpr std::uint64_t kFirstUserBand = 24;
 inline constexpr std::uint64_t kFactoryBadBlocks = 37;
 inline constexpr std::uint64_t kHoursPerBadBlock = 3000;
+inline constexpr std::uint64_t kHoursPerBoot = 200;
 inline constexpr std::uint64_t kNANDDescription = 0x4E31;
 
 // The state of the device at one hour. Writes and reads count sectors of 4 KiB.

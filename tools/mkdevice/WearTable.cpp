@@ -28,7 +28,7 @@ constexpr WearCounter kWearCounters[] = {
     {"TurboRaidIsEnabled", 1},
     {"numFactoryBad", kFactoryBadBlocks},
     {"numDieFailures", 0},
-    {"spareAvailablePercent", 99},
+    {"spareAvailablePercent", 100},
 
     {"utilFormatTime", 0, &Wear::formatTime},
     {"calendarTime", 0, &Wear::time},
@@ -36,7 +36,7 @@ constexpr WearCounter kWearCounters[] = {
     {"magazineInstanceMeta", 0, &Wear::magazineMeta},
     {"powerOnHours", 0, &Wear::hours, 2, 5},
     {"powerOnSeconds", 0, &Wear::hours, 1440},
-    {"boots", 2, &Wear::hours, 1, 200},
+    {"boots", 2, &Wear::hours, 1, kHoursPerBoot},
     {"shutdowns", 1, &Wear::hours, 1, 240},
     {"uncleanBoots", 0, &Wear::hours, 1, 2400},
     {"numSleepOps", 0, &Wear::hours, 13},
