@@ -198,6 +198,8 @@ TEST(NandinfoTable, ShowsEveryShape) {
        "msg  tab?here ? \xEF\xBF\xBD\ne    []\n\n"
        "              0           1\na         1,000          22\nname?[2J  x\n"
        "b                -1,234,567\n"},
+      {Dictionary{{"n", 1000}, {"error", "longer"}, {"m", 1}, {"d", platform::Date{0}}}, 80,
+       "n      1,000\nerror  longer\nm          1\nd      1970-01-01T00:00:00Z\n"},
       {Dictionary{{"0", one}, {"1", other}}, 20,
        "0:\na         1,000\nname?[2J  x\n\n1:\nb  -1,234,567\na          22\n"},
       {Array{one, other}, 80, "a      name?[2J  b\n1,000  x\n   22            -1,234,567\n"},

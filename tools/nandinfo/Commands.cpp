@@ -11,7 +11,6 @@ namespace nandinfo {
 namespace {
 
 using platform::Dictionary;
-using platform::Platform;
 using platform::Value;
 
 CommandResult result(std::optional<Dictionary> dictionary) {

@@ -57,8 +57,8 @@ class Progress {
 bool hasController(platform::Platform& platform) {
   for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
     const char* className = NANDInfo::nand_exporters_tunnel[i].className;
-    const NANDInfo::RegistryHandle service(
-        platform, NANDInfo::FindServiceUsingIterator(platform, className));
+    const NANDInfo::RegistryHandle service(platform,
+                                           NANDInfo::FindServiceUsingIterator(platform, className));
     if (service.get() != 0) return true;
   }
   return false;

@@ -6,6 +6,7 @@
 
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
+#include "platform/host/Timestamp.h"
 #include "platform/host/UTF8.h"
 
 namespace nandinfo {
@@ -41,31 +42,47 @@ Cell cellOf(const Value& value) {
     return {number->isReal() ? number->text() : grouped(number->text()), true};
   }
   if (const auto* text = value.as<std::string>()) return {printable(*text)};
+  if (const auto* date = value.as<platform::Date>()) {
+    Cell cell;
+    platform::host::appendTimestamp(cell.text, date->secondsSince1970);
+    return cell;
+  }
   std::string json;
   platform::host::appendJSON(json, value);
   return {printable(json)};
 }
 
-// Rows in columns, two blanks apart.
+// Rows in columns, two blanks apart. Numbers end below each other, however wide the texts among
+// them are.
 class Grid {
  public:
-  void add(Row row) { rows_.push_back(std::move(row)); }
+  void add(Row row) {
+    columns_.resize(std::max(columns_.size(), row.size()));
+    for (std::size_t i = 0; i < row.size(); ++i) {
+      const std::size_t width = columnsOf(row[i].text);
+      columns_[i].width = std::max(columns_[i].width, width);
+      if (row[i].right) columns_[i].numbers = std::max(columns_[i].numbers, width);
+    }
+    rows_.push_back(std::move(row));
+  }
 
   std::size_t width() const {
     std::size_t width = 0;
-    for (const std::size_t column : widths()) width += column + (width > 0 ? 2 : 0);
+    for (const Column& column : columns_) width += column.width + (width > 0 ? 2 : 0);
     return width;
   }
 
   // Lines wider than `most` columns are cut.
   void appendTo(std::string& out, std::size_t most = std::string::npos) const {
-    const auto columns = widths();
     for (const Row& row : rows_) {
       std::string line;
+      std::size_t end = 0;  // of the columns so far
       for (std::size_t i = 0; i < row.size(); ++i) {
-        const std::string blanks(columns[i] - columnsOf(row[i].text), ' ');
-        if (i > 0) line += "  ";
-        line += row[i].right ? blanks + row[i].text : row[i].text + blanks;
+        const auto& [text, right] = row[i];
+        if (right) line.append(columns_[i].numbers - columnsOf(text), ' ');
+        line += text;
+        end += columns_[i].width + 2;
+        line.append(end - columnsOf(line), ' ');
       }
       line.resize(line.find_last_not_of(' ') + 1);
       if (columnsOf(line) > most) cut(line, most);
@@ -74,6 +91,10 @@ class Grid {
   }
 
  private:
+  struct Column {
+    std::size_t width = 0, numbers = 0;  // of all cells, of the numbers among them
+  };
+
   static void cut(std::string& line, std::size_t most) {
     std::size_t end = 0;
     for (std::size_t columns = 0; end < line.size(); ++end) {
@@ -83,18 +104,8 @@ class Grid {
     line += "\xE2\x80\xA6";  // an ellipsis
   }
 
-  std::vector<std::size_t> widths() const {
-    std::vector<std::size_t> widths;
-    for (const Row& row : rows_) {
-      widths.resize(std::max(widths.size(), row.size()));
-      for (std::size_t i = 0; i < row.size(); ++i) {
-        widths[i] = std::max(widths[i], columnsOf(row[i].text));
-      }
-    }
-    return widths;
-  }
-
   std::vector<Row> rows_;
+  std::vector<Column> columns_;
 };
 
 template <typename Content>
