@@ -17,7 +17,16 @@ TEST(Dictionary, KeepsOrderAndFindsEveryKeyWhateverIsDoneToIt) {
     const std::string key(1 + random() % 12, static_cast<char>('a' + random() % 26));
     const auto found = std::find_if(expected.begin(), expected.end(),
                                     [&](const auto& entry) { return entry.first == key; });
-    if (random() % 4 == 0) {
+    if (random() % 200 == 0) {
+      const std::int64_t dropped = step % 3;
+      dictionary.keepIf([&](std::string_view, Value& value) {
+        const std::int64_t number = value.as<Number>()->int64Value();
+        value = number + 1;
+        return number % 3 != dropped;
+      });
+      std::erase_if(expected, [&](const auto& entry) { return entry.second % 3 == dropped; });
+      for (auto& entry : expected) ++entry.second;
+    } else if (random() % 4 == 0) {
       EXPECT_EQ(dictionary.remove(key), found != expected.end());
       if (found != expected.end()) expected.erase(found);
     } else {
