@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <utility>
 
+#include "NANDInfo/Controller.h"
 #include "platform/Platform.h"
 
 namespace NANDInfo {
@@ -55,6 +56,26 @@ class DriverHandle {
  private:
   platform::DriverConnections& drivers_;
   platform::DriverConnections::OpenResult opened_;
+};
+
+// The record of the first driver that could be opened; null when there is none.
+class OpenExporter {
+ public:
+  explicit OpenExporter(platform::Platform& platform) : platform_(platform) {
+    findNandExporterNew(platform, exporter_);
+  }
+  OpenExporter(const OpenExporter&) = delete;
+  OpenExporter& operator=(const OpenExporter&) = delete;
+  ~OpenExporter() {
+    if (exporter_ != nullptr) ReleaseIOInterfaces(platform_, exporter_);
+  }
+
+  const nand_exporter_t* get() const { return exporter_; }
+  const nand_exporter_t* operator->() const { return exporter_; }
+
+ private:
+  platform::Platform& platform_;
+  nand_exporter_t* exporter_;
 };
 
 }  // namespace NANDInfo
