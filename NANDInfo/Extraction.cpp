@@ -56,8 +56,7 @@ std::optional<Dictionary> NandInfoExtractToEV_runAllSteps(Platform& platform, bo
       break;
     }
     const auto sent = NandInfoExtractToEV_runStep(platform, step);
-    if (!wantsSummary || !sent) continue;
-    for (const auto& [key, value] : *sent) summary.set(key, value);
+    if (wantsSummary && sent) addEntries(*sent, summary);
   }
   if (!wantsSummary) return std::nullopt;
   summary.set(kNANDInfoErrorMessageKey, GetAPIErrorMessage());

@@ -12,6 +12,7 @@
 #include "NANDInfo/Extraction.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Magazine.h"
+#include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "platform/Platform.h"
 
@@ -31,10 +32,6 @@ using Payload = std::shared_ptr<const Dictionary>;
 bool send(Platform& platform, const char* event, Payload payload) {
   return EventraSendEventLazyWrapper(platform, event,
                                      [payload = std::move(payload)] { return *payload; });
-}
-
-void addEntries(Dictionary& target, const Dictionary& entries) {
-  for (const auto& [key, value] : entries) target.set(key, value);
 }
 
 Dictionary failure(const char* message) { return {{kNANDInfoErrorMessageKey, message}}; }
@@ -74,7 +71,7 @@ Dictionary sendStatistics(Platform& platform, const char* function, const Dictio
         CreateFilteredDict(statistics, EventraConfigDetails(event)));
     const bool succeeds = send(platform, event, payload);
     log.outcome(succeeds, view);
-    if (succeeds) addEntries(sent, *payload);
+    if (succeeds) addEntries(*payload, sent);
   }
   return sent;
 }
@@ -178,7 +175,7 @@ Dictionary createAndLogSMagFTLFieldsToEventraForEvent(Platform& platform, std::i
   const StepLog log(platform, "createAndLogSMagFTLFieldsToEventraForEvent");
   log.enabled(event);
   window = CreateFilteredDict(std::move(window), EventraConfigDetails(event));
-  if (addsHistory) addEntries(window, CopySMagNANDFTLCustomHistoryInfo(platform, 0));
+  if (addsHistory) addEntries(CopySMagNANDFTLCustomHistoryInfo(platform, 0), window);
   const auto payload = std::make_shared<const Dictionary>(std::move(window));
   const bool succeeds = send(platform, event, payload);
   log.outcome(succeeds, event);

@@ -7,6 +7,7 @@
 #include "NANDInfo/Collectors.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/MagazineDeltas.h"
+#include "NANDInfo/Utilities.h"
 
 namespace NANDInfo {
 
@@ -24,15 +25,11 @@ std::optional<Dictionary> snapshot(Platform& platform, std::uint64_t hours) {
   return counters;
 }
 
-void addEntries(Dictionary& target, const Dictionary& entries) {
-  for (const auto& [key, value] : entries) target.set(key, value);
-}
-
 void addWindow(Dictionary& result, const Dictionary& newer, const Dictionary& older, bool deltas,
                std::uint32_t mode) {
   if (const auto days = magazineDeltaDays(newer, older)) {
     result.set(kTLM_SM_deltaDays, *days);
-    addEntries(result, magazineDeltas(newer, older, deltas && *days > 0.0, mode));
+    addEntries(magazineDeltas(newer, older, deltas && *days > 0.0, mode), result);
   } else {
     SetAPIErrorMessage("CopyWhitelistedNANDFTLInfo: Unable to gather other stats magazine deltas");
   }
@@ -51,9 +48,9 @@ Dictionary CopySMagNANDFTLInfo(Platform& platform, std::uint64_t hours, std::uin
   if (newer && older) {
     addWindow(result, *newer, *older, deltaFlag != 0, mode);
   } else if (older) {
-    addEntries(result, *older);
+    addEntries(*older, result);
   }
-  addEntries(result, gatherZMCFTLOtherData(platform, newer ? &*newer : nullptr));
+  addEntries(gatherZMCFTLOtherData(platform, newer ? &*newer : nullptr), result);
 
   const auto statistics = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0);
   if (statistics && statistics->empty()) {

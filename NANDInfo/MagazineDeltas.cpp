@@ -1,9 +1,9 @@
 #include "NANDInfo/MagazineDeltas.h"
 
+#include "NANDInfo/Counters.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Magazine.h"
 #include "NANDInfo/Whitelists.h"
-#include "platform/Text.h"
 
 namespace NANDInfo {
 
@@ -72,9 +72,9 @@ Value instantaneousWriteAmplification(const Dictionary& newer, const Dictionary&
   if (Number(now->doubleValue() - then->doubleValue()).int64Value() < 1) return std::int32_t{0};
 
   double left = 1.0;
-  int bucket = 1;
+  std::uint32_t bucket = 1;
   for (; bucket <= 31; ++bucket) {
-    if (const Number* const part = older.number(platform::format("vcurve_%d", bucket))) {
+    if (const Number* const part = older.number(indexed("vcurve_", bucket))) {
       left = left - (1.0 - 0.033 * bucket) * static_cast<double>(part->int64Value());
     }
     if (left <= 0.0) break;
