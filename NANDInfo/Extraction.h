@@ -43,8 +43,8 @@ std::optional<platform::Dictionary> NandInfoExtractToEV_runStep(platform::Platfo
 bool EventraSendEventLazyWrapper(platform::Platform& platform, std::string_view event,
                                  platform::Eventra::PayloadProducer producer);
 
-// Sends how full the boot variables' memory is and how often it was written; the result is what was
-// sent, empty without that memory's service.
+// Sends how full the boot variables' memory is and how often it was written; the result is what
+// there was to send, empty without that memory's service.
 platform::Dictionary gatherNVRAMStats(platform::Platform& platform);
 
 // Sends the stats magazine's counters of the last day (0), week (1) or month (2), and returns what

@@ -1,6 +1,5 @@
 #include "NANDInfo/ExtractionSteps.h"
 
-#include <array>
 #include <initializer_list>
 #include <iterator>
 #include <memory>

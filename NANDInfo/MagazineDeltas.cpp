@@ -69,7 +69,7 @@ Value instantaneousWriteAmplification(const Dictionary& newer, const Dictionary&
   const Number* const then = older.number("gcWrites");
   if (now == nullptr || then == nullptr) return std::int32_t{0};
   if (magazineDeltaDays(newer, older).value_or(0.0) <= 0.0) return std::int32_t{0};
-  if (Number(now->doubleValue() - then->doubleValue()).int64Value() < 1) return std::int32_t{0};
+  if (now->doubleValue() - then->doubleValue() < 1.0) return std::int32_t{0};
 
   double left = 1.0;
   std::uint32_t bucket = 1;

@@ -12,7 +12,6 @@ namespace NANDInfo {
 namespace {
 
 using platform::Dictionary;
-using platform::Number;
 using support::FTLFields;
 using support::StorageDevice;
 using u64 = std::uint64_t;
@@ -41,34 +40,6 @@ TEST(MagazineTimeStamp, IsBits24To55OfTheMetadata) {
   Dictionary without{{"boots", 1}};
   addMagazineTimeStamp(without);
   EXPECT_EQ(without.size(), 1u);
-}
-
-TEST(MagazineDeltas, TakeTheCountersOfTheModeThatBothSnapshotsHave) {
-  const Dictionary newer{{"coldestCycle_0", u64{9}},
-                         {"hostWrites", u64{500}},
-                         {"boots", u64{3}},
-                         {"gcWrites", u64{2}},
-                         {"nandReads", u64{1}}},
-      older{{"hostWrites", u64{200}},
-            {"numFences", u64{1}},
-            {"coldestCycle_0", u64{7}},
-            {"boots", u64{1}},
-            {"gcWrites", u64{5}}};
-  const struct {
-    std::uint32_t mode;
-    const char *differences, *values;
-  } rows[] = {{0, "hostWrites=300 gcWrites=-3 ", "hostWrites=200 gcWrites=5 "},
-              {1, "coldestCycle_0=7 ", "coldestCycle_0=7 "},
-              {2, "hostWrites=300 coldestCycle_0=7 gcWrites=-3 ",
-               "hostWrites=200 coldestCycle_0=7 gcWrites=5 "},
-              {3, "", ""}};
-  for (const auto& [mode, differences, values] : rows) {
-    EXPECT_EQ(textOf(magazineDeltas(newer, older, true, mode)), differences) << mode;
-    EXPECT_EQ(textOf(magazineDeltas(newer, older, false, mode)), values) << mode;
-  }
-  const Dictionary values = magazineDeltas(newer, older, false, 2);
-  EXPECT_EQ(values.number("hostWrites")->type(), Number::Type::float64);
-  EXPECT_EQ(values.number("coldestCycle_0")->type(), Number::Type::uint64);
 }
 
 TEST(AveragePECycles, NeedAllThreeAndReplaceWhatIsThere) {
@@ -121,16 +92,8 @@ TEST(WriteAmplification, IsOfTheBucketThatGainsABand) {
         older{{"gcWrites", olderWrites}, {kTLM_magazineTimeStamp, u64{100}}};
     for (const auto& [place, value] : curve) older.set("vcurve_" + std::to_string(place), value);
     const auto result = instantaneousWriteAmplification(newer, older);
-    const double expected = bucket == 0 ? 0.0 : 1.0 / (1.0 - 0.033 * bucket);
-    EXPECT_EQ(result.as<Number>()->doubleValue(), expected) << newerWrites << " " << bucket;
-    for (Dictionary* one : {&newer, &older}) {
-      for (const char* key : {"gcWrites", kTLM_magazineTimeStamp}) {
-        const Dictionary whole = *one;
-        one->remove(key);
-        EXPECT_EQ(instantaneousWriteAmplification(newer, older), platform::Value(0)) << key;
-        *one = whole;
-      }
-    }
+    EXPECT_EQ(result, platform::Value(bucket == 0 ? 0.0 : 1.0 / (1.0 - 0.033 * bucket)))
+        << newerWrites << " " << bucket;
   }
 }
 
@@ -161,6 +124,7 @@ TEST(Magazine, ReportsAWindowAsFarAsItsSnapshotsGo) {
       {newer, older, statistics, 1, 0,
        "1 TLM_SM_deltaDays=1.5 hostWrites=150 bandErases=60 averageTLCPECycles=5 "},
       {newer, older, statistics, 1, 1, "1 TLM_SM_deltaDays=1.5 coldestCycle_0=5 coldestCycle_1=6 "},
+      {newer, older, statistics, 1, 3, "1 TLM_SM_deltaDays=1.5 "},
       {newer, older, {}, 0, 2, "1 TLM_SM_deltaDays=1.5 " + values, "executeTunnelCommand"},
       {snapshotAt(kDay, late), older, statistics, 1, 2,
        "1 TLM_SM_deltaDays=0 " + values + "averageTLCPECycles=0.8333333333333334 "},
@@ -205,6 +169,10 @@ TEST(Magazine, ReportsAWindowAsFarAsItsSnapshotsGo) {
       result.remove(key);
     }
     result.remove(kTLM_APIErrorMessage);
+    if (row.newer) {
+      EXPECT_TRUE(!result.number("hostWrites") || result.number("hostWrites")->isReal());
+      EXPECT_FALSE(result.number("coldestCycle_0") && result.number("coldestCycle_0")->isReal());
+    }
     EXPECT_EQ(textOf(result), "IsStatMagSupported=" + row.result);
   }
 }
