@@ -21,7 +21,6 @@ using platform::Dictionary;
 using platform::LogLevel;
 using platform::Number;
 using platform::Platform;
-using platform::Value;
 
 namespace {
 

@@ -74,8 +74,8 @@ Value instantaneousWriteAmplification(const Dictionary& newer, const Dictionary&
   double left = 1.0;
   std::uint32_t bucket = 1;
   for (; bucket <= 31; ++bucket) {
-    if (const Number* const part = older.number(indexed("vcurve_", bucket))) {
-      left = left - (1.0 - 0.033 * bucket) * static_cast<double>(part->int64Value());
+    if (const Number* const bands = older.number(indexed("vcurve_", bucket))) {
+      left = left - (1.0 - 0.033 * bucket) * static_cast<double>(bands->int64Value());
     }
     if (left <= 0.0) break;
   }
