@@ -11,7 +11,8 @@
 extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
 FuzzTarget binary_property_list_fuzz, bus_message_fuzz, ftl_statistics_fuzz, import_lines_fuzz,
-    kernel_snapshot_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz, xml_property_list_fuzz;
+    kernel_snapshot_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz, registry_fuzz,
+    xml_property_list_fuzz;
 }
 
 namespace {
@@ -29,6 +30,7 @@ constexpr Row kTargets[] = {
     {"kernel_snapshot_fuzz", kernel_snapshot_fuzz},
     {"legacy_statistics_fuzz", legacy_statistics_fuzz},
     {"msp_statistics_fuzz", msp_statistics_fuzz},
+    {"registry_fuzz", registry_fuzz},
     {"xml_property_list_fuzz", xml_property_list_fuzz},
 };
 

@@ -4,6 +4,7 @@
 #include "platform/host/Timestamp.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
+#include "tools/mkdevice/SampleController.h"
 
 namespace mkdevice {
 
@@ -218,6 +219,7 @@ std::vector<SampleFile> sampleFiles(const Sample& sample) {
   addLog("var/log/servita/support.log", supportLog, yesterday);
   addLog("var/log/servita/support.log.1", supportLog, yesterday - 1);
   addLog("var/log/servita/uploads.log", supportLog, yesterday);
+  for (SampleFile& file : controllerFiles(sample)) files.push_back(std::move(file));
   return files;
 }
 
