@@ -42,6 +42,13 @@ struct StorageDevice : TestPlatform {
       registry.alwaysTunnels(method, 13, 0, ftlBuffer(fields));
     }
   }
+
+  // The snapshot of its magazine so many hours back.
+  void setSnapshot(std::uint32_t hours, const FTLFields& fields) {
+    for (const std::uint32_t method : {8, 9}) {
+      registry.alwaysTunnels(method, 10, hours, ftlBuffer(fields));
+    }
+  }
 };
 
 inline constexpr char kQRT3[] = "NorbaQRT3NVMeController";
