@@ -150,6 +150,38 @@ struct KernelValues : Kernel {
   }
 };
 
+struct Usage : NetworkUsage {
+  Usage(NetworkUsage& i, Plan& p) : inner(i), plan(p) {}
+  NetworkUsage& inner;
+  Plan& plan;
+  void queryAllProcesses(Reply reply) override {
+    if (plan.fails()) return reply(nullptr);
+    inner.queryAllProcesses(std::move(reply));
+  }
+};
+
+struct Channels : ReportingChannels {
+  Channels(ReportingChannels& i, Plan& p) : inner(i), plan(p) {}
+  struct Subscription : ChannelSubscription {
+    Subscription(std::unique_ptr<ChannelSubscription> i, Plan& p) : inner(std::move(i)), plan(p) {}
+    std::unique_ptr<ChannelSubscription> inner;
+    Plan& plan;
+    std::optional<std::vector<ChannelSample>> createSamples() override {
+      return plan.fails() ? std::nullopt : inner->createSamples();
+    }
+  };
+  ReportingChannels& inner;
+  Plan& plan;
+  std::vector<ReportChannel> copyChannels(std::uint64_t categoryMask) override {
+    return plan.fails() ? std::vector<ReportChannel>() : inner.copyChannels(categoryMask);
+  }
+  std::unique_ptr<ChannelSubscription> subscribe(
+      const std::vector<ReportChannel>& channels) override {
+    auto subscription = plan.fails() ? nullptr : inner.subscribe(channels);
+    return subscription ? std::make_unique<Subscription>(std::move(subscription), plan) : nullptr;
+  }
+};
+
 }  // namespace
 
 struct FaultInjector::Services {
@@ -163,6 +195,8 @@ struct FaultInjector::Services {
         namedServices(inner.namedServices, plan),
         device(inner, plan),
         kernel(inner.kernel, plan),
+        reportingChannels(inner.reportingChannels, plan),
+        networkUsage(inner.networkUsage, plan),
         platform{inner.log,
                  inner.streams,
                  inner.clock,
@@ -188,6 +222,8 @@ struct FaultInjector::Services {
                  inner.registry,
                  inner.drivers,
                  inner.purgeableSpace,
+                 reportingChannels,
+                 networkUsage,
                  inner.applications,
                  inner.locale,
                  device,
@@ -203,6 +239,8 @@ struct FaultInjector::Services {
   Listeners namedServices;
   Device device;
   KernelValues kernel;
+  Channels reportingChannels;
+  Usage networkUsage;
   Platform platform;
 };
 
