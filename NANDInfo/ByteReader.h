@@ -22,7 +22,7 @@ T littleEndian(std::span<const std::byte, sizeof(T)> bytes) {
   return value;
 }
 
-// The number that at most eight bytes hold.
+// The number that one to eight bytes hold.
 inline std::uint64_t littleEndianOfAnyWidth(std::span<const std::byte> bytes) {
   std::array<std::byte, sizeof(std::uint64_t)> extended = {};
   std::memcpy(extended.data(), bytes.data(), std::min(bytes.size(), extended.size()));

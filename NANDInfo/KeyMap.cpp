@@ -5,26 +5,30 @@ namespace NANDInfo {
 
 namespace {
 
-platform::Dictionary keyMap() {
-  const std::string prefix = "com.norba.NANDInfo.";
-  platform::Dictionary map;
+struct KeyMap {
+  NameTable counters;
+  std::vector<std::string> keys;  // of the counters, in their order
+};
+
+KeyMap keyMap() {
+  std::vector<NameRow> counters;
+  std::vector<std::string> keys;
   for (const KeyMapRow& row : keyMapRows()) {
-    const std::vector<std::string> suffixes = expandFamily(row.suffixes);
-    auto suffix = suffixes.begin();
-    for (std::string& counter : expandFamily(row.counters)) {
-      map.set(std::move(counter), prefix + *suffix++);
+    counters.push_back({row.counters, 0});
+    for (std::string& key : expandFamily(std::string("com.norba.NANDInfo.") + row.suffixes)) {
+      keys.push_back(std::move(key));
     }
   }
-  return map;
+  return {NameTable(counters), std::move(keys)};
 }
 
 }  // namespace
 
 std::optional<std::string_view> keyMapKey(std::string_view counter) {
-  static const platform::Dictionary map = keyMap();
-  const std::string* const key = map.text(counter);
-  if (key == nullptr) return std::nullopt;
-  return *key;
+  static const KeyMap map = keyMap();
+  const NameTable::Entry* const entry = map.counters.find(counter);
+  if (entry == nullptr) return std::nullopt;
+  return map.keys[static_cast<std::size_t>(entry - map.counters.begin())];
 }
 
 }  // namespace NANDInfo

@@ -4,6 +4,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <span>
 #include <string>
 #include <string_view>
@@ -24,7 +25,7 @@ struct NameRow {
 class NameTable {
  public:
   struct Entry {
-    std::string name;
+    std::string_view name;  // borrowed from the table
     std::uint8_t number;
   };
 
@@ -39,6 +40,9 @@ class NameTable {
   const Entry* end() const { return entries_.data() + entries_.size(); }
 
  private:
+  std::uint32_t place(std::string_view name, std::uint32_t hash) const;
+
+  std::unique_ptr<char[]> text_;  // the names, one after the other
   std::vector<Entry> entries_;
   platform::KeyIndex index_;
 };

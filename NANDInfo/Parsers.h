@@ -11,16 +11,19 @@
 
 namespace NANDInfo MORVEND_EXPORTED {
 
-// FTL statistics: records of 64-bit words under the names of the key table, other keys under
-// "Stat_<key>". Returns the number of values added; 0 is a failed parse.
+// FTL statistics: records of 64-bit words, up to an end key or a record that the buffer can't hold.
+// A key of the table is published under its name, an array as "name_0", "name_1" and so on (one
+// whose record holds a single element as "name_"), any other key as if its name were "Stat_<key>".
+// Returns the number of values added; 0 is a failed parse.
 std::uint32_t ZMCFTLParseBufferToCxt(GenericParserCxt* context, std::span<const std::byte> buffer);
 
 // The same with every key under "Stat_<key>".
 std::uint32_t ZMCFTLParseStatKeyBufferToCxt(GenericParserCxt* context,
                                             std::span<const std::byte> buffer);
 
-// MSP statistics: records of tag, length and elements. Returns the number of elements added; 0 is
-// a failed parse.
+// MSP statistics: records of tag, length and elements, unaligned. Array elements are published
+// under the name directly followed by the index; tags that are not in the table are passed over.
+// Returns the number of elements added; 0 is a failed parse.
 std::uint32_t ZMCMSPParseBufferToCxt(GenericParserCxt* context, std::span<const std::byte> buffer);
 
 // What the legacy decoder fills: all fields, and the most used ones for direct reading.

@@ -9,8 +9,10 @@
 
 namespace NANDInfo {
 
-// The I/O statistics of the first thread with the name: empty when the thread has none, no value
-// when no such thread is found. The payload is borrowed from the snapshot.
+// The I/O statistics of the first thread with the name, in the snapshot's first container and those
+// inside it: empty when the thread has none, no value when no such thread is found. Only as much of
+// the name is compared as the thread's own item has room for. A snapshot that is cut ends there,
+// with what its open containers hold so far. The payload is borrowed from the snapshot.
 std::optional<std::span<const std::byte>> getIOStatsWithThreadnameFromKCData(
     std::span<const std::byte> snapshot, std::string_view threadName);
 

@@ -1,3 +1,101 @@
+// The storage library's tables: expanded once, then asked for every counter.
+#include <cstring>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <vector>
+
+#include "NANDInfo/KeyTables.h"
+#include "NANDInfo/NameRows.h"
+#include "NANDInfo/Whitelists.h"
 #include "bench/Rows.h"
 
-void bench::addStorageTableRows(Table&) {}
+namespace bench {
+
+namespace {
+
+using platform::Dictionary;
+
+// The key map as a plain table.
+struct Record {
+  char counter[104];
+  std::string key;
+};
+
+std::vector<Record> keyMapRecords() {
+  std::vector<Record> records;
+  for (const NANDInfo::KeyMapRow& row : NANDInfo::keyMapRows()) {
+    for (const std::string& counter : NANDInfo::expandFamily(row.counters)) {
+      Record& record = records.emplace_back(Record{{}, std::string(*NANDInfo::keyMapKey(counter))});
+      counter.copy(record.counter, sizeof record.counter - 1);
+    }
+  }
+  return records;
+}
+
+// Everything that the controller's key table names.
+Dictionary ftlDictionary() {
+  Dictionary counters;
+  std::uint64_t value = 1;
+  for (const NANDInfo::FTLKey& row : NANDInfo::FTLKeyTable()) {
+    for (unsigned i = 0; i < row.elements; ++i) {
+      const std::string suffix = row.elements == 1 ? "" : "_" + std::to_string(i);
+      counters.set(row.name + suffix, value = value * 6364136223846793005u + 1);
+    }
+  }
+  return counters;
+}
+
+}  // namespace
+
+void addStorageTableRows(Table& table) {
+  const auto records = keyMapRecords();
+  Dictionary legacy;
+  for (const auto& [counter, key] : records) legacy.set(counter, std::uint64_t{1});
+  table.compare(
+      "renaming a legacy dictionary through the key map", "a linear walk of the table per name",
+      0.1, 1,
+      [&] {
+        Dictionary renamed;
+        for (const auto& [name, value] : legacy) {
+          if (const auto key = NANDInfo::keyMapKey(name)) renamed.set(*key, value);
+        }
+        keep(renamed);
+      },
+      [&] {
+        Dictionary renamed;
+        for (const auto& [name, value] : legacy) {
+          for (const auto& [counter, key] : records) {
+            if (std::strncmp(counter, name.c_str(), 100) != 0) continue;
+            renamed.set(key, value);
+            break;
+          }
+        }
+        keep(renamed);
+      },
+      51);
+
+  const Dictionary counters = ftlDictionary();
+  const NANDInfo::NameTable& whitelist = NANDInfo::WhitelistedRawNANDFTLCounters_SigDigDict();
+  table.compare(
+      "filtering and rounding a copy of the FTL dictionary", "copying its entries into a new one",
+      1.5, 1, [&] { keep(NANDInfo::CreateFilteredDict_SigDig(counters, &whitelist, true)); },
+      [&] {
+        Dictionary copy;
+        for (const auto& [key, value] : counters) copy.set(key, value);
+        keep(copy);
+      },
+      51);
+
+  table.compare(
+      "first use of the FTL whitelist", "a hash table of its names", 1.0, 1,
+      [] { keep(NANDInfo::NameTable(NANDInfo::ftlSignificantDigitsRows())); },
+      [&] {
+        std::unordered_map<std::string, std::uint8_t> names(whitelist.size());
+        for (const auto& [name, digits] : whitelist) names.emplace(name, digits);
+        keep(names);
+      },
+      51);
+}
+
+}  // namespace bench

@@ -150,6 +150,64 @@ struct KernelValues : Kernel {
   }
 };
 
+// A close that fails has closed all the same, any other call that fails was not made.
+struct Registry : DeviceRegistry, DriverConnections {
+  Registry(Platform& i, Plan& p) : registry(i.registry), drivers(i.drivers), plan(p) {}
+  static constexpr DriverStatus kInjected = 0x2BC;
+  DeviceRegistry& registry;
+  DriverConnections& drivers;
+  Plan& plan;
+  RegistryObject DrvGetMatchingService(std::string_view className) override {
+    return plan.fails() ? 0 : registry.DrvGetMatchingService(className);
+  }
+  RegistryObject rootEntry() override { return plan.fails() ? 0 : registry.rootEntry(); }
+  RegistryObject createIterator() override { return plan.fails() ? 0 : registry.createIterator(); }
+  RegistryObject next(RegistryObject iterator) override {
+    return plan.fails() ? 0 : registry.next(iterator);
+  }
+  bool conformsTo(RegistryObject entry, std::string_view className) override {
+    return registry.conformsTo(entry, className);
+  }
+  std::optional<Value> searchProperty(RegistryObject entry, std::string_view key,
+                                      Direction direction) override {
+    return plan.fails() ? std::nullopt : registry.searchProperty(entry, key, direction);
+  }
+  void release(RegistryObject object) override { registry.release(object); }
+  OpenResult DrvServiceOpen(RegistryObject service, std::uint32_t type) override {
+    return plan.fails() ? OpenResult{kInjected, 0} : drivers.DrvServiceOpen(service, type);
+  }
+  DriverStatus DrvServiceClose(DriverConnection connection) override {
+    const DriverStatus status = drivers.DrvServiceClose(connection);
+    return plan.fails() ? kInjected : status;
+  }
+  CallResult DrvCallStructMethod(DriverConnection connection, std::uint32_t method,
+                                 std::span<const std::byte> input,
+                                 std::span<std::byte> output) override {
+    return plan.fails() ? CallResult{kInjected, 0}
+                        : drivers.DrvCallStructMethod(connection, method, input, output);
+  }
+  DriverStatus DrvCallMethod(DriverConnection connection, std::uint32_t method,
+                             std::span<const std::uint64_t> input,
+                             std::span<std::uint64_t> output) override {
+    return plan.fails() ? kInjected : drivers.DrvCallMethod(connection, method, input, output);
+  }
+};
+
+struct Storage : KernelSnapshots, PurgeableSpace {
+  Storage(Platform& i, Plan& p) : inner(i), plan(p) {}
+  Platform& inner;
+  Plan& plan;
+  std::optional<std::vector<std::byte>> capture(std::uint32_t flags) override {
+    return plan.fails() ? std::nullopt : inner.snapshots.capture(flags);
+  }
+  bool isPresent() override { return inner.purgeableSpace.isPresent(); }
+  std::optional<Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
+      const Dictionary& query) override {
+    if (plan.fails()) return std::nullopt;
+    return inner.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(query);
+  }
+};
+
 struct Usage : NetworkUsage {
   Usage(NetworkUsage& i, Plan& p) : inner(i), plan(p) {}
   NetworkUsage& inner;
@@ -197,6 +255,8 @@ struct FaultInjector::Services {
         kernel(inner.kernel, plan),
         reportingChannels(inner.reportingChannels, plan),
         networkUsage(inner.networkUsage, plan),
+        registry(inner, plan),
+        storage(inner, plan),
         platform{inner.log,
                  inner.streams,
                  inner.clock,
@@ -218,10 +278,10 @@ struct FaultInjector::Services {
                  device,
                  device,
                  kernel,
-                 inner.snapshots,
-                 inner.registry,
-                 inner.drivers,
-                 inner.purgeableSpace,
+                 storage,
+                 registry,
+                 registry,
+                 storage,
                  reportingChannels,
                  networkUsage,
                  inner.applications,
@@ -241,6 +301,8 @@ struct FaultInjector::Services {
   KernelValues kernel;
   Channels reportingChannels;
   Usage networkUsage;
+  Registry registry;
+  Storage storage;
   Platform platform;
 };
 

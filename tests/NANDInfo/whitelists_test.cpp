@@ -48,9 +48,9 @@ TEST(Whitelists, HoldTheirNamesAndDigitsOnceEach) {
   for (const auto& [table, names, digest] : allTables()) {
     std::vector<std::string> lines;
     for (const NameTable::Entry& entry : table) {
-      lines.push_back(entry.name + " " + std::to_string(entry.number));
+      lines.push_back(std::string(entry.name) + " " + std::to_string(entry.number));
       ASSERT_EQ(table.find(entry.name), &entry);
-      ASSERT_FALSE(table.contains(entry.name + "x"));
+      ASSERT_FALSE(table.contains(std::string(entry.name) + "x"));
     }
     std::ranges::sort(lines);
     EXPECT_EQ(lines.size(), names);
@@ -99,7 +99,7 @@ TEST(Whitelists, NameWhatTheParsersProduce) {
     const bool ofMSP = &each.table == &WhitelistedRawNANDMSPCounters_SigDigDict();
     for (const NameTable::Entry& entry : each.table) {
       const bool derived = entry.name.starts_with("TLM_") || entry.name.starts_with("EAN_");
-      EXPECT_TRUE(derived || (ofMSP ? msp : ftl).contains(entry.name)) << entry.name;
+      EXPECT_TRUE(derived || (ofMSP ? msp : ftl).contains(std::string(entry.name))) << entry.name;
     }
   }
   for (const KeyMapRow& row : keyMapRows()) {
@@ -115,7 +115,7 @@ static_assert(countNames(kRows) == 8);
 TEST(NameTable, ExpandsFamiliesInOrderAndKeepsTheFirstOfAName) {
   std::string names;
   for (const NameTable::Entry& entry : NameTable(kRows)) {
-    names += entry.name + ":" + std::to_string(entry.number) + " ";
+    names += std::string(entry.name) + ":" + std::to_string(entry.number) + " ";
   }
   EXPECT_EQ(names, "n1:2 n3:2 n4:2 n10:2 all:20 n5:3 zero:0 ");
 }

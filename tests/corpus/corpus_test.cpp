@@ -10,7 +10,8 @@
 // The fuzz targets as they are, each entry renamed after its file (see tests/CMakeLists.txt).
 extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
-FuzzTarget binary_property_list_fuzz, bus_message_fuzz, import_lines_fuzz, xml_property_list_fuzz;
+FuzzTarget binary_property_list_fuzz, bus_message_fuzz, ftl_statistics_fuzz, import_lines_fuzz,
+    legacy_statistics_fuzz, msp_statistics_fuzz, xml_property_list_fuzz;
 }
 
 namespace {
@@ -23,7 +24,10 @@ struct Row {
 constexpr Row kTargets[] = {
     {"binary_property_list_fuzz", binary_property_list_fuzz},
     {"bus_message_fuzz", bus_message_fuzz},
+    {"ftl_statistics_fuzz", ftl_statistics_fuzz},
     {"import_lines_fuzz", import_lines_fuzz},
+    {"legacy_statistics_fuzz", legacy_statistics_fuzz},
+    {"msp_statistics_fuzz", msp_statistics_fuzz},
     {"xml_property_list_fuzz", xml_property_list_fuzz},
 };
 

@@ -1,0 +1,29 @@
+// Reading counters out of a dictionary.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "platform/PropertyList.h"
+#include "platform/Text.h"
+
+namespace NANDInfo {
+
+// The counter's low 32 bits as a signed number; none when the dictionary doesn't have it.
+inline std::optional<std::int32_t> signed32(const platform::Dictionary& counters,
+                                            std::string_view name) {
+  const platform::Number* number = counters.number(name);
+  if (number == nullptr) return std::nullopt;
+  return static_cast<std::int32_t>(static_cast<std::uint32_t>(number->uint64Value()));
+}
+
+// The name of an array's element.
+inline std::string indexed(std::string_view name, std::uint64_t index) {
+  std::string text(name);
+  platform::appendInteger(text, index);
+  return text;
+}
+
+}  // namespace NANDInfo

@@ -1,0 +1,68 @@
+// What holds of every parser of counter buffers, whatever the bytes.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <memory_resource>
+#include <span>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/GenericParserContext.h"
+
+namespace fuzz {
+
+using Fields = std::vector<std::pair<std::string, std::uint64_t>>;
+
+inline void require(bool condition) {
+  if (!condition) std::abort();
+}
+
+inline Fields fieldsOf(const NANDInfo::GenericParserCxt& context) {
+  Fields fields;
+  for (std::size_t i = 0; i < context.size(); ++i) {
+    require(context[i].name.size() <= NANDInfo::kLongestFieldName);
+    fields.emplace_back(context[i].name, context[i].value);
+  }
+  return fields;
+}
+
+inline bool isSubsequence(const Fields& some, const Fields& all) {
+  auto place = all.begin();
+  for (const auto& field : some) {
+    while (place != all.end() && *place != field) ++place;
+    if (place++ == all.end()) return false;
+  }
+  return true;
+}
+
+// Parses twice, and once more with little memory, and returns the fields. Elements are at least
+// `narrowest` bytes wide.
+template <typename Parse>
+Fields checkCounterParser(Parse parse, std::span<const std::byte> bytes, std::size_t narrowest) {
+  const auto run = [&](std::pmr::memory_resource* memory) {
+    NANDInfo::ResetAPIErrorMessage();
+    NANDInfo::GenericParserCxt context(memory);
+    const std::uint32_t total = parse(&context, bytes);
+    return std::pair(total, fieldsOf(context));
+  };
+  const auto [total, fields] = run(std::pmr::new_delete_resource());
+  const std::string message = NANDInfo::GetAPIErrorMessage();
+  require(fields.size() <= bytes.size() / narrowest);
+  // The two differ only by what is dropped from an array of more than 65,535 elements.
+  require(total == fields.size() || (total > fields.size() && bytes.size() > 65535 * narrowest));
+  require(run(std::pmr::new_delete_resource()) == std::pair(total, fields));
+  require(NANDInfo::GetAPIErrorMessage() == message);
+
+  std::vector<std::byte> room(bytes.size());
+  std::pmr::monotonic_buffer_resource little(room.data(), room.size(),
+                                             std::pmr::null_memory_resource());
+  const auto [lessTotal, fewer] = run(&little);
+  require(lessTotal <= total && isSubsequence(fewer, fields));
+  return fields;
+}
+
+}  // namespace fuzz

@@ -1,0 +1,120 @@
+#include <gtest/gtest.h>
+
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/GenericParserContext.h"
+#include "NANDInfo/NameTable.h"
+#include "support/ControllerBuffers.h"
+
+namespace NANDInfo {
+namespace {
+
+using support::Bytes, support::Fields, support::fieldsOf, support::RefusingMemory;
+
+constexpr std::uint64_t kLargest = ~std::uint64_t{0};
+
+TEST(GenericParserContext, AddsElementsOfEveryWidth) {
+  const Bytes source = support::words({0x8182838485868788, 0x9192939495969798});
+  const struct {
+    std::uint32_t width, count;
+    bool result;
+    Fields expected;
+  } rows[] = {
+      {1, 1, true, {{"n_", 0x88}}},
+      {4, 2, true, {{"n_0", 0x85868788}, {"n_1", 0x81828384}}},
+      {7, 2, true, {{"n_0", 0x82838485868788}, {"n_1", 0x93949596979881}}},
+      {8, 2, true, {{"n_0", 0x8182838485868788}, {"n_1", 0x9192939495969798}}},
+      {8, 1, true, {{"n_", 0x8182838485868788}}},
+      {0, 3, true, {}},
+      {8, 0, true, {}},
+      {9, 0, true, {}},
+      {9, 1, false, {}},
+      {9, 3, false, {}},
+      // Never beyond the source.
+      {8, 3, true, {{"n_0", 0x8182838485868788}, {"n_1", 0x9192939495969798}}},
+      {5, 0xFFFFFFFF, true, {{"n_0", 0x8485868788}, {"n_1", 0x9798818283}, {"n_2", 0x9293949596}}},
+  };
+  for (const auto& [width, count, result, expected] : rows) {
+    GenericParserCxt context;
+    EXPECT_EQ(AddMultipleFieldsToGenericContext(&context, "n_", source, width, count), result)
+        << width << " " << count;
+    EXPECT_EQ(fieldsOf(context), expected) << width << " " << count;
+  }
+  EXPECT_FALSE(AddSingleValueToGenericContext(nullptr, "a", "b", 1));
+  EXPECT_FALSE(AddMultipleFieldsToGenericContext(nullptr, "n", source, 8, 2));
+}
+
+TEST(GenericParserContext, DropsElementsBeyondThe16BitIndex) {
+  const Bytes source(65537, std::byte{7});
+  for (const std::uint32_t count : {65535u, 65536u, 65537u}) {
+    GenericParserCxt context;
+    EXPECT_TRUE(AddMultipleFieldsToGenericContext(&context, "n", source, 1, count));
+    ASSERT_EQ(context.size(), 65535u);
+    EXPECT_EQ(context[65534].name, "n65534");
+  }
+}
+
+TEST(GenericParserContext, CutsLongNamesAndKeepsEqualOnes) {
+  GenericParserCxt context;
+  const std::string longName(120, 'x'), name97(97, 'y');
+  AddSingleValueToGenericContext(&context, longName, "suffix", 1);
+  AddSingleValueToGenericContext(&context, name97, "12", kLargest);
+  AddSingleValueToGenericContext(&context, "", "boots", 2);
+  AddSingleValueToGenericContext(&context, "", "", 3);
+  AddSingleValueToGenericContext(&context, "bo", "ots", 4);
+  EXPECT_EQ(fieldsOf(context), (Fields{{longName.substr(0, 98), 1},
+                                       {name97 + "1", kLargest},
+                                       {"boots", 2},
+                                       {"", 3},
+                                       {"boots", 4}}));
+  const auto dictionary = CreateDictFromCxt(context);
+  EXPECT_EQ(dictionary.size(), 4u);
+  EXPECT_EQ(dictionary.number("boots")->uint64Value(), 4u);
+  EXPECT_EQ(dictionary.number("boots")->type(), platform::Number::Type::uint64);
+  EXPECT_EQ(dictionary.number(name97 + "1")->uint64Value(), kLargest);
+  const NameRow allowed[] = {{"boots", 0}, {"absent", 0}};
+  const NameTable table(allowed);
+  EXPECT_EQ(CreateDictFromCxt(context, &table),
+            (platform::Dictionary{{"boots", std::uint64_t{4}}}));
+  for (int i = 0; i < 2; ++i) ReleaseGenericParserCxt(&context);
+  EXPECT_TRUE(context.empty() && CreateDictFromCxt(context).empty());
+  AddSingleValueToGenericContext(&context, "again", "", 5);
+  EXPECT_EQ(fieldsOf(context), (Fields{{"again", 5}}));
+  ReleaseGenericParserCxt(nullptr);
+}
+
+// Whichever allocation is refused: only the field that needed it is missing.
+TEST(GenericParserContext, SurvivesARefusalAtEachAllocation) {
+  constexpr std::uint32_t kCount = 1000;
+  Bytes source;
+  for (std::uint64_t i = 0; i < kCount; ++i) support::put(source, i * i, 8);
+  bool refused = true;
+  for (int granted = 0; refused; ++granted) {
+    ASSERT_LT(granted, 100);
+    RefusingMemory memory(granted, 1);
+    GenericParserCxt context(&memory);
+    refused = !AddMultipleFieldsToGenericContext(&context, "name", source, 8, kCount);
+    ASSERT_EQ(context.size(), refused ? kCount - 1 : kCount);
+    std::uint64_t element = 0;
+    for (const auto& [name, value] : fieldsOf(context)) {
+      if (name != "name" + std::to_string(element)) ++element;
+      ASSERT_EQ(name, "name" + std::to_string(element));
+      ASSERT_EQ(value, element * element);
+      ++element;
+    }
+  }
+}
+
+TEST(APIErrorMessage, KeepsTheFirstOne) {
+  ResetAPIErrorMessage();
+  EXPECT_STREQ(GetAPIErrorMessage(), "NA");
+  SetAPIErrorMessage("%s(%d)", std::string(2000, 'm').c_str(), 1);
+  SetAPIErrorMessage("second");
+  EXPECT_EQ(GetAPIErrorMessage(), std::string(1023, 'm'));
+  ResetAPIErrorMessage();
+  SetAPIErrorMessage("failed: %d", 7);
+  EXPECT_STREQ(GetAPIErrorMessage(), "failed: 7");
+  ResetAPIErrorMessage();
+}
+
+}  // namespace
+}  // namespace NANDInfo

@@ -1,0 +1,86 @@
+// Counter buffers put together by hand, and a look at what their parsers made of them.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <limits>
+#include <memory_resource>
+#include <new>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "NANDInfo/GenericParserContext.h"
+
+namespace support {
+
+using Bytes = std::vector<std::byte>;
+using Fields = std::vector<std::pair<std::string, std::uint64_t>>;
+
+// Appends the low `width` bytes of a number, lowest first.
+inline void put(Bytes& bytes, std::uint64_t number, unsigned width) {
+  for (unsigned i = 0; i < width; ++i) bytes.push_back(static_cast<std::byte>(number >> (8 * i)));
+}
+
+// The header word of an FTL record.
+constexpr std::uint64_t header(std::uint32_t key, std::uint32_t count) {
+  return key | std::uint64_t{count} << 32;
+}
+
+inline Bytes words(const std::vector<std::uint64_t>& all) {
+  Bytes bytes;
+  for (const std::uint64_t word : all) put(bytes, word, 8);
+  return bytes;
+}
+
+// A record of an MSP buffer: its length is that of the values, unless another one is given.
+struct MSPRecord {
+  std::uint16_t tag;
+  unsigned width;
+  std::vector<std::uint64_t> values;
+  std::uint64_t length = values.size() * width;
+};
+
+inline Bytes records(const std::vector<MSPRecord>& all) {
+  Bytes bytes;
+  for (const auto& [tag, width, values, length] : all) {
+    put(bytes, tag, 2);
+    put(bytes, length, 2);
+    for (const std::uint64_t value : values) put(bytes, value, width);
+  }
+  return bytes;
+}
+
+inline Fields fieldsOf(const NANDInfo::GenericParserCxt& context) {
+  Fields fields;
+  for (std::size_t i = 0; i < context.size(); ++i) {
+    fields.emplace_back(context[i].name, context[i].value);
+  }
+  return fields;
+}
+
+// Grants the first allocations, refuses some, and grants the rest.
+class RefusingMemory : public std::pmr::memory_resource {
+ public:
+  explicit RefusingMemory(int granted = 0, int refused = std::numeric_limits<int>::max())
+      : granted_(granted), refused_(refused) {}
+
+ private:
+  void* do_allocate(std::size_t bytes, std::size_t alignment) override {
+    if (granted_ > 0) {
+      --granted_;
+    } else if (refused_ > 0) {
+      --refused_;
+      throw std::bad_alloc();
+    }
+    return std::pmr::new_delete_resource()->allocate(bytes, alignment);
+  }
+  void do_deallocate(void* memory, std::size_t bytes, std::size_t alignment) override {
+    std::pmr::new_delete_resource()->deallocate(memory, bytes, alignment);
+  }
+  bool do_is_equal(const memory_resource& other) const noexcept override { return this == &other; }
+
+  int granted_, refused_;
+};
+
+}  // namespace support
