@@ -60,7 +60,7 @@ class Changes {
       const Number* count = record.number(counter.name);
       const std::int64_t bytes = integer(count);
       const std::size_t place = entry.size();
-      entry.push_back(count != nullptr ? Value(*count) : Value(0));
+      entry.emplace_back(count != nullptr ? *count : Number(0));
       if (previous == nullptr) {
         if (recent) ReportDataUsage(counter.stem, bytes);
         continue;

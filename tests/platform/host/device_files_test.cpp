@@ -271,7 +271,8 @@ TEST_F(DeviceFiles, ReportChannelsAreThoseOfACategoryWithANameAndAValue) {
   for (const auto& one : channels) found.push_back(one.name + " " + std::to_string(one.format));
   EXPECT_EQ(found, (Texts{"a 1", "text 1", "b 0"}));
   found.clear();
-  for (const auto& [one, value] : *facility.subscribe(asked)->createSamples()) {
+  const auto samples = facility.subscribe(asked)->createSamples();
+  for (const auto& [one, value] : *samples) {
     found.push_back(one.name + " " + std::to_string(one.format) + " " + std::to_string(value));
   }
   EXPECT_EQ(found, (Texts{"a 1 5", "b 0 -9"}));
