@@ -16,6 +16,7 @@
 
 #include "bench/Rows.h"
 #include "platform/CivilDate.h"
+#include "support/ControllerRoot.h"
 #include "support/HostOnRoot.h"
 #include "support/TemporaryFolder.h"
 
@@ -72,6 +73,12 @@ void addStartRows(bench::Table& table) {
   table.compareFigures(
       "-d with the gate closed, peak memory", "empty program, same libraries", 1.5, "KiB",
       [&] { return run(gated).peakKiB; }, [&] { return run(empty).peakKiB; });
+
+  support::writeController(root);
+  const Arguments statistics{program("nandinfo"), "ftl", "--round"};
+  table.compare(
+      "nandinfo ftl, every counter", "empty program, same libraries", 3, 1,
+      [&] { run(statistics); }, [&] { run(empty); }, 101);
 }
 
 // A device whose history holds three days up to yesterday, and a whitelist that lets it all

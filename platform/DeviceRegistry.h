@@ -46,8 +46,8 @@ class DeviceRegistry {
   // Whether the entry is of the class or of one that conforms to it.
   virtual bool conformsTo(RegistryObject entry, std::string_view className) = 0;
 
-  // The value of a property on the entry or on what lies in the direction of the search, the
-  // nearest first; none when it is nowhere.
+  // The value of a property on the entry or on what lies in the direction of the search: its
+  // parents from the nearest up, or all below it in the order of a walk. None when it is nowhere.
   virtual std::optional<Value> searchProperty(RegistryObject entry, std::string_view key,
                                               Direction direction) = 0;
 

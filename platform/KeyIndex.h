@@ -7,7 +7,9 @@
 #include <string_view>
 #include <vector>
 
-namespace platform {
+#include "platform/Exported.h"
+
+namespace platform MORVEND_EXPORTED {
 
 // Seeded for each process: keys come from files and messages, and nobody outside shall be able to
 // choose keys that collide.
@@ -46,4 +48,4 @@ class KeyIndex {
   std::size_t taken_ = 0;
 };
 
-}  // namespace platform
+}  // namespace MORVEND_EXPORTED

@@ -10,9 +10,10 @@
 #include <string_view>
 #include <vector>
 
+#include "platform/Exported.h"
 #include "platform/PropertyList.h"
 
-namespace platform {
+namespace platform MORVEND_EXPORTED {
 
 // In all three, a missing value in a write (a null pointer) removes the key.
 
@@ -59,4 +60,4 @@ class PrivilegedPreferences {
                                 std::string_view domain) = 0;
 };
 
-}  // namespace platform
+}  // namespace MORVEND_EXPORTED

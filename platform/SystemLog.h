@@ -4,7 +4,9 @@
 #include <cstdarg>
 #include <string_view>
 
-namespace platform {
+#include "platform/Exported.h"
+
+namespace platform MORVEND_EXPORTED {
 
 // "standard" is the level that the log itself calls default; a notice is a standard line.
 enum class LogLevel { debug, info, standard, error };
@@ -28,4 +30,4 @@ class SystemLog {
   LogLevel lowest_;
 };
 
-}  // namespace platform
+}  // namespace MORVEND_EXPORTED

@@ -5,7 +5,9 @@
 #include <cstdint>
 #include <string>
 
-namespace platform {
+#include "platform/Exported.h"
+
+namespace platform MORVEND_EXPORTED {
 
 std::string format(const char* format, ...) __attribute__((format(printf, 1, 2)));
 std::string vformat(const char* format, std::va_list arguments)
@@ -21,4 +23,4 @@ void appendInteger(std::string& text, std::uint64_t value);
 // Appends the shortest text that reads back as the same double: "inf", "-inf", "nan" for the rest.
 void appendReal(std::string& text, double value);
 
-}  // namespace platform
+}  // namespace MORVEND_EXPORTED

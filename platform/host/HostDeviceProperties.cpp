@@ -1,5 +1,7 @@
 #include "platform/host/HostDeviceProperties.h"
 
+#include "platform/host/DeviceFileSystem.h"
+
 namespace platform::host {
 
 namespace {
@@ -9,6 +11,14 @@ constexpr std::uint64_t kNoSuchContainer = 2;
 bool isPlainName(std::string_view name) {
   return !name.empty() && name != "." && name != ".." &&
          name.find_first_of(std::string_view("/\0", 2)) == name.npos;
+}
+
+// A size in bytes; what is missing or negative is 0.
+std::uint64_t bytes(const Dictionary& usage, const char* key) {
+  const Number* size = usage.number(key);
+  const bool negative =
+      size != nullptr && size->type() != Number::Type::uint64 && size->int64Value() < 0;
+  return size != nullptr && !negative ? size->uint64Value() : 0;
 }
 
 }  // namespace
@@ -30,7 +40,18 @@ std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {
 }
 
 std::optional<DeviceProperties::DiskUsage> HostDeviceProperties::diskUsage() {
-  return std::nullopt;
+  const Dictionary* properties = properties_.dictionary();
+  const Value* given = properties != nullptr ? properties->find("DiskUsage") : nullptr;
+  if (given == nullptr) {
+    const auto host = DeviceFileSystem(root_).statfs("/");
+    if (!host) return std::nullopt;
+    const std::uint64_t available = host->blocksAvailable * host->blockSize;
+    return DiskUsage{host->blocks * host->blockSize, available, available};
+  }
+  const auto* usage = given->as<Dictionary>();
+  if (usage == nullptr) return std::nullopt;
+  return DiskUsage{bytes(*usage, "TotalDiskCapacity"), bytes(*usage, "TotalDataAvailable"),
+                   bytes(*usage, "AmountDataAvailable")};
 }
 
 std::optional<std::string> HostDeviceProperties::systemGroupContainerPath(

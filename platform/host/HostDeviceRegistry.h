@@ -1,15 +1,28 @@
-// The device registry and its drivers: device/registry.plist.
+// The device registry and its drivers: device/registry.plist, which is read at the first question.
+// Without the file, or with anything but a dictionary at its top, there is no registry.
 #pragma once
+
+#include <cstdint>
+#include <optional>
+#include <unordered_map>
+#include <vector>
 
 #include "platform/DeviceRegistry.h"
 #include "platform/host/DeviceFile.h"
+#include "platform/host/SimulatedDriver.h"
 
 namespace platform::host {
 
+// Depth first in file order everywhere, parents before children; a search through parents ends with
+// the root. A handle is never given out twice: one that is unknown, of another kind or released
+// already has no effect, and its question the answer that there is nothing.
 class HostDeviceRegistry : public DeviceRegistry, public DriverConnections {
  public:
   HostDeviceRegistry(const DeviceRoot& root, PropertyListCodec& codec, SystemLog& log)
-      : root_(root), log_(log), file_(root, codec, log, "device/registry.plist") {}
+      : log_(log), file_(root, codec, log, "device/registry.plist"), files_(root, log) {}
+
+  // Handles that are still held are said with an error line.
+  ~HostDeviceRegistry() override;
 
   RegistryObject DrvGetMatchingService(std::string_view className) override;
   RegistryObject rootEntry() override;
@@ -30,9 +43,33 @@ class HostDeviceRegistry : public DeviceRegistry, public DriverConnections {
                              std::span<std::uint64_t> output) override;
 
  private:
-  const DeviceRoot& root_;
+  // In the order of a walk; the root is the first. What lies below an entry follows it, up to
+  // `end`.
+  struct Entry {
+    const Dictionary& content;  // borrowed from the file
+    std::size_t parent, end;    // places; the root is its own parent
+  };
+  enum class Kind : std::uint8_t { entry, iterator, connection };
+  struct Handle {
+    Kind kind;
+    std::size_t place;  // of the entry; of the one that an iterator yields next
+  };
+
+  const std::vector<Entry>& entries();
+  void add(const Dictionary& content, std::size_t parent);
+
+  std::uint32_t handOut(Kind kind, std::size_t place);
+  Handle* held(std::uint32_t handle, Kind kind);
+  std::optional<SimulatedDriver> driverAt(std::size_t place);
+  std::optional<SimulatedDriver> driverOf(DriverConnection connection);
+
   SystemLog& log_;
   DeviceFile file_;
+  DriverFiles files_;
+  std::vector<Entry> entries_;
+  bool isRead_ = false;
+  std::unordered_map<std::uint32_t, Handle> handles_;
+  std::uint32_t lastHandle_ = 0;
 };
 
 }  // namespace platform::host

@@ -2,9 +2,12 @@
 
 namespace platform::host {
 
-std::optional<std::vector<std::byte>> HostKernelSnapshots::capture(std::uint32_t) {
-  (void)root_;
-  return std::nullopt;
+std::optional<std::vector<std::byte>> HostKernelSnapshots::capture(std::uint32_t flags) {
+  if ((flags & kChunkedData) == 0) return std::nullopt;
+  const auto bytes = root_.readFile("device/kernel-snapshot.bin", kLargestSnapshot + 1);
+  if (!bytes || bytes->size() > kLargestSnapshot) return std::nullopt;
+  const auto* first = reinterpret_cast<const std::byte*>(bytes->data());
+  return std::vector<std::byte>(first, first + bytes->size());
 }
 
 }  // namespace platform::host

@@ -6,9 +6,14 @@
 
 namespace platform::host {
 
+inline constexpr std::size_t kLargestSnapshot = std::size_t{64} << 20;
+
 class HostKernelSnapshots : public KernelSnapshots {
  public:
   explicit HostKernelSnapshots(const DeviceRoot& root) : root_(root) {}
+
+  // The file's bytes. The capture fails without the file, without the chunked-data flag, in which
+  // format the file is, and when the file is longer than a snapshot gets.
   std::optional<std::vector<std::byte>> capture(std::uint32_t flags) override;
 
  private:

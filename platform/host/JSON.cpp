@@ -1,5 +1,6 @@
 #include "platform/host/JSON.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "platform/Text.h"
@@ -86,10 +87,46 @@ void append(std::string& out, const Data& data) {
   out += '"';
 }
 
+bool holdsOthers(const Array& array) {
+  return std::any_of(array.begin(), array.end(), [](const Value& element) {
+    return element.as<Array>() != nullptr || element.as<Dictionary>() != nullptr;
+  });
+}
+
+void appendIndented(std::string& out, const Value& value, std::size_t depth) {
+  const auto newLine = [&](std::size_t level) { out.append(1, '\n').append(2 * level, ' '); };
+  if (const auto* dictionary = value.as<Dictionary>();
+      dictionary != nullptr && !dictionary->empty()) {
+    out += '{';
+    for (const Dictionary::Entry& entry : *dictionary) {
+      if (&entry != dictionary->begin()) out += ',';
+      newLine(depth + 1);
+      append(out, entry.key);
+      out += ": ";
+      appendIndented(out, entry.value, depth + 1);
+    }
+    newLine(depth);
+    out += '}';
+  } else if (const auto* array = value.as<Array>(); array != nullptr && holdsOthers(*array)) {
+    out += '[';
+    for (const Value& element : *array) {
+      if (&element != array->data()) out += ',';
+      newLine(depth + 1);
+      appendIndented(out, element, depth + 1);
+    }
+    newLine(depth);
+    out += ']';
+  } else {
+    appendJSON(out, value);
+  }
+}
+
 }  // namespace
 
 void appendJSON(std::string& out, const Value& value) {
   std::visit([&out](const auto& content) { append(out, content); }, value.variant());
 }
+
+void appendIndentedJSON(std::string& out, const Value& value) { appendIndented(out, value, 0); }
 
 }  // namespace platform::host

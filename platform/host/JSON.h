@@ -12,4 +12,8 @@ namespace platform::host {
 // UTC, data base64 text. What isn't UTF-8 becomes U+FFFD, so that the text is always valid.
 void appendJSON(std::string& out, const Value& value);
 
+// The same for people to read, without a line feed at its end: each entry of a dictionary on a line
+// of its own, and each element of an array that holds arrays or dictionaries.
+void appendIndentedJSON(std::string& out, const Value& value);
+
 }  // namespace platform::host

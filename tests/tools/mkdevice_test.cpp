@@ -1,14 +1,20 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <map>
 #include <set>
 
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/KeyTables.h"
+#include "NANDInfo/Parsers.h"
 #include "daemon/context/DeviceContext.h"
 #include "platform/host/Host.h"
 #include "report/PLReport.h"
 #include "support/TemporaryFolder.h"
 #include "tools/demo/Device.h"
+#include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/DeviceMaker.h"
+#include "tools/mkdevice/SampleController.h"
 #include "tools/mkdevice/Vocabulary.h"
 
 namespace {
@@ -60,6 +66,19 @@ TEST(MkdeviceTables, EveryRowMakesSense) {
     EXPECT_TRUE(row.spread > 0 && row.spread < 1) << row.key;
     EXPECT_EQ(row.options.bucketInterval + row.options.significantFigures, 0U) << row.key;
     EXPECT_TRUE(ascending(row.options.intervals)) << row.key;
+  }
+  for (const WearCounter& row : wearCounterTable()) {
+    EXPECT_TRUE(keys.insert(row.name).second) << row.name;
+    const auto isCounted = [&](const auto& table) {
+      return std::ranges::any_of(
+          table, [&](const auto& key) { return row.name == std::string(key.name); });
+    };
+    EXPECT_TRUE(isCounted(NANDInfo::FTLKeyTable()) || isCounted(NANDInfo::MSPTagTable()))
+        << row.name;
+  }
+  for (const CounterFamily& row : counterFamilyTable()) {
+    EXPECT_TRUE(keys.insert(row.part).second) << row.part;
+    EXPECT_GT(row.figure, 0) << row.part;
   }
   std::set<std::tuple<Group, Section, std::string>> entries;
   for (const WhitelistRow& row : whitelistTable()) {
@@ -195,6 +214,190 @@ TEST(Mkdevice, ItsReportHoldsWhatTheWhitelistNamesAndNothingElse) {
     })) << key;
   }
   EXPECT_FALSE(log->content.dictionary("PLDistributionsHistogram")->empty());
+}
+
+// The fields that a decoder finds in a buffer.
+template <typename Parse>
+std::map<std::string, std::uint64_t> fieldsOf(const std::string& bytes, Parse parse,
+                                              std::size_t expected) {
+  NANDInfo::ResetAPIErrorMessage();
+  NANDInfo::GenericParserCxt context;
+  EXPECT_EQ(parse(&context, std::as_bytes(std::span(bytes))), expected);
+  EXPECT_STREQ(NANDInfo::GetAPIErrorMessage(), "NA");
+  std::map<std::string, std::uint64_t> fields;
+  for (std::size_t i = 0; i < context.size(); ++i) {
+    fields[std::string(context[i].name)] = context[i].value;
+  }
+  return fields;
+}
+
+template <typename Table>
+std::size_t elementsOf(const Table& table) {
+  std::size_t count = 0;
+  for (const auto& row : table) count += row.elements;
+  return count;
+}
+
+using Fields = std::map<std::string, std::uint64_t>;
+
+Fields statisticsOf(const Sample& sample, int hoursAgo) {
+  return fieldsOf(ftlStatistics(Wear(sample, hoursAgo)), NANDInfo::ZMCFTLParseBufferToCxt,
+                  elementsOf(NANDInfo::FTLKeyTable()));
+}
+
+// A family row that swallows a counter by mistake shows as a relation that doesn't hold.
+TEST(MkdeviceController, ItsCountersAgreeWithEachOtherAndOnlyGrow) {
+  const char* const kAscending[][4] = {
+      {"hostWrites", "nandWrites"},
+      {"hostReads", "nandReads"},
+      {"hostWriteXacts", "hostWritesDyn", "hostWrites"},
+      {"uncleanBoots", "shutdowns", "boots"},
+      {"intermediatePartitionStart", "userPartitionStart", "numVirtualBlocks"},
+      {"IND_pool_free", "IND_pool_count"},
+      {"numFreeVirtualBlocks", "numVirtualBlocks"},
+      {"minSkinnyPECycles", "averageSkinnyPECycles", "maxSkinnyPECycles"},
+      {"averageTLCPECycles", "averageSLCPECycles", "maxHighEnduranceBlockErases"},
+      {"eanMinBootReadMBPerSec", "eanAvgBootReadMBPerSec"},
+      {"averageGracefulBootTimeMs", "maxGracefulBootTimeMs"},
+      {"avgBgInitTimeMs", "maxBgInitTimeMs"},
+  };
+  for (std::uint64_t seed = 1; seed <= 12; ++seed) {
+    SCOPED_TRACE(seed);
+    const Sample sample{.seed = seed, .today = kToday};
+    Fields newer = statisticsOf(sample, 0);
+    for (const auto& names : kAscending) {
+      for (int i = 1; i < 4 && names[i] != nullptr; ++i) {
+        EXPECT_LT(newer.at(names[i - 1]), newer.at(names[i])) << names[i];
+      }
+    }
+    for (const auto& [name, value] : newer) {
+      const bool isPercent = name.find("ercent") != name.npos || name.find("Precent") != name.npos;
+      EXPECT_TRUE(!isPercent || value <= 100) << name << " " << value;
+      EXPECT_LE(value, std::uint64_t{1} << 56) << name;
+    }
+    const std::uint64_t formatted = newer.at("utilFormatTime");
+    EXPECT_TRUE(formatted > 1'600'000'000 && formatted < newer.at("wallTime")) << formatted;
+    const double amplification =
+        static_cast<double>(newer.at("bandErases") * kPagesPerBand * kBytesPerPage / 4096) /
+        static_cast<double>(newer.at("hostWrites"));
+    EXPECT_TRUE(amplification > 1.5 && amplification < 2.7) << amplification;
+
+    for (const int hours : {4, 24, 168, 720}) {
+      const Fields older = statisticsOf(sample, hours);
+      EXPECT_LT(older.at("gcWrites"), newer.at("gcWrites"));
+      EXPECT_EQ(older.at("magazineInstanceMeta") >> 24, kToday * 86400ull - hours * 3600ull);
+      for (const auto& [name, value] : older) {
+        EXPECT_TRUE(value <= newer.at(name) || name.starts_with("vcurve_")) << name;
+      }
+      newer = older;
+    }
+  }
+}
+
+TEST(MkdeviceController, ItsOtherBuffersHaveTheShapesThatReadersExpect) {
+  const auto wordAt = [](const std::string& bytes, std::size_t offset) {
+    std::uint64_t word = 0;
+    for (std::size_t i = 0; i < 4; ++i) {
+      word |= std::uint64_t{static_cast<unsigned char>(bytes.at(offset + i))} << (8 * i);
+    }
+    return word;
+  };
+  for (std::uint64_t seed = 1; seed <= 5; ++seed) {
+    const Wear wear({.seed = seed, .today = kToday}, 0);
+    std::set<std::string> different;
+    for (std::uint64_t msp = 0; msp < kMSPs; ++msp) {
+      const std::string bytes = mspStatistics(wear, msp);
+      const auto fields =
+          fieldsOf(bytes, NANDInfo::ZMCMSPParseBufferToCxt, elementsOf(NANDInfo::MSPTagTable()));
+      EXPECT_GT(fields.at("passWithTmodeHard"), 0u);
+      different.insert(bytes);
+    }
+    EXPECT_EQ(different.size(), kMSPs);
+    NANDInfo::LegacyNandInfoCxt legacy;
+    const std::string statistics = ftlStatistics(wear);
+    EXPECT_TRUE(NANDInfo::ZMCParseBufferToCxt(&legacy, std::as_bytes(std::span(statistics))));
+    EXPECT_EQ(legacy.hostWrites, wear.hostWrites);
+
+    const std::string bands = bandStatistics(wear), defects = defectsList(wear);
+    EXPECT_EQ(bands.size(), 8 * wordAt(bands, 4) + 20 * wordAt(bands, 0));
+    EXPECT_EQ(defects.size(), 12 + 32 * wordAt(defects, 8));
+    for (std::uint32_t list = 0; list < 3; ++list) {
+      EXPECT_EQ(telemetryList(wear, list).size(), 4128u * kChannels);
+    }
+    std::string snapshot = kernelSnapshot(wear);
+    int depth = 0, deepest = 0;
+    while (wordAt(snapshot, 0) != 0xF19158ED) {
+      depth += wordAt(snapshot, 0) == 0x13 ? 1 : wordAt(snapshot, 0) == 0x14 ? -1 : 0;
+      deepest = std::max(deepest, depth);
+      snapshot.erase(0, 16 + wordAt(snapshot, 4));
+    }
+    EXPECT_EQ(std::pair(depth, deepest), std::pair(0, 3));
+    EXPECT_EQ(snapshot.size(), 16u);
+  }
+}
+
+TEST(MkdeviceController, EachDriverAnswersWhatItsControllerHas) {
+  const struct {
+    const char *name, *className, *propertyKey;
+    bool hasMSPs, recommendsDeletion;
+  } rows[] = {
+      {"qrt3", "NorbaQRT3NVMeController", "Controller Characteristics", true, false},
+      {"embedded", "NorbaEmbeddedNVMeController", "Controller Characteristics", false, false},
+      {"zmc", "ZMCStorage", "PropertyMatch", false, true}};
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    support::TemporaryFolder folder;
+    const auto kind = controllerNamed(row.name);
+    ASSERT_TRUE(kind);
+    ASSERT_EQ(Maker().make(folder / "root", {.today = kToday, .controller = *kind}), "");
+    EXPECT_FALSE(fs::exists(folder / "root/private"));
+    platform::host::Host host({.root = folder / "root"});
+    auto& registry = host.platform().registry;
+    auto& drivers = host.platform().drivers;
+    const auto service = registry.DrvGetMatchingService(row.className);
+    const auto found = registry.searchProperty(service, row.propertyKey,
+                                               platform::DeviceRegistry::Direction::parents);
+    ASSERT_TRUE(found && found->as<platform::Dictionary>());
+    EXPECT_EQ(found->as<platform::Dictionary>()->number("num-bus")->uint64Value(), kChannels);
+    const auto connection = drivers.DrvServiceOpen(service, 0).connection;
+    const auto sizeOf = [&](std::uint32_t opType, std::uint32_t argument) {
+      const std::uint32_t block[6] = {opType, 1, argument};
+      std::uint32_t size = 0;
+      drivers.DrvCallStructMethod(connection, 9, std::as_bytes(std::span(block)),
+                                  std::as_writable_bytes(std::span(&size, 1)));
+      return size;
+    };
+    for (const auto& [opType, argument] :
+         std::vector<std::pair<std::uint32_t, std::uint32_t>>{{13, 0},
+                                                              {10, 0},
+                                                              {10, 4},
+                                                              {10, 24},
+                                                              {10, 168},
+                                                              {10, 720},
+                                                              {11, 0},
+                                                              {17, 0},
+                                                              {17, 2},
+                                                              {15, 0},
+                                                              {39, 0},
+                                                              {22, 0},
+                                                              {145, 0}}) {
+      EXPECT_GT(sizeOf(opType, argument), 12u) << opType << " " << argument;
+    }
+    for (const std::uint32_t msp : {0u, 3u}) EXPECT_EQ(sizeOf(221, msp) > 0, row.hasMSPs);
+    EXPECT_EQ(sizeOf(221, 4) + sizeOf(10, 5) + sizeOf(17, 3), 0u);
+    std::uint32_t answer;
+    const auto result = drivers.DrvCallStructMethod(connection, 5, {},
+                                                    std::as_writable_bytes(std::span(&answer, 1)));
+    EXPECT_EQ(result.status == 0, row.recommendsDeletion);
+    drivers.DrvServiceClose(connection);
+    registry.release(service);
+    for (const char* other : {"NorbaNVMeEAN", "NvramDiagService"}) {
+      const auto entry = registry.DrvGetMatchingService(other);
+      EXPECT_NE(entry, 0u) << other;
+      registry.release(entry);
+    }
+  }
+  EXPECT_EQ(controllerNamed("other"), std::nullopt);
 }
 
 }  // namespace

@@ -10,10 +10,13 @@
 
 namespace mkdevice {
 
+enum class ControllerKind { qrt3, embedded, zmc };
+
 struct Sample {
   std::uint64_t seed = 1;
   int scale = 1;           // so many times the vocabulary's counters
   std::int32_t today = 0;  // the counters end on the day before
+  ControllerKind controller = ControllerKind::qrt3;
 };
 
 inline constexpr int kDaysOfCounters = 21;
@@ -44,7 +47,8 @@ struct SampleFile {
   platform::Value content;  // a text stands for itself, anything else for a property list
 };
 
-// The whitelist, the files below device/, the preferences, and the logs that a daily run will move.
+// The whitelist, the files below device/, the controller's among them, the preferences, and the
+// logs that a daily run will move.
 std::vector<SampleFile> sampleFiles(const Sample& sample);
 
 }  // namespace mkdevice

@@ -4,6 +4,7 @@
 #include "platform/host/Timestamp.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
+#include "tools/mkdevice/SampleController.h"
 
 namespace mkdevice {
 
@@ -24,7 +25,7 @@ std::string hexadecimal(Random& random, int digits) {
 }
 
 Dictionary properties(Random& random) {
-  const std::int64_t capacity = 128 * kGiB, free = random.between(20 * kGiB, 60 * kGiB);
+  const std::int64_t capacity = 119 * kGiB, free = random.between(20 * kGiB, 60 * kGiB);
   return {{"InternalBuild", false},
           {"HardwareModel", "Vrn12,3"},
           {"SystemIdentifier", hexadecimal(random, 40)},
@@ -218,6 +219,7 @@ std::vector<SampleFile> sampleFiles(const Sample& sample) {
   addLog("var/log/servita/support.log", supportLog, yesterday);
   addLog("var/log/servita/support.log.1", supportLog, yesterday - 1);
   addLog("var/log/servita/uploads.log", supportLog, yesterday);
+  for (SampleFile& file : controllerFiles(sample)) files.push_back(std::move(file));
   return files;
 }
 

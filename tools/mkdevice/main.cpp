@@ -9,6 +9,7 @@
 #include "platform/CivilDate.h"
 #include "platform/host/SystemClock.h"
 #include "tools/mkdevice/DeviceMaker.h"
+#include "tools/mkdevice/SampleController.h"
 
 namespace {
 
@@ -34,6 +35,13 @@ int main(int argc, char** argv) {
                  "the same number on the same day makes the same device; default: 1");
   app.add_option("--scale", options.sample.scale, "so many times the usual counters; default: 1")
       ->check(CLI::Range(1, mkdevice::kLargestScale));
+  app.add_option_function<std::string>(
+         "--controller",
+         [&](const std::string& name) {
+           options.sample.controller = *mkdevice::controllerNamed(name);
+         },
+         "its storage controller: qrt3 (the default), embedded or zmc")
+      ->check(CLI::IsMember({"qrt3", "embedded", "zmc"}));
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {

@@ -1,7 +1,224 @@
 #include "tools/nandinfo/NandinfoCommand.h"
 
+#include <CLI/CLI.hpp>
+#include <optional>
+#include <string_view>
+
+#include "NANDInfo/DriverHandles.h"
+#include "NANDInfo/NANDInfo.h"
+#include "platform/Text.h"
+#include "platform/host/JSON.h"
+#include "tools/nandinfo/Commands.h"
+#include "tools/nandinfo/Decode.h"
+#include "tools/nandinfo/Table.h"
+
 namespace nandinfo {
 
-int runNandinfo(const CommandServices&, int, char**) { return 2; }
+namespace {
+
+using platform::Dictionary;
+using platform::Value;
+
+constexpr int kDone = 0, kFailed = 1, kUsage = 2;
+
+constexpr char kFooter[] =
+    "Every command prints one JSON object; on a terminal, a table.\n"
+    "Examples:\n"
+    "  nandinfo ftl --round\n"
+    "  nandinfo ftl --all --stat-keys --compact\n"
+    "  nandinfo ean image-size dBIC\n"
+    "  nandinfo decode counters 1y block.bin\n"
+    "  MORVEND_ROOT=/srv/device nandinfo capture /tmp/device\n"
+    "Exit status: 0 done; 1 the work failed; 2 wrong usage.";
+
+struct Form {
+  bool json = false, compact = false;
+};
+
+// One line on a terminal that is written over again and again.
+class Progress {
+ public:
+  explicit Progress(const CommandServices& services)
+      : err_(services.err), shown_(services.errIsTerminal) {}
+  ~Progress() {
+    if (begun_) err_ << "\r\x1b[K" << std::flush;
+  }
+  void show(const std::string& text) {
+    if (!shown_) return;
+    begun_ = true;
+    err_ << "\r\x1b[K" << text << std::flush;
+  }
+
+ private:
+  std::ostream& err_;
+  bool shown_, begun_ = false;
+};
+
+bool hasController(platform::Platform& platform) {
+  for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
+    const char* className = NANDInfo::nand_exporters_tunnel[i].className;
+    const NANDInfo::RegistryHandle service(
+        platform, NANDInfo::FindServiceUsingIterator(platform, className));
+    if (service.get() != 0) return true;
+  }
+  return false;
+}
+
+std::string controllerNames() {
+  std::string names;
+  for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
+    names.append(i > 0 ? ", " : "").append(NANDInfo::nand_exporters_tunnel[i].className);
+  }
+  return names;
+}
+
+// Why the work failed, or none if it didn't: no result, one that is an error, one that holds
+// nothing but the library's message, or one that says itself that it isn't right.
+std::optional<std::string> failure(const CommandResult& result) {
+  const auto messageOr = [](const std::string& otherwise) {
+    const std::string message = NANDInfo::GetAPIErrorMessage();
+    return message == "NA" ? otherwise : message;
+  };
+  if (!result.error.empty()) return result.error;
+  if (!result) return messageOr("there is no result");
+  const auto* dictionary = result->as<Dictionary>();
+  if (dictionary == nullptr) return std::nullopt;
+  if (dictionary->find(NANDInfo::kNANDInfoErrorKey) != nullptr) {
+    return messageOr(description(dictionary->find(NANDInfo::kNANDInfoErrorMessageKey)));
+  }
+  if (dictionary->size() == 1 && dictionary->find(NANDInfo::kTLM_APIErrorMessage) != nullptr) {
+    return messageOr("the result is empty");
+  }
+  const auto* ok = dictionary->number("ok");
+  if (ok != nullptr && !ok->boolValue()) return messageOr("nothing can be decoded");
+  return std::nullopt;
+}
+
+bool isEmpty(const Value& value) {
+  const auto* dictionary = value.as<Dictionary>();
+  return dictionary != nullptr && dictionary->empty();
+}
+
+std::string shown(const CommandServices& services, const Command& command, Form form,
+                  const CommandResult& result) {
+  if (services.outIsTerminal && !form.json && !form.compact) {
+    if (!result) return {};
+    if (!isEmpty(*result)) return tableText(*result, services.width);
+    return command.empty != nullptr ? platform::format("(%s)\n", command.empty) : "(nothing)\n";
+  }
+  std::string json;
+  if (!result) {
+    json = "null";
+  } else if (form.compact) {
+    platform::host::appendJSON(json, *result);
+  } else {
+    platform::host::appendIndentedJSON(json, *result);
+  }
+  return json + '\n';
+}
+
+std::string nameOf(const Command& command) {
+  return command.group != nullptr ? platform::format("%s %s", command.group, command.name)
+                                  : command.name;
+}
+
+int run(const CommandServices& services, const Command& command, const Arguments& arguments,
+        Form form) {
+  CommandResult result;
+  {
+    Progress progress(services);
+    result = command.run(
+        {services.platform, arguments, [&](const std::string& text) { progress.show(text); }});
+  }
+  services.out << shown(services, command, form, result) << std::flush;
+  const auto say = [&](const std::string& what) {
+    services.err << "nandinfo: " << nameOf(command) << ": " << printable(what) << '\n';
+    return kFailed;
+  };
+  if (!services.out) return say("the output can't be written");
+  const auto why = failure(result);
+  if (command.asksController && !hasController(services.platform)) {
+    say("no storage controller found: the device registry names none of " + controllerNames());
+    return why ? kFailed : kDone;
+  }
+  return why ? say(*why) : kDone;
+}
+
+void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
+  const auto takes = [&command](Takes part) { return (command.takes & part) != 0; };
+  CLI::Option* round = nullptr;
+  if (takes(kRound)) {
+    round = app.add_flag("--round", arguments.round, "keep the significant digits only");
+  }
+  if (takes(kAll)) {
+    CLI::Option* all = app.add_flag("--all", arguments.all, "every counter, unrounded");
+    round->excludes(all);
+    app.add_flag("--stat-keys", arguments.statKeys, "under the keys instead of the names")
+        ->needs(all);
+  }
+  if (takes(kCode)) {
+    app.add_option("CODE", arguments.code, "four letters, such as dBIC")
+        ->required()
+        ->check([](const std::string& code) {
+          return isCode(code) ? "" : "'" + printable(code) + "' is not four letters";
+        });
+  }
+  if (takes(kLayout)) {
+    std::string names;
+    for (const CounterLayout& layout : counterLayouts()) {
+      names.append(names.empty() ? "" : ", ").append(layout.name);
+    }
+    app.add_option("LAYOUT", arguments.layout, names)
+        ->required()
+        ->check([names](const std::string& name) {
+          return findCounterLayout(name) != nullptr
+                     ? ""
+                     : "'" + printable(name) + "' is not a layout: " + names;
+        });
+  }
+  if (takes(kFile)) {
+    app.add_option("FILE", arguments.file, "the buffer; - for standard input")->required();
+  }
+  if (takes(kFolder)) {
+    app.add_option("DIR", arguments.folder, "an empty folder, or one that is to be made")
+        ->required();
+  }
+}
+
+}  // namespace
+
+int runNandinfo(const CommandServices& services, int argc, const char* const* argv) {
+  Arguments arguments;
+  Form form;
+  const Command* chosen = nullptr;
+
+  CLI::App app("Asks the storage controller what it counts.", "nandinfo");
+  app.set_version_flag("--version", "nandinfo " MORVEND_VERSION);
+  app.add_flag("--json", form.json, "JSON on a terminal, too");
+  app.add_flag("--compact", form.compact, "JSON on one line");
+  app.require_subcommand(1);
+  app.fallthrough();
+  app.footer(kFooter);
+  CLI::App* group = nullptr;
+  for (const Command& command : commands()) {
+    if (command.group != nullptr && (group == nullptr || group->get_name() != command.group)) {
+      group = app.add_subcommand(command.group, groupDescription(command.group));
+      group->require_subcommand(1);
+    }
+    CLI::App& parent = command.group != nullptr ? *group : app;
+    CLI::App* own = parent.add_subcommand(command.name, command.description);
+    own->footer("Global options: --json and --compact.");
+    own->callback([&chosen, &command] { chosen = &command; });
+    addOptions(*own, command, arguments);
+  }
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) return app.exit(error, services.out, services.err);
+    services.err << "nandinfo: " << printable(error.what()) << '\n';
+    return kUsage;
+  }
+  return run(services, *chosen, arguments, form);
+}
 
 }  // namespace nandinfo

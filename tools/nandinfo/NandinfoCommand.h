@@ -1,6 +1,7 @@
 // The command nandinfo: calls the storage library and prints what it returns.
 #pragma once
 
+#include <cstddef>
 #include <ostream>
 
 #include "platform/Platform.h"
@@ -11,10 +12,13 @@ struct CommandServices {
   platform::Platform& platform;
   std::ostream& out;
   std::ostream& err;
-  bool outIsTerminal;
+  bool outIsTerminal = false;  // then results are tables for people, else JSON
+  bool errIsTerminal = false;  // then long work shows its progress there
+  std::size_t width = 80;      // of the terminal, in columns
 };
 
-// Runs the command line; returns the exit status: 0 done, 1 the work failed, 2 wrong usage.
-int runNandinfo(const CommandServices& services, int argc, char** argv);
+// Runs the command line; returns the exit status: 0 done; 1 the work failed, with one line on
+// `err`; 2 wrong usage.
+int runNandinfo(const CommandServices& services, int argc, const char* const* argv);
 
 }  // namespace nandinfo

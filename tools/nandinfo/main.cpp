@@ -1,5 +1,6 @@
 // The process of the command nandinfo.
 
+#include <sys/ioctl.h>
 #include <unistd.h>
 
 #include <iostream>
@@ -9,9 +10,14 @@
 
 int main(int argc, char** argv) {
   platform::host::Host host;
-  return nandinfo::runNandinfo({.platform = host.platform(),
-                                .out = std::cout,
-                                .err = std::cerr,
-                                .outIsTerminal = ::isatty(STDOUT_FILENO) == 1},
-                               argc, argv);
+  nandinfo::CommandServices services{.platform = host.platform(),
+                                     .out = std::cout,
+                                     .err = std::cerr,
+                                     .outIsTerminal = ::isatty(STDOUT_FILENO) == 1,
+                                     .errIsTerminal = ::isatty(STDERR_FILENO) == 1};
+  winsize size{};
+  if (services.outIsTerminal && ::ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0) {
+    services.width = size.ws_col;
+  }
+  return nandinfo::runNandinfo(services, argc, argv);
 }

@@ -45,5 +45,21 @@ TEST(JSON, IsValidWhateverTheBytes) {
   }
 }
 
+TEST(JSON, IndentedHoldsTheSame) {
+  std::string text;
+  appendIndentedJSON(
+      text, Dictionary{{"d", Dictionary{{"e", Dictionary{}}}}, {"a", Array{1, Array{}, "x"}}});
+  EXPECT_EQ(text,
+            "{\n  \"d\": {\n    \"e\": {}\n  },\n  \"a\": [\n    1,\n    [],\n    \"x\"\n  ]\n}");
+  support::RandomValue random(4);
+  for (int i = 0; i < 300; ++i) {
+    const Value value = random.value();
+    text.clear();
+    appendIndentedJSON(text, value);
+    ASSERT_EQ(nlohmann::ordered_json::parse(text).dump(),
+              nlohmann::ordered_json::parse(json(value)).dump());
+  }
+}
+
 }  // namespace
 }  // namespace platform::host

@@ -1,0 +1,133 @@
+// Bytes as the registry file, and then every question to every entry and driver.
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+
+#include "PropertyListRoundTrip.h"
+#include "platform/host/HostDeviceRegistry.h"
+#include "platform/host/HostPropertyListCodec.h"
+
+namespace {
+
+using namespace platform;
+using fuzz::require;
+using host::HostDeviceRegistry;
+
+constexpr std::size_t kMostEntries = 200, kLargestOutput = 4096;
+
+// A root in memory, with one file for drivers to answer from and one outside device/.
+struct Folder {
+  Folder() {
+    const bool inMemory = std::filesystem::is_directory("/dev/shm");
+    path = std::string(inMemory ? "/dev/shm" : "/tmp") + "/registry-fuzz-XXXXXX";
+    require(::mkdtemp(path.data()) != nullptr, "there is a folder");
+    write("buffer", "below device/");
+    std::ofstream(path + "/outside") << "OUTSIDE";
+  }
+  ~Folder() { std::filesystem::remove_all(path); }
+  void write(const std::string& name, std::string_view bytes) const {
+    std::filesystem::create_directories(path + "/device");
+    std::ofstream(path + "/device/" + name, std::ios::binary) << bytes;
+  }
+  std::string path;
+};
+
+// The number of lines, and whether one is about handles.
+class CountingLog : public SystemLog {
+ public:
+  CountingLog() : SystemLog(LogLevel::debug) {}
+  int lines = 0;
+  bool handlesWereLost = false;
+
+ private:
+  void write(LogLevel, std::string_view message) override {
+    ++lines;
+    handlesWereLost |= message.find("not released") != message.npos;
+  }
+};
+
+void put(std::span<std::byte> block, std::size_t offset, std::uint32_t word) {
+  for (std::size_t i = 0; i < 4; ++i) block[offset + i] = static_cast<std::byte>(word >> (8 * i));
+}
+
+// One struct call: nothing is written behind what the call says that it delivered.
+void callStruct(HostDeviceRegistry& registry, DriverConnection connection, std::uint32_t method,
+                std::span<const std::byte> block, std::size_t capacity) {
+  constexpr std::byte kUntouched{0xA5};
+  std::vector<std::byte> output(capacity, kUntouched);
+  const auto result = registry.DrvCallStructMethod(connection, method, block, output);
+  require(result.outputSize <= capacity, "no more is delivered than there is room");
+  require(result.status == 0 || result.outputSize == 0, "a failed call delivers nothing");
+  for (std::size_t i = result.outputSize; i < capacity; ++i) {
+    require(output[i] == kUntouched, "what isn't delivered isn't written");
+  }
+  const std::string_view text(reinterpret_cast<const char*>(output.data()), result.outputSize);
+  require(text != "OUTSIDE", "no file outside device/ is read");
+}
+
+void askDriver(HostDeviceRegistry& registry, DriverConnection connection) {
+  std::byte block[24]{};
+  for (const std::uint32_t opType : {10u, 11u, 13u, 15u, 17u, 22u, 39u, 145u, 221u}) {
+    for (const std::uint32_t argument : {0u, 1u, 24u, 1u << 31}) {
+      for (const std::uint32_t flags : {0u, 1u, 4u, 5u}) {
+        put(block, 0, opType), put(block, 4, flags), put(block, 8, argument);
+        callStruct(registry, connection, 8 + flags % 2, block, flags % 2 == 1 ? 4 : kLargestOutput);
+      }
+    }
+  }
+  for (const std::size_t capacity : {0u, 1u, 4u}) callStruct(registry, connection, 5, {}, capacity);
+  callStruct(registry, connection, 9, std::span(block).first(23), 4);
+  for (const std::uint64_t code : {0x64424943ull, 0ull, ~0ull}) {
+    std::uint64_t output[2] = {1, 2};
+    const auto status = registry.DrvCallMethod(connection, 3, {&code, 1}, output);
+    require(status == 0 || output[0] == 1, "a failed call writes nothing");
+    require(output[1] == 2, "there is one output scalar");
+  }
+}
+
+// Every handle that was handed out is given back.
+void askEverything(HostDeviceRegistry& registry) {
+  const RegistryObject root = registry.rootEntry(), iterator = registry.createIterator();
+  require((root == 0) == (iterator == 0), "a root and a walk, or neither");
+  std::size_t entries = 0;
+  while (const RegistryObject entry = registry.next(iterator)) {
+    for (const auto direction :
+         {DeviceRegistry::Direction::parents, DeviceRegistry::Direction::children}) {
+      registry.searchProperty(entry, "name", direction);
+    }
+    const auto [status, connection] = registry.DrvServiceOpen(entry, 0);
+    require((status == 0) == (connection != 0), "a connection, or an error");
+    if (connection != 0 && ++entries <= kMostEntries) askDriver(registry, connection);
+    registry.DrvServiceClose(connection);
+    require(registry.DrvServiceClose(connection) != 0, "a closed connection is gone");
+    registry.release(entry);
+    require(!registry.conformsTo(entry, "Disk"), "a released entry is gone");
+  }
+  for (const char* className : {"Controller", "Disk", ""}) {
+    const RegistryObject service = registry.DrvGetMatchingService(className);
+    require(service == 0 || registry.conformsTo(service, className), "a match conforms");
+    registry.release(service);
+  }
+  for (const RegistryObject object : {root, iterator, root, 0u, 77u}) registry.release(object);
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
+  static const Folder folder;
+  static const host::DeviceRoot root(folder.path);
+  folder.write("registry.plist", {reinterpret_cast<const char*>(bytes), size});
+  host::HostPropertyListCodec codec;
+  CountingLog log;
+  {
+    HostDeviceRegistry registry(root, codec, log);
+    askEverything(registry);
+    const int lines = log.lines;
+    askEverything(registry);
+    require(log.lines == lines, "what is wrong is said once");
+  }
+  require(!log.handlesWereLost, "every handle is counted");
+  return 0;
+}

@@ -1,0 +1,12 @@
+#include "platform/host/HostPlatform.h"
+
+#include "platform/host/Host.h"
+
+namespace platform::host {
+
+std::shared_ptr<Platform> makeHostPlatform() {
+  const auto host = std::make_shared<Host>();
+  return {host, &host->platform()};
+}
+
+}  // namespace platform::host

@@ -1,0 +1,19 @@
+// The Linux host as a platform, for programs that load the storage library.
+#pragma once
+
+#include <memory>
+
+#include "platform/Exported.h"
+
+namespace platform {
+
+struct Platform;
+
+namespace host MORVEND_EXPORTED {
+
+// Every service over the device root that MORVEND_ROOT names ("/" without it); what was written is
+// on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
+std::shared_ptr<Platform> makeHostPlatform();
+
+}  // namespace MORVEND_EXPORTED
+}  // namespace platform

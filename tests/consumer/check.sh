@@ -1,0 +1,55 @@
+#!/usr/bin/env bash
+# Installs a build elsewhere, builds a program against it in every way that is offered, and compares
+# what they print. Usage: check.sh BUILD LIBDIR CXX
+set -euo pipefail
+build=$1 libdir=$2 cxx=$3
+here=$(dirname "$(readlink -f "$0")")
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+fail() { echo "$*" >&2; exit 1; }
+
+cmake --install "$build" --prefix "$work/installed" >/dev/null
+# Nothing may depend on where it was installed.
+mv "$work/installed" "$work/moved"
+prefix=$work/moved lib=$work/moved/$libdir
+export PKG_CONFIG_PATH=$lib/pkgconfig LD_LIBRARY_PATH=$lib
+
+strangers=$(nm -DC --defined-only "$lib/libNANDInfo.so" | cut -d' ' -f3- | grep -vE '^(NANDInfo|platform)::' || true)
+[ -z "$strangers" ] || fail "exported: $strangers"
+readelf -d "$lib/libNANDInfo.so" | grep -q 'SONAME.*\[libNANDInfo\.so\.0\]' || fail "no SONAME"
+
+mkdir -p "$work/root/device"
+cat >"$work/root/device/properties.plist" <<'EOF'
+<plist version="1.0"><dict><key>DiskUsage</key><dict>
+<key>TotalDiskCapacity</key><integer>124780544000</integer>
+<key>TotalDataAvailable</key><integer>31195136000</integer>
+<key>AmountDataAvailable</key><integer>30000000000</integer>
+</dict></dict></plist>
+EOF
+
+with_cmake() {
+  cmake -S "$here" -B "$work/$1" -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_PREFIX_PATH="$prefix" \
+    -DNANDInfo_USE_STATIC_LIBS="$2" >/dev/null
+  cmake --build "$work/$1" >/dev/null
+}
+with_pkg_config() {
+  local flags
+  flags=$(pkg-config --cflags --libs "${@:2}" NANDInfo)
+  [ $# -eq 1 ] || flags=${flags/-lNANDInfo/-l:libNANDInfo.a}
+  mkdir "$work/$1"
+  # shellcheck disable=SC2086
+  "$cxx" -std=c++20 "$here/consumer.cpp" $flags -o "$work/$1/consumer"
+}
+with_cmake cmake-shared OFF &
+with_cmake cmake-static ON &
+with_pkg_config pkg-config-shared &
+with_pkg_config pkg-config-static --static &
+for job in $(jobs -p); do wait "$job"; done
+
+for way in cmake-shared cmake-static pkg-config-shared pkg-config-static; do
+  needed=$(readelf -d "$work/$way/consumer" | grep -c 'NEEDED.*libNANDInfo' || true)
+  [[ $way == *shared && $needed == 1 || $way == *static && $needed == 0 ]] || fail "$way: linked otherwise"
+  printed=$(MORVEND_ROOT=$work/root DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent "$work/$way/consumer")
+  [[ $printed == *"TLM_UserCapacity_MB = 119000"* && $printed == "${first:=$printed}" ]] ||
+    fail "$way printed $printed"
+done

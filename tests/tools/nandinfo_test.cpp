@@ -1,0 +1,281 @@
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <nlohmann/json.hpp>
+#include <sstream>
+
+#include "NANDInfo/NANDInfo.h"
+#include "support/ControllerBuffers.h"
+#include "support/TemporaryFolder.h"
+#include "support/TestPlatform.h"
+#include "tools/nandinfo/Commands.h"
+#include "tools/nandinfo/NandinfoCommand.h"
+#include "tools/nandinfo/Table.h"
+
+namespace {
+
+using platform::Array;
+using platform::Dictionary;
+using platform::Value;
+using support::header;
+using Words = std::vector<std::string>;
+
+class Nandinfo : public testing::Test {
+ protected:
+  int run(const Words& arguments) {
+    std::vector<const char*> argv = {"nandinfo"};
+    for (const auto& argument : arguments) argv.push_back(argument.c_str());
+    std::ostringstream outStream, errStream;
+    NANDInfo::ResetAPIErrorMessage();
+    const int status =
+        nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60},
+                              static_cast<int>(argv.size()), argv.data());
+    out = outStream.str();
+    err = errStream.str();
+    EXPECT_EQ(device.registry.problems(), Words());
+    return status;
+  }
+
+  std::string file(const char* name, const support::Bytes& bytes) {
+    folder.write(name, {reinterpret_cast<const char*>(bytes.data()), bytes.size()});
+    return folder / name;
+  }
+
+  support::TestPlatform device;
+  support::TemporaryFolder folder;
+  bool terminal = false;
+  std::string out, err;
+};
+
+TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
+  const Words commands[] = {
+      {},
+      {"magazine"},
+      {"info", "disk"},
+      {"info", "--round"},
+      {"ftl", "--round", "--all"},
+      {"ftl", "--stat-keys"},
+      {"health"},
+      {"health", "all"},
+      {"ean", "image-size"},
+      {"ean", "image-size", "dBI"},
+      {"ean", "image-size", "dBIC5"},
+      {"ean", "update-count", "d\nIC"},
+      {"decode"},
+      {"decode", "ftl"},
+      {"decode", "counters", "2y", "file"},
+      {"decode", "counters", "1y"},
+      {"capture"},
+      {"--unknown\x1b[2J", "info"},
+  };
+  for (const auto& command : commands) {
+    EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
+    EXPECT_TRUE(err.starts_with("nandinfo: ")) << err;
+    EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
+    EXPECT_EQ(err.find('\x1b'), std::string::npos);
+    EXPECT_EQ(out, "");
+  }
+  for (const nandinfo::Command& command : nandinfo::commands()) {
+    Words words{command.name, "--help"};
+    if (command.group != nullptr) words.insert(words.begin(), command.group);
+    EXPECT_EQ(run(words), 0) << err;
+    EXPECT_NE(out.find(command.description), std::string::npos) << out;
+  }
+  EXPECT_EQ(run({"--help"}), 0);
+  EXPECT_NE(out.find("Examples:"), std::string::npos);
+  EXPECT_EQ(run({"--version"}), 0);
+  EXPECT_TRUE(out.starts_with("nandinfo ")) << out;
+}
+
+TEST_F(Nandinfo, DecodesAFileOrSaysWhatIsWrongWithIt) {
+  const auto counters = file("ftl", support::words({header(4, 1), UINT64_MAX, header(4, 1), 7,
+                                                    header(4242, 2), 1, 2, header(4, 9)}));
+  const auto empty = file("empty", {});
+  const auto msp = file("msp", support::records({{0x2FFF, 4, {}}}));
+  const struct {
+    const char* form;
+    std::string path;
+    int status;
+    const char *out, *err;
+  } rows[] = {
+      {"ftl", counters, 0,
+       R"({"ok": true, "fields": [["hostWrites", 18446744073709551615], ["hostWrites", 7], )"
+       R"(["Stat_4242_0", 1], ["Stat_4242_1", 2]], "error": "NA"})",
+       ""},
+      {"ftl-stat", counters, 0, R"(["Stat_4", 7])", ""},
+      {"legacy", counters, 1, R"({"ok": false, "fields": [["hostWrites", 1844)", "decode legacy: "},
+      {"ftl", empty, 1, R"({"ok": false, "fields": [], "error": )", "decode ftl: "},
+      {"msp", msp, 1, R"({"ok": false, "fields": [], )", "decode msp: "},
+      {"msp", folder / "none", 1, "null", "/none: No such file or directory"},
+      {"msp", folder.path(), 1, "null", ": Is a directory"},
+      {"msp", "/dev/zero", 1, "null", "/dev/zero: longer than 16 MiB"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(run({"decode", row.form, row.path, "--compact"}), row.status) << row.path;
+    EXPECT_NE(out.find(row.out), std::string::npos) << out;
+    EXPECT_EQ(std::count(out.begin(), out.end(), '\n'), 1);
+    EXPECT_NE(err.find(row.err), std::string::npos) << err;
+    EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), row.status) << err;
+  }
+}
+
+// The bounds are those of the layouts: one word less than they read isn't enough, and what lies
+// beyond is as good as zero.
+TEST_F(Nandinfo, DecodesCounterBlocksThatHoldWhatTheLayoutReads) {
+  const struct {
+    const char* layout;
+    std::uint32_t words, last;  // where the last word that is read goes to
+  } rows[] = {
+      {"1y", 533, 76},      {"1x-sandisk", 316, 72}, {"1x-hynix", 312, 72},
+      {"generic", 121, 44}, {"q8", 127, 85},
+  };
+  for (const auto& [layout, count, last] : rows) {
+    support::Bytes block;
+    for (std::uint32_t i = 0; i < count; ++i) support::put(block, i, 4);
+    EXPECT_EQ(run({"decode", "counters", layout, file("whole", block)}), 0) << err;
+    const auto words = nlohmann::json::parse(out);
+    ASSERT_EQ(words.size(), 177u);
+    EXPECT_EQ(words[last], count - 1) << layout;
+    EXPECT_EQ(*std::max_element(words.begin(), words.end()), count - 1) << layout;
+    block.pop_back();
+    EXPECT_EQ(run({"decode", "counters", layout, file("cut", block)}), 1);
+    EXPECT_EQ(out, "null\n");
+    EXPECT_NE(err.find("/cut: " + std::to_string(4 * count - 1) + " bytes"), std::string::npos);
+  }
+}
+
+TEST_F(Nandinfo, SaysWhenThereIsNoController) {
+  const struct {
+    Words command;
+    int status;
+    const char* out;
+  } rows[] = {
+      {{"info"}, 1, "com.norba.NANDInfo.Error"},
+      {{"ftl"}, 1, "TLM_APIErrorMessage"},
+      {{"ftl", "--all"}, 1, ""},
+      {{"msp", "--round"}, 1, "TLM_APIErrorMessage"},
+      {{"storage"}, 0, "EAN_imageSize_BIC"},
+      {{"health", "servita"}, 1, "TLM_APIErrorMessage"},
+      {{"health", "lab"}, 0, "IsNANDRetirable"},
+      {{"health", "ota"}, 0, "{}"},
+      {{"recommends-deletion"}, 0, "false"},
+      {{"capture", folder / "capture"}, 1, "null"},
+  };
+  for (const auto& row : rows) {
+    EXPECT_EQ(run(row.command), row.status) << row.command[0];
+    EXPECT_TRUE(nlohmann::json::accept(out)) << out;
+    EXPECT_NE(out.find(row.out), std::string::npos) << out;
+    EXPECT_NE(err.find("no storage controller found: "), std::string::npos) << err;
+    EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
+  }
+  EXPECT_FALSE(std::filesystem::exists(folder / "capture"));
+  EXPECT_EQ(run({"freezer"}), 0);
+  EXPECT_EQ(out + err, "{}\n");
+}
+
+TEST_F(Nandinfo, ShowsTablesOnATerminalOnly) {
+  terminal = true;
+  const auto counters = file("ftl", support::words({header(4, 1), 1234567, header(7, 1), 89}));
+  EXPECT_EQ(run({"decode", "ftl", counters}), 0);
+  EXPECT_EQ(out,
+            "ok     true\nerror  NA\n\nfields:\nhostWrites  1,234,567\nhostReads          89\n");
+  EXPECT_EQ(run({"decode", "ftl", counters, "--json"}), 0);
+  EXPECT_EQ(out,
+            "{\n  \"ok\": true,\n  \"fields\": [\n    [\"hostWrites\", 1234567],\n"
+            "    [\"hostReads\", 89]\n  ],\n  \"error\": \"NA\"\n}\n");
+  EXPECT_EQ(run({"freezer"}), 0);
+  EXPECT_TRUE(out.starts_with("(there is no kernel snapshot")) << out;
+}
+
+TEST(NandinfoTable, ShowsEveryShape) {
+  const Dictionary one{{"a", 1000}, {"name\x1b[2J", "x"}}, other{{"b", -1234567}, {"a", 22}};
+  const struct {
+    Value value;
+    std::size_t width;
+    const char* text;
+  } rows[] = {
+      {Dictionary{{"msg", "tab\there \xC2\x9B \xFF"}, {"0", one}, {"1", other}, {"e", Array{}}}, 80,
+       "msg  tab?here ? \xEF\xBF\xBD\ne    []\n\n"
+       "              0           1\na         1,000          22\nname?[2J  x\n"
+       "b                -1,234,567\n"},
+      {Dictionary{{"0", one}, {"1", other}}, 20,
+       "0:\na         1,000\nname?[2J  x\n\n1:\nb  -1,234,567\na          22\n"},
+      {Array{one, other}, 80, "a      name?[2J  b\n1,000  x\n   22            -1,234,567\n"},
+      {Array{Dictionary{{"k", "\xC3\xA4\xC3\xB6\xC3\xBC\xC3\xA4"}}}, 3,
+       "k\n\xC3\xA4\xC3\xB6\xE2\x80\xA6\n"},
+      {Array{0, 1, 2, 3, 4, 5, 6, 7, 100, 0.5}, 80,
+       "0:    0    1  2  3  4  5  6  7\n8:  100  0.5\n"},
+      {std::uint64_t{UINT64_MAX}, 80, "18,446,744,073,709,551,615\n"},
+      {true, 80, "true\n"},
+      {Dictionary(), 80, ""},
+      {Array{}, 80, ""},
+  };
+  for (const auto& row : rows) EXPECT_EQ(nandinfo::tableText(row.value, row.width), row.text);
+}
+
+// Everything that can be missing is: the driver has no MSP command, the EAN service refuses.
+TEST_F(Nandinfo, CapturesWhatIsAnsweredAndListsWhatIsNot) {
+  auto& registry = device.registry;
+  registry.add({.className = "ZMCStorage", .properties = {{"PropertyMatch", Array{"x", 5}}}});
+  registry.add({.className = "NorbaNVMeEAN", .openStatus = 7});
+  registry.alwaysTunnels(8, 13, 0, support::words({1}));
+  registry.alwaysTunnels(8, 10, 720, {});
+  registry.standing["5"] = {.output = support::Bytes(4, std::byte{1})};
+  device.clock.secondsSince1970 = 1795320000;
+
+  EXPECT_EQ(run({"capture", folder / "c"}), 0) << err;
+  const auto manifest = nlohmann::json::parse(folder.read("c/manifest.json"));
+  EXPECT_EQ(out, folder.read("c/manifest.json"));
+  EXPECT_EQ(manifest["time"], "2026-11-22T04:00:00Z");
+  EXPECT_EQ(manifest["class"], "ZMCStorage");
+  ASSERT_EQ(manifest["buffers"].size(), 2u);
+  EXPECT_EQ(manifest["buffers"][0]["sha256"],
+            "7c9fa136d4413fa6173637e883b6998d32e1d675f88cddff9dcbcf331820f4b8");
+  EXPECT_EQ(manifest["buffers"][1].dump(),
+            R"({"argument":720,"file":"read-statistics-720.bin","name":"read-statistics",)"
+            R"("opType":10,"sha256":)"
+            R"("e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855","size":0})");
+  std::string leftOut;
+  for (const auto& entry : manifest["leftOut"]) leftOut += entry["what"].get<std::string>() + ";";
+  EXPECT_EQ(leftOut,
+            "read-statistics 0;read-statistics 4;read-statistics 8;read-statistics 12;"
+            "read-statistics 16;read-statistics 20;read-statistics 24;read-statistics 168;msp;"
+            "defects 0;telemetry 0;telemetry 1;telemetry 2;task-scheduler 0;snapshot 0;"
+            "snapshot-header 0;band-statistics 0;EAN service;");
+  EXPECT_EQ(folder.read("c/statistics-0.bin"), std::string("\1\0\0\0\0\0\0\0", 8));
+  const Dictionary driver{
+      {"Buffers", Dictionary{{"13:0", "statistics-0.bin"}, {"10:720", "read-statistics-720.bin"}}},
+      {"RecommendsDeletion", platform::Data(4, 1)}};
+  EXPECT_EQ(
+      device.parse(folder.read("c/registry.plist")),
+      (Dictionary{{"Class", "Root"},
+                  {"Children",
+                   Array{Dictionary{{"Class", "ZMCStorage"},
+                                    {"Properties", Dictionary{{"PropertyMatch", Array{"x", 5}}}},
+                                    {"Driver", driver}}}}}));
+
+  const auto mode = [this](const char* name) {
+    struct stat status {};
+    ::stat((folder / name).c_str(), &status);
+    return status.st_mode & 0777;
+  };
+  EXPECT_EQ(mode("c"), 0700u);
+  for (const char* name : {"c/statistics-0.bin", "c/registry.plist", "c/manifest.json"}) {
+    EXPECT_EQ(mode(name), 0600u) << name;
+  }
+
+  // Neither a folder that holds something nor what isn't one is touched; an empty one will do.
+  EXPECT_EQ(run({"capture", folder / "c"}), 1);
+  EXPECT_NE(err.find("/c: the folder is not empty"), std::string::npos) << err;
+  EXPECT_EQ(nlohmann::json::parse(folder.read("c/manifest.json")), manifest);
+  EXPECT_EQ(run({"capture", folder / "c/manifest.json"}), 1);
+  EXPECT_EQ(run({"capture", folder / "not/there"}), 1);
+  std::filesystem::create_directory(folder / "empty");
+  terminal = true;
+  EXPECT_EQ(run({"capture", folder / "empty"}), 0);
+  EXPECT_NE(err.find("telemetry 2"), std::string::npos);
+  EXPECT_TRUE(err.ends_with("\r\x1b[K")) << err;
+  EXPECT_EQ(folder.read("empty/manifest.json"), folder.read("c/manifest.json"));
+}
+
+}  // namespace

@@ -1,0 +1,41 @@
+#include "tools/nandinfo/CaptureFolder.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "platform/host/Files.h"
+
+namespace nandinfo {
+
+std::string CaptureFolder::open(const std::string& path) {
+  path_ = path;
+  made_ = ::mkdir(path.c_str(), 0700) == 0;
+  if (!made_ && errno != EEXIST) return path + ": " + std::strerror(errno);
+  folder_ =
+      platform::host::FileDescriptor(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!folder_) return path + ": " + std::strerror(errno);
+  std::vector<std::string> names;
+  if (const int error = platform::host::namesInFolder(folder_.get(), names)) {
+    return path + ": " + std::strerror(error);
+  }
+  return names.empty() ? "" : path + ": the folder is not empty";
+}
+
+std::string CaptureFolder::write(const std::string& name, std::string_view bytes) {
+  if (const int error = platform::host::replaceFile(folder_.get(), name, bytes)) {
+    return path_ + "/" + name + ": " + platform::host::errorText(error);
+  }
+  files_.push_back(name);
+  return {};
+}
+
+CaptureFolder::~CaptureFolder() {
+  if (finished_) return;
+  for (const std::string& file : files_) ::unlinkat(folder_.get(), file.c_str(), 0);
+  if (made_) ::rmdir(path_.c_str());
+}
+
+}  // namespace nandinfo

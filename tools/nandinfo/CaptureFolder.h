@@ -1,0 +1,34 @@
+// The folder that a capture fills. What was written is taken back unless the capture is finished.
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "platform/host/FileDescriptor.h"
+
+namespace nandinfo {
+
+class CaptureFolder {
+ public:
+  ~CaptureFolder();
+
+  // The functions return the empty text, or what is wrong with which file.
+
+  // Opens the folder: an empty one, or one that is made, with mode 0700.
+  std::string open(const std::string& path);
+
+  // Writes a file whole, with mode 0600.
+  std::string write(const std::string& name, std::string_view bytes);
+
+  // The files stay.
+  void finish() { finished_ = true; }
+
+ private:
+  std::string path_;
+  platform::host::FileDescriptor folder_;
+  bool made_ = false, finished_ = false;
+  std::vector<std::string> files_;
+};
+
+}  // namespace nandinfo

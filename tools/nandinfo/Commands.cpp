@@ -1,0 +1,106 @@
+#include "tools/nandinfo/Commands.h"
+
+#include <algorithm>
+
+#include "NANDInfo/NANDInfo.h"
+#include "tools/nandinfo/Capture.h"
+#include "tools/nandinfo/Decode.h"
+
+namespace nandinfo {
+
+namespace {
+
+using platform::Dictionary;
+using platform::Platform;
+using platform::Value;
+
+CommandResult result(std::optional<Dictionary> dictionary) {
+  return {dictionary ? std::optional<Value>(*std::move(dictionary)) : std::nullopt, {}};
+}
+
+CommandResult ftl(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  return result(arguments.all
+                    ? NANDInfo::CopyNANDFTLInfo(invocation.platform, arguments.statKeys, true)
+                    : NANDInfo::CopyWhitelistedNANDFTLInfo(invocation.platform, arguments.round));
+}
+
+// The functions that take the platform alone, and those that round on demand.
+template <auto function>
+CommandResult call(const Invocation& invocation) {
+  return result(function(invocation.platform));
+}
+template <auto function>
+CommandResult callRounding(const Invocation& invocation) {
+  return result(function(invocation.platform, invocation.arguments.round));
+}
+template <auto function>
+CommandResult callWithCode(const Invocation& invocation) {
+  std::uint32_t code = 0;
+  for (const char c : invocation.arguments.code) code = code << 8 | static_cast<unsigned char>(c);
+  return {function(invocation.platform, code), {}};
+}
+
+CommandResult daily(const Invocation& invocation) {
+  return result(NANDInfo::CopyNANDInfoWithOptions(invocation.platform));
+}
+
+CommandResult recommendsDeletion(const Invocation& invocation) {
+  return {NANDInfo::NandRecommendsContentDeletion(invocation.platform), {}};
+}
+
+constexpr Command kCommands[] = {
+    {nullptr, "info", "The basic counters, for the counters service", kNothing, true, nullptr,
+     call<NANDInfo::CopyNANDInfo>},
+    {nullptr, "daily", "The basic counters as the day's telemetry has them", kNothing, false,
+     "today all storage counters go to the analytics sink", daily},
+    {nullptr, "ftl", "The whitelisted FTL statistics, or all of them", kRound | kAll, true, nullptr,
+     ftl},
+    {nullptr, "msp", "The whitelisted statistics of each MSP", kRound, true, nullptr,
+     callRounding<NANDInfo::CopyWhitelistedNANDMSPInfo>},
+    {nullptr, "storage", "The storage summary with the EAN images", kRound, true, nullptr,
+     callRounding<NANDInfo::CopyWhitelistedStorageStats>},
+    {nullptr, "disk", "Capacity, fullness and available space", kNothing, false, nullptr,
+     call<NANDInfo::GetDiskInfo>},
+    {nullptr, "freezer", "What the kernel's swap-out thread has written", kNothing, false,
+     "there is no kernel snapshot, or no swap-out thread in it",
+     call<NANDInfo::CopyVMFreezerNANDInfo>},
+    {"health", "servita", "For the warranty service", kNothing, true, nullptr,
+     call<NANDInfo::CopyServitaNANDInfo>},
+    {"health", "lab", "For internal lab tools", kNothing, true, nullptr,
+     call<NANDInfo::CopyInternalLabNANDInfo>},
+    {"health", "ota", "For system updates", kNothing, true, "the controller gave no statistics",
+     call<NANDInfo::CopyOTANANDInfo>},
+    {nullptr, "recommends-deletion", "Whether the controller asks for content to be deleted",
+     kNothing, true, nullptr, recommendsDeletion},
+    {"ean", "image-size", "The size of an image, in bytes", kCode, false, nullptr,
+     callWithCode<NANDInfo::GetEANImageSize>},
+    {"ean", "update-count", "The number of an image's updates", kCode, false, nullptr,
+     callWithCode<NANDInfo::GetEANUpdateCount>},
+    {"decode", "ftl", "FTL statistics under their names", kFile, false, nullptr, decodeFTL},
+    {"decode", "ftl-stat", "FTL statistics under their keys", kFile, false, nullptr, decodeFTLStat},
+    {"decode", "legacy", "FTL statistics in their legacy form", kFile, false, nullptr,
+     decodeLegacy},
+    {"decode", "msp", "The statistics of an MSP", kFile, false, nullptr, decodeMSP},
+    {"decode", "counters", "A channel's counter block, as the 177 words of the common layout",
+     kLayout | kFile, false, nullptr, decodeCounters},
+    {nullptr, "capture", "Save all that the controller answers, as a device folder", kFolder, true,
+     nullptr, capture},
+};
+
+}  // namespace
+
+bool isCode(std::string_view text) {
+  return text.size() == 4 &&
+         std::all_of(text.begin(), text.end(), [](char c) { return c > ' ' && c < 0x7f; });
+}
+
+std::span<const Command> commands() { return kCommands; }
+
+const char* groupDescription(std::string_view group) {
+  if (group == "health") return "The health figures of the flash memory";
+  if (group == "ean") return "The EAN service's images";
+  return "Decode a captured buffer";
+}
+
+}  // namespace nandinfo

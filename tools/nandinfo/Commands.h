@@ -1,0 +1,61 @@
+// What the command line can ask for: one row a command.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "platform/Platform.h"
+#include "platform/Result.h"
+
+namespace nandinfo {
+
+// What the command line says; each command looks at its own part.
+struct Arguments {
+  bool round = false, all = false, statKeys = false;
+  std::string code, layout, file, folder;
+};
+
+struct Invocation {
+  platform::Platform& platform;
+  const Arguments& arguments;
+  std::function<void(const std::string&)> progress;
+};
+
+// What a command came to: a value to print, or none; with an error when the command knows better
+// than the library why the work failed.
+using CommandResult = platform::Result<platform::Value>;
+
+// The parts of the command line that a command takes.
+enum Takes : std::uint8_t {
+  kNothing = 0,
+  kRound = 1,
+  kAll = 2,
+  kCode = 4,
+  kFile = 8,
+  kLayout = 16,
+  kFolder = 32,
+};
+
+struct Command {
+  const char* group;  // the word before the name, or null
+  const char* name;
+  const char* description;
+  std::uint8_t takes;   // of Takes
+  bool asksController;  // without one it has little to say
+  const char* empty;    // what an empty result means to a person, or null
+  CommandResult (*run)(const Invocation& invocation);
+};
+
+// Commands of one group stand together.
+std::span<const Command> commands();
+
+// Whether a text is the code of an image: four printable characters.
+bool isCode(std::string_view text);
+
+// What the groups are, for the help.
+const char* groupDescription(std::string_view group);
+
+}  // namespace nandinfo
