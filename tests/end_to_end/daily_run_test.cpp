@@ -63,8 +63,8 @@ TEST(DailyRun, SubmitsTheDayOnceAndLeavesTheRecordsBehind) {
   EXPECT_EQ(std::count(events.begin(), events.end(), '\n'), 3);
   Lines keys;
   for (const std::string& row : device.recorded()) keys.push_back(row.substr(row.find(' ') + 1));
-  const Lines recorded{"com.norba.tarvenn.DiskUsageUserBlocksFree -1",
-                       "com.norba.tarvenn.DiskUsageUserTotalBlocks -1",
+  const Lines recorded{"com.norba.tarvenn.DiskUsageUserBlocksFree 3",
+                       "com.norba.tarvenn.DiskUsageUserTotalBlocks 5",
                        "com.norba.velquist.channel 7", "datausage.wifiInKB.com.norba.process 2"};
   EXPECT_EQ(keys, recorded);
   EXPECT_TRUE(device.names("device/ecc-events").empty());

@@ -39,7 +39,7 @@ void checkDevice(const Device& before, const Device& device, const faults::Outco
 
   // A key that isn't recorded is missing only when the run said so, and nothing is recorded twice,
   // but for data usage when the run was killed before its baseline was kept.
-  Lines expectedRows{"DiskUsageUserBlocksFree -1", "DiskUsageUserTotalBlocks -1",
+  Lines expectedRows{"DiskUsageUserBlocksFree 3", "DiskUsageUserTotalBlocks 5",
                      "velquist.channel 7", "wifiInKB.com.norba.process 2"};
   const bool unrecorded =
       faulty.standardError.find("Could not record counters") != std::string::npos;
