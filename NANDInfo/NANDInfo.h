@@ -17,6 +17,7 @@
 #include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Parsers.h"
+#include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "platform/Exported.h"

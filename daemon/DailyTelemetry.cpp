@@ -72,6 +72,8 @@ struct Collector {
 
 constexpr Collector kCollectors[] = {
     {"disk usage", CollectDiskUsage},
+    {"storage log",
+     [](Platform& platform) { NANDInfo::DumpStorageStructuredLog(platform, false); }},
     {"storage health", CollectStorageHealth},
     {"memory errors", CollectEccEvents},
     {"data usage", [](Platform& platform) { CollectDataUsage(platform); }},

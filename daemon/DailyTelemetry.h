@@ -5,9 +5,9 @@
 
 namespace morvend {
 
-// Runs the collectors, each whatever became of the others: disk usage, storage health, memory error
-// events, data usage and the kernel's reporting channels. What they find goes to today's counters
-// or, as structured data, to the crash-reporting support library.
+// Runs the collectors, each whatever became of the others: disk usage, the storage log, storage
+// health, memory error events, data usage and the kernel's reporting channels. What they find goes
+// to today's counters or, as structured data, to the crash-reporting support library.
 void CollectDailyTelemetry(platform::Platform& platform);
 
 }  // namespace morvend

@@ -1,5 +1,7 @@
-// The wall clock.
+// The wall clock, and the device's time zone.
 #pragma once
+
+#include <cstdint>
 
 #include "platform/PropertyList.h"
 
@@ -11,6 +13,9 @@ class Clock {
 
   // The current time; it may jump, either way.
   virtual Date now() = 0;
+
+  // How far the device's clocks are ahead of UTC at an instant, in seconds.
+  virtual std::int32_t secondsFromUTC(Date instant) = 0;
 };
 
 }  // namespace platform

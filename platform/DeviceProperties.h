@@ -17,6 +17,9 @@ class DeviceProperties {
   // A device property as a truth value; false when the device doesn't know it.
   virtual bool booleanProperty(std::string_view name) = 0;
 
+  // A device property as a text; none when the device doesn't know it or it is no text.
+  virtual std::optional<std::string> textProperty(std::string_view name) = 0;
+
   // The multi-user indicator, or none when the query fails.
   virtual std::optional<std::uint32_t> multiUserIndicator() = 0;
 

@@ -1,8 +1,9 @@
-// The crash-reporting support library: structured-data logs, and the two preference functions that
-// it offers to those who load it at run time.
+// The crash-reporting support library: structured-data logs, the identifiers of logs, and the two
+// preference functions that it offers to those who load it at run time.
 #pragma once
 
 #include <cstdint>
+#include <string>
 
 #include "platform/PropertyList.h"
 
@@ -17,6 +18,9 @@ class FaultwatchSupport {
 
   // Hands the structured-data logs of earlier days over for submission.
   virtual void dumpAllOldStructuredDataLogs() = 0;
+
+  // A text that no other log carries: a random UUID.
+  virtual std::string newIncidentIdentifier() = 0;
 };
 
 // Where the library lies, and the types of the functions that carry the names

@@ -1,10 +1,11 @@
-// Values that the kernel holds under names, and its clock.
+// Values that the kernel holds under names, its clock, and this process as it knows it.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <span>
+#include <string>
 #include <string_view>
 
 namespace platform {
@@ -18,6 +19,10 @@ class Kernel {
   struct Timebase {
     std::uint32_t numerator, denominator;
   };
+  struct Process {
+    std::string name;
+    std::int32_t identifier;
+  };
 
   virtual ~Kernel() = default;
 
@@ -29,6 +34,9 @@ class Kernel {
   // Ticks since boot, and nanoseconds for each tick as a ratio (none when it can't be read).
   virtual std::uint64_t absoluteTime() = 0;
   virtual std::optional<Timebase> timebase() = 0;
+
+  // The calling process, under the name of its program.
+  virtual Process process() = 0;
 };
 
 }  // namespace platform

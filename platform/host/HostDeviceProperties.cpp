@@ -1,6 +1,10 @@
 #include "platform/host/HostDeviceProperties.h"
 
+#include <fcntl.h>
+#include <sys/utsname.h>
+
 #include "platform/host/DeviceFileSystem.h"
+#include "platform/host/Files.h"
 
 namespace platform::host {
 
@@ -11,6 +15,21 @@ constexpr std::uint64_t kNoSuchContainer = 2;
 bool isPlainName(std::string_view name) {
   return !name.empty() && name != "." && name != ".." &&
          name.find_first_of(std::string_view("/\0", 2)) == name.npos;
+}
+
+// Of a short file of the host; none when it is empty or can't be read.
+std::optional<std::string> firstLine(const std::string& path) {
+  constexpr std::size_t kLongest = 256;
+  const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+  const Result<std::string> text = readRegularFile(file.get(), kLongest);
+  if (!text) return std::nullopt;
+  std::string line = text->substr(0, text->find('\n'));
+  return line.empty() ? std::nullopt : std::optional(std::move(line));
+}
+
+std::optional<std::string> machineName() {
+  utsname host;
+  return ::uname(&host) == 0 ? std::optional<std::string>(host.machine) : std::nullopt;
 }
 
 // A size in bytes; what is negative is 0.
@@ -31,6 +50,17 @@ const Number* HostDeviceProperties::number(std::string_view name) {
 bool HostDeviceProperties::booleanProperty(std::string_view name) {
   const Number* value = number(name);
   return value != nullptr && value->boolValue();
+}
+
+std::optional<std::string> HostDeviceProperties::textProperty(std::string_view name) {
+  const Dictionary* properties = properties_.dictionary();
+  if (const Value* value = properties != nullptr ? properties->find(name) : nullptr) {
+    const auto* text = value->as<std::string>();
+    return text != nullptr ? std::optional(*text) : std::nullopt;
+  }
+  if (name == "SystemIdentifier") return firstLine(machineId_);
+  if (name == "HardwareModel") return machineName();
+  return std::nullopt;
 }
 
 std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {

@@ -8,11 +8,18 @@ namespace platform::host {
 
 class HostDeviceProperties : public DeviceProperties {
  public:
-  // `properties` is device/properties.plist, which other services read too.
-  HostDeviceProperties(const DeviceRoot& root, DeviceFile& properties)
-      : root_(root), properties_(properties) {}
+  // `properties` is device/properties.plist, which other services read too; `machineId` is a path
+  // of the host.
+  HostDeviceProperties(const DeviceRoot& root, DeviceFile& properties,
+                       std::string machineId = "/etc/machine-id")
+      : root_(root), properties_(properties), machineId_(std::move(machineId)) {}
 
   bool booleanProperty(std::string_view name) override;
+
+  // Without the entry, "SystemIdentifier" is the host's machine-id and "HardwareModel" the name of
+  // its machine.
+  std::optional<std::string> textProperty(std::string_view name) override;
+
   std::optional<std::uint32_t> multiUserIndicator() override;
 
   // Sizes that are negative are 0. Without the entry, the figures of the file system that holds the root; with one of another type
@@ -29,6 +36,7 @@ class HostDeviceProperties : public DeviceProperties {
 
   const DeviceRoot& root_;
   DeviceFile& properties_;
+  std::string machineId_;
 };
 
 }  // namespace platform::host

@@ -143,4 +143,6 @@ std::uint64_t HostKernel::absoluteTime() {
 
 std::optional<Kernel::Timebase> HostKernel::timebase() { return Timebase{1, 1}; }
 
+Kernel::Process HostKernel::process() { return {program_invocation_short_name, ::getpid()}; }
+
 }  // namespace platform::host

@@ -23,6 +23,7 @@ class HostKernel : public Kernel {
   std::uint64_t pageSize() override;
   std::uint64_t absoluteTime() override;
   std::optional<Timebase> timebase() override;
+  Process process() override;
 
  private:
   std::optional<ReadResult> nextEvent(std::span<std::byte> buffer);

@@ -6,6 +6,7 @@
 #include "platform/FaultwatchSupport.h"
 #include "platform/SystemLog.h"
 #include "platform/host/DeviceRoot.h"
+#include "platform/host/RandomUUID.h"
 
 namespace platform::host {
 
@@ -21,6 +22,8 @@ class StructuredLogFiles final : public FaultwatchSupport {
   // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl. What
   // isn't a regular file, or larger than the spool, stays where it is, with an error line.
   void dumpAllOldStructuredDataLogs() override;
+
+  std::string newIncidentIdentifier() override { return randomUUID(); }
 
  private:
   const DeviceRoot& root_;

@@ -1,6 +1,9 @@
 #include "platform/host/SystemClock.h"
 
+#include <cmath>
 #include <ctime>
+
+#include "platform/Convert.h"
 
 namespace platform::host {
 
@@ -8,6 +11,14 @@ Date SystemClock::now() {
   timespec time{};
   ::clock_gettime(CLOCK_REALTIME, &time);
   return {static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_nsec) / 1e9};
+}
+
+std::int32_t SystemClock::secondsFromUTC(Date instant) {
+  const auto seconds = saturatingCast<std::time_t>(std::floor(instant.secondsSince1970));
+  std::tm local{};
+  ::tzset();
+  return ::localtime_r(&seconds, &local) != nullptr ? static_cast<std::int32_t>(local.tm_gmtoff)
+                                                    : 0;
 }
 
 }  // namespace platform::host

@@ -1,4 +1,4 @@
-// The host's clock.
+// The host's clock and time zone.
 #pragma once
 
 #include "platform/Clock.h"
@@ -8,6 +8,7 @@ namespace platform::host {
 class SystemClock : public Clock {
  public:
   Date now() override;
+  std::int32_t secondsFromUTC(Date instant) override;
 };
 
 }  // namespace platform::host

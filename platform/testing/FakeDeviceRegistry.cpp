@@ -186,6 +186,7 @@ FakeDeviceRegistry::Answer FakeDeviceRegistry::answer(DriverConnection connectio
 DriverConnections::CallResult FakeDeviceRegistry::DrvCallStructMethod(
     DriverConnection connection, std::uint32_t method, std::span<const std::byte> input,
     std::span<std::byte> output) {
+  inputs.emplace_back(input.begin(), input.end());
   std::string call = format("%u", method);
   if (input.size() == 24) {
     const std::uint32_t opType = word(input, 0), query = word(input, 4), index = word(input, 8);

@@ -76,6 +76,9 @@ class FakeDeviceRegistry : public DeviceRegistry, public DriverConnections {
   // Every driver call so far, and every opening as "open <class>".
   std::vector<std::string> calls;
 
+  // The input of every struct method.
+  std::vector<Bytes> inputs;
+
   RegistryObject DrvGetMatchingService(std::string_view className) override;
   RegistryObject rootEntry() override;
   RegistryObject createIterator() override;

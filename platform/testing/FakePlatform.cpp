@@ -161,6 +161,7 @@ class StringHandle : public LogHandle {
 
 bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                               const Dictionary* options, const Writer& writer) {
+  beforeLog();
   Log log{std::string(logType), std::string(logName), {}, {}};
   if (options != nullptr) log.options = *options;
   StringHandle handle(log.contents);
@@ -171,6 +172,7 @@ bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::str
 }
 
 void FakeHousekeeping::logStructuredData(std::int32_t type, const Dictionary& data) {
+  structured.emplace_back(type, data);
   journal_.push_back(format("structured %d ", type) + description(Value(data)));
 }
 
@@ -212,6 +214,11 @@ bool FakeEventra::EventraSendEventLazy(std::string_view event, PayloadProducer p
 bool FakeDevice::booleanProperty(std::string_view name) {
   ++internalBuildQueries;
   return name == "InternalBuild" && internalBuild;
+}
+
+std::optional<std::string> FakeDevice::textProperty(std::string_view name) {
+  const auto found = texts.find(name);
+  return found != texts.end() ? std::optional(found->second) : std::nullopt;
 }
 
 std::optional<std::string> FakeDevice::systemGroupContainerPath(std::string_view,

@@ -25,7 +25,9 @@ using Journal = std::vector<std::string>;
 class FakeClock : public Clock {
  public:
   double secondsSince1970 = 0;
+  std::int32_t zone = 0;  // seconds ahead of UTC
   Date now() override { return {secondsSince1970}; }
+  std::int32_t secondsFromUTC(Date) override { return zone; }
 };
 
 class FakeFileSystem : public FileSystem {
@@ -113,6 +115,7 @@ class FakeSubmission : public LogSubmission {
   explicit FakeSubmission(Journal& journal) : journal_(journal) {}
   bool allowed = true;
   std::vector<Log> logs;
+  std::function<void()> beforeLog = [] {};  // may throw
 
   bool DiagnosticLogSubmissionEnabled() override { return allowed; }
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
@@ -125,8 +128,10 @@ class FakeSubmission : public LogSubmission {
 class FakeHousekeeping : public FaultwatchSupport, public ServitaLogs {
  public:
   explicit FakeHousekeeping(Journal& journal) : journal_(journal) {}
+  std::vector<std::pair<std::int32_t, Dictionary>> structured;  // type and data of each log
   void logStructuredData(std::int32_t type, const Dictionary& data) override;
   void dumpAllOldStructuredDataLogs() override { journal_.push_back("dump structured logs"); }
+  std::string newIncidentIdentifier() override { return "incident"; }
   void rollServitaLogs() override { journal_.push_back("roll servita logs"); }
 
  private:
@@ -173,6 +178,7 @@ class FakeDevice : public DeviceProperties,
  public:
   bool internalBuild = false;
   int internalBuildQueries = 0;
+  std::map<std::string, std::string, std::less<>> texts;  // properties
   std::optional<std::uint32_t> multiUser = 0;
   std::optional<std::string> container;
   std::uint64_t containerError = 2;
@@ -190,6 +196,7 @@ class FakeDevice : public DeviceProperties,
   std::optional<DiskUsage> usage;
   std::optional<DiskUsage> diskUsage() override { return usage; }
   bool booleanProperty(std::string_view name) override;
+  std::optional<std::string> textProperty(std::string_view name) override;
   std::optional<std::uint32_t> multiUserIndicator() override { return multiUser; }
   std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
                                                       std::uint64_t& error) override;
@@ -215,6 +222,7 @@ class FakeKernel : public Kernel {
   std::vector<std::string> reads;  // the names asked for, in order
   std::uint64_t bytesPerPage = 4096, ticks = 0;
   std::optional<Timebase> ratio = Timebase{1, 1};
+  Process running{"morvend", 77};
 
   // Values that are delivered once each, before the integers: what each read gets.
   struct Delivery {
@@ -228,6 +236,7 @@ class FakeKernel : public Kernel {
   std::uint64_t pageSize() override { return bytesPerPage; }
   std::uint64_t absoluteTime() override { return ticks; }
   std::optional<Timebase> timebase() override { return ratio; }
+  Process process() override { return running; }
 };
 
 class FakeSnapshots : public KernelSnapshots {

@@ -111,6 +111,9 @@ struct Device : DeviceProperties, SystemVersion, LibraryLoader {
   bool booleanProperty(std::string_view name) override {
     return !plan.fails() && inner.deviceProperties.booleanProperty(name);
   }
+  std::optional<std::string> textProperty(std::string_view name) override {
+    return plan.fails() ? std::nullopt : inner.deviceProperties.textProperty(name);
+  }
   std::optional<std::uint32_t> multiUserIndicator() override {
     return plan.fails() ? std::nullopt : inner.deviceProperties.multiUserIndicator();
   }
@@ -148,6 +151,7 @@ struct KernelValues : Kernel {
   std::optional<Timebase> timebase() override {
     return plan.fails() ? std::nullopt : inner.timebase();
   }
+  Process process() override { return inner.process(); }
 };
 
 // A close that fails has closed all the same, any other call that fails was not made.

@@ -10,8 +10,9 @@
 // The fuzz targets as they are, each entry renamed after its file (see tests/CMakeLists.txt).
 extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
-FuzzTarget binary_property_list_fuzz, bus_message_fuzz, ftl_statistics_fuzz, import_lines_fuzz,
-    legacy_statistics_fuzz, msp_statistics_fuzz, registry_fuzz, xml_property_list_fuzz;
+FuzzTarget binary_property_list_fuzz, bus_message_fuzz, defects_list_fuzz, ftl_statistics_fuzz,
+    import_lines_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz, registry_fuzz,
+    telemetry_list_fuzz, validity_list_fuzz, xml_property_list_fuzz;
 }
 
 namespace {
@@ -24,11 +25,14 @@ struct Row {
 constexpr Row kTargets[] = {
     {"binary_property_list_fuzz", binary_property_list_fuzz},
     {"bus_message_fuzz", bus_message_fuzz},
+    {"defects_list_fuzz", defects_list_fuzz},
     {"ftl_statistics_fuzz", ftl_statistics_fuzz},
     {"import_lines_fuzz", import_lines_fuzz},
     {"legacy_statistics_fuzz", legacy_statistics_fuzz},
     {"msp_statistics_fuzz", msp_statistics_fuzz},
     {"registry_fuzz", registry_fuzz},
+    {"telemetry_list_fuzz", telemetry_list_fuzz},
+    {"validity_list_fuzz", validity_list_fuzz},
     {"xml_property_list_fuzz", xml_property_list_fuzz},
 };
 

@@ -18,6 +18,7 @@ namespace support {
 struct SetClock final : platform::Clock {
   std::atomic<double> seconds = 1795320000;  // 2026-11-22T04:00:00Z
   platform::Date now() override { return {seconds}; }
+  std::int32_t secondsFromUTC(platform::Date) override { return 0; }
 };
 
 struct HostServices {

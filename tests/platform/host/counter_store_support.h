@@ -17,6 +17,7 @@ inline constexpr char kDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sql
 struct FixedClock : platform::Clock {
   double seconds = 20000 * 86400.0 + 3600;
   platform::Date now() override { return {seconds}; }
+  std::int32_t secondsFromUTC(platform::Date) override { return 0; }
 };
 
 // The rows of a history, one line each: "day key value", "day key second:value second:value".

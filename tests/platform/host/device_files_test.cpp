@@ -4,8 +4,11 @@
 #include <sys/stat.h>
 
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
 #include <future>
+#include <regex>
+#include <set>
 #include <thread>
 
 #include "platform/FaultwatchSupport.h"
@@ -20,6 +23,8 @@
 #include "platform/host/HostReportingChannels.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
+#include "platform/host/RandomUUID.h"
+#include "platform/host/SystemClock.h"
 #include "platform/testing/RecordingLog.h"
 #include "support/TemporaryFolder.h"
 
@@ -170,6 +175,53 @@ TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
     EXPECT_EQ(properties.systemGroupContainerPath(name, error), std::nullopt) << name;
     EXPECT_EQ(error, 2u) << name;
   }
+}
+
+TEST_F(DeviceFiles, TextPropertiesAreTheDevicesElseTheHosts) {
+  folder.write("machine-id", "0123abcd\nmore\n");
+  folder.write("empty", "\n");
+  const auto of = [&](const Dictionary& device, const char* machineId, const char* name) {
+    writePlist("device/properties.plist", device);
+    DeviceFile file(root, codec, log, "device/properties.plist");
+    return HostDeviceProperties(root, file, (folder / machineId).string()).textProperty(name);
+  };
+  constexpr char kId[] = "SystemIdentifier", kModel[] = "HardwareModel", kKey[] = "InverseDeviceID";
+  const Dictionary device{{kId, "id"}, {kModel, "m1"}, {kKey, "k"}};
+  for (const auto& [name, value] : device) {
+    EXPECT_EQ(of(device, "machine-id", name.c_str()), *value.as<std::string>());
+    EXPECT_EQ(of({{name, 1}}, "machine-id", name.c_str()), std::nullopt);
+  }
+  EXPECT_EQ(of({}, "machine-id", kId), "0123abcd");
+  EXPECT_EQ(of({}, "empty", kId), std::nullopt);
+  EXPECT_EQ(of({}, "missing", kId), std::nullopt);
+  EXPECT_NE(of({}, "machine-id", kModel).value_or(""), "");
+  EXPECT_EQ(of({}, "machine-id", kKey), std::nullopt);
+}
+
+TEST_F(DeviceFiles, TheZoneIsTheHosts) {
+  const char* before = std::getenv("TZ");
+  const std::string zone = before != nullptr ? before : "";
+  SystemClock clock;
+  // Six months in summer time; a time that no calendar reaches has no zone.
+  ::setenv("TZ", "ABC-1:30DEF,M4.1.0,M10.1.0", 1);
+  EXPECT_EQ(clock.secondsFromUTC({1795320000}), 5400);
+  EXPECT_EQ(clock.secondsFromUTC({1782864000.5}), 9000);
+  EXPECT_EQ(clock.secondsFromUTC({1e300}), 0);
+  ::setenv("TZ", "XYZ3", 1);
+  EXPECT_EQ(clock.secondsFromUTC({1795320000}), -10800);
+  before != nullptr ? ::setenv("TZ", zone.c_str(), 1) : ::unsetenv("TZ");
+}
+
+TEST_F(DeviceFiles, IncidentIdentifiersAreRandomUUIDs) {
+  std::set<std::string> seen;
+  for (int i = 0; i < 100; ++i) {
+    const std::string text = randomUUID();
+    EXPECT_TRUE(std::regex_match(
+        text, std::regex("[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}")))
+        << text;
+    seen.insert(text);
+  }
+  EXPECT_EQ(seen.size(), 100u);
 }
 
 TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesElseTheHosts) {

@@ -1,0 +1,76 @@
+#include "NANDInfo/NANDLog.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+
+#include "platform/CivilDate.h"
+#include "platform/Text.h"
+
+namespace NANDInfo {
+
+namespace {
+
+using platform::Array;
+using platform::Number;
+using platform::Value;
+
+bool isNumber(const Value& value) { return value.as<Number>() != nullptr; }
+
+std::string numberText(const Number& number) {
+  const bool hasDecimals = number.isReal() && !std::isnan(number.doubleValue());
+  return hasDecimals ? platform::format("%.2f", number.doubleValue()) : number.text();
+}
+
+std::string joined(const Array& array) {
+  std::string text;
+  for (const Value& element : array) {
+    if (&element != &array.front()) text += ',';
+    text += platform::description(element);
+  }
+  return text;
+}
+
+std::optional<std::string> entryText(const Value& value) {
+  if (const auto* number = value.as<Number>()) return numberText(*number);
+  const auto* array = value.as<Array>();
+  if (array == nullptr || !std::any_of(array->begin(), array->end(), isNumber)) return std::nullopt;
+  return joined(*array);
+}
+
+}  // namespace
+
+std::string NANDLogEntries(const platform::Dictionary& values) {
+  std::string entries;
+  for (const auto& [key, value] : values) {
+    const auto text = entryText(value);
+    if (!text) continue;
+    if (!entries.empty()) entries += ';';
+    entries += key + ':' + *text;
+  }
+  return entries;
+}
+
+std::string NANDLogText(const NANDLogOrigin& origin, const std::string& entries) {
+  const std::string body =
+      platform::format("%s %s[%d]: %s\n", origin.date.c_str(), origin.processName.c_str(),
+                       origin.processIdentifier, entries.c_str());
+  return platform::format(
+      "System ID: %s\nHardware Model: %s\nOS Version: %s\nDate: %s\nIncident ID: %s\n"
+      "Faultwatch Key: %s\n\n%s",
+      platform::description(origin.systemIdentifier).c_str(),
+      platform::description(origin.hardwareModel).c_str(), origin.operatingSystemVersion.c_str(),
+      origin.date.c_str(), origin.incidentIdentifier.c_str(), origin.faultwatchKey.c_str(),
+      body.c_str());
+}
+
+std::string NANDLogDate(platform::Date instant, std::int32_t secondsFromUTC) {
+  const auto t = platform::civilFromSeconds(instant.secondsSince1970 + secondsFromUTC);
+  const std::int32_t minutes = std::abs(secondsFromUTC / 60);
+  return platform::format("%04lld-%02d-%02d %02d:%02d:%02d %c%02d%02d",
+                          static_cast<long long>(t.date.year), t.date.month, t.date.day, t.hour,
+                          t.minute, t.second, secondsFromUTC < 0 ? '-' : '+', minutes / 60,
+                          minutes % 60);
+}
+
+}  // namespace NANDInfo

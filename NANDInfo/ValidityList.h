@@ -1,0 +1,22 @@
+// The flash validity list: how much of the flash still holds valid data, as sixteen short lists.
+//
+// Little-endian: the number of records and the place of the first one in units of 8 bytes, 32 bits
+// each; then records of 20 bytes, with the index of a list at byte 12 and a value for it at 16.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <optional>
+#include <span>
+
+#include "platform/PropertyList.h"
+
+namespace NANDInfo {
+
+using ValidityLists = std::array<platform::Array, 16>;
+
+// The values of each list, in record order; records of other lists are left out. None when there
+// are no records or they don't all fit.
+std::optional<ValidityLists> parseValidityList(std::span<const std::byte> buffer);
+
+}  // namespace NANDInfo

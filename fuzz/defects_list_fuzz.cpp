@@ -1,0 +1,25 @@
+// Defects lists: as many records as are claimed and fit.
+#include <algorithm>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <span>
+
+#include "NANDInfo/DefectsList.h"
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
+  const auto list = NANDInfo::DefectsList::parse(std::as_bytes(std::span(bytes, size)));
+  if (list.has_value() != (size >= 12)) std::abort();
+  if (!list) return 0;
+  std::uint32_t claimed;
+  std::memcpy(&claimed, bytes + 8, sizeof claimed);
+  if (list->size() != std::min<std::size_t>(claimed, (size - 12) / 32)) std::abort();
+  for (std::size_t i = 0; i < list->size(); ++i) {
+    const auto defect = (*list)[i];
+    const auto offset = NANDInfo::reasonOffset(defect.mode);
+    if (offset.has_value() != (defect.mode < 3)) std::abort();
+    const auto log = NANDInfo::defectLog(defect);
+    if (log.size() != 8 || log.number("CE")->int64Value() != defect.CE) std::abort();
+  }
+  return 0;
+}

@@ -1,0 +1,555 @@
+// The controller's diagnostic lists: each parser with valid lists that are then cut or altered, the
+// handlers by what they refuse, and the whole dump by the failures of every call.
+
+#include "NANDInfo/StructuredLogs.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <functional>
+#include <limits>
+#include <string>
+
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/DefectsList.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/ListHandlers.h"
+#include "NANDInfo/StructuredLogState.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
+#include "NANDInfo/WriteAmplification.h"
+#include "support/ControllerLists.h"
+#include "support/TestPlatform.h"
+
+namespace NANDInfo {
+namespace {
+
+using platform::Array;
+using platform::Dictionary;
+using platform::Value;
+using platform::fakes::FakeDeviceRegistry;
+using support::Bytes;
+using Entry = FakeDeviceRegistry::Entry;
+using Answer = FakeDeviceRegistry::Answer;
+using Lines = std::vector<std::string>;
+
+constexpr char kQRT3[] = "NorbaQRT3NVMeController";
+constexpr char kEmbedded[] = "NorbaEmbeddedNVMeController";
+constexpr char kStorage[] = "ZMCStorage";
+constexpr std::uint32_t kError = 0x2BC;
+constexpr double kInfinity = std::numeric_limits<double>::infinity();
+
+TEST(WriteAmplification, IsErasedBlocksToHostWrites) {
+  const std::uint64_t most = UINT64_MAX;
+  const struct {
+    std::uint32_t pages, bytesPerPage;
+    std::uint64_t erases, hostWrites;
+    std::vector<std::pair<const char*, std::uint64_t>> fields;
+    double user, intermediate;
+  } rows[] = {
+      {256, 4096, 10, 1024, {}, 2.5, 0},
+      {256, 4096, 10, 3000, {}, 0.853333353996276855, 0},  // single precision
+      {1, 4095, 10, 1, {}, 0, 0},
+      {0x10000, 0x10001, 16, 16, {}, 16, 0},  // a 32-bit product
+      {1, 4096, most, 1, {}, 0x1p64, 0},
+      {2, 4096, most, 2, {}, 0x1p63, 0},  // a 64-bit product
+      {2, 4096, 1, 0, {}, kInfinity, 0},
+      {256, 4096, 1, 256, {{"pagesPerVirtualBlockSlc", 64}, {"intermediateBandErases", 8}}, 1, 2},
+      {256, 4096, 1, 256, {{"pagesPerVirtualBlockSlc", 64}}, 1, 0},
+      {256, 4096, 1, 256, {{"intermediateBandErases", 8}, {"pagesPerVirtualBlockSlcX", 1}}, 1, 0},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(&row - rows);
+    LegacyNandInfoCxt context;
+    context.pagesPerVirtualBlock = row.pages;
+    context.bytesPerPage = row.bytesPerPage;
+    context.bandErases = row.erases;
+    context.hostWrites = row.hostWrites;
+    for (const auto& [name, value] : row.fields) context.fields.add(name, "", value);
+    const WriteAmplification result = writeAmplificationOf(context);
+    EXPECT_EQ(result.user, row.user);
+    EXPECT_EQ(result.intermediate, row.intermediate);
+  }
+  EXPECT_TRUE(std::isnan(writeAmplificationOf({}).user));
+}
+
+TEST(WriteAmplification, IsHighAboveAThresholdBetween0And10) {
+  const auto nan = std::nan("");
+  const struct {
+    std::optional<Value> preference;
+    double threshold;
+  } rows[] = {
+      {{}, 2},        {1.5, 1.5},           {12.0, 2},          {10.0, 2},  {0.0, 2},
+      {-1.0, 2},      {std::int32_t{1}, 2}, {true, 2},          {"1.5", 2}, {nan, 2},
+      {kInfinity, 2}, {1e-300, 2},          {9.99999999999, 2}, {9.5, 9.5}, {Value(3.25F), 3.25}};
+  for (const auto& [preference, threshold] : rows) {
+    SCOPED_TRACE(threshold);
+    EXPECT_TRUE(isHighWriteAmplification(std::nextafter(threshold, 11), preference));
+    EXPECT_TRUE(isHighWriteAmplification(kInfinity, preference));
+    EXPECT_FALSE(isHighWriteAmplification(threshold, preference));
+    EXPECT_FALSE(isHighWriteAmplification(nan, preference));
+  }
+}
+
+TEST(ValidityList, RecordsGoToTheirListsInOrder) {
+  const std::vector<std::pair<std::uint8_t, std::uint8_t>> records = {
+      {3, 10}, {16, 1}, {7, 255}, {3, 5}, {255, 2}, {0, 0}, {15, 9}};
+  for (const std::uint32_t headerUnits : {1u, 2u, 100u}) {
+    const Bytes bytes = support::validityList(headerUnits, records);
+    const auto lists = parseValidityList(bytes);
+    ASSERT_TRUE(lists);
+    ValidityLists expected;
+    expected[0] = {0};
+    expected[3] = {10, 5};
+    expected[7] = {255};
+    expected[15] = {9};
+    EXPECT_EQ(*lists, expected);
+    for (std::size_t size = 0; size < bytes.size(); ++size) {
+      EXPECT_FALSE(
+          parseValidityList(Bytes(bytes.begin(), bytes.begin() + static_cast<long>(size))));
+    }
+  }
+  // Counts that only a multiplication in 32 bits would believe, and no records.
+  for (const auto& [count, units] : std::vector<std::pair<std::uint32_t, std::uint32_t>>{
+           {0, 1}, {0xCCCCCCCD, 1}, {1, 0x20000001}, {0xFFFFFFFF, 0xFFFFFFFF}, {2, 1}}) {
+    Bytes bytes = support::words32({count, units});
+    bytes.resize(28);
+    EXPECT_FALSE(parseValidityList(bytes)) << count;
+  }
+  EXPECT_TRUE(parseValidityList(Bytes(support::words32({1, 0, 0, 0, 0}))));  // the header a record
+}
+
+TEST(TelemetryList, HasTheChannelsThatFit) {
+  const Bytes bytes = support::telemetryList(2);
+  const auto fits = [&](std::size_t size, std::int32_t channels) {
+    const auto list = parseTelemetryList(std::span(bytes).first(size), channels);
+    EXPECT_EQ(list ? list->size() : 0, list && channels > 0 ? channels : 0);
+    return list.has_value();
+  };
+  EXPECT_TRUE(fits(2 * 4128, 2));
+  EXPECT_TRUE(fits(0, 0));
+  EXPECT_TRUE(fits(0, INT32_MIN));
+  for (const std::size_t size : {0, 1, 4096, 4128, 8192, 8224, 8255}) EXPECT_FALSE(fits(size, 2));
+  // 4128 times these is small in 32 bits.
+  for (const std::int32_t channels : {INT32_MAX, 0x100000, 0x8000000}) {
+    EXPECT_FALSE(fits(bytes.size(), channels));
+  }
+}
+
+TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
+  const Bytes bytes = support::telemetryList(2);
+  const auto channels = *parseTelemetryList(bytes, 2);
+  const std::uint64_t hynix = 0xAD8252232100, sandisk = 0x4582603A5700;
+  const struct {
+    const char* chip;
+    std::uint64_t vendor;
+    CounterConverter* convert;
+    std::size_t readStages, dspExceptions;
+    const char* last;
+  } rows[] = {{"QM7", hynix, parseCountersAlgoGeneric, 23, 12, "algoNANDAccessesBin[7]"},
+              {"QM8", sandisk, parseCountersAlgoGenericQ8, 33, 38, "retentionIndication[11]"},
+              {"QM9", sandisk, parseCounters1xSandisk, 23, 12, "readStage19NumOfErrorsBin[11]"},
+              {"", 0x458260DE5700, parseCounters1xSandisk, 23, 12, "readStage19NumOfErrorsBin[11]"},
+              {"qm7", hynix, parseCounters1xHynix, 23, 12, "readStage19NumOfErrorsBin[11]"},
+              {"QM7 ", 1, parseCounters1y, 23, 12, "readStage19NumOfErrorsBin[11]"}};
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.chip);
+    const ChipKind chip = chipKind(row.chip);
+    ASSERT_EQ(counterConverter(chip, row.vendor), row.convert);
+    NandCountersRecord record{};
+    row.convert(channels[1].counters, record);
+    const Dictionary log = telemetryLog(channels[1], chip, row.convert);
+    Dictionary expected;
+    std::int32_t summary = 100;
+    for (const char* name : {"RD", "PE", "Max_PE_rate", "t0", "Ret", "block_type", "num_pages"}) {
+      expected.set(name, summary++);
+    }
+    const auto expect = [&](const char* name, std::size_t first, std::size_t count) {
+      for (std::size_t i = 0; i < count; ++i) {
+        expected.set(name + ("[" + std::to_string(i)) + "]",
+                     static_cast<std::int32_t>(record[first + i]));
+      }
+    };
+    expect("readStage", 0, row.readStages);
+    expect("initialReadStage", 33, 23);
+    expect("nandStageOfLife", 56, 8);
+    expect("dspExceptionParameter", 65, row.dspExceptions);
+    expect("readStage18NumOfErrorsBin", 103, 12);
+    expect("readStage9NumOfErrorsBin", 115, 10);
+    expect("readStage10NumOfErrorsBin", 125, 10);
+    expect("readStage17NumOfErrorsBin", 135, 10);
+    expect("readStage19NumOfErrorsBin", 145, 12);
+    expect("algoNANDAccessesBin", 157, chip == ChipKind::QM7 ? 8 : 0);
+    expect("retentionIndication", 165, chip == ChipKind::QM8 ? 12 : 0);
+    EXPECT_EQ(description(log), description(expected));  // the order too
+    EXPECT_EQ((log.end() - 1)->key, row.last);
+  }
+}
+
+TEST(DefectsList, IsCutToTheRecordsThatFit) {
+  const Bytes bytes = support::defectsList(
+      7, {{0xABCD1234, 1, 2, 3, 0x80000000, 5, 0xFFFFFFF6, 2}, {0, 9, 9, 9, 9, 9, 9, 9}});
+  for (std::size_t size = 0; size <= bytes.size(); ++size) {
+    const auto list = DefectsList::parse(std::span(bytes).first(size));
+    ASSERT_EQ(list.has_value(), size >= 12);
+    if (!list) continue;
+    EXPECT_EQ(list->size(), (size - 12) / 32);
+    EXPECT_EQ(list->factoryCount(), 7u);
+    if (list->size() == 0) continue;
+    EXPECT_EQ(description(defectLog((*list)[0])), description(Dictionary{{"Bus", 0x1234},
+                                                                         {"CE", 0xABCD},
+                                                                         {"CAU", 1},
+                                                                         {"Block", 2},
+                                                                         {"Cycle", 3},
+                                                                         {"Reason", INT32_MIN},
+                                                                         {"Page", 5},
+                                                                         {"Temperature", -10}}));
+    EXPECT_EQ((*list)[0].mode, 2u);
+  }
+  for (const std::uint32_t count : {0u, 1u, 3u, 0x08000001u, 0xFFFFFFFFu}) {
+    Bytes altered = bytes;
+    const Bytes word = support::words32({count});
+    std::copy(word.begin(), word.end(), altered.begin() + 8);
+    EXPECT_EQ(DefectsList::parse(altered)->size(), std::min(count, 2u));
+  }
+}
+
+class StructuredLogsTest : public ::testing::Test {
+ protected:
+  StructuredLogsTest() { restart(); }
+  ~StructuredLogsTest() override { EXPECT_EQ(registry.problems(), Lines()); }
+
+  // A controller that answers everything. One field of its statistics makes the validity list
+  // wanted: erases without host writes.
+  void restart(const char* className = kEmbedded) {
+    ResetExporters();
+    ResetStructuredLogState();
+    registry = FakeDeviceRegistry();
+    registry.add({.className = "Bus",
+                  .properties = {{"Controller Characteristics", characteristics}},
+                  .children = {{.className = className}}});
+    const auto header = [](std::uint32_t key) { return support::header(key, 1); };
+    registry.alwaysTunnels(
+        9, 13, 0,
+        support::words({header(49), 4096, header(50), 64, header(4), 256, header(20), 12}));
+    registry.alwaysTunnels(9, 11, 0, support::validityList(1, {{3, 1}, {7, 2}, {3, 4}}));
+    for (std::uint32_t i = 0; i < 3; ++i) {
+      registry.alwaysTunnels(9, 17, i, support::telemetryList(2));
+    }
+    registry.alwaysTunnels(9, 15, 0, support::defectsList(2, {{0, 0, 0, 0, 0, 0, 0, 0}}));
+    fakes.streams.errors.clear();
+    fakes.housekeeping.structured.clear();
+    fakes.submission.logs.clear();
+    fakes.preferences.values.clear();
+  }
+
+  Dictionary characteristics{{"chip-id", "QM7"},
+                             {"manufacturer-id", "AD8252232142"},
+                             {"num-bus", 2},
+                             {"nand-device-desc", 99}};
+  support::TestPlatform fakes;
+  platform::Platform& platform = fakes.platform;
+  FakeDeviceRegistry& registry = fakes.registry;
+  const Lines& errors = fakes.streams.errors;
+  const std::vector<std::pair<std::int32_t, Dictionary>>& structured =
+      fakes.housekeeping.structured;
+};
+
+TEST_F(StructuredLogsTest, ADumpFetchesTheListsInOrderAndLogsThem) {
+  for (const bool flag : {false, true}) {
+    restart();
+    EXPECT_TRUE(DumpStorageStructuredLog(platform, flag));
+    EXPECT_EQ(errors, Lines());
+    const Lines statistics = {std::string("open ") + kEmbedded, "9 size 13/0", "9 data 13/0"};
+    Lines expected = statistics;
+    expected.push_back(statistics[0]);
+    for (const char* list : {"11/0", "17/0", "17/1", "17/2", "15/0"}) {
+      for (const char* phase : {"9 size ", "9 data "}) {
+        expected.push_back(std::string(phase) + list);
+        // The validity list's handler asks for the statistics in between.
+        if (expected.back() == "9 data 11/0") {
+          expected.insert(expected.end(), statistics.begin(), statistics.end());
+        }
+      }
+    }
+    EXPECT_EQ(registry.calls, expected);
+    const std::uint32_t bit = flag ? 2 : 0;
+    EXPECT_EQ(registry.inputs[2], support::words32({11, bit | 1, 0, 0, 0, 0}));
+    EXPECT_EQ(registry.inputs[3], support::words32({11, bit, 0, 0, 0, 0}));
+    EXPECT_EQ(registry.inputs[10], support::words32({17, bit | 2 << 2 | 1, 0, 0, 0, 0}));
+    EXPECT_EQ(registry.inputs[11], support::words32({17, bit | 2 << 2, 0, 0, 0, 0}));
+
+    ASSERT_EQ(structured.size(), 3u * 2 + 2);
+    for (const auto& [type, log] : structured) EXPECT_EQ(type, 176);
+    EXPECT_EQ(structured[1].second.number("RD")->int64Value(), 100);
+    EXPECT_EQ(structured[6].second,
+              (Dictionary{{"Factory Count", 2}, {"com.norba.NANDInfo.nandDesc", 99}}));
+    ASSERT_EQ(fakes.submission.logs.size(), 1u);
+    EXPECT_EQ(fakes.submission.logs[0].type, "165");
+    const std::string& text = fakes.submission.logs[0].contents;
+    EXPECT_NE(text.find(": IntermediateWamp:0.00;UserWamp:3.00;"), text.npos) << text;
+    EXPECT_NE(text.find(";ValidityList[3]:1,4;ValidityList[7]:2\n"), text.npos) << text;
+    EXPECT_NE(text.find(std::string(kNANDInfoBytesPerPageKey) + ":4096;"), text.npos) << text;
+    EXPECT_EQ(text.find(kNANDInfoExportVersionKey), text.npos);
+  }
+}
+
+TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
+  const struct {
+    std::optional<Value> preference;
+    bool forced, statisticsFail, logged;
+  } rows[] = {{{}, false, false, true},    {5.0, false, false, false}, {5.0, true, false, true},
+              {{}, false, true, false},    {2.5, false, false, true},  {{}, true, true, true},
+              {"5.0", false, false, true}, {3.0, false, false, false}};
+  for (const auto& row : rows) {
+    SCOPED_TRACE(&row - rows);
+    restart();
+    gForceCollectionSet = row.forced;
+    gCurrentUserWamp = gCurrentSysWamp = 9;
+    gNeedValidityList = !row.logged;
+    if (row.preference) {
+      fakes.preferences.setMobile("com.norba.NANDInfo", "userWAmp", *row.preference);
+    }
+    if (row.statisticsFail) registry.standing.erase("9 data 13/0");
+    EXPECT_TRUE(DumpStorageStructuredLog(platform, false));
+    EXPECT_EQ(gNeedValidityList, row.logged);
+    EXPECT_EQ(gCurrentUserWamp, row.statisticsFail ? 0 : 3);
+    EXPECT_EQ(gCurrentSysWamp, 0);
+    EXPECT_EQ(fakes.submission.logs.size(), row.logged ? 1u : 0u);
+    EXPECT_EQ(structured.size(), 8u);
+  }
+}
+
+// A call or a list that fails, what is said of it, and what is logged all the same.
+TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
+  const auto fail = [&](const char* call, Answer answer) {
+    return [this, call, answer] { registry.standing[call] = answer; };
+  };
+  const auto announce = FakeDeviceRegistry::announce;
+  const auto list = [&](std::uint32_t opType, std::uint32_t argument, Bytes bytes) {
+    return [=, this] { registry.alwaysTunnels(9, opType, argument, bytes); };
+  };
+  const auto exporter = [](auto change) { return [change] { change(nand_exporters_tunnel[1]); }; };
+  const std::string notFetched = "Could not retrieve data from driver for selector ";
+  const std::string beyond = "ERROR: Attempting to parse beyond the bounds of the buffer\n";
+  const std::string unparsable = "data cannot be parsed";
+  const std::string sizeFailed = "DrvCallStructMethod failed with status 0x2bc on selector index ";
+  const std::string validity = "Validity list retrieval is not supported\n";
+  const std::string telemetry = "Telemetry list retrieval is not supported\n";
+  const std::string defects = "Defects list retrieval is not supported\n";
+  const SelectorGetter none = [] { return static_cast<const SelectorPair*>(nullptr); };
+  const struct {
+    const char* name;
+    std::function<void()> prepare;
+    bool result;
+    Lines errors;
+    std::size_t submitted, structured;
+  } rows[] = {
+      {"size", fail("9 size 11/0", {kError}), true, {sizeFailed + "0\n"}, 0, 8},
+      {"last size", fail("9 size 15/0", {kError}), true, {sizeFailed + "4\n"}, 1, 6},
+      {"data", fail("9 data 17/1", {kError}), true, {notFetched + "17\n"}, 1, 6},
+      {"empty", fail("9 size 17/2", announce(0)), true, {}, 1, 6},
+      {"no answer", fail("9 size 17/2", {}), true, {}, 1, 6},
+      {"short size", fail("9 size 15/0", {.output = Bytes(1, std::byte{12})}), true, {}, 1, 7},
+      {"large",
+       fail("9 size 17/0", announce((16u << 20) + 1)),
+       false,
+       {"Could not malloc 16777217 bytes"},
+       1,
+       6},
+      {"largest", fail("9 size 17/0", announce(16u << 20)), true, {}, 1, 8},
+      {"huge",
+       fail("9 size 15/0", announce(0xFFFFFFFF)),
+       false,
+       {"Could not malloc 4294967295 bytes"},
+       1,
+       6},
+      {"delivered short", fail("9 data 11/0", {}), false, {unparsable}, 0, 8},
+      {"claimed long",
+       fail("9 data 15/0", {.output = Bytes(44), .claimedSize = SIZE_MAX}),
+       true,
+       {},
+       1,
+       7},
+      {"cut telemetry", list(17, 0, Bytes(8255)), false, {beyond}, 1, 6},
+      {"cut defects", list(15, 0, Bytes(11)), false, {unparsable}, 1, 6},
+      {"two",
+       [&] { list(11, 0, Bytes(40))(), list(15, 0, Bytes(4))(); },
+       false,
+       {unparsable, unparsable},
+       0,
+       6},
+      {"no validity",
+       exporter([](auto& e) { e.getBandStatsSelectors = nullptr; }),
+       true,
+       {validity},
+       0,
+       8},
+      {"index",
+       [&] {
+         nand_exporters_tunnel[1].getBandStatsSelectors = nullptr;
+         fail("9 size 17/0", {kError})();
+       },
+       true,
+       {validity, sizeFailed + "0\n"},
+       0,
+       6},
+      {"none",
+       exporter([](auto& e) {
+         e.getBandStatsSelectors = e.getTelemetryListSelectors = e.getDefectsListSelectors =
+             nullptr;
+       }),
+       true,
+       {validity, telemetry, defects},
+       0,
+       0},
+      {"no pair", exporter([&](auto& e) { e.getTelemetryListSelectors = none; }), false, {}, 1, 2},
+      {"no properties",
+       [&] { registry.root->children[0].properties = {}; },
+       false,
+       {"failed to create dictionary"},
+       0,
+       0},
+      {"its own properties",
+       [&] {
+         auto& controller = registry.root->children[0].children[0];
+         controller.properties = {{"Controller Characteristics", Dictionary{{"num-bus", 1}}}};
+       },
+       false, Lines(3, "ERROR: Could not determine the chip-id\n"), 1, 2},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    restart();
+    row.prepare();
+    EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
+    EXPECT_EQ(errors, row.errors);
+    EXPECT_EQ(fakes.submission.logs.size(), row.submitted);
+    EXPECT_EQ(structured.size(), row.structured);
+    EXPECT_EQ(registry.problems(), Lines());
+  }
+}
+
+TEST_F(StructuredLogsTest, WithoutAServiceOrAConnectionThereIsNothing) {
+  const std::string noService = "Could not get matching Regmora service for exporting classes\n";
+  const std::string notOpened = "Could not get connection to service\n";
+  const std::string notClosed = "Could not close connection to service\n";
+  const std::string walking =
+      "Failed to find matching service with DrvGetMatchingService, trying iterator...\n";
+  const Dictionary properties{{"Controller Characteristics", characteristics}};
+  const struct {
+    std::optional<Entry> controller;
+    bool result;
+    Lines errors;
+    std::size_t structured;
+  } rows[] = {
+      {std::nullopt, false, {walking, noService, walking, noService}, 0},
+      {Entry{.className = kQRT3, .openStatus = kError}, false, {notOpened, notOpened}, 0},
+      {Entry{.className = kQRT3, .oddHandle = true}, false, {notOpened}, 0},
+      {Entry{.className = kQRT3, .openStatus = kError, .oddHandle = true},
+       false,
+       {notOpened, notOpened},
+       0},
+      {Entry{.className = kQRT3, .closeStatus = kError},
+       false,
+       {notClosed, "failed to create dictionary", notClosed},
+       0},
+      {Entry{.className = kQRT3, .properties = properties, .closeStatus = kError},
+       true,
+       {notClosed, notClosed},
+       8},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(&row - rows);
+    restart();
+    registry.root->children.clear();
+    if (row.controller) registry.add(*row.controller);
+    EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
+    EXPECT_EQ(errors, row.errors);
+    EXPECT_EQ(structured.size(), row.structured);
+    EXPECT_EQ(registry.problems(), Lines());
+    Dictionary untouched{{"key", 1}};
+    if (!row.result) DumpNANDInfo(platform, untouched);
+    EXPECT_EQ(untouched, (Dictionary{{"key", 1}}));
+  }
+}
+
+TEST_F(StructuredLogsTest, TelemetryNeedsThreeCharacteristics) {
+  const auto with = [&](const char* key, std::optional<Value> value) -> Value {
+    Dictionary changed = characteristics;
+    changed.remove(key);
+    if (value) changed.set(key, *value);
+    return changed;
+  };
+  const std::string missing = "ERROR: Could not determine the ",
+                    no = "ERROR: ", noText = " is not stored as a OrvalstrTypeID\n";
+  const std::string noCount = "ERROR: could not determine the number of channels\n";
+  const struct {
+    Value characteristics;
+    std::string error;
+    std::size_t logs;
+  } rows[] = {
+      {Array{}, "ERROR: Could not parse the Device Characteristics dictionary\n", 0},
+      {with("chip-id", {}), missing + "chip-id\n", 0},
+      {with("chip-id", platform::Data{1}), no + "chip-id" + noText, 0},
+      {with("chip-id", std::string(63, 'Q')), "", 2},
+      {with("chip-id", std::string(64, 'Q')),
+       "ERROR: Unable to obtain chip-id as conversion from the UniChar contents of Orvalstr "
+       "failed, or the buffer of 64 bytes is too small\n",
+       0},
+      {with("manufacturer-id", {}), missing + "manufacturer-id\n", 0},
+      {with("manufacturer-id", 7), no + "manufacturer-id" + noText, 0},
+      {with("manufacturer-id", "AD"), "", 2},
+      {with("manufacturer-id", ""), "", 2},
+      {with("num-bus", {}), noCount, 0},
+      {with("num-bus", "2"), noCount, 0},
+      {with("num-bus", 0), "", 0},
+      {with("num-bus", -1), "", 0},
+      {with("num-bus", 1), "", 1},
+      {with("num-bus", 3), "ERROR: Attempting to parse beyond the bounds of the buffer\n", 0},
+      {with("num-bus", std::int64_t{0x100000002}), "", 2},
+  };
+  for (const auto& row : rows) {
+    restart();
+    SCOPED_TRACE(&row - rows);
+    EXPECT_EQ(DumpTelemetryList(platform, support::telemetryList(2), row.characteristics, kQRT3),
+              row.error.empty());
+    EXPECT_EQ(errors, row.error.empty() ? Lines() : Lines{row.error});
+    EXPECT_EQ(structured.size(), row.logs);
+  }
+  // The vendor's lowest byte doesn't count, and only six are read.
+  const auto readStage = [&](const char* chip, const char* vendor) {
+    restart();
+    const Dictionary device{{"chip-id", chip}, {"manufacturer-id", vendor}, {"num-bus", 1}};
+    EXPECT_TRUE(DumpTelemetryList(platform, support::telemetryList(1), device, kQRT3));
+    return structured[0].second.number("readStage[4]")->int64Value();
+  };
+  const auto hynix = readStage("", "AD8252232100"), other = readStage("", "AD8252232000");
+  EXPECT_NE(hynix, other);
+  EXPECT_EQ(readStage("", "ad82522321ff"), hynix);
+  EXPECT_EQ(readStage("", "AD82522321FF99"), hynix);
+}
+
+TEST_F(StructuredLogsTest, TheDefectModeCountsOnNewerDriversOnly) {
+  const auto reasons = [&](const char* className, const Value& device) {
+    restart();
+    std::vector<std::vector<std::uint32_t>> records;
+    for (const std::uint32_t mode : {0u, 1u, 2u, 3u, 0xFFFFFFFFu}) {
+      records.push_back({0, 0, 0, 0, 50, 0, 0, mode});
+    }
+    EXPECT_TRUE(DumpDefectsList(platform, support::defectsList(0, records), device, className));
+    std::vector<std::int64_t> all;
+    for (const auto& [type, log] : structured) {
+      if (const auto* reason = log.number("Reason")) all.push_back(reason->int64Value());
+    }
+    return all;
+  };
+  EXPECT_EQ(reasons(kEmbedded, characteristics), (std::vector<std::int64_t>{50, 250, 150, 50, 50}));
+  EXPECT_EQ(errors, (Lines{"Encountered unexpected defectMode: 0x3",
+                           "Encountered unexpected defectMode: 0xffffffff"}));
+  EXPECT_EQ(reasons(kStorage, "no dictionary"), std::vector<std::int64_t>(5, 50));
+  EXPECT_EQ(errors, Lines());
+  EXPECT_EQ(structured[0].second, (Dictionary{{"Factory Count", 0}}));
+}
+
+}  // namespace
+}  // namespace NANDInfo
