@@ -34,11 +34,11 @@ Figures ofFileSystem(platform::Platform& platform) {
 Figures ofDeviceProperties(platform::Platform& platform) {
   const auto usage = platform.deviceProperties.diskUsage();
   if (!usage) return {};
-  const std::uint64_t total = usage->totalDiskCapacity >> 20;
+  const std::uint64_t total = usage->totalDiskCapacity.value_or(0) >> 20;
   return {.capacityGB = GetUserCapacityInGB(static_cast<std::uint32_t>(total)),
           .userMB = total,
-          .availableMB = usage->amountDataAvailable >> 20,
-          .fullness = usedShare(total, usage->totalDataAvailable >> 20)};
+          .availableMB = usage->amountDataAvailable.value_or(0) >> 20,
+          .fullness = usedShare(total, usage->totalDataAvailable.value_or(0) >> 20)};
 }
 
 }  // namespace

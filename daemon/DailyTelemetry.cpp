@@ -1,7 +1,92 @@
 #include "daemon/DailyTelemetry.h"
 
+#include "NANDInfo/NANDInfo.h"
+#include "daemon/DataUsage.h"
+#include "daemon/EccEvents.h"
+
 namespace morvend {
 
-void CollectDailyTelemetry(platform::Platform&, DeviceContext&) {}
+using platform::ChannelSample;
+using platform::Dictionary;
+using platform::LogLevel;
+using platform::Number;
+using platform::Platform;
+using platform::ReportChannel;
+
+namespace {
+
+constexpr std::uint64_t kReportedCategory = 0x100;
+
+std::int64_t mebibytes(std::optional<std::uint64_t> bytes) {
+  return bytes ? static_cast<std::int64_t>(*bytes) >> 20 : -1;
+}
+
+void CollectDiskUsage(Platform& platform) {
+  const auto usage =
+      platform.deviceProperties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
+  platform.counters.PLClientSetValueForScalarKey("com.norba.tarvenn.DiskUsageUserTotalBlocks",
+                                                 mebibytes(usage.totalDiskCapacity));
+  platform.counters.PLClientSetValueForScalarKey("com.norba.tarvenn.DiskUsageUserBlocksFree",
+                                                 mebibytes(usage.totalDataAvailable));
+}
+
+void CollectStorageHealth(Platform& platform) {
+  auto info = NANDInfo::CopyNANDInfoWithOptions(platform);
+  if (!info) {
+    platform.log.log(LogLevel::standard, "failed to get NAND info dict");
+    return;
+  }
+  for (const auto& [key, value] : NANDInfo::CopyVMFreezerNANDInfo(platform)) info->set(key, value);
+  if (const auto* error = info->find(NANDInfo::kNANDInfoErrorKey)) {
+    platform.log.log(LogLevel::standard, "error reading nand info, error %s with message %s",
+                     description(*error).c_str(),
+                     description(info->find(NANDInfo::kNANDInfoErrorMessageKey)).c_str());
+    return;
+  }
+  for (const auto& [key, value] : *info) {
+    if (const auto* number = value.as<Number>()) {
+      platform.counters.PLClientSetValueForScalarKey(key, number->int64Value());
+    }
+  }
+}
+
+void CollectReportChannels(Platform& platform) {
+  auto channels = platform.reportingChannels.copyChannels(kReportedCategory);
+  if (channels.empty()) return;
+  std::erase_if(channels, [](const ReportChannel& channel) {
+    return channel.format != platform::kSimpleChannelFormat;
+  });
+  const auto subscription = platform.reportingChannels.subscribe(channels);
+  const auto samples = subscription ? subscription->createSamples() : std::nullopt;
+  if (!samples) return;
+  for (const auto& [channel, value] : *samples) {
+    if (channel.format != platform::kSimpleChannelFormat) continue;
+    platform.counters.PLClientSetValueForScalarKey("com.norba.velquist." + channel.name, value);
+  }
+}
+
+struct Collector {
+  const char* name;
+  void (*collect)(Platform&);
+};
+
+constexpr Collector kCollectors[] = {
+    {"disk usage", CollectDiskUsage},
+    {"storage log",
+     [](Platform& platform) { NANDInfo::DumpStorageStructuredLog(platform, false); }},
+    {"storage health", CollectStorageHealth},
+    {"memory errors", CollectEccEvents},
+    {"data usage", [](Platform& platform) { CollectDataUsage(platform); }},
+    {"report channels", CollectReportChannels},
+};
+
+}  // namespace
+
+void CollectDailyTelemetry(Platform& platform) {
+  for (const Collector& collector : kCollectors) {
+    platform.log.log(LogLevel::debug, "telemetry: %s", collector.name);
+    collector.collect(platform);
+  }
+}
 
 }  // namespace morvend

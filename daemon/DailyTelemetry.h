@@ -1,12 +1,13 @@
 // The device health values that are collected beside the counters report.
 #pragma once
 
-#include "daemon/context/DeviceContext.h"
 #include "platform/Platform.h"
 
 namespace morvend {
 
-// Collects them and hands them on. No collector has been added yet.
-void CollectDailyTelemetry(platform::Platform& platform, DeviceContext& context);
+// Runs the collectors, each whatever became of the others: disk usage, the storage log, storage
+// health, memory error events, data usage and the kernel's reporting channels. What they find goes
+// to today's counters or, as structured data, to the crash-reporting support library.
+void CollectDailyTelemetry(platform::Platform& platform);
 
 }  // namespace morvend

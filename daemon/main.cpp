@@ -1,12 +1,15 @@
 // morvend: turns the device's counters into its daily report, and exits.
 
+#include <memory>
+
 #include "daemon/Entry.h"
 #include "platform/host/Host.h"
 
 int main(int argc, char** argv) {
   platform::host::Host host;
-  morvend::DeviceContext context(host.platform());
-  host.keepCountersBelow([&context] { return context.GetHomeDirectoryPath(); });
-  morvend::RunProcess(host.platform(), context, argc, argv);
+  // The host's too: it may record what comes in late, up to its end.
+  const auto context = std::make_shared<morvend::DeviceContext>(host.platform());
+  host.keepCountersBelow([context] { return context->GetHomeDirectoryPath(); });
+  morvend::RunProcess(host.platform(), *context, argc, argv);
   return 0;
 }

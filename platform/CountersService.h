@@ -1,7 +1,8 @@
-// The device's counters service, as its clients see it.
+// The device's counters service, as its clients see it. Values may be recorded from any thread.
 #pragma once
 
 #include <cstdint>
+#include <string_view>
 
 #include "platform/PropertyList.h"
 
@@ -19,6 +20,11 @@ class CountersService {
 
   // Asks the service to bring everything recorded so far into its database.
   virtual void PLClientCheckpoint() = 0;
+
+  // A key's scalar for today: holds the value, or has it added to what it holds. The service says
+  // so in the log when a value can't be recorded.
+  virtual void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) = 0;
+  virtual void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) = 0;
 };
 
 }  // namespace platform

@@ -23,10 +23,10 @@ class DeviceProperties {
   // The multi-user indicator, or none when the query fails.
   virtual std::optional<std::uint32_t> multiUserIndicator() = 0;
 
-  // The device's disk usage; an entry that the device doesn't know is 0. None when it has no
-  // answer.
+  // The device's disk usage in bytes; none when it has no answer, and for each figure that it
+  // doesn't know.
   struct DiskUsage {
-    std::uint64_t totalDiskCapacity, totalDataAvailable, amountDataAvailable;  // bytes
+    std::optional<std::uint64_t> totalDiskCapacity, totalDataAvailable, amountDataAvailable;
   };
   virtual std::optional<DiskUsage> diskUsage() = 0;
 

@@ -16,10 +16,12 @@
 #include "platform/LibraryLoader.h"
 #include "platform/LocaleService.h"
 #include "platform/LogSubmission.h"
+#include "platform/NetworkUsage.h"
 #include "platform/PLHistory.h"
 #include "platform/PreferenceStore.h"
 #include "platform/PropertyListCodec.h"
 #include "platform/PurgeableSpace.h"
+#include "platform/ReportingChannels.h"
 #include "platform/RunLock.h"
 #include "platform/ServitaLogs.h"
 #include "platform/StandardStreams.h"
@@ -54,6 +56,8 @@ struct Platform {
   DeviceRegistry& registry;
   DriverConnections& drivers;
   PurgeableSpace& purgeableSpace;
+  ReportingChannels& reportingChannels;
+  NetworkUsage& networkUsage;
   InstalledApplications& applications;
   LocaleService& locale;
   LibraryLoader& libraries;

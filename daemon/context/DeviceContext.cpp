@@ -37,6 +37,7 @@ bool DeviceContext::determineMultiUserMode() {
 }
 
 const std::string* DeviceContext::GetHomeDirectoryPath() {
+  const std::scoped_lock lock(homeMutex_);
   if (home_) return &*home_;
   if (!multiUser_) multiUser_ = determineMultiUserMode();
   if (*multiUser_) {

@@ -1,7 +1,8 @@
 // Probes that tell what kind of device this is and where its counters data lie.
 //
-// What doesn't change during the life of the process is asked once and kept here. Only
-// PLIsInternalDevice may be called from several threads; the others belong to the main thread.
+// What doesn't change during the life of the process is asked once and kept here.
+// PLIsInternalDevice and GetHomeDirectoryPath may be called from several threads; the others belong
+// to the main thread.
 #pragma once
 
 #include <cstdint>
@@ -42,6 +43,7 @@ class DeviceContext {
   platform::Platform& platform_;
   std::once_flag internalOnce_;
   bool internal_ = false;
+  std::mutex homeMutex_;  // over the two that follow
   std::optional<bool> multiUser_;
   std::optional<std::string> home_;
   platform::QNSPreferencesGetIntegerValueFunction* readInteger_ = nullptr;

@@ -12,7 +12,7 @@ namespace {
 constexpr int kDaysKept = 60;
 constexpr std::size_t kMostSamplesInRow = 65536;
 
-void record(sqlite::Connection& connection, const CounterChange& change) {
+void write(sqlite::Connection& connection, const CounterChange& change) {
   switch (change.kind) {
     case CounterChange::Kind::set:
       sqlite::Statement(connection,
@@ -109,7 +109,26 @@ Date CounterStore::PLDateFromDaysSince1970(std::int32_t day) {
   return {static_cast<double>(day) * static_cast<double>(kSecondsPerDay)};
 }
 
+void CounterStore::PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) {
+  record(CounterChange::Kind::set, key, value);
+}
+
+void CounterStore::PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) {
+  record(CounterChange::Kind::add, key, value);
+}
+
+void CounterStore::record(CounterChange::Kind kind, std::string_view key, std::int64_t value) {
+  const CounterChange change{.kind = kind, .key = key, .day = PLDaysSince1970(), .amount = value};
+  const std::string error = apply({&change, 1});
+  const std::scoped_lock lock(mutex_);
+  if (!error.empty() && error != clientError_) {
+    place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());
+  }
+  clientError_ = error;
+}
+
 void CounterStore::PLClientCheckpoint() {
+  const std::scoped_lock lock(mutex_);
   const std::string error =
       database_.write(CounterDatabase::Missing::skip, [](sqlite::Connection& connection) {
         {
@@ -127,14 +146,15 @@ std::string CounterStore::apply(std::span<const CounterChange> changes) {
   for (const CounterChange& change : changes) {
     if (std::isnan(change.sample)) return "not a number can't be recorded as a sample";
   }
+  const std::scoped_lock lock(mutex_);
   return database_.write(
       CounterDatabase::Missing::create, [changes](sqlite::Connection& connection) {
         if (changes.size() == 1) {
-          record(connection, changes.front());
+          write(connection, changes.front());
           return;
         }
         sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
-        for (const CounterChange& change : changes) record(connection, change);
+        for (const CounterChange& change : changes) write(connection, change);
         transaction.commit();
       });
 }

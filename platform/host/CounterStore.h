@@ -1,6 +1,7 @@
 // The counters service and the history store: an SQLite database below the device root.
 #pragma once
 
+#include <mutex>
 #include <span>
 
 #include "platform/Clock.h"
@@ -21,7 +22,7 @@ struct CounterChange {
   std::int32_t seconds = 0;  // push: the second within the day
 };
 
-// For one thread. Nothing is opened before it is needed.
+// For any thread; each history for one. Nothing is opened before it is needed.
 class CounterStore : public CountersService, public HistoryStore {
  public:
   // `home` yields the device path of the folder that holds the counters' data; while it yields none
@@ -38,6 +39,10 @@ class CounterStore : public CountersService, public HistoryStore {
   // write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
+  // Failures are logged, the same one once for as long as it lasts.
+  void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
+  void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
+
   // The history lives no longer than the store.
   std::unique_ptr<PLHistory> initWithDefaultPath() override { return history(); }
   std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
@@ -50,9 +55,13 @@ class CounterStore : public CountersService, public HistoryStore {
   std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
 
  private:
+  void record(CounterChange::Kind kind, std::string_view key, std::int64_t value);
+
   CounterPlace place_;
   Clock& clock_;
+  std::mutex mutex_;  // over the two that follow
   CounterDatabase database_;
+  std::string clientError_;
 };
 
 }  // namespace platform::host

@@ -14,8 +14,10 @@
 #include "platform/host/HostKernelSnapshots.h"
 #include "platform/host/HostLibraryLoader.h"
 #include "platform/host/HostLocale.h"
+#include "platform/host/HostNetworkUsage.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/host/HostPurgeableSpace.h"
+#include "platform/host/HostReportingChannels.h"
 #include "platform/host/HostStandardStreams.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
@@ -73,17 +75,44 @@ struct Host::Services {
   HostKernelSnapshots snapshots{root};
   HostDeviceRegistry registry{root, codec, log};
   HostPurgeableSpace purgeableSpace{root, codec, log};
+  HostReportingChannels reportingChannels{root, codec, log};
   HostApplications applications{root, codec, log};
   HostLocale locale{root, codec, log};
   HostLibraryLoader libraries{root, preferences};
   RunLockFile runLock{root, log};
+  HostNetworkUsage networkUsage{root, codec, log};  // last: its replies use the others
 
-  Platform platform{log,          streams,    clock,          digest,           codec,
-                    files,        counters,   counters,       preferences,      preferences,
-                    preferences,  submission, structuredLogs, servitaLogs,      bus,
-                    bus,          bus,        eventSink,      deviceProperties, systemVersion,
-                    kernel,       snapshots,  registry,       registry,         purgeableSpace,
-                    applications, locale,     libraries,      runLock};
+  Platform platform{log,
+                    streams,
+                    clock,
+                    digest,
+                    codec,
+                    files,
+                    counters,
+                    counters,
+                    preferences,
+                    preferences,
+                    preferences,
+                    submission,
+                    structuredLogs,
+                    servitaLogs,
+                    bus,
+                    bus,
+                    bus,
+                    eventSink,
+                    deviceProperties,
+                    systemVersion,
+                    kernel,
+                    snapshots,
+                    registry,
+                    registry,
+                    purgeableSpace,
+                    reportingChannels,
+                    networkUsage,
+                    applications,
+                    locale,
+                    libraries,
+                    runLock};
 };
 
 Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {

@@ -23,7 +23,8 @@ class Host {
  public:
   explicit Host(const HostOptions& options = HostOptions::fromEnvironment());
 
-  // Flushes the preferences and writes every event that was sent.
+  // Waits for a reply of the usage service that has begun, flushes the preferences and writes every
+  // event that was sent.
   ~Host();
 
   // The services live as long as the host.
@@ -32,7 +33,8 @@ class Host {
   const DeviceRoot& root() const;
 
   // Tells where the counters' data lie: `home` yields a device path (borrowed), or null while there
-  // is no such place. Until it is told, there are no counters.
+  // is no such place. Until it is told, there are no counters. Called from any thread, to the end
+  // of the host.
   void keepCountersBelow(std::function<const std::string*()> home);
 
  private:

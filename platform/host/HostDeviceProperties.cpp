@@ -32,12 +32,12 @@ std::optional<std::string> machineName() {
   return ::uname(&host) == 0 ? std::optional<std::string>(host.machine) : std::nullopt;
 }
 
-// A size in bytes; what is missing or negative is 0.
-std::uint64_t bytes(const Dictionary& usage, const char* key) {
+// A size in bytes; what is negative is 0.
+std::optional<std::uint64_t> bytes(const Dictionary& usage, const char* key) {
   const Number* size = usage.number(key);
-  const bool negative =
-      size != nullptr && size->type() != Number::Type::uint64 && size->int64Value() < 0;
-  return size != nullptr && !negative ? size->uint64Value() : 0;
+  if (size == nullptr) return std::nullopt;
+  const bool negative = size->type() != Number::Type::uint64 && size->int64Value() < 0;
+  return negative ? 0 : size->uint64Value();
 }
 
 }  // namespace

@@ -259,6 +259,15 @@ void* FakeDevice::symbol(void*, const char* name) {
 
 Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std::byte> buffer) {
   reads.emplace_back(name);
+  if (const auto once = deliveries.find(name); once != deliveries.end() && !once->second.empty()) {
+    const Delivery delivery = std::move(once->second.front());
+    once->second.pop_front();
+    rooms.push_back(buffer.size());
+    if (delivery.error != 0) return {delivery.error, 0};
+    const std::size_t length = std::min(buffer.size(), delivery.bytes.size());
+    std::copy_n(delivery.bytes.begin(), length, buffer.begin());
+    return {0, length};
+  }
   const auto found = integers.find(name);
   if (found == integers.end()) return {ENOENT, 0};
   const std::size_t length = std::min<std::size_t>(buffer.size(), 8);
@@ -268,12 +277,64 @@ Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std
   return {0, length};
 }
 
+void FakeNetworkUsage::queryAllProcesses(Reply reply) {
+  if (repliesAtOnce) return reply(records ? &*records : nullptr);
+  pending.push_back(std::move(reply));
+}
+
+std::vector<ReportChannel> FakeReportingChannels::copyChannels(std::uint64_t categoryMask) {
+  std::vector<ReportChannel> channels;
+  if ((categoryMask & category) == 0) return channels;
+  for (const ChannelSample& sample : samples) channels.push_back(sample.channel);
+  return channels;
+}
+
+std::unique_ptr<ChannelSubscription> FakeReportingChannels::subscribe(
+    const std::vector<ReportChannel>& channels) {
+  struct Subscription : ChannelSubscription {
+    explicit Subscription(FakeReportingChannels& f) : facility(f) {}
+    FakeReportingChannels& facility;
+    std::optional<std::vector<ChannelSample>> createSamples() override {
+      return facility.delivers ? std::optional(facility.samples) : std::nullopt;
+    }
+  };
+  subscribed.clear();
+  for (const ReportChannel& channel : channels) subscribed.push_back(channel.name);
+  return subscribes ? std::make_unique<Subscription>(*this) : nullptr;
+}
+
 FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest)
-    : log(lowest), platform{log,         streams,    clock,        digest,       codec,
-                            files,       counters,   history,      preferences,  preferences,
-                            preferences, submission, housekeeping, housekeeping, service,
-                            service,     service,    eventra,      device,       device,
-                            kernel,      snapshots,  registry,     registry,     purgeableSpace,
-                            device,      device,     device,       runLock} {}
+    : log(lowest),
+      platform{log,
+               streams,
+               clock,
+               digest,
+               codec,
+               files,
+               counters,
+               history,
+               preferences,
+               preferences,
+               preferences,
+               submission,
+               housekeeping,
+               housekeeping,
+               service,
+               service,
+               service,
+               eventra,
+               device,
+               device,
+               kernel,
+               snapshots,
+               registry,
+               registry,
+               purgeableSpace,
+               reportingChannels,
+               networkUsage,
+               device,
+               device,
+               device,
+               runLock} {}
 
 }  // namespace platform::fakes

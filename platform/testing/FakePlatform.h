@@ -48,6 +48,15 @@ class FakeCounters : public CountersService {
   Date PLDateFromDaysSince1970(std::int32_t day) override { return {day * 86400.0}; }
   void PLClientCheckpoint() override { journal_.push_back("checkpoint"); }
 
+  // What was recorded, in order: "set <key> <value>", "add <key> <value>".
+  std::vector<std::string> records;
+  void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override {
+    records.push_back("set " + std::string(key) + " " + std::to_string(value));
+  }
+  void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override {
+    records.push_back("add " + std::string(key) + " " + std::to_string(value));
+  }
+
  private:
   Journal& journal_;
 };
@@ -228,6 +237,14 @@ class FakeKernel : public Kernel {
   std::optional<Timebase> ratio = Timebase{1, 1};
   Process running{"morvend", 77};
 
+  // Values that are delivered once each, before the integers: what each read gets.
+  struct Delivery {
+    int error = 0;
+    std::vector<std::byte> bytes;
+  };
+  std::map<std::string, std::deque<Delivery>, std::less<>> deliveries;
+  std::vector<std::size_t> rooms;  // the buffers' sizes of these reads
+
   ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override;
   std::uint64_t pageSize() override { return bytesPerPage; }
   std::uint64_t absoluteTime() override { return ticks; }
@@ -256,6 +273,26 @@ class FakePurgeableSpace : public PurgeableSpace {
     lastQuery = query;
     return answer;
   }
+};
+
+// Replies within the query, or leaves the replies to the test.
+class FakeNetworkUsage : public NetworkUsage {
+ public:
+  std::optional<Array> records;
+  bool repliesAtOnce = true;
+  std::vector<Reply> pending;
+  void queryAllProcesses(Reply reply) override;
+};
+
+class FakeReportingChannels : public ReportingChannels {
+ public:
+  std::vector<ChannelSample> samples;  // of all channels; they are all of one category
+  std::uint64_t category = 0x100;
+  bool subscribes = true, delivers = true;
+  std::vector<std::string> subscribed;  // the names of the channels last subscribed to
+  std::vector<ReportChannel> copyChannels(std::uint64_t categoryMask) override;
+  std::unique_ptr<ChannelSubscription> subscribe(
+      const std::vector<ReportChannel>& channels) override;
 };
 
 class FakeStreams : public StandardStreams {
@@ -295,6 +332,8 @@ class FakePlatform {
   FakeSnapshots snapshots;
   FakeDeviceRegistry registry;
   FakePurgeableSpace purgeableSpace;
+  FakeReportingChannels reportingChannels;
+  FakeNetworkUsage networkUsage;
   FakeRunLock runLock;
   Platform platform;
 };

@@ -213,6 +213,38 @@ struct Storage : KernelSnapshots, PurgeableSpace {
   }
 };
 
+struct Usage : NetworkUsage {
+  Usage(NetworkUsage& i, Plan& p) : inner(i), plan(p) {}
+  NetworkUsage& inner;
+  Plan& plan;
+  void queryAllProcesses(Reply reply) override {
+    if (plan.fails()) return reply(nullptr);
+    inner.queryAllProcesses(std::move(reply));
+  }
+};
+
+struct Channels : ReportingChannels {
+  Channels(ReportingChannels& i, Plan& p) : inner(i), plan(p) {}
+  struct Subscription : ChannelSubscription {
+    Subscription(std::unique_ptr<ChannelSubscription> i, Plan& p) : inner(std::move(i)), plan(p) {}
+    std::unique_ptr<ChannelSubscription> inner;
+    Plan& plan;
+    std::optional<std::vector<ChannelSample>> createSamples() override {
+      return plan.fails() ? std::nullopt : inner->createSamples();
+    }
+  };
+  ReportingChannels& inner;
+  Plan& plan;
+  std::vector<ReportChannel> copyChannels(std::uint64_t categoryMask) override {
+    return plan.fails() ? std::vector<ReportChannel>() : inner.copyChannels(categoryMask);
+  }
+  std::unique_ptr<ChannelSubscription> subscribe(
+      const std::vector<ReportChannel>& channels) override {
+    auto subscription = plan.fails() ? nullptr : inner.subscribe(channels);
+    return subscription ? std::make_unique<Subscription>(std::move(subscription), plan) : nullptr;
+  }
+};
+
 }  // namespace
 
 struct FaultInjector::Services {
@@ -226,6 +258,8 @@ struct FaultInjector::Services {
         namedServices(inner.namedServices, plan),
         device(inner, plan),
         kernel(inner.kernel, plan),
+        reportingChannels(inner.reportingChannels, plan),
+        networkUsage(inner.networkUsage, plan),
         registry(inner, plan),
         storage(inner, plan),
         platform{inner.log,
@@ -253,6 +287,8 @@ struct FaultInjector::Services {
                  registry,
                  registry,
                  storage,
+                 reportingChannels,
+                 networkUsage,
                  inner.applications,
                  inner.locale,
                  device,
@@ -268,6 +304,8 @@ struct FaultInjector::Services {
   Listeners namedServices;
   Device device;
   KernelValues kernel;
+  Channels reportingChannels;
+  Usage networkUsage;
   Registry registry;
   Storage storage;
   Platform platform;

@@ -9,8 +9,8 @@ namespace platform::fakes {
 
 // Decorated are the services that have a failure to report: files, property lists, history,
 // preferences (a read finds nothing), submission, events, listener, device properties, system
-// version, kernel, libraries, registry, drivers, snapshots and purgeable space. All other services
-// are the inner platform's own.
+// version, kernel, libraries, registry, drivers, snapshots, purgeable space, reporting channels and
+// network usage (a reply without records). All other services are the inner platform's own.
 class FaultInjector {
  public:
   explicit FaultInjector(Platform& inner);

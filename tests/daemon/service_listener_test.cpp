@@ -50,6 +50,7 @@ class ServiceTest : public ::testing::Test {
     RunProcess(platform.platform, context, 1, arguments);
     Lines lines;
     for (const std::string& line : platform.log.lines()) {
+      if (support::isAboutStorage(line)) continue;
       if (line.starts_with("default: ") || line.starts_with("error: ")) {
         lines.push_back(line.substr(line.find(' ') + 1));
       }

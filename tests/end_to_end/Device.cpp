@@ -59,7 +59,20 @@ void Device::fill() {
                                                setting("guest", "g")}}}}});
   writePropertyList("device/system-version.plist",
                     Dictionary{{"ProductBuildVersion", "A1"}, {"ProductVersion", "1.0"}});
-  writePropertyList("device/kernel.plist", Dictionary());
+  writePropertyList("device/kernel.plist",
+                    Dictionary{{"kern.bootsessionuuid", today_ % 2 == 0 ? "0" : "1"}});
+  writePropertyList("device/properties.plist",
+                    Dictionary{{"DiskUsage", Dictionary{{"TotalDiskCapacity", 5 << 20},
+                                                        {"TotalDataAvailable", 3 << 20}}}});
+  writePropertyList(
+      "device/report-channels.plist",
+      Array{Dictionary{{"Name", "channel"}, {"Category", 0x100}, {"Format", 1}, {"Value", 7}}});
+  writePropertyList(
+      "device/network-usage.plist",
+      Dictionary{{"Records", Array{Dictionary{{"procName", "process"},
+                                              {"since", platform::Date{today_ * 86400.0}},
+                                              {"wifiInBytes", 2048}}}}});
+  root_->write("device/ecc-events/1", std::string("\1\0", 2));
   writePropertyList("device/locale.plist", Dictionary{{"PreferredLanguages", Array{"de-AT"}},
                                                       {"Localizations", Array{"en", "de"}},
                                                       {"CountryCode", "AT"}});
@@ -145,18 +158,17 @@ Dictionary Device::expectedSections() const {
       {"PLStartDate", platform::Date{(today_ - 1) * 86400.0}}};
 }
 
-Lines Device::history() const {
+Lines Device::rows(std::int32_t first, std::int32_t last) const {
   support::HostOnRoot host(root_->path());
   Lines rows;
   const auto history = host.platform().history.initWithDefaultPath();
   history->scalarsForKeyPrefix(
-      "", INT32_MIN, INT32_MAX,
-      [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
+      "", first, last, [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
         rows.push_back(
             format("%d %s %lld", day, std::string(key).c_str(), static_cast<long long>(value)));
       });
   history->distributionsForKeyPrefix(
-      "", INT32_MIN, INT32_MAX, [&](std::string_view key, std::int32_t day, auto& samples, bool&) {
+      "", first, last, [&](std::string_view key, std::int32_t day, auto& samples, bool&) {
         std::string row = format("%d %s", day, std::string(key).c_str());
         for (auto block = samples.getNextValues(); !block.values.empty();
              block = samples.getNextValues()) {

@@ -29,7 +29,8 @@ class Device {
   Device();
 
   // Counters of three days, whitelist, consent, tasking for three users, device files, logs to be
-  // rolled and dumped, the module.
+  // rolled and dumped, the module, an ECC event, a reporting channel, a process that used the
+  // network. It is a day on which storage counters go to the analytics sink.
   void fill();
 
   const support::TemporaryFolder& root() const { return *root_; }
@@ -61,10 +62,14 @@ class Device {
   // creation date and the collectors' values.
   Dictionary expectedSections() const;
 
-  // Every row of the history as one text a row.
-  Lines history() const;
+  // Every row of the history before today as one text a row.
+  Lines history() const { return rows(INT32_MIN, today_ - 1); }
+
+  // Today's rows: what the runs have recorded.
+  Lines recorded() const { return rows(today_, INT32_MAX); }
 
  private:
+  Lines rows(std::int32_t first, std::int32_t last) const;
   faults::Strings environment(const std::string& bus) const;
 
   std::unique_ptr<support::TemporaryFolder> root_;

@@ -61,6 +61,18 @@ TEST(DailyRun, SubmitsTheDayOnceAndLeavesTheRecordsBehind) {
   EXPECT_EQ(device.names("var/log/servita"), (Lines{"a.log.1", "a.log.2"}));
   const std::string events = device.root().read("var/spool/morvend/events.jsonl");
   EXPECT_EQ(std::count(events.begin(), events.end(), '\n'), 3);
+  Lines keys;
+  for (const std::string& row : device.recorded()) keys.push_back(row.substr(row.find(' ') + 1));
+  const Lines recorded{"com.norba.tarvenn.DiskUsageUserBlocksFree 3",
+                       "com.norba.tarvenn.DiskUsageUserTotalBlocks 5",
+                       "com.norba.velquist.channel 7", "datausage.wifiInKB.com.norba.process 2"};
+  EXPECT_EQ(keys, recorded);
+  EXPECT_TRUE(device.names("device/ecc-events").empty());
+  const Lines structured = device.names("var/spool/morvend/structured");
+  ASSERT_EQ(structured.size(), 1u);
+  const std::string line = device.root().read("var/spool/morvend/structured/" + structured[0]);
+  EXPECT_TRUE(line.starts_with("{\"type\": 172, ")) << line;
+  EXPECT_TRUE(line.ends_with("\"data\": {\"id\": 1, \"count\": 0}}\n")) << line;
 
   const auto second = device.run("morvend", {"-d"});
   EXPECT_EQ(linesOf(second.standardError),
@@ -84,7 +96,8 @@ TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
   }
   EXPECT_FALSE(std::filesystem::exists(missing.root().path()));
   EXPECT_EQ(empty.record(kGateRecord), Value(empty.today() - 1));
-  EXPECT_TRUE(empty.names("var/mobile").empty()) << "reading made a database";
+  EXPECT_EQ(empty.recorded().size(), 2u) << "disk usage";
+  EXPECT_TRUE(empty.history().empty());
 }
 
 // A timer's run beside another one: the second waits, and then finds the gate closed.
@@ -139,6 +152,7 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
   const std::string written[] = {"var/run/morvend.lock",
                                  "var/run",
                                  "var/preferences/mobile/com.norba.pellorand.morvend.plist",
+                                 "var/preferences/mobile/com.norba.quenset.morvend.plist",
                                  "var/preferences/mobile",
                                  "var/preferences/guest/com.example.plist",
                                  "var/preferences/guest",
@@ -146,6 +160,8 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
                                  "var/spool/morvend/submitted",
                                  "var/spool/morvend",
                                  "var/spool",
+                                 "var/spool/morvend/structured",
+                                 "device/ecc-events",
                                  "var/log/servita/a.log",
                                  "var/log/servita/a.log.2",
                                  support::kCountersDatabase,

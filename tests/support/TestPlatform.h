@@ -14,6 +14,11 @@ struct RealCodecs {
   platform::host::MD5Digest digest;
 };
 
+// Whether a line of the log is the storage library's, or about it: every daily run has some.
+inline bool isAboutStorage(const std::string& line) {
+  return line.find("NANDInfo: ") != line.npos || line.find(" nand info") != line.npos;
+}
+
 class TestPlatform : private RealCodecs, public platform::fakes::FakePlatform {
  public:
   explicit TestPlatform(platform::LogLevel lowest = platform::LogLevel::debug)

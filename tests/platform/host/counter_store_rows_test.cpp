@@ -53,6 +53,24 @@ TEST_F(CounterStoreRows, SumsSaturateInsteadOfWrapping) {
   }
 }
 
+TEST_F(CounterStoreRows, ClientsRecordForTodayAndAFailureIsSaidOnce) {
+  here.store.PLClientAddValueForScalarKey("added", 5);
+  here.store.PLClientAddValueForScalarKey("added", -7);
+  here.store.PLClientSetValueForScalarKey("set", 5);
+  here.store.PLClientSetValueForScalarKey("set", INT64_MIN);
+  here.clock.seconds += 86400;
+  here.store.PLClientAddValueForScalarKey("added", 1);
+  EXPECT_EQ(here.rows(),
+            (Lines{"20000 added -2", "20000 set -9223372036854775808", "20001 added 1"}));
+  EXPECT_TRUE(here.log.lines().empty());
+  std::filesystem::remove_all(folder / "var");
+  std::ofstream(folder / "var");
+  StoreFixture blocked(folder.path());
+  for (int i = 0; i < 3; ++i) blocked.store.PLClientSetValueForScalarKey("set", i);
+  EXPECT_EQ(blocked.log.count("error: Could not record counters: /var/mobile"), 1);
+  EXPECT_EQ(blocked.log.lines().size(), 1u);
+}
+
 TEST_F(CounterStoreRows, RowsComeByDayThenBytesOfTheKeyWithinTheBounds) {
   const std::string nul("a\0b", 3);
   for (const std::string_view key : {"b", "\xff", "B", "a", ""}) {

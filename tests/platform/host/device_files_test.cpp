@@ -6,8 +6,10 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
+#include <future>
 #include <regex>
 #include <set>
+#include <thread>
 
 #include "platform/FaultwatchSupport.h"
 #include "platform/host/DeviceFile.h"
@@ -16,7 +18,9 @@
 #include "platform/host/HostKernel.h"
 #include "platform/host/HostLibraryLoader.h"
 #include "platform/host/HostLocale.h"
+#include "platform/host/HostNetworkUsage.h"
 #include "platform/host/HostPropertyListCodec.h"
+#include "platform/host/HostReportingChannels.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
 #include "platform/host/RandomUUID.h"
@@ -298,6 +302,57 @@ TEST_F(DeviceFiles, ApplicationsAreTheDictionariesOfTheArray) {
              Array{Dictionary{{"Type", "User"}}, Dictionary{{"Type", "user"}}, "x", Dictionary{}});
   HostApplications(root, codec, log).enumerateBundles(collect);
   EXPECT_EQ(types, (std::vector{BundleType::user, BundleType::system, BundleType::system}));
+}
+
+TEST_F(DeviceFiles, ReportChannelsAreThoseOfACategoryWithANameAndAValue) {
+  HostReportingChannels missing(root, codec, log);
+  EXPECT_TRUE(missing.copyChannels(~0U).empty());
+  EXPECT_EQ(missing.subscribe({}), nullptr);
+  const auto channel = [](Value name, Value category, Value value) {
+    return Dictionary{{"Name", name}, {"Category", category}, {"Format", 1}, {"Value", value}};
+  };
+  writePlist("device/report-channels.plist",
+             Array{"x", channel("a", 0x300, 5), channel("other", 0x200, 6), channel(7, 0x100, 7),
+                   channel("text", 0x100, "8"), channel("untold", "0x100", 9), Dictionary{},
+                   Dictionary{{"Name", "b"}, {"Category", 0x100}, {"Value", std::int64_t{-9}}}});
+  HostReportingChannels facility(root, codec, log);
+  const auto channels = facility.copyChannels(0x100);
+  auto asked = channels;
+  asked.push_back({99, 1, "made up"});
+  Texts found;
+  for (const auto& one : channels) found.push_back(one.name + " " + std::to_string(one.format));
+  EXPECT_EQ(found, (Texts{"a 1", "text 1", "b 0"}));
+  found.clear();
+  const auto samples = facility.subscribe(asked)->createSamples();
+  for (const auto& [one, value] : *samples) {
+    found.push_back(one.name + " " + std::to_string(one.format) + " " + std::to_string(value));
+  }
+  EXPECT_EQ(found, (Texts{"a 1 5", "b 0 -9"}));
+}
+
+TEST_F(DeviceFiles, NetworkUsageIsRepliedOnAThreadOfTheService) {
+  using Answer = std::optional<Array>;
+  const auto ask = [this] {
+    std::promise<Answer> answer;
+    HostNetworkUsage service(root, codec, log);
+    service.queryAllProcesses([&, asker = std::this_thread::get_id()](const Array* records) {
+      EXPECT_NE(std::this_thread::get_id(), asker);
+      answer.set_value(records != nullptr ? Answer(*records) : Answer());
+    });
+    return answer.get_future().get();
+  };
+  EXPECT_EQ(ask(), Answer());
+  const Array records{Dictionary{{"procName", "p"}}, 7};
+  const Value delays[] = {0, -1e300, std::numeric_limits<double>::quiet_NaN(), "text", 0.001};
+  for (const Value& delay : delays) {
+    writePlist("device/network-usage.plist",
+               Dictionary{{"Records", records}, {"ReplyDelay", delay}});
+    EXPECT_EQ(ask(), records);
+  }
+  for (const Value& wrong : {Value(Dictionary{{"Records", "text"}}), Value("text")}) {
+    writePlist("device/network-usage.plist", wrong);
+    EXPECT_EQ(ask(), Answer());
+  }
 }
 
 struct CountingPreferences : PreferenceStore {

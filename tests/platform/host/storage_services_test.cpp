@@ -50,7 +50,7 @@ TEST_F(StorageServices, PurgeableSpaceIsPresentWithItsFileAndAnswersWithADiction
 }
 
 TEST_F(StorageServices, DiskUsageIsTheDevicesElseTheRootsFileSystem) {
-  using Usage = std::array<std::uint64_t, 3>;
+  using Usage = std::array<std::optional<std::uint64_t>, 3>;
   struct statvfs host;
   ASSERT_EQ(::statvfs(folder.path().c_str(), &host), 0);
   const std::uint64_t total = host.f_blocks * host.f_frsize;
@@ -64,7 +64,8 @@ TEST_F(StorageServices, DiskUsageIsTheDevicesElseTheRootsFileSystem) {
        Usage{std::uint64_t{1} << 40, 7, UINT64_MAX}},
       {{{"DiskUsage",
          Dictionary{{"TotalDiskCapacity", std::int64_t{-1}}, {"TotalDataAvailable", -2.5}}}},
-       Usage{0, 0, 0}},
+       Usage{0, 0, std::nullopt}},
+      {{{"DiskUsage", Dictionary{{"TotalDiskCapacity", "text"}}}}, Usage{}},
       {{{"DiskUsage", "plenty"}}, std::nullopt},
   };
   for (const auto& row : rows) {

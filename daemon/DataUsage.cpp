@@ -1,0 +1,50 @@
+#include "daemon/DataUsage.h"
+
+#include <memory>
+#include <semaphore>
+
+#include "daemon/DataUsageChanges.h"
+#include "platform/CivilDate.h"
+
+namespace morvend {
+
+using platform::Array;
+using platform::Dictionary;
+using platform::LogLevel;
+using platform::Platform;
+
+namespace {
+
+constexpr char kBaseline[] = "netUsageBaseline";
+constexpr char kDomain[] = "com.norba.quenset.morvend";
+
+void handleReply(const Platform& platform, const Array* records) {
+  const std::int32_t today = platform.counters.PLDaysSince1970();
+  const auto stored = platform.preferences.QNSPreferencesGetValue(kBaseline, kDomain);
+  const auto* baseline = stored ? stored->as<Dictionary>() : nullptr;
+  DataUsageChanges changes = dataUsageChanges(
+      baseline != nullptr ? *baseline : Dictionary(), records != nullptr ? *records : Array(),
+      platform.counters.PLDateFromDaysSince1970(platform::dayBefore(today)));
+  for (const CounterAddition& addition : changes.additions) {
+    platform.counters.PLClientAddValueForScalarKey(addition.key, addition.value);
+  }
+  const platform::Value value(std::move(changes.baseline));
+  platform.preferences.QNSPreferencesSetValue(kBaseline, &value, kDomain);
+  platform.preferences.QNSPreferencesSynchronize(kDomain);
+}
+
+}  // namespace
+
+void CollectDataUsage(Platform& platform, std::chrono::nanoseconds patience) {
+  // Shared with the reply, which may come when this has returned.
+  const auto done = std::make_shared<std::binary_semaphore>(0);
+  platform.networkUsage.queryAllProcesses([platform, done](const Array* records) {
+    handleReply(platform, records);
+    done->release();
+  });
+  if (!done->try_acquire_for(patience)) {
+    platform.log.log(LogLevel::standard, "Vexmor timed out, no datausage available");
+  }
+}
+
+}  // namespace morvend

@@ -1,0 +1,174 @@
+#include "daemon/DailyTelemetry.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+
+#include "NANDInfo/NANDInfo.h"
+#include "daemon/EccEvents.h"
+#include "support/ControllerBuffers.h"
+#include "support/TestPlatform.h"
+
+namespace morvend {
+namespace {
+
+using platform::ChannelSample;
+using platform::Dictionary;
+using platform::ReportChannel;
+using Lines = std::vector<std::string>;
+
+constexpr char kNextEvent[] = "kern.next_ecc_event";
+
+// An event of which every data entry is its index, plus one.
+support::Bytes event(std::uint8_t id, std::uint8_t count) {
+  support::Bytes bytes;
+  support::put(bytes, id | count << 8 | 0xFFFF0000U, 8);
+  for (std::uint64_t i = 1; i <= 8; ++i) support::put(bytes, i, 8);
+  return bytes;
+}
+
+struct DailyTelemetryTest : ::testing::Test {
+  // What the telemetry records under the keys that begin so.
+  Lines recorded(const std::string& beginning) {
+    platform.counters.records.clear();
+    CollectDailyTelemetry(platform.platform);
+    Lines lines;
+    for (const std::string& line : platform.counters.records) {
+      if (line.starts_with("set " + beginning)) lines.push_back(line.substr(4 + beginning.size()));
+    }
+    return lines;
+  }
+  Lines structuredLogs() {
+    platform.journal.clear();
+    CollectEccEvents(platform.platform);
+    return platform.journal;
+  }
+
+  support::TestPlatform platform;
+};
+
+TEST_F(DailyTelemetryTest, DiskUsageIsInWholeMebibytesOrMinusOne) {
+  using Usage = platform::DeviceProperties::DiskUsage;
+  constexpr std::uint64_t k64GiB = std::uint64_t{64} << 30;
+  const struct {
+    std::optional<Usage> usage;
+    const char *total, *free;
+  } rows[] = {{{}, "-1", "-1"},
+              {Usage{}, "-1", "-1"},
+              {Usage{k64GiB, 0, 1}, "65536", "0"},
+              {Usage{k64GiB - 1, {}, 1}, "65535", "-1"},
+              {Usage{{}, UINT64_MAX, {}}, "-1", "-1"}};
+  for (const auto& row : rows) {
+    platform.device.usage = row.usage;
+    EXPECT_EQ(
+        recorded("com.norba.tarvenn.DiskUsageUser"),
+        (Lines{std::string("TotalBlocks ") + row.total, std::string("BlocksFree ") + row.free}));
+  }
+}
+
+// What the library answers goes out as it is, or not at all.
+TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReportsAnError) {
+  constexpr char kFailure[] =
+      "default: error reading nand info, error 1 with message Unable to parse buffer";
+  // A thread's begin, name, statistics and end.
+  auto& snapshot = platform.snapshots.snapshot.emplace();
+  const auto item = [&](std::uint32_t type, const support::Bytes& payload) {
+    support::put(snapshot, type | std::uint64_t{payload.size()} << 32, 8);
+    support::put(snapshot, 1, 8);
+    snapshot.insert(snapshot.end(), payload.begin(), payload.end());
+  };
+  item(0x13, support::words({0}));
+  item(0x909, support::words({0x6F706177735F4D56, 0x7475}));
+  item(0x901, support::words({1, 2, 3, 4096}));
+  constexpr std::size_t kDiskUsage = 2;  // recorded before
+  EXPECT_EQ(recorded("").size(), kDiskUsage);
+  EXPECT_EQ(platform.log.count(kFailure), 1);
+
+  platform.registry.add({"NorbaEmbeddedNVMeController"});
+  for (const std::uint32_t method : {8, 9}) {
+    platform.registry.alwaysTunnels(method, 13, 0, support::words({support::header(1, 1), 7}));
+  }
+  Dictionary info = *NANDInfo::CopyNANDInfo(platform.platform);
+  EXPECT_GT(info.size(), 20u);
+  info.set("TLM_VMFreezer_bytesWritten", 4096);
+  info.set("com.norba.NANDInfo.VMFreezer.NumPhysicalWrites", 4096);
+  Lines expected;
+  for (const auto& [key, value] : info) expected.push_back(key + " " + description(value));
+  Lines lines = recorded("");
+  lines.erase(lines.begin(), lines.begin() + kDiskUsage);
+  EXPECT_EQ(lines, expected);
+  EXPECT_EQ(platform.log.count(kFailure), 1);
+  EXPECT_EQ(platform.registry.problems(), Lines());
+}
+
+TEST_F(DailyTelemetryTest, AnEccEventIsLoggedWithTheEntriesThatCount) {
+  for (const int count : {0, 2, 8, 9, 255}) {
+    Dictionary expected{{"id", 3}, {"count", count}};
+    for (int i = 0; i < std::min(count, 8); ++i) expected.set("reg" + std::to_string(i), i + 1);
+    const support::Bytes record = event(3, static_cast<std::uint8_t>(count));
+    EXPECT_EQ(eccEventData(std::span(record).first<kEccEventRecordSize>()), expected);
+  }
+  support::Bytes record = event(255, 8);
+  record.back() = std::byte{0x80};
+  const Dictionary data = eccEventData(std::span(record).first<kEccEventRecordSize>());
+  EXPECT_EQ(*data.find("reg7"), platform::Value(INT64_MIN + 8));
+}
+
+TEST_F(DailyTelemetryTest, AtMostTenEccEventsAreLoggedInARun) {
+  auto& pending = platform.kernel.deliveries[kNextEvent];
+  pending.resize(12, {0, event(1, 0)});
+  EXPECT_EQ(structuredLogs().size(), 10u);
+  EXPECT_EQ(pending.size(), 2u);
+  EXPECT_EQ(structuredLogs().size(), 2u);
+  EXPECT_TRUE(structuredLogs().empty());
+  EXPECT_TRUE(platform.log.lines().empty());
+}
+
+// What a read doesn't fill is still that of the event before.
+TEST_F(DailyTelemetryTest, AnEccReadHasTheLengthOfTheOneBefore) {
+  support::Bytes shortened = event(2, 2);
+  shortened.resize(16);
+  shortened[8] = std::byte{9};
+  platform.kernel.deliveries[kNextEvent] = {{0, event(1, 1)}, {0, shortened}, {0, event(3, 2)}};
+  const auto structured = [](const Dictionary& data) {
+    return "structured 172 " + description(platform::Value(data));
+  };
+  EXPECT_EQ(structuredLogs(),
+            (Lines{structured({{"id", 1}, {"count", 1}, {"reg0", 1}}),
+                   structured({{"id", 2}, {"count", 2}, {"reg0", 9}, {"reg1", 2}}),
+                   structured({{"id", 3}, {"count", 2}, {"reg0", 1}, {"reg1", 2}})}));
+  EXPECT_EQ(platform.kernel.rooms, (std::vector<std::size_t>{72, 72, 16}));
+}
+
+TEST_F(DailyTelemetryTest, OnlyAnUnexpectedErrorOfAnEccReadIsLogged) {
+  for (const int error : {ENOENT, EBUSY, EIO, ENOMEM}) {
+    platform.log.clear();
+    platform.kernel.deliveries[kNextEvent] = {{0, event(1, 0)}, {error, {}}, {0, event(2, 0)}};
+    EXPECT_EQ(structuredLogs().size(), 1u);
+    const bool quiet = error == ENOENT || error == EBUSY;
+    EXPECT_EQ(platform.log.lines(),
+              quiet ? Lines{}
+                    : Lines{"default: Unexpected errno (" + std::to_string(error) +
+                            ") reading ECC events from kernel"});
+  }
+}
+
+TEST_F(DailyTelemetryTest, OnlySimpleReportChannelsAreSubscribedToAndRecorded) {
+  auto& channels = platform.reportingChannels;
+  channels.samples = {
+      {{1, 1, "a"}, 5}, {{2, 2, "histogram"}, 6}, {{3, 1, "b c"}, INT64_MIN}, {{4, 0, "none"}, 7}};
+  constexpr char kPrefix[] = "com.norba.velquist.";
+  EXPECT_EQ(recorded(kPrefix), (Lines{"a 5", "b c -9223372036854775808"}));
+  EXPECT_EQ(channels.subscribed, (Lines{"a", "b c"}));
+  channels.delivers = false;
+  EXPECT_TRUE(recorded(kPrefix).empty());
+  channels.subscribes = false;
+  EXPECT_TRUE(recorded(kPrefix).empty());
+  channels.subscribed.clear();
+  channels.category = 0xFF;
+  EXPECT_TRUE(recorded(kPrefix).empty());
+  EXPECT_TRUE(channels.subscribed.empty());
+}
+
+}  // namespace
+}  // namespace morvend

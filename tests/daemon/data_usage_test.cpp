@@ -1,0 +1,258 @@
+#include "daemon/DataUsage.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+
+#include "daemon/DataUsageChanges.h"
+#include "support/HostOnRoot.h"
+#include "support/TemporaryFolder.h"
+#include "support/TestPlatform.h"
+
+namespace morvend {
+namespace {
+
+using platform::Array;
+using platform::Date;
+using platform::Dictionary;
+using platform::Value;
+using Lines = std::vector<std::string>;
+
+constexpr char kDomain[] = "com.norba.quenset.morvend";
+constexpr char kBaseline[] = "netUsageBaseline";
+
+constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
+constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
+constexpr double kDay = 86400, kToday = 20000 * kDay, kYesterday = kToday - kDay;
+
+Dictionary usage(Dictionary named, double since, std::initializer_list<Value> counts) {
+  const char* const names[] = {"wifiInBytes", "wifiOutBytes", "wwanInBytes", "wwanOutBytes"};
+  named.set("since", Date{since});
+  for (std::size_t i = 0; i < counts.size(); ++i) named.set(names[i], counts.begin()[i]);
+  return named;
+}
+Dictionary bundle(double since, std::initializer_list<Value> counts) {
+  return usage({{"bundleName", "b"}, {"procName", "p"}}, since, counts);
+}
+
+Lines texts(const std::vector<CounterAddition>& additions) {
+  Lines lines;
+  for (const auto& [key, value] : additions) lines.push_back(key + " " + std::to_string(value));
+  return lines;
+}
+
+TEST(DataUsageChanges, AreTheDifferencesToTheDayBefore) {
+  const Date long_ago{kToday - 30 * kDay};
+  const double since = long_ago.secondsSince1970;
+  const Array base{long_ago, 5000, 5000, 5000, 5000};
+  const Value kNone("no array"), old(1024), big(std::int64_t{1} << 40),
+      huge(std::uint64_t{1} << 63);
+  const struct {
+    const char* what;
+    Value baseline;  // of "b"
+    Dictionary record;
+    Lines additions;
+  } rows[] = {
+      {"first seen, today",
+       kNone,
+       bundle(kToday, {5000, 0, 1023, 1024}),
+       {"datausage.wifiInKB.b 4", "datausage.wwanOutKB.b 1"}},
+      {"the first instant of yesterday",
+       kNone,
+       bundle(kYesterday, {2048}),
+       {"datausage.wifiInKB.b 2"}},
+      {"the last one before it",
+       kNone,
+       bundle(kYesterday - 0.5, {9999, 9999}),
+       {"datausage.olddata.b 1"}},
+      {"the future", kNone, bundle(1e300, {2048}), {"datausage.wifiInKB.b 2"}},
+      {"no time at all", kNone, bundle(std::nan(""), {2048}), {"datausage.olddata.b 1"}},
+      {"grown, too little or unchanged",
+       base,
+       bundle(since, {7048, 6023, 6024, 5000}),
+       {"datausage.wifiInKB.b 2", "datausage.wwanInKB.b 1"}},
+      {"down",
+       base,
+       bundle(since, {4999, 0, 5000, -1}),
+       {"datausage.baddata.b 1", "datausage.baddata.b 1", "datausage.baddata.b 1"}},
+      {"down to a missing count",
+       base,
+       bundle(since, {5000, 5000, "text"}),
+       {"datausage.baddata.b 1", "datausage.baddata.b 1"}},
+      {"a date with a fraction, stored without",
+       base,
+       bundle(since + 0.75, {7048, 5000, 5000, 5000}),
+       {"datausage.wifiInKB.b 2"}},
+      {"another period, old", base, bundle(since + 1, {9999}), {"datausage.olddata.b 1"}},
+      {"another period, of yesterday",
+       base,
+       bundle(kYesterday + 5, {9216, 0, 0, 2048.9}),
+       {"datausage.wifiInKB.b 9", "datausage.wwanOutKB.b 2"}},
+      {"a short entry",
+       Array{long_ago, "text"},
+       bundle(since, {old, old, old}),
+       {"datausage.wifiInKB.b 1", "datausage.wifiOutKB.b 1", "datausage.wwanInKB.b 1"}},
+      {"an entry without a date", Array{1, 2}, bundle(kToday, {old}), {"datausage.wifiInKB.b 1"}},
+      {"an empty entry", Array{}, bundle(kToday, {old}), {"datausage.wifiInKB.b 1"}},
+      {"no entry", "text", bundle(since, {old}), {"datausage.olddata.b 1"}},
+      {"large",
+       Array{long_ago, 0, kLeast, 1, -1},
+       bundle(since, {big, kMost, kLeast, kMost}),
+       {"datausage.wifiInKB.b 1073741824", "datausage.baddata.b 1",
+        "datausage.wwanInKB.b 9007199254740991", "datausage.baddata.b 1"}},
+      {"beyond 63 bits",
+       kNone,
+       bundle(kToday, {huge, 1e300}),
+       {"datausage.wifiInKB.b -9007199254740992", "datausage.wifiOutKB.b 9007199254740991"}},
+      {"without a bundle",
+       kNone,
+       usage({{"procName", "p"}}, kToday, {old}),
+       {"datausage.wifiInKB.com.norba.p 1"}},
+      {"a bundle that is no text",
+       kNone,
+       usage({{"bundleName", 7}, {"procName", "b"}}, since, {}),
+       {"datausage.olddata.com.norba.b 1"}},
+      {"an empty name", kNone, usage({{"bundleName", ""}}, since, {}), {"datausage.olddata. 1"}},
+  };
+  for (const auto& row : rows) {
+    const auto changes = dataUsageChanges({{"b", row.baseline}}, {row.record}, Date{kYesterday});
+    EXPECT_EQ(texts(changes.additions), row.additions) << row.what;
+    ASSERT_EQ(changes.baseline.size(), 1u) << row.what;
+    const Array& entry = *changes.baseline.begin()->value.as<Array>();
+    ASSERT_EQ(entry.size(), 5u) << row.what;
+    const double stored = entry[0].as<Date>()->secondsSince1970;
+    EXPECT_TRUE(stored == row.record.date("since")->secondsSince1970 || std::isnan(stored));
+    // Kept as they came, so that the same records the next day add nothing but old data.
+    const auto next = dataUsageChanges(changes.baseline, {row.record}, Date{kToday});
+    EXPECT_LE(next.additions.size(), std::isnan(stored) ? 1u : 0u) << row.what;
+  }
+}
+
+TEST(DataUsageChanges, SkipWhatIsNoRecordAndKeepTheLatestOfAName) {
+  Dictionary undated = bundle(kToday, {4096});
+  undated.set("since", "2026-11-22");
+  const Array records{"text", usage({}, kToday, {4096}), undated, bundle(kToday, {4096}),
+                      usage({{"procName", "b"}}, kToday, {8192, 1, 2, std::uint64_t{3}})};
+  const auto changes = dataUsageChanges({{"gone", Array{Date{kToday}}}}, records, Date{kYesterday});
+  EXPECT_EQ(texts(changes.additions),
+            (Lines{"datausage.wifiInKB.b 4", "datausage.wifiInKB.com.norba.b 8"}));
+  EXPECT_EQ(changes.baseline, (Dictionary{{"b", Array{Date{kToday}, 8192, 1, 2, 3}}}));
+}
+
+TEST(DataUsageStep, ReplacesTheBaselineWhateverTheReply) {
+  const Dictionary baseline{{"b", Array{Date{kToday}, 1024}}};
+  const struct {
+    Value stored;
+    std::optional<Array> reply;
+    Lines records;
+    Dictionary baseline;
+  } rows[] = {
+      {baseline,
+       Array{bundle(kToday, {4096})},
+       {"add datausage.wifiInKB.b 3"},
+       {{"b", Array{Date{kToday}, 4096, 0, 0, 0}}}},
+      {"no dictionary",
+       Array{bundle(kYesterday, {4096})},
+       {"add datausage.wifiInKB.b 4"},
+       {{"b", Array{Date{kYesterday}, 4096, 0, 0, 0}}}},
+      {baseline, Array(), {}, {}},
+      {baseline, {}, {}, {}},
+  };
+  for (const auto& row : rows) {
+    support::TestPlatform device;
+    device.counters.today = 20000;
+    device.preferences.setMobile(kDomain, kBaseline, row.stored);
+    device.networkUsage.records = row.reply;
+    CollectDataUsage(device.platform);
+    EXPECT_EQ(device.counters.records, row.records);
+    EXPECT_EQ(device.preferences.mobile(kDomain, kBaseline), Value(row.baseline));
+    ASSERT_EQ(device.journal.size(), 2u);
+    EXPECT_EQ(device.journal[1], std::string("synchronize ") + kDomain);
+    EXPECT_TRUE(device.log.lines().empty());
+  }
+}
+
+TEST(DataUsageStep, GoesOnWithoutAReplyAndDealsWithALateOne) {
+  support::TestPlatform device;
+  device.counters.today = 20000;
+  device.networkUsage.repliesAtOnce = false;
+  CollectDataUsage(device.platform, std::chrono::nanoseconds(1));
+  EXPECT_EQ(device.log.lines(), Lines{"default: Vexmor timed out, no datausage available"});
+  EXPECT_TRUE(device.journal.empty());
+  const Array records{bundle(kToday, {4096})};
+  device.networkUsage.pending.at(0)(&records);
+  EXPECT_EQ(device.counters.records, Lines{"add datausage.wifiInKB.b 4"});
+  EXPECT_EQ(device.journal.size(), 2u);
+}
+
+// On the host, where the reply is another thread's.
+class DataUsageThreads : public ::testing::Test {
+ protected:
+  void answer(const Array& records, double delay) {
+    support::RealCodecs codecs;
+    folder.write("device/network-usage.plist",
+                 *codecs.codec.writeXML(Dictionary{{"Records", records}, {"ReplyDelay", delay}}));
+  }
+
+  // The sum of the day's scalars.
+  std::int64_t recorded() {
+    support::HostOnRoot host(folder.path());
+    std::int64_t sum = 0;
+    host.platform().history.initWithDefaultPath()->scalarsForKeyPrefix(
+        "", INT32_MIN, INT32_MAX,
+        [&](std::string_view, std::int32_t, std::int64_t value, bool&) { sum += value; });
+    return sum;
+  }
+
+  support::TemporaryFolder folder;
+};
+
+TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
+  constexpr int kProcesses = 100, kOthers = 100;
+  Array records;
+  for (int i = 0; i < kProcesses; ++i) {
+    records.push_back(usage({{"procName", std::to_string(i)}}, 1e11, {4096}));
+  }
+  answer(records, 0);
+  {
+    support::HostOnRoot host(folder.path());
+    platform::Platform& platform = host.platform();
+    CollectDataUsage(platform, std::chrono::nanoseconds(0));
+    for (int i = 0; i < kOthers; ++i) {
+      platform.counters.PLClientAddValueForScalarKey("other", 1);
+      const Value value(i);
+      platform.preferences.QNSPreferencesSetValue("other", &value, kDomain);
+      platform.preferences.QNSPreferencesSynchronize(kDomain);
+      if (i % 20 == 0) platform.counters.PLClientCheckpoint();
+    }
+    // Replies come in the order of the queries, so that this one's end is the end of both.
+    CollectDataUsage(platform);
+    const auto baseline = platform.preferences.QNSPreferencesGetValue(kBaseline, kDomain);
+    EXPECT_EQ(baseline->as<Dictionary>()->size(), static_cast<std::size_t>(kProcesses));
+  }
+  EXPECT_EQ(recorded(), 4 * kProcesses + kOthers);
+}
+
+TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
+  answer({bundle(1e11, {4096})}, std::numeric_limits<double>::infinity());
+  for (int i = 0; i < 3; ++i) {
+    support::HostOnRoot host(folder.path());
+    CollectDataUsage(host.platform(), std::chrono::milliseconds(i));
+  }
+  EXPECT_EQ(recorded(), 0);
+}
+
+// The end of the process may meet the reply at any moment.
+TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
+  answer({bundle(1e11, {4096}), bundle(1e11, {4096})}, 0);
+  for (int i = 0; i < 20; ++i) {
+    support::HostOnRoot host(folder.path());
+    CollectDataUsage(host.platform(),
+                     i < 19 ? std::chrono::microseconds(20 * i) : kUsageServicePatience);
+  }
+  EXPECT_EQ(recorded(), 8);
+}
+
+}  // namespace
+}  // namespace morvend
