@@ -36,9 +36,9 @@ std::set<std::string> namedInHelp(const std::string& program, const std::string&
   const std::string help = folder.read("help");
   std::set<std::string> named;
   for (const auto& option : found(help, "\n *[-h,]*-(-[a-z-]+)")) named.insert("Fl " + option);
-  const std::size_t commands = std::min(help.find("\nSubcommands:"), help.size());
-  for (const auto& name :
-       found(help.substr(commands, help.find("\n\n", commands) - commands), "\n  ([a-z-]+)")) {
+  const std::size_t commands = std::min(help.find("ommands:\n"), help.size());
+  for (const auto& name : found(help.substr(commands, help.find("\n\n", commands) - commands),
+                                "\n  ([a-z-]+( [a-z-]+)?)  ")) {
     named.insert("Cm" + command + " " + name);
     named.merge(namedInHelp(program, command + " " + name));
   }
