@@ -44,6 +44,25 @@ CommandResult daily(const Invocation& invocation) {
   return result(NANDInfo::CopyNANDInfoWithOptions(invocation.platform));
 }
 
+CommandResult magazine(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  return result(arguments.history
+                    ? NANDInfo::CopySMagNANDFTLCustomHistoryInfo(invocation.platform, 0)
+                    : NANDInfo::CopySMagNANDFTLInfo(invocation.platform, arguments.hours,
+                                                    arguments.noDelta ? 0 : 1, arguments.mode));
+}
+
+CommandResult extract(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  return result(NANDInfo::NandInfoExtractToEV_runAllSteps(invocation.platform, arguments.monthly,
+                                                          true, arguments.from));
+}
+
+CommandResult dump(const Invocation& invocation) {
+  const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.platform, false);
+  return {handled, handled ? "" : "not every list was dumped"};
+}
+
 CommandResult recommendsDeletion(const Invocation& invocation) {
   return {NANDInfo::NandRecommendsContentDeletion(invocation.platform), {}};
 }
@@ -70,6 +89,14 @@ constexpr Command kCommands[] = {
      call<NANDInfo::CopyInternalLabNANDInfo>},
     {"health", "ota", "For system updates", kNothing, true, "the controller gave no statistics",
      call<NANDInfo::CopyOTANANDInfo>},
+    {nullptr, "magazine", "What the FTL counters came to over the last hours", kWindow, true,
+     nullptr, magazine},
+    {nullptr, "nvram", "Send the use of the boot variables' memory as an event", kNothing, false,
+     "this device doesn't tell", call<NANDInfo::gatherNVRAMStats>},
+    {nullptr, "extract", "Send the storage health as events, and sum them up", kSteps, true,
+     nullptr, extract},
+    {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, true, nullptr,
+     dump},
     {nullptr, "recommends-deletion", "Whether the controller asks for content to be deleted",
      kNothing, true, nullptr, recommendsDeletion},
     {"ean", "image-size", "The size of an image, in bytes", kCode, false, nullptr,

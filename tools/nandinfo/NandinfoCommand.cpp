@@ -1,6 +1,7 @@
 #include "tools/nandinfo/NandinfoCommand.h"
 
 #include <CLI/CLI.hpp>
+#include <charconv>
 #include <optional>
 #include <string_view>
 
@@ -144,6 +145,41 @@ int run(const CommandServices& services, const Command& command, const Arguments
   return why ? say(*why) : kDone;
 }
 
+// An option with a decimal number, at most `most`.
+CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& number,
+                       std::uint32_t most, const std::string& description) {
+  const auto set = [&number, name, most](const std::string& text) {
+    const char* const end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, number);
+    if (error == std::errc() && stop == end && number <= most) return;
+    throw CLI::ValidationError(
+        name, platform::format("'%s' is not a number from 0 to %u", text.c_str(), most));
+  };
+  return app.add_option_function<std::string>(name, set, description)->type_name("N");
+}
+
+void addWindow(CLI::App& app, Arguments& arguments) {
+  CLI::App* which = app.add_option_group("Window")->require_option(1);
+  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, UINT32_MAX,
+                                 "from so many hours ago until now, as differences");
+  which->add_flag("--history", arguments.history,
+                  "the write amplification of the last six windows of four hours");
+  app.add_flag("--no-delta", arguments.noDelta, "the counters as they were then")->needs(hours);
+  addNumber(app, "--mode", arguments.mode, NANDInfo::kMagazineBoth,
+            "0: the accumulating counters, 1: the dynamic ones, 2: both (default)")
+      ->needs(hours);
+}
+
+void addSteps(CLI::App& app, Arguments& arguments) {
+  constexpr std::uint32_t kLastStep = 6;
+  std::string steps = "the first step (default: 0):";
+  for (std::uint32_t step = 0; step <= kLastStep; ++step) {
+    steps += platform::format("\n%u  %s", step, NANDInfo::kEV_Extraction_Step_Names[step].name);
+  }
+  app.add_flag("--monthly", arguments.monthly, "with the last step, which is the monthly one");
+  addNumber(app, "--from", arguments.from, kLastStep, steps);
+}
+
 void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
   const auto takes = [&command](Takes part) { return (command.takes & part) != 0; };
   CLI::Option* round = nullptr;
@@ -183,6 +219,8 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("DIR", arguments.folder, "an empty folder, or one that is to be made")
         ->required();
   }
+  if (takes(kWindow)) addWindow(app, arguments);
+  if (takes(kSteps)) addSteps(app, arguments);
 }
 
 }  // namespace
