@@ -4,6 +4,8 @@
 
 #include <filesystem>
 #include <nlohmann/json.hpp>
+#include <set>
+#include <sstream>
 
 #include "end_to_end/Device.h"
 #include "support/ControllerRoot.h"
@@ -51,6 +53,8 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
       {"health lab", 0, "IsNANDRetirable\": ", ""},
       {"ean update-count ifw1", 0, "9223372036854775808\n", ""},
       {"recommends-deletion", 0, "false\n", ""},
+      {"magazine --hours 24", 0, "\"hostWrites\": 24,\n", ""},
+      {"nvram", 0, "{}", ""},
       {"decode msp -", 1, "\"ok\": false", "nandinfo: decode msp: "},
       {"ftl --unknown", 2, "", "nandinfo: The following argument was not expected: --unknown\n"},
   };
@@ -64,6 +68,34 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
   }
   EXPECT_EQ(nandinfo(device, "disk", "/dev/full").err,
             "nandinfo: disk: the output can't be written\n");
+}
+
+// On a made device, all of whose events are used.
+TEST(NandinfoProgram, LeavesLogsAndEvents) {
+  const Device device;
+  ASSERT_EQ(device.run("mkdevice", {device.root().path()}).status, 0);
+  std::filesystem::remove(device.root() / "device/analytics.plist");
+  std::filesystem::remove_all(device.root() / "var/spool");
+
+  EXPECT_EQ(nandinfo(device, "dump").out, "true\n");
+  ASSERT_EQ(device.names(kSubmitted).size(), 1u);
+  const std::string log = device.root().read(kSubmitted + ("/" + device.names(kSubmitted)[0]));
+  EXPECT_NE(log.find(";UserWamp:"), std::string::npos) << log;
+  const auto valuesOf = [&device](const std::string& path, const char* key) {
+    std::set<nlohmann::json> values;
+    std::istringstream lines(device.root().read(path));
+    for (std::string line; std::getline(lines, line);) {
+      values.insert(nlohmann::json::parse(line)[key]);
+    }
+    return values;
+  };
+  const std::string structured = "var/spool/morvend/structured";
+  ASSERT_EQ(device.names(structured).size(), 1u);
+  EXPECT_TRUE(valuesOf(structured + "/" + device.names(structured)[0], "type").contains(176));
+
+  const auto summary = nlohmann::json::parse(nandinfo(device, "extract --monthly").out);
+  EXPECT_TRUE(summary.contains("msp_index"));
+  EXPECT_EQ(valuesOf("var/spool/morvend/events.jsonl", "event").size(), 9u);
 }
 
 TEST(NandinfoProgram, ACaptureAnswersAsTheDeviceDid) {
