@@ -20,13 +20,13 @@
 #include "platform/host/HostStandardStreams.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
+#include "platform/host/PlayedServices.h"
 #include "platform/host/PreferenceFiles.h"
 #include "platform/host/RunLockFile.h"
 #include "platform/host/ServitaLogFiles.h"
 #include "platform/host/StandardErrorLog.h"
 #include "platform/host/StructuredLogFiles.h"
 #include "platform/host/SubmissionSpool.h"
-#include "platform/host/SystemClock.h"
 
 namespace platform::host {
 

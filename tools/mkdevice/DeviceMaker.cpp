@@ -6,6 +6,8 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <memory>
+#include <optional>
 
 #include "daemon/DailyRun.h"
 #include "daemon/context/DeviceContext.h"
@@ -118,14 +120,11 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
 
 // The day that begins with `sample.today`, and what is new when the next one begins.
 std::string playDay(const std::string& root, Sample sample, const SampleCounters& counters) {
-  {
-    DeviceHost host(root, dailyRun(sample));
-    morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
-    const std::string error = host.counters().apply(counters.ofDay(sample.today));
-    if (!error.empty()) return error;
-  }
+  DeviceHost host(root, dailyRun(sample));
+  morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
+  const std::string error = host.counters().apply(counters.ofDay(sample.today));
+  if (!error.empty()) return error;
   ++sample.today;
-  Host host({.root = root, .lowestLevel = platform::LogLevel::error});
   return writeFiles(host, filesOfDay(sample));
 }
 
