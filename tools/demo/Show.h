@@ -17,7 +17,13 @@ struct ShowOptions {
 // through; what was withheld; the distributions and their histograms.
 std::string showLog(Device& device, const SubmittedLog& log, const ShowOptions& options);
 
-// The files that a daily run writes beside its report, and what is in them.
-std::string showFiles(Device& device);
+// What a daily run leaves on the device: its records, the preferences that its tasking set, the
+// support service's logs.
+std::string showKept(Device& device);
+
+// Everything that left the device, each part with the rule that let it through: the logs in the
+// spool, today's counters as far as the telemetry set them, structured logs, events, and what the
+// storage library hands to its callers.
+std::string showLeft(Device& device, bool all);
 
 }  // namespace demo

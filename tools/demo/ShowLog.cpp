@@ -19,8 +19,8 @@ using Align = Table::Align;
 
 namespace {
 
-constexpr std::size_t kMostOwnRows = 12, kMostPrefixRows = 8, kMostCollectedRows = 8;
-constexpr std::size_t kMostDistributions = 25, kMostHistograms = 3, kMostNames = 8;
+constexpr std::size_t kMostOwnRows = 6, kMostPrefixRows = 5, kMostCollectedRows = 4;
+constexpr std::size_t kMostDistributions = 8, kMostHistograms = 1, kMostNames = 8;
 constexpr std::size_t kAll = SIZE_MAX;
 
 // The key; in brackets the prefix that let it through.
@@ -62,7 +62,7 @@ class LogText {
   std::string text() {
     addHeader();
     if (options_.headerOnly) return text_;
-    recorded_ = device_.recordedFor(day_);
+    recorded_ = device_.recorded(day_ - 1, day_);
     addScalars();
     addDistributions();
     addHistograms();
