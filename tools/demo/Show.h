@@ -8,9 +8,8 @@
 namespace demo {
 
 struct ShowOptions {
-  bool all = false;         // every row, not a selection
-  bool headerOnly = false;  // nothing but the header
-  std::string prefix;       // only counters whose keys begin so
+  bool all = false;    // every row, not a selection
+  std::string prefix;  // only counters whose keys begin so, and no header
 };
 
 // A report: its header; each reported scalar beside the recorded one and the rule that let it

@@ -180,15 +180,21 @@ class LeftText {
     }
   }
 
+  static std::string shortEvent(const std::string& event) {
+    constexpr std::string_view kStorage = "com.norba.massStorage.NANDInfo.";
+    return event.starts_with(kStorage) ? "~~." + event.substr(kStorage.size()) : shortKey(event);
+  }
+
   void addEvents() {
-    text_ += "\n" + heading("Analytics events, in " + device_.pathOf(kEvents));
+    text_ += "\n" + heading("Analytics events (~~ is com.norba.massStorage.NANDInfo)") + "  " +
+             device_.pathOf(kEvents) + "\n";
     Table table({{"EVENT", Align::left},
                  {"SENT", Align::right},
                  {"FIELDS", Align::right},
                  {"LET THROUGH BY", Align::left}});
     for (const auto& [event, sent] :
          talliesOf(device_.bytes(kEvents).value_or(""), "event", "payload")) {
-      table.addRow({shortKey(event), std::to_string(sent.count), sent.range(), eventRule(event)});
+      table.addRow({shortEvent(event), std::to_string(sent.count), sent.range(), eventRule(event)});
     }
     text_ += table.text();
   }
@@ -226,7 +232,8 @@ class LeftText {
   static std::string digitsText(const Dictionary& result, const NANDInfo::NameTable& digits) {
     Tally kept;
     for (const auto& [key, value] : result) {
-      if (const auto* entry = digits.find(key)) kept.add(entry->number);
+      const auto* entry = digits.find(key);
+      if (entry != nullptr && value.as<platform::Number>() != nullptr) kept.add(entry->number);
     }
     return "storage whitelist, " + kept.range() + " significant digits";
   }

@@ -60,8 +60,7 @@ class LogText {
   }
 
   std::string text() {
-    addHeader();
-    if (options_.headerOnly) return text_;
+    if (options_.prefix.empty()) addHeader();
     recorded_ = device_.recorded(day_ - 1, day_);
     addScalars();
     addDistributions();
@@ -218,6 +217,7 @@ class LogText {
         rows.push_back(&entry);
       }
     }
+    if (rows.empty() && !options_.prefix.empty()) return;
     const auto shown = evenlySpread(rows.size(), atMost(kMostDistributions));
     for (const std::size_t i : shown) {
       std::array<double, 5> statistics{};

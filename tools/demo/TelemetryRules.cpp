@@ -51,7 +51,7 @@ std::string eventRule(std::string_view event) {
   const NANDInfo::NameTable* fields = NANDInfo::EventraConfigDetails(event);
   if (fields == nullptr) return kFixed;
   const bool magazine = event.starts_with("com.norba.massStorage.NANDInfo.SM.");
-  return platform::format("%s whitelist, the event's %zu fields", magazine ? "magazine" : "storage",
+  return platform::format("%s whitelist, list of %zu", magazine ? "magazine" : "storage",
                           fields->size());
 }
 

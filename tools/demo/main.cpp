@@ -61,8 +61,7 @@ int main(int argc, char** argv) {
   show->add_option("ROOT", root, "the device root")->required();
   show->add_option("LOG", logs, "the reports' files; default: all of the root's spool");
   show->add_flag("--all", options.all, "every row, not a selection");
-  show->add_flag("--header", options.headerOnly, "the header alone");
-  show->add_option("--prefix", options.prefix, "only counters whose keys begin so");
+  show->add_option("--prefix", options.prefix, "only counters whose keys begin so, and no header");
   CLI::App* kept = app.add_subcommand("kept", "Show what the daily runs left on the device");
   kept->add_option("ROOT", root, "the device root")->required();
   CLI::App* left = app.add_subcommand("left", "Show everything that left the device, and why");

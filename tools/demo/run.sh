@@ -98,30 +98,33 @@ chapter "This machine's own figures: pelloran sample --every 1 --for 4; morvend 
 "$bin/pelloran" sample --every 1 --for 4
 "$bin/pelloran" show --day today --prefix host. >"$demo/today.txt"
 sed -n '1p; /host\.loadavg\.1m/p; /host\.vmstat\.pgfault/p' "$demo/today.txt" | sed 's/^/  /'
-say "  … $(($(wc -l <"$demo/today.txt") - 1)) counters of five readings; -t reports today, done or not"
+say "  … $(($(wc -l <"$demo/today.txt") - 1)) counters of five readings"
+say "Of them, a report of today, done or not, has these and others:"
 touch "$demo/before"
 "$bin/morvend" -t 2>"$demo/today.log"
 find_report
-today=$report
+"$bin/morvend-demo" show "$device" "$report" --prefix host.vmstat.pg
 
-chapter "The storage library: nandinfo"
-say "Storage health as events of the analytics sink, where its configuration uses them:"
-"$bin/nandinfo" extract --monthly >"$demo/extraction.json" 2>"$demo/extraction.log" ||
-  fail "the extraction failed: $(tail -n 1 "$demo/extraction.log")"
-sed -nE 's/.*: (SUCCESS|FAILED) (in logging|to log) (com\.norba\.)?([^ ]+) .*/  \1 \4/p' \
-  "$demo/extraction.log" | sort | uniq -c | sed -E 's/^ +([0-9]+) +/  \1 x /'
-say "A counter as it is, and as it leaves: nandinfo storage [--round]"
+# asked ARGUMENT...: what nandinfo prints; what it says in the system log goes to a file.
+asked() {
+  "$bin/nandinfo" "$@" 2>"$demo/nandinfo.log" ||
+    fail "nandinfo $* failed: $(tail -n 1 "$demo/nandinfo.log")"
+}
+
+chapter "The storage library: nandinfo extract --monthly"
+say "Events of storage health for the analytics sink, whose configuration says which it uses:"
+asked extract --monthly >"$demo/extraction.json"
+sed -nE 's/.*SUCCESS in logging (com\.norba\.)?([^ ]+) .*/sent    \2/p
+  s/.*FAILED to log (com\.norba\.)?([^ ]+) .*/unused  \2/p' "$demo/nandinfo.log" |
+  uniq -c | sed -E 's/^ +([0-9]+) /  \1 /'
+say "A counter as it is and as it leaves (storage, storage --round), and what labs get (health lab):"
 for option in '' --round; do
-  "$bin/nandinfo" storage $option 2>/dev/null | sed -n 's/^ *"TLM_hostWrites": /  hostWrites /p'
+  asked storage $option | sed -nE 's/^ *"TLM_(hostWrites)": ([0-9]+).*/  \1 \2/p'
 done
-say "What lab tools get, the most of three kinds of callers: nandinfo health lab"
-"$bin/nandinfo" health lab 2>/dev/null | sed -n 's/^ *"com.norba.NANDInfo.Health./  /p' | tr -d '",'
+asked health lab | sed -n 's/^ *"com.norba.NANDInfo.Health./  /p' | tr -d '",'
 
 chapter "What was submitted for yesterday"
 "$bin/morvend-demo" show "$device" "$yesterday"
-chapter "What was submitted for today: this machine's own figures"
-say "The tasking that the first run applied is named by this report:"
-"$bin/morvend-demo" show "$device" "$today" --prefix host.
 chapter "What stays on the device"
 "$bin/morvend-demo" kept "$device"
 chapter "Everything that left the device, and the rule that let it through"
