@@ -143,25 +143,30 @@ class LeftText {
     struct Counter {
       std::string key;
       std::int64_t value;
+      std::optional<Rule> listed;
     };
     std::map<CounterRule, std::vector<Counter>> byRule;
     for (const auto& [key, value] : device_.recorded(today, today).scalars) {
-      if (const auto rule = counterRule(key)) byRule[*rule].push_back({key, value});
+      const auto rule = counterRule(key);
+      if (rule) byRule[*rule].push_back({key, value, rules_.ofScalar(key)});
     }
     Table table({{"KEY (~ is com.norba)", Align::left},
                  {"VALUE", Align::right},
                  {"IN THE DAY'S REPORT", Align::left}});
     std::size_t count = 0;
-    for (const auto& [rule, counters] : byRule) {
-      const auto shown = evenlySpread(counters.size(), all_ ? SIZE_MAX : kMostCountersOfRule);
+    for (auto& [rule, counters] : byRule) {
+      const auto listed = static_cast<std::size_t>(
+          std::stable_partition(counters.begin(), counters.end(),
+                                [](const Counter& counter) { return counter.listed.has_value(); }) -
+          counters.begin());
       table.addRow(
-          {format("%s, by %s: %zu", rule.step.c_str(), rule.rule.c_str(), counters.size())});
-      for (const std::size_t i : shown) {
-        const auto listed = rules_.ofScalar(counters[i].key);
-        table.addRow({"  " + shortKey(counters[i].key), std::to_string(counters[i].value),
-                      listed ? roundingText(*listed->options) : "withheld"});
-      }
+          {rule.step + ", by " + rule.rule, "", format("%zu of %zu", listed, counters.size())});
       count += counters.size();
+      if (!all_ && counters.size() > kMostCountersOfRule) counters.resize(kMostCountersOfRule);
+      for (const auto& [key, value, entry] : counters) {
+        table.addRow({"  " + shortKey(key), std::to_string(value),
+                      entry ? roundingText(*entry->options) : "withheld"});
+      }
     }
     text_ += "\n" + heading(format("Counters that the telemetry set today: %zu", count));
     if (count > 0) text_ += table.text();
