@@ -15,8 +15,6 @@ using platform::host::FileDescriptor;
 
 namespace {
 
-constexpr char kSubmitted[] = "var/spool/morvend/submitted";
-constexpr std::string_view kOptions = ".options.plist";
 constexpr std::size_t kLargestFile = std::size_t{64} << 20;
 
 Result<std::string> readHostFile(const std::string& path) {
@@ -56,7 +54,7 @@ Result<SubmittedLog> Device::readLog(const std::string& path) {
   auto* content = parsed->as<Dictionary>();
   if (content == nullptr) return failure("not a dictionary");
   SubmittedLog log{path, bytes->size(), std::move(*content), std::nullopt};
-  if (const auto beside = readHostFile(path + std::string(kOptions))) {
+  if (const auto beside = readHostFile(path + kOptions)) {
     const auto options = codec.read(*beside);
     const auto* dictionary = options ? options->as<Dictionary>() : nullptr;
     const std::string* version =
@@ -66,14 +64,14 @@ Result<SubmittedLog> Device::readLog(const std::string& path) {
   return Result<SubmittedLog>::success(std::move(log));
 }
 
-Recorded Device::recordedFor(std::int32_t day) {
+Recorded Device::recorded(std::int32_t firstDay, std::int32_t lastDay) {
   Recorded recorded;
   const auto history = host_.counters().initWithDefaultPath();
-  history->scalarsForKeyPrefix("", day - 1, day,
+  history->scalarsForKeyPrefix("", firstDay, lastDay,
                                [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
                                  recorded.scalars.insert_or_assign(std::string(key), value);
                                });
-  history->distributionsForKeyPrefix("", day - 1, day,
+  history->distributionsForKeyPrefix("", firstDay, lastDay,
                                      [&](std::string_view key, std::int32_t, auto&, bool&) {
                                        recorded.distributions.emplace(key);
                                      });

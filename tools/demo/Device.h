@@ -24,7 +24,7 @@ struct SubmittedLog {
   std::optional<std::string> previousVersion;  // from the options that were submitted with it
 };
 
-// What was recorded on a day and the one before, the later value of each key.
+// What was recorded on some days, the latest value of each key.
 struct Recorded {
   std::map<std::string, std::int64_t, std::less<>> scalars;
   std::set<std::string, std::less<>> distributions;
@@ -32,13 +32,16 @@ struct Recorded {
 
 class Device {
  public:
+  static constexpr char kSubmitted[] = "var/spool/morvend/submitted";
+  static constexpr char kOptions[] = ".options.plist";
+
   explicit Device(std::string root);
 
   // The submitted reports, the oldest first: paths of the host.
   std::vector<std::string> logs();
 
   platform::Result<SubmittedLog> readLog(const std::string& path);
-  Recorded recordedFor(std::int32_t day);
+  Recorded recorded(std::int32_t firstDay, std::int32_t lastDay);
 
   // Null, with a line on standard error, when it can't be read.
   const report::PLConfig* whitelist() const { return whitelist_.get(); }
@@ -49,6 +52,8 @@ class Device {
   // A file of the device: its bytes, or the property list that it is. None if there is none.
   std::optional<std::string> bytes(const std::string& path);
   std::optional<platform::Dictionary> propertyList(const std::string& path);
+
+  platform::Platform& platform() { return host_.platform(); }
 
   // The host's path of a path of the device.
   std::string pathOf(const std::string& path) const { return root_ + "/" + path; }

@@ -19,8 +19,8 @@ using Align = Table::Align;
 
 namespace {
 
-constexpr std::size_t kMostOwnRows = 12, kMostPrefixRows = 8, kMostCollectedRows = 8;
-constexpr std::size_t kMostDistributions = 25, kMostHistograms = 3, kMostNames = 8;
+constexpr std::size_t kMostOwnRows = 6, kMostPrefixRows = 5, kMostCollectedRows = 4;
+constexpr std::size_t kMostDistributions = 8, kMostHistograms = 1, kMostNames = 8;
 constexpr std::size_t kAll = SIZE_MAX;
 
 // The key; in brackets the prefix that let it through.
@@ -60,9 +60,8 @@ class LogText {
   }
 
   std::string text() {
-    addHeader();
-    if (options_.headerOnly) return text_;
-    recorded_ = device_.recordedFor(day_);
+    if (options_.prefix.empty()) addHeader();
+    recorded_ = device_.recorded(day_ - 1, day_);
     addScalars();
     addDistributions();
     addHistograms();
@@ -218,6 +217,7 @@ class LogText {
         rows.push_back(&entry);
       }
     }
+    if (rows.empty() && !options_.prefix.empty()) return;
     const auto shown = evenlySpread(rows.size(), atMost(kMostDistributions));
     for (const std::size_t i : shown) {
       std::array<double, 5> statistics{};

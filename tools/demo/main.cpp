@@ -35,9 +35,15 @@ int runShow(const std::string& root, std::vector<std::string> logs,
   return kDone;
 }
 
-int runFiles(const std::string& root) {
+int runKept(const std::string& root) {
   demo::Device device(root);
-  std::cout << demo::showFiles(device) << std::flush;
+  std::cout << demo::showKept(device) << std::flush;
+  return kDone;
+}
+
+int runLeft(const std::string& root, bool all) {
+  demo::Device device(root);
+  std::cout << demo::showLeft(device, all) << std::flush;
   return kDone;
 }
 
@@ -55,10 +61,12 @@ int main(int argc, char** argv) {
   show->add_option("ROOT", root, "the device root")->required();
   show->add_option("LOG", logs, "the reports' files; default: all of the root's spool");
   show->add_flag("--all", options.all, "every row, not a selection");
-  show->add_flag("--header", options.headerOnly, "the header alone");
-  show->add_option("--prefix", options.prefix, "only counters whose keys begin so");
-  CLI::App* files = app.add_subcommand("files", "Show what a run wrote beside its report");
-  files->add_option("ROOT", root, "the device root")->required();
+  show->add_option("--prefix", options.prefix, "only counters whose keys begin so, and no header");
+  CLI::App* kept = app.add_subcommand("kept", "Show what the daily runs left on the device");
+  kept->add_option("ROOT", root, "the device root")->required();
+  CLI::App* left = app.add_subcommand("left", "Show everything that left the device, and why");
+  left->add_option("ROOT", root, "the device root")->required();
+  left->add_flag("--all", options.all, "every counter, not a selection");
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
@@ -67,5 +75,7 @@ int main(int argc, char** argv) {
     return kUsage;
   }
   if (deliver->parsed()) return runDeliver();
-  return files->parsed() ? runFiles(root) : runShow(root, std::move(logs), options);
+  if (kept->parsed()) return runKept(root);
+  if (left->parsed()) return runLeft(root, options.all);
+  return runShow(root, std::move(logs), options);
 }

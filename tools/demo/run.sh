@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# The demo: makes a sample device, runs a day of it, and shows what was submitted.
+# The demo: a sample device's way through one day, from the message on the bus to what left it.
 # run.sh BIN_DIR, in the project's folder; everything it makes lies in build/demo.
 set -euo pipefail
 [ $# -eq 1 ] || { echo "usage: $0 BIN_DIR" >&2; exit 2; }
@@ -13,7 +13,7 @@ step=0
 chapter() { step=$((step + 1)); printf '\n%s== %d. %s%s\n' "$bold" $step "$1" "$plain"; }
 say() { printf '%s\n' "$*"; }
 fail() { echo "demo: $*" >&2; exit 1; }
-for program in mkdevice pelloran morvend morvend-demo; do
+for program in mkdevice pelloran morvend nandinfo morvend-demo; do
   [ -x "$bin/$program" ] || fail "$bin/$program is not built"
 done
 command -v dbus-daemon >/dev/null || fail "dbus-daemon is missing; ./dev demo installs it"
@@ -26,17 +26,14 @@ clean_up() {
 trap clean_up EXIT
 trap 'exit 130' INT TERM
 
-# What a program said in the system log, without the priorities that are for the journal.
-shown_log() { sed 's/^<[0-9]>//; s/^/  | /' "$1"; }
-
-# run_daily OPTION: runs the daemon and leaves the new report's path in $report.
-run_daily() {
-  touch "$demo/before"
-  "$bin/morvend" "$1" 2>"$demo/morvend$1.log"
-  shown_log "$demo/morvend$1.log"
-  find_report
-  say "The report: $report"
+# What a program said in the system log, without the priorities that are for the journal, what it
+# says of each key, and the content of the message, which the report repeats.
+shown_log() {
+  sed -E 's/^<[0-9]>//; /^(prefix match|Treating key|NANDInfo: findNandExporter)/d; /^\($/,/^\)$/d
+    s/^/  | /' "$1"
 }
+
+# The report that was submitted since $demo/before was touched, as $report.
 find_report() {
   report=$(find "$submitted" -name 'log-pellorand.193.*Z*' ! -name '*.plist' \
     -newer "$demo/before" | sort | tail -n 1)
@@ -47,19 +44,19 @@ rm -rf "$demo"
 mkdir -p "$demo"
 export MORVEND_ROOT=$device
 
-chapter "A sample device: mkdevice $device"
-"$bin/mkdevice" "$device"
+# Every other day the telemetry leaves the storage counters to the analytics sink, by the boot session:
+# a device for which today is one of the others has more to show.
+for seed in $(seq 8); do
+  rm -rf "$device"
+  "$bin/mkdevice" --seed "$seed" "$device"
+  "$bin/nandinfo" daily 2>"$demo/nandinfo.log" | grep NumLogicalReads >/dev/null && break
+done
+
+chapter "A sample device: mkdevice --seed $seed $device"
 say "A folder that stands for a device's file system: $(find "$device" -type f | wc -l) files," \
   "$(du -sh "$device" | cut -f1). Three weeks of counters,"
 say "up to yesterday, a whitelist that says which of them may be reported and how they are"
-say "rounded, and the user's consent to it."
-
-chapter "Counters of this machine: pelloran sample --every 1 --for 4"
-"$bin/pelloran" sample --every 1 --for 4
-say "Five readings of this machine's own figures were recorded as today's counters:"
-"$bin/pelloran" show --day today >"$demo/today.txt"
-sed -n '1p; /host\.loadavg/p; /host\.vmstat\.pgfault/p' "$demo/today.txt" | sed 's/^/  /'
-say "  … $(($(wc -l <"$demo/today.txt") - 1)) counters in all, in $device/var/mobile/Library/Pelloran"
+say "rounded, the user's consent to it, and a storage controller with all its counters."
 
 # A message bus of the demo's own, with a socket in a folder with a short name.
 socket=$(mktemp -d)
@@ -81,22 +78,12 @@ export DBUS_SYSTEM_BUS_ADDRESS=unix:path=$socket/bus
 for _ in $(seq 50); do [ -S "$socket/bus" ] && break; sleep 0.1; done
 [ -S "$socket/bus" ] || fail "the message bus did not start: $(cat "$demo/bus.log")"
 
-chapter "Yesterday's report: morvend -f"
-say "The daily sequence for yesterday: checkpoint, report, dump of structured logs, tasking,"
-say "roll-over of the support service's logs. The daemon's own log:"
-run_daily -f
-yesterday=$report
-
-chapter "Today's report, with this machine's figures: morvend -t"
-run_daily -t
-today=$report
-
-chapter "The service: morvend, and a client on a message bus of the demo's own"
+chapter "The day: morvend, and a client on a message bus of the demo's own"
 touch "$demo/before"
-"$bin/morvend" 2>"$demo/morvend.log" &
+MORVEND_LOG=debug "$bin/morvend" 2>"$demo/service.log" &
 daemon=$!
 "$bin/morvend-demo" deliver
-say "  the daemon ends once ten seconds pass without a message"
+say "  the daemon does yesterday's work, and ends once ten seconds pass without a message"
 for waited in $(seq 30); do
   kill -0 "$daemon" 2>/dev/null || break
   [ ! -t 1 ] || printf '\r  %2d s ' "$waited"
@@ -105,21 +92,53 @@ done
 [ ! -t 1 ] || printf '\r\e[K'
 kill -0 "$daemon" 2>/dev/null && fail "the daemon did not end"
 daemon=''
-shown_log "$demo/morvend.log"
 find_report
-say "The report: $report"
+yesterday=$report
+say "What it said, down to the single steps:"
+shown_log "$demo/service.log"
+
+chapter "The gate: morvend -d, which does a day's work once"
+"$bin/morvend" -d 2>"$demo/gate.log"
+shown_log "$demo/gate.log"
+
+chapter "This machine's own figures: pelloran sample --every 1 --for 4; morvend -t"
+"$bin/pelloran" sample --every 1 --for 4
+"$bin/pelloran" show --day today --prefix host. >"$demo/today.txt"
+sed -n '1p; /host\.loadavg\.1m/p; /host\.vmstat\.pgfault/p' "$demo/today.txt" | sed 's/^/  /'
+say "  … $(($(wc -l <"$demo/today.txt") - 1)) counters of five readings"
+say "Of them, a report of today, done or not, has these and others:"
+touch "$demo/before"
+"$bin/morvend" -t 2>"$demo/today.log"
+find_report
+"$bin/morvend-demo" show "$device" "$report" --prefix host.vmstat.pg
+
+# asked ARGUMENT...: what nandinfo prints; what it says in the system log goes to a file.
+asked() {
+  "$bin/nandinfo" "$@" 2>"$demo/nandinfo.log" ||
+    fail "nandinfo $* failed: $(tail -n 1 "$demo/nandinfo.log")"
+}
+
+chapter "The storage library: nandinfo extract --monthly"
+say "Events of storage health for the analytics sink, whose configuration says which it uses:"
+asked extract --monthly >"$demo/extraction.json"
+sed -nE 's/.*SUCCESS in logging (com\.norba\.)?([^ ]+) .*/sent    \2/p
+  s/.*FAILED to log (com\.norba\.)?([^ ]+) .*/unused  \2/p' "$demo/nandinfo.log" |
+  uniq -c | sed -E 's/^ +([0-9]+) /  \1 /'
+say "A counter as it is and as it leaves (storage, storage --round), and what labs get (health lab):"
+for option in '' --round; do
+  asked storage $option | sed -nE 's/^ *"TLM_(hostWrites)": ([0-9]+).*/  \1 \2/p'
+done
+asked health lab | sed -n 's/^ *"com.norba.NANDInfo.Health./  /p' | tr -d '",'
 
 chapter "What was submitted for yesterday"
 "$bin/morvend-demo" show "$device" "$yesterday"
-chapter "What was submitted for today: this machine's own figures"
-say "The tasking that the first run applied is named by this report and the next:"
-"$bin/morvend-demo" show "$device" "$today" --prefix host.
-chapter "What the service submitted: yesterday once more, with app info"
-"$bin/morvend-demo" show "$device" "$report" --header
-chapter "What the runs wrote beside the reports"
-"$bin/morvend-demo" files "$device"
+chapter "What stays on the device"
+"$bin/morvend-demo" kept "$device"
+chapter "Everything that left the device, and the rule that let it through"
+"$bin/morvend-demo" left "$device"
 
 chapter "Look for yourself"
 say "  less $yesterday"
-say "  $bin/morvend-demo show $device --all"
+say "  $bin/morvend-demo left $device --all"
 say "  MORVEND_ROOT=$device $bin/pelloran show --day yesterday"
+say "  MORVEND_ROOT=$device $bin/nandinfo ftl --all"

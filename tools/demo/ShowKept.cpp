@@ -1,6 +1,3 @@
-#include <nlohmann/json.hpp>
-#include <sstream>
-
 #include "platform/Text.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
@@ -16,41 +13,9 @@ using Align = Table::Align;
 namespace {
 
 constexpr char kDomain[] = "com.norba.pellorand.morvend";
-constexpr std::size_t kMostLines = 6;
 
 std::string preferencesPath(const std::string& user, const std::string& domain) {
   return "var/preferences/" + user + "/" + domain + ".plist";
-}
-
-// A file of JSON Lines: where it is; of its first lines what each is, and what it holds.
-std::string linesOf(Device& device, const std::string& path, const char* kind,
-                    const char* content) {
-  using JSON = nlohmann::ordered_json;
-  std::istringstream lines(device.bytes(path).value_or(""));
-  Table table({{"", Align::left}, {"", Align::left}});
-  std::size_t count = 0;
-  for (std::string line; std::getline(lines, line);) {
-    const auto parsed = JSON::parse(line, nullptr, false);
-    if (!parsed.is_object() || ++count > kMostLines) continue;
-    const auto what = parsed.value(kind, JSON());
-    table.addRow({"  " + (what.is_string() ? shortKey(what.get<std::string>())
-                                           : std::string(kind) + " " + what.dump()),
-                  parsed.value(content, JSON()).dump()});
-  }
-  std::string shown = "  " + device.pathOf(path) + "\n" + table.text();
-  if (count > kMostLines) shown += format("    … and %zu more\n", count - kMostLines);
-  return shown;
-}
-
-std::string structuredLogsOf(Device& device) {
-  const std::string folder = "var/spool/morvend/submitted/";
-  std::string shown;
-  for (const std::string& name : device.namesIn(folder)) {
-    if (name.starts_with("structured-")) {
-      shown += linesOf(device, std::string(folder).append(name), "type", "data");
-    }
-  }
-  return shown;
 }
 
 std::string namesOf(Device& device, const std::string& folder) {
@@ -101,19 +66,15 @@ std::string records(Device& device) {
 
 }  // namespace
 
-std::string showFiles(Device& device) {
-  std::string text = heading("Analytics events (~ is com.norba)") +
-                     linesOf(device, "var/spool/morvend/events.jsonl", "event", "payload");
-  text += "\n" + heading("Structured logs of earlier days, submitted") + structuredLogsOf(device);
-  text += "\n" + heading("The support service's logs, each moved one number up") +
-          namesOf(device, "var/log/servita");
-  text += "\n" + heading("What the daemon remembers") + records(device);
+std::string showKept(Device& device) {
+  std::string text = heading("What the daemon remembers") + records(device);
   const auto own = device.propertyList(preferencesPath("mobile", kDomain));
   const auto* payload = own ? own->array("TaskingPayload") : nullptr;
   if (payload != nullptr) {
     text += "\n" + heading("Preferences that the tasking set") + settingsOf(device, *payload);
   }
-  return text;
+  return text + "\n" + heading("The support service's logs, each moved one number up") +
+         namesOf(device, "var/log/servita");
 }
 
 }  // namespace demo
