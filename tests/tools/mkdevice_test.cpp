@@ -234,8 +234,8 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
                             }),
               1u)
         << "one a week, in the first run";
-    for (const char* part : {"Date: 2026-11-19 ", " morvend[", ";ValidityList[15]:"}) {
-      EXPECT_NE(storage.find(part), storage.npos) << part;
+    for (const char* text : {"Date: 2026-11-19 ", " morvend[", ";ValidityList[15]:"}) {
+      EXPECT_NE(storage.find(text), storage.npos) << text;
     }
     EXPECT_TRUE(files.empty() || files == made) << "but for the storage log's random identifier";
     files = std::move(made);
