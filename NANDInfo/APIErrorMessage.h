@@ -3,7 +3,7 @@
 
 #include "platform/Exported.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // Records a message, cut to 1,023 bytes, if none is recorded yet; else does nothing, not even
 // format.
@@ -15,4 +15,4 @@ const char* GetAPIErrorMessage();
 // Forgets the message: the state of a process that has just begun.
 void ResetAPIErrorMessage();
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

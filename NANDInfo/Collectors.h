@@ -12,7 +12,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 enum class FTLParser { named, statKey };
 enum class FTLSource { statistics, readStatistics };
@@ -43,4 +43,4 @@ platform::Dictionary gatherNANDHealthInfo(platform::Platform& platform);
 // 1 when the device is in a shop's demo mode, else 0.
 std::int32_t storeDemoMode(platform::Platform& platform);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

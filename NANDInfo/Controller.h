@@ -16,7 +16,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // The op types of a tunnel command: of its size phase and of its data phase.
 struct SelectorPair {
@@ -111,4 +111,4 @@ struct zmc_connection_t {
 bool openZMCConnection(platform::Platform& platform, zmc_connection_t& connection);
 void closeZMCConnection(platform::Platform& platform, zmc_connection_t& connection);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

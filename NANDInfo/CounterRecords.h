@@ -8,7 +8,7 @@
 
 #include "platform/Exported.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // One channel's raw counters: little-endian 32-bit words.
 inline constexpr std::size_t kCounterBlockSize = 4096;
@@ -30,4 +30,4 @@ void parseCountersAlgoGeneric(CounterBlock block, NandCountersRecord& record);
 void parseOnlyAlgoGenericCountersQ8(CounterBlock block, NandCountersRecord& record);
 void parseCountersAlgoGenericQ8(CounterBlock block, NandCountersRecord& record);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

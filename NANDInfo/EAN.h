@@ -10,7 +10,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // The size of an image in bytes, and the number of its updates, by its four-character code (the
 // first character in the highest byte). 0 on any failure, with a line in the log.
@@ -28,4 +28,4 @@ struct EANQuery {
 // In the order in which the storage statistics ask.
 std::span<const EANQuery> EANQueries();
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -8,7 +8,7 @@
 #include "NANDInfo/NameTable.h"
 #include "platform/Exported.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 inline constexpr char kEventName_massStorage_NANDInfo_FTLCounters_1[] =
     "com.norba.massStorage.NANDInfo.FTLCounters_1";
@@ -52,4 +52,4 @@ inline constexpr char kViewName_massStorage_NANDInfo_StorageStats_1[] =
 // of the eight above with a view. What else a dictionary holds stays on the device.
 const NameTable* EventraConfigDetails(std::string_view event);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -15,7 +15,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // A step's number is its place in the table.
 struct ExtractionStep {
@@ -52,4 +52,4 @@ platform::Dictionary gatherNVRAMStats(platform::Platform& platform);
 platform::Dictionary createAndLogSMagFTLFieldsToEventraForEvent(platform::Platform& platform,
                                                                 std::int32_t deltaType);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -12,7 +12,7 @@
 #include "platform/Exported.h"
 #include "platform/PropertyList.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 class NameTable;
 
@@ -70,4 +70,4 @@ void ReleaseGenericParserCxt(GenericParserCxt* context);
 platform::Dictionary CreateDictFromCxt(const GenericParserCxt& context,
                                        const NameTable* allowedKeys = nullptr);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

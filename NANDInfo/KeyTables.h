@@ -7,7 +7,7 @@
 
 #include "platform/Exported.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // A key of the FTL statistics buffer. Elements are 64-bit words; one element is a single value.
 struct FTLKey {
@@ -36,4 +36,4 @@ std::span<const MSPTag> MSPTagTable();
 // The row of a tag, or null.
 const MSPTag* findMSPTag(std::uint32_t tag);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -14,7 +14,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // Which counters CopySMagNANDFTLInfo reports, by its mode; any other mode reports none.
 inline constexpr std::uint32_t kMagazineAccumulating = 0;
@@ -34,4 +34,4 @@ platform::Dictionary CopySMagNANDFTLInfo(platform::Platform& platform, std::uint
 platform::Dictionary CopySMagNANDFTLCustomHistoryInfo(platform::Platform& platform,
                                                       std::uint32_t skips);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

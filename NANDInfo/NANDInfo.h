@@ -30,7 +30,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // The basic dictionary, keys "com.norba.NANDInfo.…": from the legacy statistics, for the counters
 // service. On failure only the two error keys.
@@ -76,4 +76,4 @@ platform::Dictionary CopyOTANANDInfo(platform::Platform& platform);
 // Whether the controller asks for content to be deleted: a boolean.
 platform::Value NandRecommendsContentDeletion(platform::Platform& platform);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

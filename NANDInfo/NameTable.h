@@ -13,7 +13,7 @@
 #include "platform/Exported.h"
 #include "platform/KeyIndex.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 struct NameRow {
   const char* family;
@@ -50,4 +50,4 @@ class NameTable {
 // The names of one family, in the order of its braces.
 std::vector<std::string> expandFamily(std::string_view family);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -9,7 +9,7 @@
 
 #include "NANDInfo/GenericParserContext.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // FTL statistics: records of 64-bit words, up to an end key or a record that the buffer can't hold.
 // A key of the table is published under its name, an array as "name_0", "name_1" and so on (one
@@ -58,4 +58,4 @@ bool ZMCParseBufferToCxt(LegacyNandInfoCxt* context, std::span<const std::byte> 
 // Frees the fields and sets everything to 0.
 void ZMCReleaseContext(LegacyNandInfoCxt* context);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

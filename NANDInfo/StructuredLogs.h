@@ -8,7 +8,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // Works out the write amplification, and with it whether the validity list is wanted; then fetches
 // the lists that the controller's driver offers and hands each to its handler. True when every list
@@ -19,4 +19,4 @@ bool DumpStorageStructuredLog(platform::Platform& platform, bool flag);
 // can't be had.
 void DumpNANDInfo(platform::Platform& platform, platform::Dictionary& dictionary);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

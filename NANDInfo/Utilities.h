@@ -12,7 +12,7 @@ namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // The type of the number that a pointer designates.
 enum class NumberKind { signed8, signed32, signed64, float64 };
@@ -42,4 +42,4 @@ void addEntries(const platform::Dictionary& entries, platform::Dictionary& targe
 std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text);
 std::uint32_t hexStringToInt32(platform::Platform& platform, std::string_view text);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -10,7 +10,7 @@
 #include "platform/Exported.h"
 #include "platform/PropertyList.h"
 
-namespace NANDInfo MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // Significant-digits dictionaries: a counter that is in one may be reported, and its number is how
 // many significant decimal digits it keeps. Each is expanded at its first use.
@@ -41,4 +41,4 @@ std::uint64_t roundSig(std::uint64_t value, std::uint64_t digits);
 // The marketed capacity in gigabytes of a user capacity in megabytes.
 std::uint32_t GetUserCapacityInGB(std::uint32_t megabytes);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace NANDInfo

@@ -5,7 +5,7 @@
 
 #include "platform/Exported.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 inline constexpr std::int64_t kSecondsPerDay = 86400;
 
@@ -35,4 +35,4 @@ std::int32_t dayNumber(double secondsSince1970);
 // One day back, staying at the first day that 32 bits can name.
 constexpr std::int32_t dayBefore(std::int32_t day) { return day == INT32_MIN ? day : day - 1; }
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

@@ -2,4 +2,4 @@
 // hidden visibility.
 #pragma once
 
-#define MORVEND_EXPORTED __attribute__((visibility("default")))
+#define MORVEND_EXPORTED [[gnu::visibility("default")]]

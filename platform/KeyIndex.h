@@ -9,7 +9,7 @@
 
 #include "platform/Exported.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 // Seeded for each process: keys come from files and messages, and nobody outside shall be able to
 // choose keys that collide.
@@ -48,4 +48,4 @@ class KeyIndex {
   std::size_t taken_ = 0;
 };
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

@@ -13,7 +13,7 @@
 #include "platform/Exported.h"
 #include "platform/PropertyList.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 // In all three, a missing value in a write (a null pointer) removes the key.
 
@@ -60,4 +60,4 @@ class PrivilegedPreferences {
                                 std::string_view domain) = 0;
 };
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

@@ -15,7 +15,7 @@
 
 #include "platform/Exported.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 class Value;
 
@@ -201,4 +201,4 @@ inline const Dictionary::Entry* Dictionary::end() const {
   return entries_.data() + entries_.size();
 }
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

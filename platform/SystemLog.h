@@ -6,7 +6,7 @@
 
 #include "platform/Exported.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 // "standard" is the level that the log itself calls default; a notice is a standard line.
 enum class LogLevel { debug, info, standard, error };
@@ -30,4 +30,4 @@ class SystemLog {
   LogLevel lowest_;
 };
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

@@ -7,7 +7,7 @@
 
 #include "platform/Exported.h"
 
-namespace platform MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED platform {
 
 std::string format(const char* format, ...) __attribute__((format(printf, 1, 2)));
 std::string vformat(const char* format, std::va_list arguments)
@@ -23,4 +23,4 @@ void appendInteger(std::string& text, std::uint64_t value);
 // Appends the shortest text that reads back as the same double: "inf", "-inf", "nan" for the rest.
 void appendReal(std::string& text, double value);
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace platform

@@ -9,11 +9,11 @@ namespace platform {
 
 struct Platform;
 
-namespace host MORVEND_EXPORTED {
+namespace MORVEND_EXPORTED host {
 
 // Every service over the device root that MORVEND_ROOT names ("/" without it); what was written is
 // on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
 std::shared_ptr<Platform> makeHostPlatform();
 
-}  // namespace MORVEND_EXPORTED
+}  // namespace host
 }  // namespace platform
