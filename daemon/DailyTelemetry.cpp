@@ -1,5 +1,8 @@
 #include "daemon/DailyTelemetry.h"
 
+#include <array>
+#include <vector>
+
 #include "NANDInfo/NANDInfo.h"
 #include "daemon/DataUsage.h"
 #include "daemon/EccEvents.h"
@@ -12,6 +15,7 @@ using platform::LogLevel;
 using platform::Number;
 using platform::Platform;
 using platform::ReportChannel;
+using platform::ScalarValue;
 
 namespace {
 
@@ -24,10 +28,10 @@ std::int64_t mebibytes(std::optional<std::uint64_t> bytes) {
 void CollectDiskUsage(Platform& platform) {
   const auto usage =
       platform.deviceProperties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
-  platform.counters.PLClientSetValueForScalarKey("com.norba.tarvenn.DiskUsageUserTotalBlocks",
-                                                 mebibytes(usage.totalDiskCapacity));
-  platform.counters.PLClientSetValueForScalarKey("com.norba.tarvenn.DiskUsageUserBlocksFree",
-                                                 mebibytes(usage.totalDataAvailable));
+  platform.counters.PLClientSetValuesForScalarKeys(std::array{
+      ScalarValue{"com.norba.tarvenn.DiskUsageUserTotalBlocks", mebibytes(usage.totalDiskCapacity)},
+      ScalarValue{"com.norba.tarvenn.DiskUsageUserBlocksFree",
+                  mebibytes(usage.totalDataAvailable)}});
 }
 
 void CollectStorageHealth(Platform& platform) {
@@ -43,11 +47,11 @@ void CollectStorageHealth(Platform& platform) {
                      description(info->find(NANDInfo::kNANDInfoErrorMessageKey)).c_str());
     return;
   }
+  std::vector<ScalarValue> values;
   for (const auto& [key, value] : *info) {
-    if (const auto* number = value.as<Number>()) {
-      platform.counters.PLClientSetValueForScalarKey(key, number->int64Value());
-    }
+    if (const auto* number = value.as<Number>()) values.push_back({key, number->int64Value()});
   }
+  platform.counters.PLClientSetValuesForScalarKeys(values);
 }
 
 void CollectReportChannels(Platform& platform) {

@@ -2,11 +2,18 @@
 #pragma once
 
 #include <cstdint>
+#include <span>
 #include <string_view>
 
 #include "platform/PropertyList.h"
 
 namespace platform {
+
+// A key and its scalar for today; the key is borrowed.
+struct ScalarValue {
+  std::string_view key;
+  std::int64_t value;
+};
 
 class CountersService {
  public:
@@ -25,6 +32,11 @@ class CountersService {
   // so in the log when a value can't be recorded.
   virtual void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) = 0;
   virtual void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) = 0;
+
+  // The same as setting one after the other; a service may record them as one, all or none.
+  virtual void PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) {
+    for (const auto& [key, value] : values) PLClientSetValueForScalarKey(key, value);
+  }
 };
 
 }  // namespace platform

@@ -110,16 +110,28 @@ Date CounterStore::PLDateFromDaysSince1970(std::int32_t day) {
 }
 
 void CounterStore::PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(CounterChange::Kind::set, key, value);
+  record(
+      {{.kind = CounterChange::Kind::set, .key = key, .day = PLDaysSince1970(), .amount = value}});
 }
 
 void CounterStore::PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(CounterChange::Kind::add, key, value);
+  record(
+      {{.kind = CounterChange::Kind::add, .key = key, .day = PLDaysSince1970(), .amount = value}});
 }
 
-void CounterStore::record(CounterChange::Kind kind, std::string_view key, std::int64_t value) {
-  const CounterChange change{.kind = kind, .key = key, .day = PLDaysSince1970(), .amount = value};
-  const std::string error = apply({&change, 1});
+void CounterStore::PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) {
+  const std::int32_t today = PLDaysSince1970();
+  std::vector<CounterChange> changes;
+  changes.reserve(values.size());
+  for (const auto& [key, value] : values) {
+    changes.push_back(
+        {.kind = CounterChange::Kind::set, .key = key, .day = today, .amount = value});
+  }
+  if (!changes.empty()) record(changes);
+}
+
+void CounterStore::record(const std::vector<CounterChange>& changes) {
+  const std::string error = apply(changes);
   const std::scoped_lock lock(mutex_);
   if (!error.empty() && error != clientError_) {
     place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());

@@ -70,16 +70,7 @@ TEST_F(DailyTelemetryTest, DiskUsageIsInWholeMebibytesOrMinusOne) {
 TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReportsAnError) {
   constexpr char kFailure[] =
       "default: error reading nand info, error 1 with message Unable to parse buffer";
-  // A thread's begin, name, statistics and end.
-  auto& snapshot = platform.snapshots.snapshot.emplace();
-  const auto item = [&](std::uint32_t type, const support::Bytes& payload) {
-    support::put(snapshot, type | std::uint64_t{payload.size()} << 32, 8);
-    support::put(snapshot, 1, 8);
-    snapshot.insert(snapshot.end(), payload.begin(), payload.end());
-  };
-  item(0x13, support::words({0}));
-  item(0x909, support::words({0x6F706177735F4D56, 0x7475}));
-  item(0x901, support::words({1, 2, 3, 4096}));
+  platform.snapshots.snapshot = support::kernelSnapshot(4096);
   constexpr std::size_t kDiskUsage = 2;  // recorded before
   EXPECT_EQ(recorded("").size(), kDiskUsage);
   EXPECT_EQ(platform.log.count(kFailure), 1);

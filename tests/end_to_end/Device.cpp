@@ -7,6 +7,8 @@
 #include "platform/Text.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/host/SystemClock.h"
+#include "support/ControllerLists.h"
+#include "support/ControllerRoot.h"
 #include "support/HostOnRoot.h"
 
 namespace end_to_end {
@@ -17,6 +19,28 @@ namespace {
 
 Dictionary setting(const char* user, const char* key) {
   return {{"Domain", "com.example"}, {"User", user}, {"Key", key}, {"Value", key}};
+}
+
+// Worn enough for the validity list to be logged: three bytes erased for one that was written.
+Dictionary controller() {
+  const support::Bytes statistics =
+      support::words({support::header(4, 1), 1, support::header(20, 1), 3, support::header(49, 1),
+                      4096, support::header(50, 1), 1, support::header(1, 1), 7});
+  const platform::Data telemetry = support::data(support::telemetryList(1));
+  const Dictionary buffers{
+      {"13", support::data(statistics)},
+      {"11", support::data(support::validityList(2, {{0, 5}, {1, 7}, {0, 6}}))},
+      {"17:0", telemetry},
+      {"17:1", telemetry},
+      {"17:2", telemetry},
+      {"15", support::data(support::defectsList(2, {{1, 0, 3, 4, 5, 6, 7, 0}}))}};
+  const Dictionary characteristics{{"chip-id", "QM8"},
+                                   {"manufacturer-id", "2C64A1D40500"},
+                                   {"num-bus", 1},
+                                   {"nand-device-desc", 9}};
+  return {{"Class", "NorbaQRT3NVMeController"},
+          {"Properties", Dictionary{{"Controller Characteristics", characteristics}}},
+          {"Driver", Dictionary{{"Buffers", buffers}}}};
 }
 
 }  // namespace
@@ -60,7 +84,7 @@ void Device::fill() {
   writePropertyList("device/system-version.plist",
                     Dictionary{{"ProductBuildVersion", "A1"}, {"ProductVersion", "1.0"}});
   writePropertyList("device/kernel.plist",
-                    Dictionary{{"kern.bootsessionuuid", today_ % 2 == 0 ? "0" : "1"}});
+                    Dictionary{{"kern.bootsessionuuid", today_ % 2 == 0 ? "1" : "0"}});
   writePropertyList("device/properties.plist",
                     Dictionary{{"DiskUsage", Dictionary{{"TotalDiskCapacity", 5 << 20},
                                                         {"TotalDataAvailable", 3 << 20}}}});
@@ -73,6 +97,11 @@ void Device::fill() {
                                               {"since", platform::Date{today_ * 86400.0}},
                                               {"wifiInBytes", 2048}}}}});
   root_->write("device/ecc-events/1", std::string("\1\0", 2));
+  writePropertyList("device/registry.plist", Dictionary{{"Children", Array{controller()}}});
+  writePropertyList("device/purgeable-space.plist",
+                    Dictionary{{"SPACEREAP_TOTAL_AVAILABLE", 5000}});
+  const platform::Data snapshot = support::data(support::kernelSnapshot(4096));
+  root_->write("device/kernel-snapshot.bin", std::string(snapshot.begin(), snapshot.end()));
   writePropertyList("device/locale.plist", Dictionary{{"PreferredLanguages", Array{"de-AT"}},
                                                       {"Localizations", Array{"en", "de"}},
                                                       {"CountryCode", "AT"}});
@@ -140,6 +169,25 @@ std::vector<Dictionary> Device::dailyLogs() const {
     logs.push_back(dictionary != nullptr ? *dictionary : Dictionary());
   }
   return logs;
+}
+
+Lines Device::storageLogs() const {
+  Lines logs;
+  for (const std::string& name : names(kSubmitted)) {
+    if (!name.starts_with("StorageStatus.165.")) continue;
+    logs.push_back(root_->read(std::string(kSubmitted) + "/" + name));
+  }
+  return logs;
+}
+
+Lines Device::structuredLogs() const {
+  std::string all;
+  for (const char* folder : {kSubmitted, "var/spool/morvend/structured"}) {
+    for (const std::string& name : names(folder)) {
+      if (name.ends_with(".jsonl")) all += root_->read(std::string(folder) + "/" + name);
+    }
+  }
+  return linesOf(all);
 }
 
 Dictionary Device::expectedSections() const {

@@ -30,7 +30,8 @@ class Device {
 
   // Counters of three days, whitelist, consent, tasking for three users, device files, logs to be
   // rolled and dumped, the module, an ECC event, a reporting channel, a process that used the
-  // network. It is a day on which storage counters go to the analytics sink.
+  // network, a worn storage controller with every list. It is a day on which storage counters go to
+  // the counters service.
   void fill();
 
   const support::TemporaryFolder& root() const { return *root_; }
@@ -57,6 +58,12 @@ class Device {
 
   // The daily logs in the spool, parsed; one that doesn't parse is an empty dictionary.
   std::vector<Dictionary> dailyLogs() const;
+
+  // The storage logs in the spool.
+  Lines storageLogs() const;
+
+  // The lines of structured data in the spool, then of those that aren't dumped yet.
+  Lines structuredLogs() const;
 
   // The log that this device's counters make for yesterday, without what a run adds to it: the
   // creation date and the collectors' values.

@@ -122,25 +122,27 @@ WRAPPED(mkdir, (const char* path, mode_t mode), (path, mode))
 WRAPPED(mkdirat, (int folder, const char* path, mode_t mode), (folder, path, mode))
 WRAPPED(rmdir, (const char* path), (path))
 
-// An open call counts when it may make or empty a file.
-#define OPENING(name, parameters, ...)                                               \
-  EXPORTED int name parameters {                                                     \
-    mode_t mode = 0;                                                                 \
-    const int makes = (flags & O_CREAT) != 0 || (flags & O_TMPFILE) == O_TMPFILE;    \
-    if (makes) {                                                                     \
-      va_list rest;                                                                  \
-      va_start(rest, flags);                                                         \
-      mode = va_arg(rest, mode_t);                                                   \
-      va_end(rest);                                                                  \
-    }                                                                                \
-    if (!makes && (flags & O_TRUNC) == 0) return ORIGINAL(name)(__VA_ARGS__, flags); \
-    AROUND(ORIGINAL(name)(__VA_ARGS__, flags, mode));                                \
+// An open call counts when it makes or empties a file: an existing one opens on a full disk, too.
+#define OPENING(name, parameters, folder, ...)                                  \
+  EXPORTED int name parameters {                                                \
+    mode_t mode = 0;                                                            \
+    const int temporary = (flags & O_TMPFILE) == O_TMPFILE;                     \
+    int changes = (flags & O_TRUNC) != 0 || temporary;                          \
+    if ((flags & O_CREAT) != 0 || temporary) {                                  \
+      va_list rest;                                                             \
+      va_start(rest, flags);                                                    \
+      mode = va_arg(rest, mode_t);                                              \
+      va_end(rest);                                                             \
+      if (faccessat(folder, path, F_OK, AT_SYMLINK_NOFOLLOW) != 0) changes = 1; \
+    }                                                                           \
+    if (!changes) return ORIGINAL(name)(__VA_ARGS__, flags, mode);              \
+    AROUND(ORIGINAL(name)(__VA_ARGS__, flags, mode));                           \
   }
 
-OPENING(open, (const char* path, int flags, ...), path)
-OPENING(open64, (const char* path, int flags, ...), path)
-OPENING(openat, (int folder, const char* path, int flags, ...), folder, path)
-OPENING(openat64, (int folder, const char* path, int flags, ...), folder, path)
+OPENING(open, (const char* path, int flags, ...), AT_FDCWD, path)
+OPENING(open64, (const char* path, int flags, ...), AT_FDCWD, path)
+OPENING(openat, (int folder, const char* path, int flags, ...), folder, folder, path)
+OPENING(openat64, (int folder, const char* path, int flags, ...), folder, folder, path)
 
 // Half of the bytes, but at least one, so that a program that goes on comes to an end.
 static size_t half(size_t size) { return size - size / 2; }

@@ -51,6 +51,21 @@ inline Bytes records(const std::vector<MSPRecord>& all) {
   return bytes;
 }
 
+// A kernel snapshot of one thread, the swap-out thread, that has written so many bytes.
+inline Bytes kernelSnapshot(std::uint64_t bytesWritten) {
+  constexpr std::uint32_t kBegin = 0x13, kThreadName = 0x909, kIOStatistics = 0x901;
+  Bytes bytes;
+  for (const auto& [type, payload] :
+       {std::pair(kBegin, words({0})),
+        std::pair(kThreadName, words({0x6F706177735F4D56, 0x7475})),  // VM_swapout
+        std::pair(kIOStatistics, words({1, 2, 3, bytesWritten}))}) {
+    put(bytes, type | std::uint64_t{payload.size()} << 32, 8);
+    put(bytes, 1, 8);
+    bytes.insert(bytes.end(), payload.begin(), payload.end());
+  }
+  return bytes;
+}
+
 inline Fields fieldsOf(const NANDInfo::GenericParserCxt& context) {
   Fields fields;
   for (std::size_t i = 0; i < context.size(); ++i) {

@@ -1,0 +1,168 @@
+// Whatever the device's services answer, the day ends with its record written, and nothing is left
+// of it in the process.
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <functional>
+#include <random>
+
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/StructuredLogState.h"
+#include "daemon/Entry.h"
+#include "end_to_end/Device.h"
+#include "platform/host/HostPropertyListCodec.h"
+#include "platform/testing/FaultInjector.h"
+#include "support/HostOnRoot.h"
+
+namespace end_to_end {
+namespace {
+
+using platform::Data;
+using platform::Platform;
+
+std::ptrdiff_t entriesOf(const char* folder) {
+  return std::distance(std::filesystem::directory_iterator(folder), {});
+}
+
+// Runs the daily sequence in this process, as `main` does; what was written to standard error. The
+// platform may be wrapped.
+std::string runDay(
+    const Device& device,
+    const std::function<void(Platform&, const std::function<void(Platform&)>&)>& wrap =
+        [](Platform& platform, const auto& run) { run(platform); }) {
+  ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent", 1);
+  NANDInfo::ResetExporters();
+  NANDInfo::ResetAPIErrorMessage();
+  NANDInfo::ResetStructuredLogState();
+  const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
+  ::testing::internal::CaptureStderr();
+  {
+    support::HostOnRoot host(device.root().path());
+    wrap(host.platform(), [](Platform& platform) {
+      morvend::DeviceContext context(platform);
+      const char* const arguments[] = {"morvend", "-d"};
+      morvend::RunProcess(platform, context, 2, arguments);
+    });
+  }
+  const std::string said = ::testing::internal::GetCapturedStderr();
+  EXPECT_EQ(entriesOf("/proc/self/fd"), files) << said;
+  EXPECT_EQ(entriesOf("/proc/self/task"), threads) << said;
+  EXPECT_EQ(said.find("were not released"), std::string::npos) << said;
+  EXPECT_EQ(linesOf(said).back(), "morvend ended");
+  EXPECT_EQ(device.record("LastCrashLogSerializationDateInDaysSince1970"),
+            Value(device.today() - 1))
+      << said;
+  return said;
+}
+
+// Every value of a property list but the outermost.
+void collectValues(Value& value, std::vector<Value*>& all) {
+  const auto add = [&all](Value& inner) {
+    all.push_back(&inner);
+    collectValues(inner, all);
+  };
+  if (auto* array = value.as<Array>()) {
+    for (Value& element : *array) add(element);
+  } else if (auto* dictionary = value.as<Dictionary>()) {
+    for (const auto& entry : *dictionary) add(*dictionary->find(entry.key));
+  }
+}
+
+class HostileDevice : public ::testing::Test {
+ protected:
+  HostileDevice() { filled.fill(); }
+
+  Data randomData(std::size_t size) {
+    Data bytes(size);
+    for (auto& byte : bytes) byte = static_cast<std::uint8_t>(random());
+    return bytes;
+  }
+
+  // A day on the filled device with one file replaced.
+  void runWith(const std::string& path, const std::string& bytes, const std::string& what) {
+    SCOPED_TRACE(path + ": " + what);
+    Device device;
+    device.become(filled);
+    device.root().write(path, bytes);
+    runDay(device);
+  }
+
+  Device filled;
+  std::mt19937 random{1};
+};
+
+// Each value of each file, one after the other, becomes something else: names that nobody knows,
+// buffers that lie, counts that can't be.
+TEST_F(HostileDevice, EndsTheDayWhateverAValueIsReplacedBy) {
+  constexpr std::size_t kTurns = 8;  // of the replacements, for each value
+  Data lyingCount(24, 0xFF);
+  lyingCount[0] = 4;
+  const Dictionary announced{{"Data", lyingCount}, {"Announce", std::int64_t{1} << 32}};
+  const Dictionary failing{{"Data", lyingCount}, {"FailData", 5}};
+  const Value others[] = {Array(),           Dictionary(),   "",        announced,
+                          randomData(20000), failing,        "x",       -1,
+                          lyingCount,        randomData(1),  INT64_MAX, 1e300,
+                          Array{"x"},        randomData(40), true,      Dictionary{{"", -1}}};
+  std::size_t next = 0;
+  platform::host::HostPropertyListCodec codec;
+  for (const std::string& name : filled.names("device")) {
+    if (!name.ends_with(".plist")) continue;
+    Value list = *filled.readPropertyList("device/" + name);
+    std::vector<Value*> values;
+    collectValues(list, values);
+    for (std::size_t i = 0; i < values.size(); ++i) {
+      for (std::size_t turn = 0; turn < kTurns; ++turn) {
+        // Moved, so that the values within stay where they are.
+        Value whole = std::exchange(*values[i], others[next++ % std::size(others)]);
+        runWith("device/" + name, *codec.writeXML(list), std::to_string(i));
+        *values[i] = std::move(whole);
+      }
+    }
+  }
+}
+
+TEST_F(HostileDevice, EndsTheDayWhateverAFileHolds) {
+  platform::host::HostPropertyListCodec codec;
+  Array channels;
+  for (int i = 0; i < 3000; ++i) {
+    channels.push_back(Dictionary{{"Name", std::string(300, 'c') + std::to_string(i)},
+                                  {"Category", 0x100},
+                                  {"Format", 1},
+                                  {"Value", INT64_MIN}});
+  }
+  for (const char* path :
+       {"device/registry.plist", "device/kernel-snapshot.bin", "device/ecc-events/1",
+        "device/report-channels.plist", "device/network-usage.plist", "device/kernel.plist",
+        kModule, kWhitelist, "var/preferences/__quenset__/com.norba.Varnhollow.plist"}) {
+    const std::string whole = filled.root().read(path);
+    runWith(path, "", "empty");
+    runWith(path, whole.substr(0, whole.size() / 2), "cut");
+    runWith(path, *codec.writeXML(channels), "an array");
+    for (const std::size_t size : {1u, 71u, 73u, 5000u}) {
+      const Data bytes = randomData(size);
+      runWith(path, std::string(bytes.begin(), bytes.end()), "random");
+    }
+  }
+}
+
+// A service that fails once, at any call.
+TEST_F(HostileDevice, EndsTheDayWhicheverCallFails) {
+  int calls = 1;
+  for (int failing = 0; failing <= calls; ++failing) {
+    Device device;
+    device.become(filled);
+    runDay(device, [&](Platform& platform, const auto& run) {
+      platform::fakes::FaultInjector faults(platform);
+      faults.failAt(failing);
+      run(faults.platform());
+      if (failing == 0) calls = faults.calls();
+    });
+    if (HasFailure()) FAIL() << "call " << failing << " of " << calls;
+  }
+  EXPECT_GT(calls, 70);
+}
+
+}  // namespace
+}  // namespace end_to_end
