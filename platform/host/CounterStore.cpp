@@ -12,6 +12,10 @@ namespace {
 constexpr int kDaysKept = 60;
 constexpr std::size_t kMostSamplesInRow = 65536;
 
+// A client's failure that takes this long, and how long it is then spared.
+constexpr std::chrono::seconds kSlow(1);
+constexpr std::chrono::minutes kPause(1);
+
 void write(sqlite::Connection& connection, const CounterChange& change) {
   switch (change.kind) {
     case CounterChange::Kind::set:
@@ -118,9 +122,16 @@ void CounterStore::PLClientAddValueForScalarKey(std::string_view key, std::int64
 }
 
 void CounterStore::record(CounterChange::Kind kind, std::string_view key, std::int64_t value) {
+  const auto start = std::chrono::steady_clock::now();
+  {
+    const std::scoped_lock lock(mutex_);
+    if (start < droppedUntil_) return;
+  }
   const CounterChange change{.kind = kind, .key = key, .day = PLDaysSince1970(), .amount = value};
   const std::string error = apply({&change, 1});
   const std::scoped_lock lock(mutex_);
+  const auto end = std::chrono::steady_clock::now();
+  if (!error.empty() && end - start > kSlow) droppedUntil_ = end + kPause;
   if (!error.empty() && error != clientError_) {
     place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());
   }
