@@ -22,8 +22,8 @@ class HostDeviceProperties : public DeviceProperties {
 
   std::optional<std::uint32_t> multiUserIndicator() override;
 
-  // Sizes that are negative are 0. Without the entry, the figures of the file system that holds the root; with one of another type
-  // than a dictionary, no answer. A negative size counts as 0.
+  // Sizes that are negative are 0. Without the entry, the figures of the file system that holds the
+  // root; with one of another type than a dictionary, no answer. A negative size counts as 0.
   std::optional<DiskUsage> diskUsage() override;
 
   // /var/containers/systemgroup/<identifier>, a path of the device, where that folder exists; else
