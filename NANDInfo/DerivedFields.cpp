@@ -106,9 +106,8 @@ Dictionary getSpacereapInfo(Platform& platform) {
 
 Dictionary gatherZMCFTLOtherData(Platform& platform, const Dictionary* ftl) {
   Dictionary derived = getSpacereapInfo(platform);
-  for (const auto& fields : {CopyVMFreezerNANDInfo(platform), GetDiskInfo(platform)}) {
-    for (const auto& [key, value] : fields) CopyDictionary(key, value, derived);
-  }
+  addEntries(CopyVMFreezerNANDInfo(platform), derived);
+  addEntries(GetDiskInfo(platform), derived);
   derived.set(kTLM_storeDemoMode, storeDemoMode(platform));
   if (ftl != nullptr) {
     addFTLFields(*ftl, derived);

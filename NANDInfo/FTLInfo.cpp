@@ -61,9 +61,7 @@ std::optional<Dictionary> CopyWhitelistedNANDFTLInfo(Platform& platform, bool ro
   Dictionary counters;
   if (auto ftl = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0)) {
     counters = std::move(*ftl);
-    for (const auto& [key, value] : gatherZMCFTLOtherData(platform, &counters)) {
-      CopyDictionary(key, value, counters);
-    }
+    addEntries(gatherZMCFTLOtherData(platform, &counters), counters);
   } else {
     SetAPIErrorMessage("CopyWhitelistedNANDFTLInfo: Unable to gather other FTL fields");
   }

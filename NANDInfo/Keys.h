@@ -90,6 +90,14 @@ inline constexpr char kTLM_mspBootBlockProgFails_backup[] = "TLM_mspBootBlockPro
 inline constexpr char kTLM_mspBootBlockEraseFails_main[] = "TLM_mspBootBlockEraseFails_main";
 inline constexpr char kTLM_mspBootBlockEraseFails_backup[] = "TLM_mspBootBlockEraseFails_backup";
 
+// Of the stats magazine: a snapshot's time in seconds, the distance of two snapshots in days, and
+// the write amplification of garbage collection in each of the last six windows of four hours.
+inline constexpr char kTLM_magazineTimeStamp[] = "TLM_magazineTimeStamp";
+inline constexpr char kTLM_SM_deltaDays[] = "TLM_SM_deltaDays";
+inline constexpr const char* kTLM_instantaneous_gc_wamp_array[] = {
+    "TLM_instantaneous_gc_wamp_0", "TLM_instantaneous_gc_wamp_1", "TLM_instantaneous_gc_wamp_2",
+    "TLM_instantaneous_gc_wamp_3", "TLM_instantaneous_gc_wamp_4", "TLM_instantaneous_gc_wamp_5"};
+
 // In every whitelisted result.
 inline constexpr char kTLM_APIErrorMessage[] = "TLM_APIErrorMessage";
 

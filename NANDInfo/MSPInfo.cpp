@@ -98,8 +98,8 @@ Dictionary firmwareVersion(const Dictionary& counters) {
 Dictionary reported(const Dictionary& counters, const Dictionary& shared, bool round) {
   Dictionary msp =
       CreateFilteredDict_SigDig(counters, &WhitelistedRawNANDMSPCounters_SigDigDict(), round);
-  for (const auto& [key, value] : shared) CopyDictionary(key, value, msp);
-  for (const auto& [key, value] : firmwareVersion(counters)) CopyDictionary(key, value, msp);
+  addEntries(shared, msp);
+  addEntries(firmwareVersion(counters), msp);
   return msp;
 }
 

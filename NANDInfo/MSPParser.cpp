@@ -15,7 +15,7 @@ constexpr std::uint16_t kEndTag = 0x2FFF;
 std::optional<std::uint32_t> addElements(GenericParserCxt* context, const MSPTag& row,
                                          std::span<const std::byte> payload) {
   const unsigned tag = row.tag, width = row.width, configured = row.elements;
-  if (payload.size() != configured * width) {
+  if (payload.size() != std::size_t{configured} * width) {
     SetAPIErrorMessage(
         "ZMCMSPParseBufferToCxt: %s(%u): cfg %u elements; (%u*%u) cfg bytes != (%zu) buffer bytes",
         row.name, tag, configured, configured, width, payload.size());

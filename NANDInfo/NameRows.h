@@ -17,6 +17,15 @@ std::span<const NameRow> magazineAccumulatedSignificantDigitsRows();
 std::span<const NameRow> magazineDynamicSignificantDigitsRows();
 std::span<const NameRow> magazineSignificantDigitsRows();
 
+// What the analytics events may carry.
+std::span<const NameRow> ftlCountersEventRows();
+std::span<const NameRow> ftlHistograms1EventRows();
+std::span<const NameRow> ftlHistograms2EventRows();
+std::span<const NameRow> magazineDailyEventRows();
+std::span<const NameRow> magazineLongerEventRows();
+std::span<const NameRow> mspCountersEventRows();
+std::span<const NameRow> storageStatsEventRows();
+
 // The key map.
 struct KeyMapRow {
   const char* counters;             // a family of legacy counters

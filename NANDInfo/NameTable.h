@@ -17,7 +17,7 @@ namespace NANDInfo MORVEND_EXPORTED {
 
 struct NameRow {
   const char* family;
-  std::uint8_t number;  // whatever the table says of its names; 0 where it says nothing
+  std::uint8_t number = 0;  // whatever the table says of its names; 0 where it says nothing
 };
 
 // The names that a table's rows stand for, in the order of the rows, found in constant time. Of

@@ -1,6 +1,7 @@
 #include "NANDInfo/StructuredLogs.h"
 
 #include <array>
+#include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -118,7 +119,7 @@ bool retrieveList(Platform& platform, const Source& source, const ListRetrieval&
   const Pages pages = allocatePages(size);
   if (!pages) {
     platform.streams.writeError(
-        platform::format("Could not malloc %zd bytes", static_cast<ssize_t>(size)));
+        platform::format("Could not malloc %zd bytes", static_cast<std::ptrdiff_t>(size)));
     return false;
   }
   const std::span list(pages.get(), size);

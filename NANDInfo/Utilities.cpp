@@ -65,6 +65,10 @@ void CopyDictionary(std::string_view key, const Value& value, platform::Dictiona
   target.set(key, value);
 }
 
+void addEntries(const platform::Dictionary& entries, platform::Dictionary& target) {
+  for (const auto& [key, value] : entries) CopyDictionary(key, value, target);
+}
+
 std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text) {
   unsigned byte = 0;
   for (const char given : text.substr(0, 2)) {

@@ -34,6 +34,9 @@ platform::Value GetStringFromDictionarySafe(const platform::Dictionary& dictiona
 void CopyDictionary(std::string_view key, const platform::Value& value,
                     platform::Dictionary& target);
 
+// Stores all entries in the target; they replace what it has under their keys.
+void addEntries(const platform::Dictionary& entries, platform::Dictionary& target);
+
 // At most two, or eight, hexadecimal characters as a number. A character that isn't hexadecimal is
 // said on standard output and adds nothing.
 std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text);

@@ -2,7 +2,6 @@
 
 #include <csignal>
 #include <cstdlib>
-#include <optional>
 
 #include "platform/host/Bus.h"
 #include "platform/host/DeviceFileSystem.h"
@@ -21,13 +20,13 @@
 #include "platform/host/HostStandardStreams.h"
 #include "platform/host/HostSystemVersion.h"
 #include "platform/host/MD5Digest.h"
+#include "platform/host/PlayedServices.h"
 #include "platform/host/PreferenceFiles.h"
 #include "platform/host/RunLockFile.h"
 #include "platform/host/ServitaLogFiles.h"
 #include "platform/host/StandardErrorLog.h"
 #include "platform/host/StructuredLogFiles.h"
 #include "platform/host/SubmissionSpool.h"
-#include "platform/host/SystemClock.h"
 
 namespace platform::host {
 
@@ -42,7 +41,8 @@ HostOptions HostOptions::fromEnvironment() {
 
 // In the order of construction: each service stands after those that it uses.
 struct Host::Services {
-  explicit Services(const HostOptions& options) : root(options.root), log(options.lowestLevel) {}
+  explicit Services(const HostOptions& options)
+      : root(options.root), log(options.lowestLevel), played(options.played) {}
 
   void countDamagedDatabase() {
     preferences.addToInteger("DatabaseCorruptionCount", "com.norba.pellorand", 1);
@@ -50,8 +50,11 @@ struct Host::Services {
 
   DeviceRoot root;
   StandardErrorLog log;
+  const std::optional<PlayedRun> played;
   HostStandardStreams streams;
-  SystemClock clock;
+  const std::unique_ptr<SystemClock> ownClock =
+      played ? std::make_unique<PlayedClock>(played->now) : std::make_unique<SystemClock>();
+  Clock& clock = *ownClock;
   MD5Digest digest;
   HostPropertyListCodec codec;
   DeviceFileSystem files{root};
@@ -67,11 +70,16 @@ struct Host::Services {
   StructuredLogFiles structuredLogs{root, clock, log};
   ServitaLogFiles servitaLogs{root, log};
   Bus bus{log};
+  PlayedNotifications playedNotifications;
+  NotificationCenter& notifications =
+      played ? static_cast<NotificationCenter&>(playedNotifications) : bus;
   EventSink eventSink{root, codec, clock, log};
   DeviceFile propertiesFile{root, codec, log, "device/properties.plist"};
   HostDeviceProperties deviceProperties{root, propertiesFile};
   HostSystemVersion systemVersion{root, codec, log};
-  HostKernel kernel{root, codec, log};
+  const std::unique_ptr<HostKernel> kernel =
+      played ? std::make_unique<PlayedKernel>(root, codec, log, *played)
+             : std::make_unique<HostKernel>(root, codec, log);
   HostKernelSnapshots snapshots{root};
   HostDeviceRegistry registry{root, codec, log};
   HostPurgeableSpace purgeableSpace{root, codec, log};
@@ -98,11 +106,11 @@ struct Host::Services {
                     servitaLogs,
                     bus,
                     bus,
-                    bus,
+                    notifications,
                     eventSink,
                     deviceProperties,
                     systemVersion,
-                    kernel,
+                    *kernel,
                     snapshots,
                     registry,
                     registry,

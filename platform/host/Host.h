@@ -3,17 +3,20 @@
 
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "platform/Platform.h"
 #include "platform/host/CounterStore.h"
 #include "platform/host/DeviceRoot.h"
+#include "platform/host/PlayedRun.h"
 
 namespace platform::host {
 
 struct HostOptions {
   std::string root = "/";  // the device root, a path of the host
   LogLevel lowestLevel = LogLevel::standard;
+  std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
 
   // As the environment says: MORVEND_ROOT and MORVEND_LOG.
   static HostOptions fromEnvironment();

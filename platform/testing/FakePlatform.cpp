@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <thread>
 
 #include "platform/Text.h"
 
@@ -207,8 +208,21 @@ std::unique_ptr<NamedServiceListener> FakeService::listen(std::string_view servi
 }
 
 bool FakeEventra::EventraSendEventLazy(std::string_view event, PayloadProducer producer) {
-  if (everyEventIsUsed) events.emplace_back(event, producer());
-  return everyEventIsUsed;
+  if (!hasLazySend || !queuesEvents || !EventraIsEventUsed(event)) return false;
+  if (defers) {
+    waiting_.emplace_back(event, std::move(producer));
+  } else {
+    events.emplace_back(event, producer());
+  }
+  return true;
+}
+
+void FakeEventra::deliver() {
+  std::thread([this] {
+    for (const auto& [event, producer] : std::exchange(waiting_, {})) {
+      events.emplace_back(event, producer());
+    }
+  }).join();
 }
 
 bool FakeDevice::booleanProperty(std::string_view name) {

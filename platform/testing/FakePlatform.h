@@ -7,6 +7,7 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 #include <tuple>
 #include <utility>
@@ -164,10 +165,22 @@ class FakeService : public EventLoop, public NamedServices, public NotificationC
 
 class FakeEventra : public Eventra {
  public:
-  bool everyEventIsUsed = true;
+  bool hasLazySend = true, everyEventIsUsed = true, queuesEvents = true;
+  std::set<std::string, std::less<>> unused;  // events that aren't used even so
+  bool defers = false;                        // leaves what is sent to deliver()
   std::vector<std::pair<std::string, Dictionary>> events;
-  bool EventraIsEventUsed(std::string_view) override { return everyEventIsUsed; }
+
+  // Asks the producers that still wait for their payloads, on a thread of its own.
+  void deliver();
+
+  bool offersLazySend() override { return hasLazySend; }
+  bool EventraIsEventUsed(std::string_view event) override {
+    return everyEventIsUsed && !unused.contains(event);
+  }
   bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) override;
+
+ private:
+  std::vector<std::pair<std::string, PayloadProducer>> waiting_;
 };
 
 class FakeDevice : public DeviceProperties,

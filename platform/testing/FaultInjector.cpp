@@ -87,6 +87,7 @@ struct Events : Eventra {
   Events(Eventra& i, Plan& p) : inner(i), plan(p) {}
   Eventra& inner;
   Plan& plan;
+  bool offersLazySend() override { return inner.offersLazySend(); }
   bool EventraIsEventUsed(std::string_view event) override {
     return !plan.fails() && inner.EventraIsEventUsed(event);
   }

@@ -36,6 +36,8 @@ using Lines = std::vector<std::string>;
 constexpr char kQRT3[] = "NorbaQRT3NVMeController";
 constexpr char kEmbedded[] = "NorbaEmbeddedNVMeController";
 constexpr char kStorage[] = "ZMCStorage";
+constexpr char kCharacteristics[] = "Controller Characteristics";
+constexpr const SelectorPair* kNoPair = nullptr;
 constexpr std::uint32_t kError = 0x2BC;
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
@@ -219,15 +221,14 @@ class StructuredLogsTest : public ::testing::Test {
   StructuredLogsTest() { restart(); }
   ~StructuredLogsTest() override { EXPECT_EQ(registry.problems(), Lines()); }
 
-  // A controller that answers everything. One field of its statistics makes the validity list
-  // wanted: erases without host writes.
-  void restart(const char* className = kEmbedded) {
+  // A controller that answers everything, with a write amplification of 3.
+  void restart() {
     ResetExporters();
     ResetStructuredLogState();
     registry = FakeDeviceRegistry();
     registry.add({.className = "Bus",
-                  .properties = {{"Controller Characteristics", characteristics}},
-                  .children = {{.className = className}}});
+                  .properties = {{kCharacteristics, characteristics}},
+                  .children = {{.className = kEmbedded}}});
     const auto header = [](std::uint32_t key) { return support::header(key, 1); };
     registry.alwaysTunnels(
         9, 13, 0,
@@ -298,9 +299,11 @@ TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
   const struct {
     std::optional<Value> preference;
     bool forced, statisticsFail, logged;
-  } rows[] = {{{}, false, false, true},    {5.0, false, false, false}, {5.0, true, false, true},
-              {{}, false, true, false},    {2.5, false, false, true},  {{}, true, true, true},
-              {"5.0", false, false, true}, {3.0, false, false, false}};
+  } rows[] = {{{}, false, false, true},
+              {5.0, false, false, false},
+              {5.0, true, false, true},
+              {{}, false, true, false},
+              {{}, true, true, true}};
   for (const auto& row : rows) {
     SCOPED_TRACE(&row - rows);
     restart();
@@ -322,105 +325,68 @@ TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
 
 // A call or a list that fails, what is said of it, and what is logged all the same.
 TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
-  const auto fail = [&](const char* call, Answer answer) {
+  const auto say = [&](const char* call, Answer answer) {
     return [this, call, answer] { registry.standing[call] = answer; };
   };
   const auto announce = FakeDeviceRegistry::announce;
-  const auto list = [&](std::uint32_t opType, std::uint32_t argument, Bytes bytes) {
-    return [=, this] { registry.alwaysTunnels(9, opType, argument, bytes); };
+  const auto list = [&](std::uint32_t opType, std::size_t size) {
+    return [this, opType, size] { registry.alwaysTunnels(9, opType, 0, Bytes(size)); };
   };
-  const auto exporter = [](auto change) { return [change] { change(nand_exporters_tunnel[1]); }; };
-  const std::string notFetched = "Could not retrieve data from driver for selector ";
+  nand_exporter_t& driver = nand_exporters_tunnel[1];
+  Entry* controller = nullptr;
+  const std::string failed = "DrvCallStructMethod failed with status 0x2bc on selector index ";
+  const std::string notFetched = "Could not retrieve data from driver for selector 17\n";
   const std::string beyond = "ERROR: Attempting to parse beyond the bounds of the buffer\n";
   const std::string unparsable = "data cannot be parsed";
-  const std::string sizeFailed = "DrvCallStructMethod failed with status 0x2bc on selector index ";
   const std::string validity = "Validity list retrieval is not supported\n";
   const std::string telemetry = "Telemetry list retrieval is not supported\n";
   const std::string defects = "Defects list retrieval is not supported\n";
-  const SelectorGetter none = [] { return static_cast<const SelectorPair*>(nullptr); };
+  const auto noValidity = [&] { driver.getBandStatsSelectors = nullptr; };
+  const auto noTelemetry = [&] { driver.getTelemetryListSelectors = nullptr; };
+  const auto noPair = [&] { driver.getTelemetryListSelectors = [] { return kNoPair; }; };
+  const auto noDefects = [&] { driver.getDefectsListSelectors = nullptr; };
+  const Answer oneByte{.output = Bytes(1, std::byte{12})};
+  const Answer overlong{.output = Bytes(44), .claimedSize = ~0u};
   const struct {
-    const char* name;
-    std::function<void()> prepare;
-    bool result;
+    std::vector<std::function<void()>> prepare;
     Lines errors;
+    bool result;
     std::size_t submitted, structured;
   } rows[] = {
-      {"size", fail("9 size 11/0", {kError}), true, {sizeFailed + "0\n"}, 0, 8},
-      {"last size", fail("9 size 15/0", {kError}), true, {sizeFailed + "4\n"}, 1, 6},
-      {"data", fail("9 data 17/1", {kError}), true, {notFetched + "17\n"}, 1, 6},
-      {"empty", fail("9 size 17/2", announce(0)), true, {}, 1, 6},
-      {"no answer", fail("9 size 17/2", {}), true, {}, 1, 6},
-      {"short size", fail("9 size 15/0", {.output = Bytes(1, std::byte{12})}), true, {}, 1, 7},
-      {"large",
-       fail("9 size 17/0", announce((16u << 20) + 1)),
-       false,
+      {{say("9 size 11/0", {kError})}, {failed + "0\n"}, true, 0, 8},
+      {{say("9 size 15/0", {kError})}, {failed + "4\n"}, true, 1, 6},
+      {{noValidity, say("9 size 15/0", {kError})}, {validity, failed + "3\n"}, true, 0, 6},
+      {{say("9 data 17/1", {kError})}, {notFetched}, true, 1, 6},
+      {{say("9 size 17/2", announce(0))}, {}, true, 1, 6},
+      {{say("9 size 17/2", {})}, {}, true, 1, 6},
+      {{say("9 size 15/0", oneByte)}, {}, true, 1, 7},
+      {{say("9 data 15/0", overlong)}, {}, true, 1, 7},
+      {{say("9 data 11/0", {})}, {unparsable}, false, 0, 8},
+      {{say("9 size 17/0", announce(1 << 24))}, {}, true, 1, 8},
+      {{say("9 size 17/0", announce(1 << 24 | 1))},
        {"Could not malloc 16777217 bytes"},
+       false,
        1,
        6},
-      {"largest", fail("9 size 17/0", announce(16u << 20)), true, {}, 1, 8},
-      {"huge",
-       fail("9 size 15/0", announce(0xFFFFFFFF)),
+      {{say("9 size 15/0", announce(~0u))}, {"Could not malloc 4294967295 bytes"}, false, 1, 6},
+      {{list(17, 8255)}, {beyond}, false, 1, 6},
+      {{list(11, 40), list(15, 11)}, {unparsable, unparsable}, false, 0, 6},
+      {{noTelemetry}, {telemetry}, true, 1, 2},
+      {{noPair}, {}, false, 1, 2},
+      {{noValidity, noTelemetry, noDefects}, {validity, telemetry, defects}, true, 0, 0},
+      {{[&] {
+         controller->properties = {{kCharacteristics, Dictionary{{"num-bus", 1}}}};
+       }},
+       Lines(3, "ERROR: Could not determine the chip-id\n"),
        false,
-       {"Could not malloc 4294967295 bytes"},
        1,
-       6},
-      {"delivered short", fail("9 data 11/0", {}), false, {unparsable}, 0, 8},
-      {"claimed long",
-       fail("9 data 15/0", {.output = Bytes(44), .claimedSize = SIZE_MAX}),
-       true,
-       {},
-       1,
-       7},
-      {"cut telemetry", list(17, 0, Bytes(8255)), false, {beyond}, 1, 6},
-      {"cut defects", list(15, 0, Bytes(11)), false, {unparsable}, 1, 6},
-      {"two",
-       [&] { list(11, 0, Bytes(40))(), list(15, 0, Bytes(4))(); },
-       false,
-       {unparsable, unparsable},
-       0,
-       6},
-      {"no validity",
-       exporter([](auto& e) { e.getBandStatsSelectors = nullptr; }),
-       true,
-       {validity},
-       0,
-       8},
-      {"index",
-       [&] {
-         nand_exporters_tunnel[1].getBandStatsSelectors = nullptr;
-         fail("9 size 17/0", {kError})();
-       },
-       true,
-       {validity, sizeFailed + "0\n"},
-       0,
-       6},
-      {"none",
-       exporter([](auto& e) {
-         e.getBandStatsSelectors = e.getTelemetryListSelectors = e.getDefectsListSelectors =
-             nullptr;
-       }),
-       true,
-       {validity, telemetry, defects},
-       0,
-       0},
-      {"no pair", exporter([&](auto& e) { e.getTelemetryListSelectors = none; }), false, {}, 1, 2},
-      {"no properties",
-       [&] { registry.root->children[0].properties = {}; },
-       false,
-       {"failed to create dictionary"},
-       0,
-       0},
-      {"its own properties",
-       [&] {
-         auto& controller = registry.root->children[0].children[0];
-         controller.properties = {{"Controller Characteristics", Dictionary{{"num-bus", 1}}}};
-       },
-       false, Lines(3, "ERROR: Could not determine the chip-id\n"), 1, 2},
+       2},
   };
   for (const auto& row : rows) {
-    SCOPED_TRACE(row.name);
+    SCOPED_TRACE(&row - rows);
     restart();
-    row.prepare();
+    controller = &registry.root->children[0].children[0];
+    for (const auto& step : row.prepare) step();
     EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
     EXPECT_EQ(errors, row.errors);
     EXPECT_EQ(fakes.submission.logs.size(), row.submitted);
@@ -435,34 +401,28 @@ TEST_F(StructuredLogsTest, WithoutAServiceOrAConnectionThereIsNothing) {
   const std::string notClosed = "Could not close connection to service\n";
   const std::string walking =
       "Failed to find matching service with DrvGetMatchingService, trying iterator...\n";
-  const Dictionary properties{{"Controller Characteristics", characteristics}};
+  const std::string noProperties = "failed to create dictionary";
+  const Entry unopened{.className = kQRT3, .openStatus = kError};
+  const Entry handleless{.className = kQRT3, .oddHandle = true};
+  const Entry oddlyUnopened{.className = kQRT3, .openStatus = kError, .oddHandle = true};
+  const Entry bare{.className = kQRT3, .closeStatus = kError};
+  Entry full = bare;
+  full.properties = {{kCharacteristics, characteristics}};
   const struct {
-    std::optional<Entry> controller;
+    std::vector<Entry> plane;
     bool result;
     Lines errors;
     std::size_t structured;
-  } rows[] = {
-      {std::nullopt, false, {walking, noService, walking, noService}, 0},
-      {Entry{.className = kQRT3, .openStatus = kError}, false, {notOpened, notOpened}, 0},
-      {Entry{.className = kQRT3, .oddHandle = true}, false, {notOpened}, 0},
-      {Entry{.className = kQRT3, .openStatus = kError, .oddHandle = true},
-       false,
-       {notOpened, notOpened},
-       0},
-      {Entry{.className = kQRT3, .closeStatus = kError},
-       false,
-       {notClosed, "failed to create dictionary", notClosed},
-       0},
-      {Entry{.className = kQRT3, .properties = properties, .closeStatus = kError},
-       true,
-       {notClosed, notClosed},
-       8},
-  };
+  } rows[] = {{{}, false, {walking, noService, walking, noService}, 0},
+              {{unopened}, false, {notOpened, notOpened}, 0},
+              {{handleless}, false, {notOpened}, 0},
+              {{oddlyUnopened}, false, {notOpened, notOpened}, 0},
+              {{bare}, false, {notClosed, noProperties, notClosed}, 0},
+              {{full}, true, {notClosed, notClosed}, 8}};
   for (const auto& row : rows) {
     SCOPED_TRACE(&row - rows);
     restart();
-    registry.root->children.clear();
-    if (row.controller) registry.add(*row.controller);
+    registry.root->children = row.plane;
     EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
     EXPECT_EQ(errors, row.errors);
     EXPECT_EQ(structured.size(), row.structured);

@@ -11,8 +11,8 @@
 extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
 FuzzTarget binary_property_list_fuzz, bus_message_fuzz, defects_list_fuzz, ftl_statistics_fuzz,
-    import_lines_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz, registry_fuzz,
-    telemetry_list_fuzz, validity_list_fuzz, xml_property_list_fuzz;
+    import_lines_fuzz, kernel_snapshot_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz,
+    registry_fuzz, telemetry_list_fuzz, validity_list_fuzz, xml_property_list_fuzz;
 }
 
 namespace {
@@ -28,6 +28,7 @@ constexpr Row kTargets[] = {
     {"defects_list_fuzz", defects_list_fuzz},
     {"ftl_statistics_fuzz", ftl_statistics_fuzz},
     {"import_lines_fuzz", import_lines_fuzz},
+    {"kernel_snapshot_fuzz", kernel_snapshot_fuzz},
     {"legacy_statistics_fuzz", legacy_statistics_fuzz},
     {"msp_statistics_fuzz", msp_statistics_fuzz},
     {"registry_fuzz", registry_fuzz},

@@ -1,5 +1,5 @@
 // A device root with a controller that answers: every counter that has a name, three MSPs, lists,
-// EAN images.
+// EAN images; and with a disk whose figures stay the same.
 #pragma once
 
 #include <string_view>
@@ -58,8 +58,13 @@ inline void writeController(const TemporaryFolder& root) {
       {"Class", "NorbaNVMeEAN"},
       {"Driver",
        Dictionary{{"Scalars", Dictionary{{"3:dBIC", 4096}, {"7:ifw1", std::uint64_t{1} << 63}}}}}};
-  root.write("device/registry.plist", *platform::host::HostPropertyListCodec().writeXML(
-                                          Dictionary{{"Children", Array{controller, images}}}));
+  const Dictionary disk{{"TotalDiskCapacity", std::int64_t{128} << 30},
+                        {"TotalDataAvailable", std::int64_t{32} << 30},
+                        {"AmountDataAvailable", std::int64_t{16} << 30}};
+  platform::host::HostPropertyListCodec codec;
+  root.write("device/registry.plist",
+             *codec.writeXML(Dictionary{{"Children", Array{controller, images}}}));
+  root.write("device/properties.plist", *codec.writeXML(Dictionary{{"DiskUsage", disk}}));
 }
 
 }  // namespace support

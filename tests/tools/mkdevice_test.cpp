@@ -7,14 +7,18 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
-#include "daemon/context/DeviceContext.h"
+#include "NANDInfo/StructuredLogs.h"
+#include "NANDInfo/TelemetryList.h"
+#include "platform/Text.h"
 #include "platform/host/Host.h"
-#include "report/PLReport.h"
+#include "platform/host/JSON.h"
+#include "support/HostOnRoot.h"
 #include "support/TemporaryFolder.h"
 #include "tools/demo/Device.h"
 #include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/SampleController.h"
+#include "tools/mkdevice/SampleUsage.h"
 #include "tools/mkdevice/Vocabulary.h"
 
 namespace {
@@ -26,9 +30,9 @@ using platform::host::CounterChange;
 constexpr std::int32_t kToday = 20779;
 
 struct Maker {
-  std::string make(const fs::path& folder, const Sample& sample) {
+  std::string make(const fs::path& folder, const Sample& sample, int days = 0) {
     warnings = 0;
-    const MakingOptions options{folder.string(), sample, "/nowhere/module.so"};
+    const MakingOptions options{folder.string(), sample, days, "/nowhere/module.so"};
     return makeDevice(options, {.progress = [](const std::string&) {},
                                 .warning = [this](const std::string&) { ++warnings; }});
   }
@@ -174,16 +178,10 @@ TEST(Mkdevice, AFolderThatHoldsAnythingIsLeftAsItIs) {
 // An entry that nothing matches is dead; a private key that a prefix catches by mistake leaks.
 TEST(Mkdevice, ItsReportHoldsWhatTheWhitelistNamesAndNothingElse) {
   support::TemporaryFolder folder;
-  ASSERT_EQ(Maker().make(folder / "root", {.today = kToday}), "");
-  {
-    platform::host::Host host({.root = folder / "root", .lowestLevel = platform::LogLevel::error});
-    morvend::DeviceContext context(host.platform());
-    host.keepCountersBelow([&context] { return context.GetHomeDirectoryPath(); });
-    report::PLReport(host.platform(), context).writeLogForYesterday(kToday - 1, nullptr);
-  }
+  ASSERT_EQ(Maker().make(folder / "root", {.today = kToday}, 3), "");
   demo::Device device(folder / "root");
-  ASSERT_EQ(device.logs().size(), 1U);
-  const auto log = device.readLog(device.logs().front());
+  ASSERT_EQ(device.logs().size(), 3U);
+  const auto log = device.readLog(device.logs().back());
   ASSERT_TRUE(log) << log.error;
   const auto& scalars = *log->content.dictionary("PLScalars");
   const auto& distributions = *log->content.dictionary("PLDistributions");
@@ -203,7 +201,9 @@ TEST(Mkdevice, ItsReportHoldsWhatTheWhitelistNamesAndNothingElse) {
   expectReported(distributionTable(), distributions);
   for (const WhitelistRow& row : whitelistTable()) {
     const std::string key = row.key;
-    if (!isTaken(row.group) || key.starts_with("host.")) continue;
+    // Not of a sample device's, and not of every day's.
+    if (key.starts_with("host.") || key.starts_with("datausage.baddata.")) continue;
+    if (!isTaken(row.group)) continue;
     const bool scalar =
         row.section == Section::scalarKeys || row.section == Section::scalarPrefixes;
     const bool exact =
@@ -214,6 +214,63 @@ TEST(Mkdevice, ItsReportHoldsWhatTheWhitelistNamesAndNothingElse) {
     })) << key;
   }
   EXPECT_FALSE(log->content.dictionary("PLDistributionsHistogram")->empty());
+}
+
+// Days that aren't played at their own time, in their order or from the device as it was then.
+TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
+  support::TemporaryFolder folder;
+  std::map<std::string, std::string> files;
+  for (const char* name : {"a", "b"}) {
+    ASSERT_EQ(Maker().make(folder / name, {.today = kToday}, 3), "");
+    auto made = filesOf(folder / name);
+    std::string storage;
+    EXPECT_EQ(std::erase_if(made,
+                            [&storage](const auto& file) {
+                              if (file.first.find("/StorageStatus.") == std::string::npos) {
+                                return false;
+                              }
+                              storage = file.second;
+                              return true;
+                            }),
+              1u)
+        << "one a week, in the first run";
+    for (const char* part : {"Date: 2026-11-19 ", " morvend[", ";ValidityList[15]:"}) {
+      EXPECT_NE(storage.find(part), storage.npos) << part;
+    }
+    EXPECT_TRUE(files.empty() || files == made) << "but for the storage log's random identifier";
+    files = std::move(made);
+  }
+  std::vector<std::string> days;
+  for (const auto& [path, bytes] : files) {
+    if (path.find("structured-") != path.npos) days.push_back(path.substr(path.size() - 16, 10));
+  }
+  EXPECT_EQ(days, (std::vector<std::string>{"2026-11-18", "2026-11-19", "2026-11-20"}));
+
+  demo::Device device(folder / "a");
+  const auto logs = device.logs();
+  ASSERT_EQ(logs.size(), 3u);
+  for (std::size_t i = 0; i < logs.size(); ++i) {
+    const auto start = device.readLog(logs[i])->content.date("PLStartDate")->secondsSince1970;
+    EXPECT_EQ(start, (kToday - 4.0 + static_cast<double>(i)) * 86400);
+  }
+  support::HostOnRoot host(folder / "a");
+  EXPECT_EQ(host.platform().preferences.QNSPreferencesGetIntegerValue(
+                "LastCrashLogSerializationDateInDaysSince1970", "com.norba.pellorand.morvend"),
+            kToday - 2);
+
+  const auto received = [](std::int32_t day) {
+    const auto usage = networkUsage({.today = day});
+    const auto* process = usage.array("Records")->front().as<platform::Dictionary>();
+    return process->number("wifiInBytes")->int64Value();
+  };
+  std::map<std::int32_t, std::int64_t> expected, recorded;
+  for (const std::int32_t day : {kToday - 2, kToday - 1}) {
+    expected[day] = (received(day) - received(day - 1)) / 1024;
+  }
+  host.counters().history()->scalarsForKeyPrefix(
+      "datausage.wifiInKB.com.norba.netconfigd", INT32_MIN, INT32_MAX,
+      [&](auto, auto day, auto value, bool&) { recorded[day] = value; });
+  EXPECT_EQ(recorded, expected);
 }
 
 // The fields that a decoder finds in a buffer.
@@ -398,6 +455,43 @@ TEST(MkdeviceController, EachDriverAnswersWhatItsControllerHas) {
     }
   }
   EXPECT_EQ(controllerNamed("other"), std::nullopt);
+}
+
+TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
+  using NANDInfo::ChipKind;
+  const struct {
+    const char* name;
+    ChipKind kind;
+    NANDInfo::CounterConverter* convert;
+  } rows[] = {{"qm7", ChipKind::QM7, NANDInfo::parseCountersAlgoGeneric},
+              {"qm8", ChipKind::QM8, NANDInfo::parseCountersAlgoGenericQ8},
+              {"1x-sandisk", ChipKind::other, NANDInfo::parseCounters1xSandisk},
+              {"1x-hynix", ChipKind::other, NANDInfo::parseCounters1xHynix},
+              {"1y", ChipKind::other, NANDInfo::parseCounters1y}};
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    support::TemporaryFolder folder;
+    ASSERT_EQ(Maker().make(folder.path(), {.today = kToday, .chip = chipNamed(row.name)}), "");
+    {
+      support::HostOnRoot host(folder.path());
+      EXPECT_TRUE(NANDInfo::DumpStorageStructuredLog(host.platform(), false));
+    }
+    std::string logs;
+    for (const auto& file : fs::directory_iterator(folder / "var/spool/morvend/structured")) {
+      logs += folder.read(file.path().lexically_relative(folder.path()).string());
+    }
+    for (int list = 0; list < 3; ++list) {
+      const auto bytes = folder.read(platform::format("device/controller/telemetry-%d.bin", list));
+      const auto channels =
+          NANDInfo::parseTelemetryList(std::as_bytes(std::span(bytes)), kChannels);
+      for (const auto& channel : channels.value()) {
+        std::string log;
+        platform::host::appendJSON(log, NANDInfo::telemetryLog(channel, row.kind, row.convert));
+        EXPECT_NE(logs.find(log), logs.npos) << list;
+      }
+    }
+  }
+  EXPECT_EQ(std::size(rows), std::size(kChipNames));
 }
 
 }  // namespace

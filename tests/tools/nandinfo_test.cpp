@@ -1,13 +1,13 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <cstring>
 #include <nlohmann/json.hpp>
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
-#include "support/ControllerBuffers.h"
+#include "support/StorageDevice.h"
 #include "support/TemporaryFolder.h"
-#include "support/TestPlatform.h"
 #include "tools/nandinfo/Commands.h"
 #include "tools/nandinfo/NandinfoCommand.h"
 #include "tools/nandinfo/Table.h"
@@ -28,7 +28,7 @@ class Nandinfo : public testing::Test {
     std::ostringstream outStream, errStream;
     NANDInfo::ResetAPIErrorMessage();
     const int status =
-        nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60},
+        nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60, root},
                               static_cast<int>(argv.size()), argv.data());
     out = outStream.str();
     err = errStream.str();
@@ -41,16 +41,16 @@ class Nandinfo : public testing::Test {
     return folder / name;
   }
 
-  support::TestPlatform device;
+  support::StorageDevice device;
   support::TemporaryFolder folder;
   bool terminal = false;
-  std::string out, err;
+  std::string out, err, root;
 };
 
 TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
   const Words commands[] = {
       {},
-      {"magazine"},
+      {"cookbook"},
       {"info", "disk"},
       {"info", "--round"},
       {"ftl", "--round", "--all"},
@@ -65,6 +65,15 @@ TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
       {"decode", "ftl"},
       {"decode", "counters", "2y", "file"},
       {"decode", "counters", "1y"},
+      {"magazine"},
+      {"magazine", "--hours", "4", "--history"},
+      {"magazine", "--history", "--no-delta"},
+      {"magazine", "--hours", "-1"},
+      {"magazine", "--hours", "0x10"},
+      {"magazine", "--hours", "4294967296"},
+      {"magazine", "--hours", "4", "--mode", "3"},
+      {"extract", "--from", "7"},
+      {"extract", "--from", "\x1b"},
       {"capture"},
       {"--unknown\x1b[2J", "info"},
   };
@@ -80,8 +89,9 @@ TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
     if (command.group != nullptr) words.insert(words.begin(), command.group);
     EXPECT_EQ(run(words), 0) << err;
     EXPECT_NE(out.find(command.description), std::string::npos) << out;
+    EXPECT_EQ(run({"--help"}), 0);
+    EXPECT_NE(out.find(command.description), std::string::npos) << out;
   }
-  EXPECT_EQ(run({"--help"}), 0);
   EXPECT_NE(out.find("Examples:"), std::string::npos);
   EXPECT_EQ(run({"--version"}), 0);
   EXPECT_TRUE(out.starts_with("nandinfo ")) << out;
@@ -158,6 +168,11 @@ TEST_F(Nandinfo, SaysWhenThereIsNoController) {
       {{"health", "servita"}, 1, "TLM_APIErrorMessage"},
       {{"health", "lab"}, 0, "IsNANDRetirable"},
       {{"health", "ota"}, 0, "{}"},
+      {{"daily"}, 1, "com.norba.NANDInfo.Error"},
+      {{"magazine", "--hours", "24"}, 0, "IsStatMagSupported"},
+      {{"magazine", "--history"}, 0, "TLM_instantaneous_gc_wamp_5"},
+      {{"extract"}, 0, "EAN_imageSize_BIC"},
+      {{"dump"}, 1, "false\n"},
       {{"recommends-deletion"}, 0, "false"},
       {{"capture", folder / "capture"}, 1, "null"},
   };
@@ -169,8 +184,58 @@ TEST_F(Nandinfo, SaysWhenThereIsNoController) {
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
   }
   EXPECT_FALSE(std::filesystem::exists(folder / "capture"));
-  EXPECT_EQ(run({"freezer"}), 0);
-  EXPECT_EQ(out + err, "{}\n");
+  for (const char* command : {"freezer", "nvram"}) {
+    EXPECT_EQ(run({command}), 0);
+    EXPECT_EQ(out + err, "{}\n");
+  }
+  root = "/not/there";
+  EXPECT_EQ(run({"disk"}), 0);
+  EXPECT_EQ(err, "nandinfo: disk: there is no device root /not/there\n");
+}
+
+// An option that goes to the wrong argument, or to none.
+TEST_F(Nandinfo, HandsItsOptionsOn) {
+  device.registry.add({.className = support::kQRT3});
+  device.setStatistics({{"hostWrites", {5000}}});
+  for (const std::uint32_t hours : {0, 4, 8, 12, 16, 20, 24, 168, 720}) {
+    device.setSnapshot(hours,
+                       {{"magazineFWVersion", {1, 2, 3}},
+                        {"magazineInstanceMeta", {(std::uint64_t{4000000} - hours * 3600) << 24}},
+                        {"hostWrites", {5000 - hours}},
+                        {"numFreeVirtualBlocks", {hours}}});
+  }
+  const struct {
+    Words command;
+    std::vector<const char*> in, notIn;
+  } rows[] = {
+      {{"--hours", "24"}, {"\"hostWrites\": 24.0,", "\"numFreeVirtualBlocks\": 24,"}, {}},
+      {{"--hours", "24", "--no-delta"}, {"\"hostWrites\": 4976.0,"}, {}},
+      {{"--mode", "0", "--hours", "4"}, {"\"hostWrites\": 4.0,"}, {"numFree"}},
+      {{"--mode", "1", "--hours", "4"}, {"\"numFreeVirtualBlocks\": 4,"}, {"\"hostWrites\""}},
+      {{"--history"}, {"TLM_instantaneous_gc_wamp_5"}, {"hostWrites", "APIError"}},
+  };
+  for (auto [command, in, notIn] : rows) {
+    command.insert(command.begin(), "magazine");
+    EXPECT_EQ(run(command), 0) << err;
+    for (const char* text : in) EXPECT_NE(out.find(text), std::string::npos) << text << out;
+    for (const char* text : notIn) EXPECT_EQ(out.find(text), std::string::npos) << text << out;
+  }
+  const std::pair<Words, Words> extractions[] = {
+      {{"extract", "--from", "5"}, {"SM.WeeklyMA.FTLCounters_1"}},
+      {{"extract", "--from", "5", "--monthly"},
+       {"SM.WeeklyMA.FTLCounters_1", "SM.Monthly.FTLCounters_1"}},
+      {{"extract", "--from", "6"}, {}},
+  };
+  for (const auto& [command, events] : extractions) {
+    device.eventra.events.clear();
+    EXPECT_EQ(run(command), 0) << err;
+    Words sent;
+    for (const auto& event : device.eventra.events) {
+      sent.push_back(event.first.substr(std::strlen("com.norba.massStorage.NANDInfo.")));
+    }
+    EXPECT_EQ(sent, events) << testing::PrintToString(command);
+    EXPECT_NE(out.find("com.norba.NANDInfo.ErrorMessage"), std::string::npos) << out;
+  }
 }
 
 TEST_F(Nandinfo, ShowsTablesOnATerminalOnly) {
@@ -198,6 +263,11 @@ TEST(NandinfoTable, ShowsEveryShape) {
        "msg  tab?here ? \xEF\xBF\xBD\ne    []\n\n"
        "              0           1\na         1,000          22\nname?[2J  x\n"
        "b                -1,234,567\n"},
+      {Dictionary{{"n", 1000}, {"error", "longer"}, {"m", 1}, {"d", platform::Date{0}}}, 80,
+       "n      1,000\nerror  longer\nm          1\nd      1970-01-01T00:00:00Z\n"},
+      {Dictionary{{"0", one}, {"1", one}, {"2", other}}, 23,
+       "              0      1\na         1,000  1,000\nname?[2J  x      x\n\n"
+       "2:\nb  -1,234,567\na          22\n"},
       {Dictionary{{"0", one}, {"1", other}}, 20,
        "0:\na         1,000\nname?[2J  x\n\n1:\nb  -1,234,567\na          22\n"},
       {Array{one, other}, 80, "a      name?[2J  b\n1,000  x\n   22            -1,234,567\n"},
@@ -205,6 +275,7 @@ TEST(NandinfoTable, ShowsEveryShape) {
        "k\n\xC3\xA4\xC3\xB6\xE2\x80\xA6\n"},
       {Array{0, 1, 2, 3, 4, 5, 6, 7, 100, 0.5}, 80,
        "0:    0    1  2  3  4  5  6  7\n8:  100  0.5\n"},
+      {Array{-1234.5, 123456.0, 1e300}, 80, "0:  -1,234.5  123,456  1e+300\n"},
       {std::uint64_t{UINT64_MAX}, 80, "18,446,744,073,709,551,615\n"},
       {true, 80, "true\n"},
       {Dictionary(), 80, ""},

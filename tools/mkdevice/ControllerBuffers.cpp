@@ -128,7 +128,7 @@ std::string kernelSnapshot(const Wear& wear) {
     writer.chunk(kBegin, task, kTaskKind);
     for (std::uint64_t i = 0; task == 100 && i < std::size(kThreads); ++i) {
       const auto& [name, bytesAnHour] = kThreads[i];
-      const std::uint64_t written = bytesAnHour * (1 + wear.hours % kHoursPerBoot);
+      const std::uint64_t written = bytesAnHour * (1 + wear.hoursSinceBoot());
       BufferWriter statistics;
       for (const std::uint64_t counter : {written / 65536, written, std::uint64_t{0}, written}) {
         statistics.number(counter, 8);

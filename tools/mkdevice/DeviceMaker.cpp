@@ -6,10 +6,17 @@
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
+#include <memory>
+#include <optional>
 
+#include "daemon/DailyRun.h"
 #include "daemon/context/DeviceContext.h"
+#include "platform/CivilDate.h"
+#include "platform/Text.h"
 #include "platform/host/Files.h"
 #include "platform/host/Host.h"
+#include "tools/mkdevice/Random.h"
+#include "tools/mkdevice/Wear.h"
 
 namespace mkdevice {
 
@@ -49,8 +56,8 @@ std::string writeFile(const Host& host, const std::string& path, std::string_vie
   return error == 0 ? "" : located(path, platform::host::errorText(error));
 }
 
-std::string writeFiles(Host& host, const Sample& sample) {
-  for (const SampleFile& file : sampleFiles(sample)) {
+std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
+  for (const SampleFile& file : files) {
     std::string error;
     if (const auto* text = file.content.as<std::string>()) {
       error = writeFile(host, file.path, *text);
@@ -74,29 +81,67 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
   return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error.c_str());
 }
 
-std::string recordCounters(Host& host, const Sample& sample, const Listener& listener) {
-  const SampleCounters counters(sample);
-  for (int done = 0; done < kDaysOfCounters; ++done) {
-    listener.progress("day " + std::to_string(done + 1) + " of " + std::to_string(kDaysOfCounters));
-    const auto changes = counters.ofDay(sample.today - kDaysOfCounters + done);
-    if (std::string error = host.counters().apply(changes); !error.empty()) return error;
+// The host as the device has it.
+struct DeviceHost : Host {
+  DeviceHost(const std::string& root, const std::optional<platform::host::PlayedRun>& played)
+      : Host({.root = root, .lowestLevel = platform::LogLevel::error, .played = played}),
+        context(std::make_shared<morvend::DeviceContext>(platform())) {
+    keepCountersBelow([owned = context] { return owned->GetHomeDirectoryPath(); });
+  }
+  std::shared_ptr<morvend::DeviceContext> context;
+};
+
+std::string makeRoot(const MakingOptions& options, const Sample& first,
+                     const SampleCounters& counters, const Listener& listener) {
+  DeviceHost host(options.folder, std::nullopt);
+  listener.progress("writing files");
+  std::string error = writeFiles(host, lastingFiles(first));
+  if (error.empty()) error = writeFiles(host, filesOfDay(first));
+  if (error.empty()) error = copyModule(host, options.module, listener);
+  for (int done = 0; error.empty() && done < kDaysOfCounters; ++done) {
+    listener.progress(platform::format("counters of day %d of %d", done + 1, kDaysOfCounters));
+    error = host.counters().apply(counters.ofDay(first.today - kDaysOfCounters + done));
     host.counters().PLClientCheckpoint();
   }
-  return {};
+  return error;
+}
+
+// The run of the day that begins with `sample.today`, by the timer some minutes past midnight.
+platform::host::PlayedRun dailyRun(const Sample& sample) {
+  constexpr std::uint64_t kTicksPerSecond = 1'000'000'000;
+  Random random(sample.seed, "daily run", sample.today);
+  const std::int64_t second = random.between(600, 2400);
+  const auto sinceBoot =
+      Wear(sample, 0).hoursSinceBoot() * 3600 + static_cast<std::uint64_t>(second);
+  return {.now = {static_cast<double>(sample.today * platform::kSecondsPerDay + second)},
+          .sinceBoot = sinceBoot * kTicksPerSecond,
+          .process = {"morvend", static_cast<std::int32_t>(random.between(300, 30000))}};
+}
+
+// The day that begins with `sample.today`, and what is new when the next one begins.
+std::string playDay(const std::string& root, Sample sample, const SampleCounters& counters) {
+  DeviceHost host(root, dailyRun(sample));
+  morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
+  const std::string error = host.counters().apply(counters.ofDay(sample.today));
+  if (!error.empty()) return error;
+  ++sample.today;
+  return writeFiles(host, filesOfDay(sample));
 }
 
 }  // namespace
 
 std::string makeDevice(const MakingOptions& options, const Listener& listener) {
   if (std::string error = makeEmptyFolder(options.folder); !error.empty()) return error;
-  Host host({.root = options.folder, .lowestLevel = platform::LogLevel::error});
-  morvend::DeviceContext context(host.platform());
-  host.keepCountersBelow([&context] { return context.GetHomeDirectoryPath(); });
-
-  listener.progress("writing files");
-  if (std::string error = writeFiles(host, options.sample); !error.empty()) return error;
-  if (std::string error = copyModule(host, options.module, listener); !error.empty()) return error;
-  return recordCounters(host, options.sample, listener);
+  const SampleCounters counters(options.sample);
+  Sample sample = options.sample;
+  sample.today -= options.days;
+  std::string error = makeRoot(options, sample, counters, listener);
+  for (; error.empty() && sample.today < options.sample.today; ++sample.today) {
+    const int played = options.days - (options.sample.today - sample.today);
+    listener.progress(platform::format("playing day %d of %d", played + 1, options.days));
+    error = playDay(options.folder, sample, counters);
+  }
+  return error;
 }
 
 }  // namespace mkdevice

@@ -1,4 +1,4 @@
-// Makes a sample device root in a folder.
+// Makes a sample device root in a folder, and plays days of its past.
 #pragma once
 
 #include <functional>
@@ -8,9 +8,12 @@
 
 namespace mkdevice {
 
+inline constexpr int kMostDays = 60;
+
 struct MakingOptions {
   std::string folder;  // of the host; missing parents are made
   Sample sample;
+  int days = 0;        // so many before `sample.today` are played, at most kMostDays
   std::string module;  // of the host: the crash-reporting support library for the device
 };
 
@@ -19,8 +22,10 @@ struct Listener {
   std::function<void(const std::string&)> progress, warning;
 };
 
-// Makes the root. Returns the empty text, or what went wrong and where. A folder that holds
-// anything is refused and left as it is; one that couldn't be filled to the end is left half-made.
+// Makes the root. With days to play, makes it as it was before them; on each of them the device is
+// used, its daily run comes due, and then its counters are recorded. Returns the empty text, or
+// what went wrong and where. A folder that holds anything is refused and left as it is; one that
+// couldn't be filled to the end is left half-made.
 std::string makeDevice(const MakingOptions& options, const Listener& listener);
 
 }  // namespace mkdevice

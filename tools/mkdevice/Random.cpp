@@ -22,6 +22,12 @@ std::int64_t Random::between(std::int64_t least, std::int64_t most) {
   return static_cast<std::int64_t>(static_cast<std::uint64_t>(least) + above);
 }
 
+std::string Random::hexadecimal(int digits) {
+  std::string text;
+  while (digits-- > 0) text += "0123456789abcdef"[next() % 16];
+  return text;
+}
+
 double Random::bell() {
   // The variance of four fractions' sum is a third.
   constexpr double kSquareRootOf3 = 1.7320508075688772;

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 #include <string_view>
 
 namespace mkdevice {
@@ -21,6 +22,8 @@ class Random {
 
   // From `least` to `most`, both included.
   std::int64_t between(std::int64_t least, std::int64_t most);
+
+  std::string hexadecimal(int digits);
 
   // Bell-shaped around 0 with a standard deviation of 1, never beyond 3.5.
   double bell();

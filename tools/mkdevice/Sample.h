@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -12,11 +13,15 @@ namespace mkdevice {
 
 enum class ControllerKind { qrt3, embedded, zmc };
 
+// The flash chips, each with another layout of the telemetry list's counters.
+enum class ChipKind { qm7, qm8, sandisk1x, hynix1x, other1y };
+
 struct Sample {
   std::uint64_t seed = 1;
   int scale = 1;           // so many times the vocabulary's counters
   std::int32_t today = 0;  // the counters end on the day before
   ControllerKind controller = ControllerKind::qrt3;
+  std::optional<ChipKind> chip = {};  // the seed decides
 };
 
 inline constexpr int kDaysOfCounters = 21;
@@ -47,8 +52,13 @@ struct SampleFile {
   platform::Value content;  // a text stands for itself, anything else for a property list
 };
 
-// The whitelist, the files below device/, the controller's among them, the preferences, and the
-// logs that a daily run will move.
-std::vector<SampleFile> sampleFiles(const Sample& sample);
+// What stays from day to day: the whitelist, most files below device/, the preferences; and logs of
+// the days before.
+std::vector<SampleFile> lastingFiles(const Sample& sample);
+
+// What is new every day, as it is when `today` begins: the buffers of the controller, disk and
+// network usage, the reporting channels, the memory errors that came in, and the kernel's values.
+// Yesterday's logs of the support service are among them: a daily run moves them.
+std::vector<SampleFile> filesOfDay(const Sample& sample);
 
 }  // namespace mkdevice

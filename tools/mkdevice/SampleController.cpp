@@ -14,17 +14,26 @@ using platform::Dictionary;
 
 namespace {
 
-// In the order of ControllerKind. Which chip it is decides how its telemetry is laid out.
+// In the order of ControllerKind.
 constexpr struct {
-  const char *name, *className, *propertyKey, *chip, *manufacturer;
+  const char *className, *propertyKey;
   bool hasMSPs, recommendsDeletion;
 } kControllers[] = {
-    {"qrt3", "NorbaQRT3NVMeController", "Controller Characteristics", "QM8", "2C64A1D40500", true,
-     false},
-    {"embedded", "NorbaEmbeddedNVMeController", "Controller Characteristics", "QM7", "2C64A1D40500",
-     false, false},
-    {"zmc", "ZMCStorage", platform::kRegistryPropertyMatchKey, "QM5", "2C64A1D40500", false, true},
+    {"NorbaQRT3NVMeController", "Controller Characteristics", true, false},
+    {"NorbaEmbeddedNVMeController", "Controller Characteristics", false, false},
+    {"ZMCStorage", platform::kRegistryPropertyMatchKey, false, true},
 };
+
+// In the order of ChipKind. The manufacturer's last byte is the chip's stepping.
+constexpr struct {
+  const char *chip, *manufacturer;
+} kChips[] = {{"QM7", "2C64A1D40500"},
+              {"QM8", "2C64A1D40511"},
+              {"QM6", "458260DE5712"},
+              {"QM6", "AD8252232110"},
+              {"QM5", "2C64A1D40500"}};
+static_assert(std::size(kControllers) == std::size(kControllerNames) &&
+              std::size(kChips) == std::size(kChipNames));
 
 constexpr int kHistoryHours[] = {0, 4, 8, 12, 16, 20, 24, 168, 720};
 
@@ -65,9 +74,12 @@ Buffers buffersOf(const Sample& sample, const Wear& wear) {
   return buffers;
 }
 
-Dictionary characteristics(ControllerKind kind) {
-  return {{"chip-id", rowOf(kind).chip},
-          {"manufacturer-id", rowOf(kind).manufacturer},
+Dictionary characteristics(const Sample& sample) {
+  Random random(sample.seed, "chip");
+  const auto any = static_cast<ChipKind>(random.next() % std::size(kChips));
+  const auto& row = kChips[static_cast<std::size_t>(sample.chip.value_or(any))];
+  return {{"chip-id", row.chip},
+          {"manufacturer-id", row.manufacturer},
           {"num-bus", static_cast<std::int64_t>(kChannels)},
           {"nand-device-desc", static_cast<std::int64_t>(kNANDDescription)}};
 }
@@ -98,12 +110,11 @@ Dictionary registry(const Sample& sample, Dictionary buffers) {
   Dictionary driver;
   if (row.recommendsDeletion) driver.set("RecommendsDeletion", random.between(0, 1));
   driver.set("Buffers", std::move(buffers));
-  Dictionary controller{
-      {"Class", row.className},
-      {"Conforms", Array{"StorageController"}},
-      {"Properties", Dictionary{{row.propertyKey, characteristics(sample.controller)}}},
-      {"Driver", std::move(driver)},
-      {"Children", Array{imageService(random)}}};
+  Dictionary controller{{"Class", row.className},
+                        {"Conforms", Array{"StorageController"}},
+                        {"Properties", Dictionary{{row.propertyKey, characteristics(sample)}}},
+                        {"Driver", std::move(driver)},
+                        {"Children", Array{imageService(random)}}};
   return {
       {"Class", "Root"},
       {"Children",
@@ -118,13 +129,21 @@ Dictionary purgeableSpace(Random& random) {
           {"SPACEREAP_NONPURGEABLE_AMOUNT", random.between(30000, 60000) * kMiB}};
 }
 
+template <typename Kind>
+std::optional<Kind> kindNamed(std::string_view name, std::span<const char* const> names) {
+  const auto found = std::ranges::find(names, name);
+  if (found == names.end()) return std::nullopt;
+  return static_cast<Kind>(found - names.begin());
+}
+
 }  // namespace
 
 std::optional<ControllerKind> controllerNamed(std::string_view name) {
-  for (std::size_t i = 0; i < std::size(kControllers); ++i) {
-    if (name == kControllers[i].name) return static_cast<ControllerKind>(i);
-  }
-  return std::nullopt;
+  return kindNamed<ControllerKind>(name, kControllerNames);
+}
+
+std::optional<ChipKind> chipNamed(std::string_view name) {
+  return kindNamed<ChipKind>(name, kChipNames);
 }
 
 std::vector<SampleFile> controllerFiles(const Sample& sample) {

@@ -9,8 +9,12 @@
 
 namespace mkdevice {
 
-// "qrt3", "embedded" or "zmc"; none for any other text.
+inline constexpr const char* kControllerNames[] = {"qrt3", "embedded", "zmc"};
+inline constexpr const char* kChipNames[] = {"qm7", "qm8", "1x-sandisk", "1x-hynix", "1y"};
+
+// None for a text that isn't among the names.
 std::optional<ControllerKind> controllerNamed(std::string_view name);
+std::optional<ChipKind> chipNamed(std::string_view name);
 
 // The registry, every buffer that it names, the kernel snapshot, and the purgeable space.
 std::vector<SampleFile> controllerFiles(const Sample& sample);

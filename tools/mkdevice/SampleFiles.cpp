@@ -1,105 +1,21 @@
+#include "NANDInfo/Events.h"
 #include "platform/CivilDate.h"
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
 #include "platform/host/Timestamp.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
-#include "tools/mkdevice/SampleController.h"
 
 namespace mkdevice {
 
 using platform::Array;
-using platform::Data;
 using platform::Dictionary;
 using platform::Value;
 
 namespace {
 
-constexpr std::int64_t kGiB = std::int64_t{1} << 30;
-constexpr std::int64_t kPageSize = 16384;
-
-std::string hexadecimal(Random& random, int digits) {
-  std::string text;
-  while (digits-- > 0) text += "0123456789abcdef"[random.next() % 16];
-  return text;
-}
-
-Dictionary properties(Random& random) {
-  const std::int64_t capacity = 119 * kGiB, free = random.between(20 * kGiB, 60 * kGiB);
-  return {{"InternalBuild", false},
-          {"HardwareModel", "Vrn12,3"},
-          {"SystemIdentifier", hexadecimal(random, 40)},
-          {"InverseDeviceID", hexadecimal(random, 32)},
-          {"DiskUsage", Dictionary{{"TotalDiskCapacity", capacity},
-                                   {"TotalDataAvailable", free + 4 * kGiB},
-                                   {"AmountDataAvailable", free}}}};
-}
-
 Dictionary systemVersion(Random&) {
   return {{"ProductVersion", "17.4"}, {"ProductBuildVersion", "21E219"}};
-}
-
-// Total, available and used bytes, the page size, and whether the swap is encrypted.
-Data swapUsage(Random& random) {
-  const auto total = static_cast<std::uint64_t>(random.between(1, 4) * kGiB);
-  const std::uint64_t used = total / 16 * (random.next() % 16);
-  Data record;
-  const auto append = [&record](std::uint64_t value, int bytes) {
-    for (int i = 0; i < bytes; ++i) {
-      record.push_back(static_cast<std::uint8_t>(value >> (8 * i)));
-    }
-  };
-  append(total, 8);
-  append(total - used, 8);
-  append(used, 8);
-  append(static_cast<std::uint64_t>(kPageSize), 4);
-  append(1, 4);
-  return record;
-}
-
-// The kernel's counters agree with each other: parts add up, nothing is thawed that wasn't frozen.
-Dictionary kernelValues(Random& random) {
-  Dictionary values{{"hw.pagesize", kPageSize}, {"vm.swapusage", swapUsage(random)}};
-  std::int64_t total = 0;
-  for (const char* size : {"1", "2", "4", "8", "16", "32", "64", "128", "256"}) {
-    const std::int64_t found = random.between(0, 3);
-    total += found;
-    values.set(platform::format("vm.vmtc_%s_byte", size), found);
-  }
-  const std::int64_t bitFlips = random.between(0, 2), undiagnosed = random.between(1, 3);
-  values.set("vm.vmtc_one_bit_flip", bitFlips);
-  values.set("vm.vmtc_not_found", random.between(0, 2));
-  values.set("vm.vmtc_undiagnosed", undiagnosed);
-  values.set("vm.vmtc_total", total + bitFlips + undiagnosed);
-
-  const std::int64_t considered = random.between(900, 2400), frozen = random.between(120, 260);
-  const std::int64_t thawed = frozen * random.between(30, 60) / 100;
-  const std::int64_t refrozen = random.between(20, thawed);
-  const struct {
-    const char* name;
-    std::int64_t value;
-  } freezer[] = {
-      {"freeze_count", frozen},
-      {"freeze_pageouts", frozen * random.between(2000, 4000)},
-      {"freeze_budget_pages_remaining", random.between(20000, 90000)},
-      {"thaw_count", thawed},
-      {"thaw_count_since_boot", thawed * 3},
-      {"freezer_thaw_percentage", thawed * 100 / frozen},
-      {"freezer_process_considered_count", considered},
-      {"freezer_error_no_compressor_space_count", considered * random.between(0, 4) / 100},
-      {"freezer_error_no_swap_space_count", considered * random.between(0, 6) / 100},
-      {"freezer_error_below_min_pages_count", considered * random.between(10, 30) / 100},
-      {"freezer_error_low_probability_of_use_count", considered * random.between(20, 40) / 100},
-      {"freezer_error_other_count", considered * random.between(0, 5) / 100},
-      {"freezer_below_threshold_count", random.between(100, 400)},
-      {"freezer_skipped_full_count", random.between(0, 60)},
-      {"freezer_refreeze_count", refrozen},
-      {"freezer_bytes_refrozen", refrozen * random.between(8, 40) * kPageSize * 64},
-  };
-  for (const auto& [name, value] : freezer) {
-    values.set(platform::format("kern.memorystatus_%s", name), value);
-  }
-  return values;
 }
 
 Array applications(Random& random) {
@@ -127,8 +43,17 @@ Dictionary locale(Random&) {
           {"CountryCode", "AT"}};
 }
 
+// Neither the histograms nor the month's counters of the storage are used.
 Dictionary analytics(Random&) {
-  return {{"UsedEvents", Array{"com.norba.tarvenn.appInstalls", "com.norba.quenset.disabledLogs"}}};
+  return {
+      {"UsedEvents", Array{"com.norba.tarvenn.appInstalls", "com.norba.quenset.disabledLogs",
+                           NANDInfo::kEventName_massStorage_NANDInfo_FTLCounters_1,
+                           NANDInfo::kEventName_massStorage_NANDInfo_MSPCounters_1,
+                           NANDInfo::kEventName_massStorage_NANDInfo_StorageStats_1,
+                           NANDInfo::kEventName_massStorage_NANDInfo_NORWrites,
+                           NANDInfo::kEventName_massStorage_NANDInfo_SM_Daily_FTLCounters_1,
+                           NANDInfo::kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1}},
+      {"Available", true}};
 }
 
 Dictionary analyticsConfiguration(Random& random) {
@@ -142,7 +67,7 @@ Dictionary analyticsConfiguration(Random& random) {
       item("_servita", "com.norba.servita", "KeepLogs", std::int64_t{5})};
   return {{"LogBlocklist", Array{"211", "309"}},
           {"ScheduledTasking", Dictionary{{"TaskingID", "tasking-2117"},
-                                          {"TaskingDigest", hexadecimal(random, 32)},
+                                          {"TaskingDigest", random.hexadecimal(32)},
                                           {"TaskingPayload", payload}}}};
 }
 
@@ -163,29 +88,15 @@ std::string structuredLogs(Random& random, std::int32_t day) {
   return lines;
 }
 
-std::string supportLog(Random& random, std::int32_t day) {
-  std::string lines;
-  for (int i = 0; i < 4; ++i) {
-    const double second = static_cast<double>(day) * static_cast<double>(platform::kSecondsPerDay) +
-                          i * 21600 + static_cast<double>(random.between(0, 21599));
-    platform::host::appendTimestamp(lines, second);
-    lines += platform::format(" session %04d: %d requests answered\n", i + 1,
-                              static_cast<int>(random.between(2, 60)));
-  }
-  return lines;
-}
-
 }  // namespace
 
-std::vector<SampleFile> sampleFiles(const Sample& sample) {
+std::vector<SampleFile> lastingFiles(const Sample& sample) {
   static const struct {
     const char* path;
     Value (*content)(Random&);
   } kPropertyLists[] = {
-      {"device/properties.plist", [](Random& random) -> Value { return properties(random); }},
       {"device/system-version.plist",
        [](Random& random) -> Value { return systemVersion(random); }},
-      {"device/kernel.plist", [](Random& random) -> Value { return kernelValues(random); }},
       {"device/applications.plist", [](Random& random) -> Value { return applications(random); }},
       {"device/locale.plist", [](Random& random) -> Value { return locale(random); }},
       {"device/analytics.plist", [](Random& random) -> Value { return analytics(random); }},
@@ -197,6 +108,11 @@ std::vector<SampleFile> sampleFiles(const Sample& sample) {
        [](Random&) -> Value {
          return Dictionary{{"Experiments", false}};
        }},
+      // Every sample device writes more than this, so that its storage log has a validity list.
+      {"var/preferences/mobile/com.norba.NANDInfo.plist",
+       [](Random&) -> Value {
+         return Dictionary{{"userWAmp", 1.5}};
+       }},
       {"var/preferences/__quenset__/com.norba.Varnhollow.plist",
        [](Random& random) -> Value { return analyticsConfiguration(random); }},
   };
@@ -206,20 +122,12 @@ std::vector<SampleFile> sampleFiles(const Sample& sample) {
     Random random(sample.seed, path);
     files.push_back({path, content(random)});
   }
-  const auto addLog = [&](const std::string& path, std::string (*content)(Random&, std::int32_t),
-                          std::int32_t day) {
-    Random random(sample.seed, path);
-    files.push_back({path, content(random, day)});
-  };
   const std::int32_t yesterday = sample.today - 1;
   const platform::CivilDate date = platform::civilFromDays(yesterday);
-  addLog(platform::format("var/spool/morvend/structured/%04d-%02d-%02d.jsonl",
-                          static_cast<int>(date.year), date.month, date.day),
-         structuredLogs, yesterday);
-  addLog("var/log/servita/support.log", supportLog, yesterday);
-  addLog("var/log/servita/support.log.1", supportLog, yesterday - 1);
-  addLog("var/log/servita/uploads.log", supportLog, yesterday);
-  for (SampleFile& file : controllerFiles(sample)) files.push_back(std::move(file));
+  Random random(sample.seed, "structured", yesterday);
+  files.push_back({platform::format("var/spool/morvend/structured/%04d-%02d-%02d.jsonl",
+                                    static_cast<int>(date.year), date.month, date.day),
+                   structuredLogs(random, yesterday)});
   return files;
 }
 

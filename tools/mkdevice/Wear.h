@@ -36,6 +36,10 @@ struct Wear {
   std::uint64_t bandErases, fastBandErases;
   std::uint64_t cycles, fastCycles;  // on average for each band
 
+  // The device is started anew every kHoursPerBoot hours.
+  std::uint64_t boot() const { return hours / kHoursPerBoot; }
+  std::uint64_t hoursSinceBoot() const { return hours % kHoursPerBoot; }
+
   // What happens so many times a day has happened so often by now.
   std::uint64_t sinceFormat(double perDay) const;
 };

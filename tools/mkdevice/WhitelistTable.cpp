@@ -37,6 +37,18 @@ constexpr WhitelistRow kEntries[] = {
     {system, scalarPrefixes, "com.norba.memorystatus_freezer_", {}},
     {system, scalarKeys, "com.norba.memorystatus_freezer_refreeze_average", {.significantFigures = 2}},
 
+    // What the telemetry of a day collects; of the network's users only the system's own.
+    {storage, scalarKeys, "com.norba.tarvenn.DiskUsageUserTotalBlocks", {.bucketInterval = 1024}},
+    {storage, scalarKeys, "com.norba.tarvenn.DiskUsageUserBlocksFree", {.bucketInterval = 1024}},
+    {storage, scalarPrefixes, "com.norba.NANDInfo.Num", {.significantFigures = 3}},
+    {system, scalarPrefixes, "com.norba.velquist.", {.significantFigures = 2}},
+    {radio, scalarPrefixes, "datausage.wifiInKB.com.norba.", {.significantFigures = 2}},
+    {radio, scalarPrefixes, "datausage.wifiOutKB.com.norba.", {.significantFigures = 2}},
+    {radio, scalarPrefixes, "datausage.wwanInKB.com.norba.", {.significantFigures = 2}},
+    {radio, scalarPrefixes, "datausage.wwanOutKB.com.norba.", {.significantFigures = 2}},
+    {radio, scalarPrefixes, "datausage.olddata.com.norba.", {}},
+    {radio, scalarPrefixes, "datausage.baddata.com.norba.", {}},
+
     // Some of this machine's own figures.
     {machine, scalarPrefixes, "host.vmstat.", {.significantFigures = 3}},
     {machine, scalarPrefixes, "host.vmstat.pg", {.significantFigures = 2}},

@@ -5,6 +5,9 @@
 #include <CLI/CLI.hpp>
 #include <filesystem>
 #include <iostream>
+#include <span>
+#include <string>
+#include <vector>
 
 #include "platform/CivilDate.h"
 #include "platform/host/SystemClock.h"
@@ -18,6 +21,10 @@ std::string moduleBesideProgram() {
   std::error_code error;
   const auto program = std::filesystem::read_symlink("/proc/self/exe", error);
   return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
+}
+
+std::vector<std::string> textsOf(std::span<const char* const> names) {
+  return {names.begin(), names.end()};
 }
 
 }  // namespace
@@ -35,13 +42,21 @@ int main(int argc, char** argv) {
                  "the same number on the same day makes the same device; default: 1");
   app.add_option("--scale", options.sample.scale, "so many times the usual counters; default: 1")
       ->check(CLI::Range(1, mkdevice::kLargestScale));
+  app.add_option("--days", options.days,
+                 "so many days up to yesterday are played, each with its daily run; default: 0")
+      ->check(CLI::Range(0, mkdevice::kMostDays));
   app.add_option_function<std::string>(
          "--controller",
          [&](const std::string& name) {
            options.sample.controller = *mkdevice::controllerNamed(name);
          },
-         "its storage controller: qrt3 (the default), embedded or zmc")
-      ->check(CLI::IsMember({"qrt3", "embedded", "zmc"}));
+         "its storage controller; default: qrt3")
+      ->check(CLI::IsMember(textsOf(mkdevice::kControllerNames)));
+  app.add_option_function<std::string>(
+         "--chip",
+         [&](const std::string& name) { options.sample.chip = mkdevice::chipNamed(name); },
+         "its flash chip, which decides how its telemetry is read; default: the seed's choice")
+      ->check(CLI::IsMember(textsOf(mkdevice::kChipNames)));
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {

@@ -48,6 +48,9 @@ constexpr BufferKind kKinds[] = {
     {"band-statistics", &nand_exporter_t::getBandStatsSelectors, kZero, false},
 };
 
+// The EAN service's scalar methods.
+constexpr std::uint32_t kEANImageSizeMethod = 3, kEANUpdateCountMethod = 7;
+
 std::string sha256(std::string_view bytes) {
   std::array<char, SHA256_DIGEST_STRING_LENGTH> text{};
   SHA256Data(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size(), text.data());
@@ -183,12 +186,12 @@ class Capture {
     if (connection.status() != 0) return leaveOut(kName, statusText(connection.status()));
     Dictionary scalars;
     for (const NANDInfo::EANQuery& query : NANDInfo::EANQueries()) {
-      const std::uint32_t method = query.query == NANDInfo::GetEANImageSize ? 3 : 7;
+      const std::uint32_t method =
+          query.query == NANDInfo::GetEANImageSize ? kEANImageSizeMethod : kEANUpdateCountMethod;
       const std::string key = platform::format("%u:%s", method, lettersOf(query.code).c_str());
       const std::uint64_t input[] = {query.code};
       std::uint64_t output[] = {0};
-      const auto status =
-          platform_.drivers.DrvCallMethod(connection.get(), method, input, output);
+      const auto status = platform_.drivers.DrvCallMethod(connection.get(), method, input, output);
       if (status == 0) {
         scalars.set(key, output[0]);
       } else {

@@ -25,11 +25,9 @@ std::string CaptureFolder::open(const std::string& path) {
 }
 
 std::string CaptureFolder::write(const std::string& name, std::string_view bytes) {
-  if (const int error = platform::host::replaceFile(folder_.get(), name, bytes)) {
-    return path_ + "/" + name + ": " + platform::host::errorText(error);
-  }
-  files_.push_back(name);
-  return {};
+  files_.push_back(name);  // a failure may come after the file got its name
+  const int error = platform::host::replaceFile(folder_.get(), name, bytes);
+  return error == 0 ? "" : path_ + "/" + name + ": " + platform::host::errorText(error);
 }
 
 CaptureFolder::~CaptureFolder() {

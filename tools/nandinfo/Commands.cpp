@@ -11,7 +11,6 @@ namespace nandinfo {
 namespace {
 
 using platform::Dictionary;
-using platform::Platform;
 using platform::Value;
 
 CommandResult result(std::optional<Dictionary> dictionary) {
@@ -45,6 +44,25 @@ CommandResult daily(const Invocation& invocation) {
   return result(NANDInfo::CopyNANDInfoWithOptions(invocation.platform));
 }
 
+CommandResult magazine(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  return result(arguments.history
+                    ? NANDInfo::CopySMagNANDFTLCustomHistoryInfo(invocation.platform, 0)
+                    : NANDInfo::CopySMagNANDFTLInfo(invocation.platform, arguments.hours,
+                                                    arguments.noDelta ? 0 : 1, arguments.mode));
+}
+
+CommandResult extract(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  return result(NANDInfo::NandInfoExtractToEV_runAllSteps(invocation.platform, arguments.monthly,
+                                                          true, arguments.from));
+}
+
+CommandResult dump(const Invocation& invocation) {
+  const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.platform, false);
+  return {handled, handled ? "" : "not every list was dumped"};
+}
+
 CommandResult recommendsDeletion(const Invocation& invocation) {
   return {NANDInfo::NandRecommendsContentDeletion(invocation.platform), {}};
 }
@@ -52,12 +70,14 @@ CommandResult recommendsDeletion(const Invocation& invocation) {
 constexpr Command kCommands[] = {
     {nullptr, "info", "The basic counters, for the counters service", kNothing, true, nullptr,
      call<NANDInfo::CopyNANDInfo>},
-    {nullptr, "daily", "The basic counters as the day's telemetry has them", kNothing, false,
+    {nullptr, "daily", "The basic counters as the day's telemetry has them", kNothing, true,
      "today all storage counters go to the analytics sink", daily},
     {nullptr, "ftl", "The whitelisted FTL statistics, or all of them", kRound | kAll, true, nullptr,
      ftl},
     {nullptr, "msp", "The whitelisted statistics of each MSP", kRound, true, nullptr,
      callRounding<NANDInfo::CopyWhitelistedNANDMSPInfo>},
+    {nullptr, "magazine", "What the FTL counters came to over the last hours", kWindow, true,
+     nullptr, magazine},
     {nullptr, "storage", "The storage summary with the EAN images", kRound, true, nullptr,
      callRounding<NANDInfo::CopyWhitelistedStorageStats>},
     {nullptr, "disk", "Capacity, fullness and available space", kNothing, false, nullptr,
@@ -65,27 +85,35 @@ constexpr Command kCommands[] = {
     {nullptr, "freezer", "What the kernel's swap-out thread has written", kNothing, false,
      "there is no kernel snapshot, or no swap-out thread in it",
      call<NANDInfo::CopyVMFreezerNANDInfo>},
-    {"health", "servita", "For the warranty service", kNothing, true, nullptr,
+    {"health", "servita", "The health for the warranty service", kNothing, true, nullptr,
      call<NANDInfo::CopyServitaNANDInfo>},
-    {"health", "lab", "For internal lab tools", kNothing, true, nullptr,
+    {"health", "lab", "The health for internal lab tools", kNothing, true, nullptr,
      call<NANDInfo::CopyInternalLabNANDInfo>},
-    {"health", "ota", "For system updates", kNothing, true, "the controller gave no statistics",
-     call<NANDInfo::CopyOTANANDInfo>},
+    {"health", "ota", "The health for system updates", kNothing, true,
+     "the controller gave no statistics", call<NANDInfo::CopyOTANANDInfo>},
     {nullptr, "recommends-deletion", "Whether the controller asks for content to be deleted",
      kNothing, true, nullptr, recommendsDeletion},
-    {"ean", "image-size", "The size of an image, in bytes", kCode, false, nullptr,
+    {"ean", "image-size", "The size of an EAN image, in bytes", kCode, false, nullptr,
      callWithCode<NANDInfo::GetEANImageSize>},
-    {"ean", "update-count", "The number of an image's updates", kCode, false, nullptr,
+    {"ean", "update-count", "The number of an EAN image's updates", kCode, false, nullptr,
      callWithCode<NANDInfo::GetEANUpdateCount>},
-    {"decode", "ftl", "FTL statistics under their names", kFile, false, nullptr, decodeFTL},
-    {"decode", "ftl-stat", "FTL statistics under their keys", kFile, false, nullptr, decodeFTLStat},
-    {"decode", "legacy", "FTL statistics in their legacy form", kFile, false, nullptr,
-     decodeLegacy},
-    {"decode", "msp", "The statistics of an MSP", kFile, false, nullptr, decodeMSP},
-    {"decode", "counters", "A channel's counter block, as the 177 words of the common layout",
-     kLayout | kFile, false, nullptr, decodeCounters},
+    {nullptr, "nvram", "Send the use of the boot variables' memory", kNothing, false,
+     "there is no such memory that tells", call<NANDInfo::gatherNVRAMStats>},
+    {nullptr, "extract", "Send the storage health as events, and sum it up", kSteps, true, nullptr,
+     extract},
+    {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, true, nullptr,
+     dump},
     {nullptr, "capture", "Save all that the controller answers, as a device folder", kFolder, true,
      nullptr, capture},
+    {"decode", "ftl", "A buffer's FTL statistics under their names", kFile, false, nullptr,
+     decodeFTL},
+    {"decode", "ftl-stat", "A buffer's FTL statistics under their keys", kFile, false, nullptr,
+     decodeFTLStat},
+    {"decode", "legacy", "A buffer's FTL statistics in their legacy form", kFile, false, nullptr,
+     decodeLegacy},
+    {"decode", "msp", "A buffer's statistics of an MSP", kFile, false, nullptr, decodeMSP},
+    {"decode", "counters", "A counter block as the 177 words of the common layout", kLayout | kFile,
+     false, nullptr, decodeCounters},
 };
 
 }  // namespace

@@ -14,7 +14,9 @@ namespace nandinfo {
 
 // What the command line says; each command looks at its own part.
 struct Arguments {
-  bool round = false, all = false, statKeys = false;
+  bool round = false, all = false, statKeys = false, noDelta = false, history = false,
+       monthly = false;
+  std::uint32_t hours = 0, mode = 2, from = 0;
   std::string code, layout, file, folder;
 };
 
@@ -37,6 +39,8 @@ enum Takes : std::uint8_t {
   kFile = 8,
   kLayout = 16,
   kFolder = 32,
+  kWindow = 64,
+  kSteps = 128,
 };
 
 struct Command {

@@ -1,7 +1,11 @@
 #include "tools/nandinfo/NandinfoCommand.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
+#include <charconv>
+#include <memory>
 #include <optional>
+#include <span>
 #include <string_view>
 
 #include "NANDInfo/DriverHandles.h"
@@ -22,14 +26,18 @@ using platform::Value;
 constexpr int kDone = 0, kFailed = 1, kUsage = 2;
 
 constexpr char kFooter[] =
-    "Every command prints one JSON object; on a terminal, a table.\n"
+    "Results are JSON; on a terminal, tables.\n"
     "Examples:\n"
     "  nandinfo ftl --round\n"
     "  nandinfo ftl --all --stat-keys --compact\n"
+    "  nandinfo magazine --hours 24\n"
+    "  nandinfo extract --monthly --from 4\n"
     "  nandinfo ean image-size dBIC\n"
     "  nandinfo decode counters 1y block.bin\n"
     "  MORVEND_ROOT=/srv/device nandinfo capture /tmp/device\n"
     "Exit status: 0 done; 1 the work failed; 2 wrong usage.";
+
+constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
 
 struct Form {
   bool json = false, compact = false;
@@ -57,8 +65,8 @@ class Progress {
 bool hasController(platform::Platform& platform) {
   for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
     const char* className = NANDInfo::nand_exporters_tunnel[i].className;
-    const NANDInfo::RegistryHandle service(
-        platform, NANDInfo::FindServiceUsingIterator(platform, className));
+    const NANDInfo::RegistryHandle service(platform,
+                                           NANDInfo::FindServiceUsingIterator(platform, className));
     if (service.get() != 0) return true;
   }
   return false;
@@ -133,16 +141,69 @@ int run(const CommandServices& services, const Command& command, const Arguments
   services.out << shown(services, command, form, result) << std::flush;
   const auto say = [&](const std::string& what) {
     services.err << "nandinfo: " << nameOf(command) << ": " << printable(what) << '\n';
-    return kFailed;
   };
-  if (!services.out) return say("the output can't be written");
-  const auto why = failure(result);
-  if (command.asksController && !hasController(services.platform)) {
-    say("no storage controller found: the device registry names none of " + controllerNames());
-    return why ? kFailed : kDone;
+  if (!services.out) {
+    say("the output can't be written");
+    return kFailed;
   }
-  return why ? say(*why) : kDone;
+  auto why = failure(result);
+  const int status = why ? kFailed : kDone;
+  if (!services.missingRoot.empty() && (command.takes & kFile) == 0) {
+    why = "there is no device root " + services.missingRoot;
+  } else if (command.asksController && !hasController(services.platform)) {
+    why = "no storage controller found: the device registry names none of " + controllerNames();
+  }
+  if (why) say(*why);
+  return status;
 }
+
+// An option with a decimal number, at most `most`.
+CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& number,
+                       std::uint32_t most, const std::string& description) {
+  const auto set = [&number, name, most](const std::string& text) {
+    const char* const end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, number);
+    if (error == std::errc() && stop == end && number <= most) return;
+    throw CLI::ValidationError(
+        name, platform::format("'%s' is not a number from 0 to %u", text.c_str(), most));
+  };
+  return app.add_option_function<std::string>(name, set, description)->type_name("N");
+}
+
+void addWindow(CLI::App& app, Arguments& arguments) {
+  CLI::App* which = app.add_option_group("Window", "What is shown")->require_option(1);
+  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, UINT32_MAX,
+                                 "from so many hours ago until now, as differences");
+  which->add_flag("--history", arguments.history,
+                  "the write amplification of the last six windows of four hours");
+  app.add_flag("--no-delta", arguments.noDelta, "the counters as they were then")->needs(hours);
+  addNumber(app, "--mode", arguments.mode, NANDInfo::kMagazineBoth,
+            "0: the accumulating counters, 1: the dynamic ones, 2: both (default)")
+      ->needs(hours);
+}
+
+void addSteps(CLI::App& app, Arguments& arguments) {
+  constexpr std::uint32_t kLastStep = 6;
+  std::string steps = "the first step (default: 0):";
+  for (std::uint32_t step = 0; step <= kLastStep; ++step) {
+    steps += platform::format("\n%u  %s", step, NANDInfo::kEV_Extraction_Step_Names[step].name);
+  }
+  app.add_flag("--monthly", arguments.monthly, "with the last step, which is the monthly one");
+  addNumber(app, "--from", arguments.from, kLastStep, steps);
+}
+
+// Lists every command of the table, instead of the groups that hold some.
+class Help : public CLI::Formatter {
+ public:
+  std::string make_subcommands(const CLI::App* app, CLI::AppFormatMode mode) const override {
+    if (app->get_parent() != nullptr) return Formatter::make_subcommands(app, mode);
+    std::string list = "\nCommands:\n";
+    for (const Command& command : commands()) {
+      list += platform::format("  %-21s  %s\n", nameOf(command).c_str(), command.description);
+    }
+    return list;
+  }
+};
 
 void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
   const auto takes = [&command](Takes part) { return (command.takes & part) != 0; };
@@ -183,6 +244,8 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("DIR", arguments.folder, "an empty folder, or one that is to be made")
         ->required();
   }
+  if (takes(kWindow)) addWindow(app, arguments);
+  if (takes(kSteps)) addSteps(app, arguments);
 }
 
 }  // namespace
@@ -199,15 +262,25 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
   app.require_subcommand(1);
   app.fallthrough();
   app.footer(kFooter);
+  app.formatter(std::make_shared<Help>());
+  // Only the commands that are named, unless help may show them all: to make them takes longer than
+  // most of them run.
+  const auto named = [words = std::span(argv, static_cast<std::size_t>(argc))](const char* word) {
+    return std::find(words.begin(), words.end(), std::string_view(word)) != words.end();
+  };
+  const bool help = std::any_of(argv, argv + argc, [](std::string_view word) {
+    return word == "-h" || word.starts_with("--help");
+  });
   CLI::App* group = nullptr;
   for (const Command& command : commands()) {
+    if (!help && !named(command.group != nullptr ? command.group : command.name)) continue;
     if (command.group != nullptr && (group == nullptr || group->get_name() != command.group)) {
       group = app.add_subcommand(command.group, groupDescription(command.group));
-      group->require_subcommand(1);
+      group->require_subcommand(1)->footer(kGlobalOptions);
     }
     CLI::App& parent = command.group != nullptr ? *group : app;
     CLI::App* own = parent.add_subcommand(command.name, command.description);
-    own->footer("Global options: --json and --compact.");
+    own->footer(kGlobalOptions);
     own->callback([&chosen, &command] { chosen = &command; });
     addOptions(*own, command, arguments);
   }
@@ -215,7 +288,9 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
     if (error.get_exit_code() == 0) return app.exit(error, services.out, services.err);
-    services.err << "nandinfo: " << printable(error.what()) << '\n';
+    const auto unknown = app.remaining(true);
+    const std::string what = unknown.empty() ? error.what() : CLI::ExtrasError(unknown).what();
+    services.err << "nandinfo: " << printable(what) << '\n';
     return kUsage;
   }
   return run(services, *chosen, arguments, form);

@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <ostream>
+#include <string>
 
 #include "platform/Platform.h"
 
@@ -12,9 +13,10 @@ struct CommandServices {
   platform::Platform& platform;
   std::ostream& out;
   std::ostream& err;
-  bool outIsTerminal = false;  // then results are tables for people, else JSON
-  bool errIsTerminal = false;  // then long work shows its progress there
-  std::size_t width = 80;      // of the terminal, in columns
+  bool outIsTerminal = false;    // then results are tables for people, else JSON
+  bool errIsTerminal = false;    // then long work shows its progress there
+  std::size_t width = 80;        // of the terminal, in columns
+  std::string missingRoot = {};  // the device root's path, if nothing is there
 };
 
 // Runs the command line; returns the exit status: 0 done; 1 the work failed, with one line on

@@ -1,11 +1,14 @@
 #include "tools/nandinfo/Table.h"
 
 #include <algorithm>
+#include <span>
 #include <unordered_set>
+#include <utility>
 #include <vector>
 
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
+#include "platform/host/Timestamp.h"
 #include "platform/host/UTF8.h"
 
 namespace nandinfo {
@@ -29,43 +32,61 @@ std::size_t columnsOf(std::string_view text) {
   return text.size() - static_cast<std::size_t>(std::count_if(text.begin(), text.end(), continues));
 }
 
-std::string grouped(std::string digits) {
-  const std::size_t first = digits.starts_with('-') ? 1 : 0;
-  for (std::size_t i = digits.size(); i > first + 3;) digits.insert(i -= 3, ",");
-  return digits;
+// A number's text with its whole part in groups of three.
+std::string grouped(std::string text) {
+  const std::size_t first = text.starts_with('-') ? 1 : 0;
+  std::size_t end = std::min(text.find_first_not_of("0123456789", first), text.size());
+  while (end > first + 3) text.insert(end -= 3, ",");
+  return text;
 }
 
 Cell cellOf(const Value& value) {
   if (const auto* number = value.as<Number>()) {
     if (number->type() == Number::Type::boolean) return {number->boolValue() ? "true" : "false"};
-    return {number->isReal() ? number->text() : grouped(number->text()), true};
+    return {grouped(number->text()), true};
   }
   if (const auto* text = value.as<std::string>()) return {printable(*text)};
+  if (const auto* date = value.as<platform::Date>()) {
+    Cell cell;
+    platform::host::appendTimestamp(cell.text, date->secondsSince1970);
+    return cell;
+  }
   std::string json;
   platform::host::appendJSON(json, value);
   return {printable(json)};
 }
 
-// Rows in columns, two blanks apart.
+// Rows in columns, two blanks apart. Numbers end below each other, however wide the texts among
+// them are.
 class Grid {
  public:
-  void add(Row row) { rows_.push_back(std::move(row)); }
+  void add(Row row) {
+    columns_.resize(std::max(columns_.size(), row.size()));
+    for (std::size_t i = 0; i < row.size(); ++i) {
+      const std::size_t width = columnsOf(row[i].text);
+      columns_[i].width = std::max(columns_[i].width, width);
+      if (row[i].right) columns_[i].numbers = std::max(columns_[i].numbers, width);
+    }
+    rows_.push_back(std::move(row));
+  }
 
   std::size_t width() const {
     std::size_t width = 0;
-    for (const std::size_t column : widths()) width += column + (width > 0 ? 2 : 0);
+    for (const Column& column : columns_) width += column.width + (width > 0 ? 2 : 0);
     return width;
   }
 
   // Lines wider than `most` columns are cut.
   void appendTo(std::string& out, std::size_t most = std::string::npos) const {
-    const auto columns = widths();
     for (const Row& row : rows_) {
       std::string line;
+      std::size_t end = 0;  // of the columns so far
       for (std::size_t i = 0; i < row.size(); ++i) {
-        const std::string blanks(columns[i] - columnsOf(row[i].text), ' ');
-        if (i > 0) line += "  ";
-        line += row[i].right ? blanks + row[i].text : row[i].text + blanks;
+        const auto& [text, right] = row[i];
+        if (right) line.append(columns_[i].numbers - columnsOf(text), ' ');
+        line += text;
+        end += columns_[i].width + 2;
+        line.append(end - columnsOf(line), ' ');
       }
       line.resize(line.find_last_not_of(' ') + 1);
       if (columnsOf(line) > most) cut(line, most);
@@ -74,6 +95,10 @@ class Grid {
   }
 
  private:
+  struct Column {
+    std::size_t width = 0, numbers = 0;  // of all cells, of the numbers among them
+  };
+
   static void cut(std::string& line, std::size_t most) {
     std::size_t end = 0;
     for (std::size_t columns = 0; end < line.size(); ++end) {
@@ -83,18 +108,8 @@ class Grid {
     line += "\xE2\x80\xA6";  // an ellipsis
   }
 
-  std::vector<std::size_t> widths() const {
-    std::vector<std::size_t> widths;
-    for (const Row& row : rows_) {
-      widths.resize(std::max(widths.size(), row.size()));
-      for (std::size_t i = 0; i < row.size(); ++i) {
-        widths[i] = std::max(widths[i], columnsOf(row[i].text));
-      }
-    }
-    return widths;
-  }
-
   std::vector<Row> rows_;
+  std::vector<Column> columns_;
 };
 
 template <typename Content>
@@ -166,46 +181,66 @@ void appendArray(std::string& out, const Array& array, std::size_t width) {
   grid.appendTo(out);
 }
 
-void appendHeading(std::string& out, std::string_view key) {
-  if (!out.empty()) out += '\n';
-  out += printable(key) + ":\n";
+struct Nested {
+  std::string title;
+  const Dictionary* dictionary;
+};
+
+// A column for each dictionary; a lone one has no title.
+Grid sideBySide(std::span<const Nested> columns) {
+  std::vector<const Dictionary*> dictionaries;
+  Row titles(1);
+  for (const auto& [title, dictionary] : columns) {
+    dictionaries.push_back(dictionary);
+    titles.push_back({title, true});
+  }
+  Grid grid;
+  if (columns.size() > 1) grid.add(std::move(titles));
+  for (const auto key : keysOf(dictionaries)) {
+    Row row{{printable(key)}};
+    for (const Dictionary* dictionary : dictionaries) row.push_back(cellOf(*dictionary, key));
+    grid.add(std::move(row));
+  }
+  return grid;
+}
+
+// As many as `width` allows side by side, then the next ones.
+void appendNested(std::string& out, std::span<const Nested> rest, std::size_t width) {
+  while (!rest.empty()) {
+    std::size_t count = 1;
+    Grid grid = sideBySide(rest.first(1));
+    while (count < rest.size()) {
+      Grid wider = sideBySide(rest.first(count + 1));
+      if (wider.width() > width) break;
+      grid = std::move(wider);
+      ++count;
+    }
+    if (!out.empty()) out += '\n';
+    if (count == 1) out += rest.front().title + ":\n";
+    grid.appendTo(out);
+    rest = rest.subspan(count);
+  }
 }
 
 void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_t width) {
   Grid scalars;
-  std::vector<const Dictionary*> nested;
-  Row titles(1);
+  std::vector<Nested> nested;
+  std::vector<std::pair<std::string, const Array*>> arrays;
   for (const auto& [key, value] : dictionary) {
     if (const auto* inner = value.as<Dictionary>()) {
-      nested.push_back(inner);
-      titles.push_back({printable(key), true});
-    } else if (const auto* array = value.as<Array>(); array == nullptr || array->empty()) {
+      nested.push_back({printable(key), inner});
+    } else if (const auto* array = value.as<Array>(); array != nullptr && !array->empty()) {
+      arrays.emplace_back(printable(key), array);
+    } else {
       scalars.add({{printable(key)}, cellOf(value)});
     }
   }
   scalars.appendTo(out);
-  Grid sideBySide;
-  sideBySide.add(titles);
-  for (const auto key : keysOf(nested)) {
-    Row row{{printable(key)}};
-    for (const Dictionary* inner : nested) row.push_back(cellOf(*inner, key));
-    sideBySide.add(std::move(row));
-  }
-  const bool fits = nested.size() > 1 && sideBySide.width() <= width;
-  if (fits) {
+  appendNested(out, nested, width);
+  for (const auto& [key, array] : arrays) {
     if (!out.empty()) out += '\n';
-    sideBySide.appendTo(out);
-  }
-  for (const auto& [key, value] : dictionary) {
-    if (const auto* inner = value.as<Dictionary>(); inner != nullptr && !fits) {
-      appendHeading(out, key);
-      Grid grid;
-      for (const auto& entry : *inner) grid.add({{printable(entry.key)}, cellOf(entry.value)});
-      grid.appendTo(out);
-    } else if (const auto* array = value.as<Array>(); array != nullptr && !array->empty()) {
-      appendHeading(out, key);
-      appendArray(out, *array, width);
-    }
+    out += key + ":\n";
+    appendArray(out, *array, width);
   }
 }
 

@@ -13,8 +13,8 @@ namespace nandinfo {
 // U+FFFD for what isn't UTF-8.
 std::string printable(std::string_view text);
 
-// A value as lines. Dictionaries within a dictionary stand side by side where `width` columns
-// allow, else one after the other; rows of dictionaries are cut at that width.
+// A value as lines. Dictionaries within a dictionary stand side by side, as many as `width` columns
+// allow, then the next ones; rows of dictionaries are cut at that width.
 std::string tableText(const platform::Value& value, std::size_t width);
 
 }  // namespace nandinfo

@@ -15,6 +15,7 @@ int main(int argc, char** argv) {
                                      .err = std::cerr,
                                      .outIsTerminal = ::isatty(STDOUT_FILENO) == 1,
                                      .errIsTerminal = ::isatty(STDERR_FILENO) == 1};
+  if (!host.root().openForStatus("/")) services.missingRoot = host.root().path();
   winsize size{};
   if (services.outIsTerminal && ::ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0) {
     services.width = size.ws_col;

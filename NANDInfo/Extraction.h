@@ -1,0 +1,55 @@
+// The extraction: storage health as events of the analytics sink, one step after another. Steps are
+// independent: what fails in one is logged, and the next one runs.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+#include "platform/Eventra.h"
+#include "platform/Exported.h"
+#include "platform/PropertyList.h"
+
+namespace platform {
+struct Platform;
+}
+
+namespace NANDInfo MORVEND_EXPORTED {
+
+// A step's number is its place in the table.
+struct ExtractionStep {
+  const char* name;
+  platform::Dictionary (*handler)(platform::Platform& platform);  // null: there is none
+};
+inline constexpr std::size_t kExtractionSteps = 8;
+extern const ExtractionStep kEV_Extraction_Step_Names[kExtractionSteps];
+
+// Runs the steps from the first one (below 7) on; the monthly one, which is the last, only when it
+// is allowed. The summary, if wanted, is what the steps sent (of equal keys the later), with the
+// error message of the process under "com.norba.NANDInfo.ErrorMessage".
+std::optional<platform::Dictionary> NandInfoExtractToEV_runAllSteps(platform::Platform& platform,
+                                                                    bool allowsMonthly,
+                                                                    bool wantsSummary,
+                                                                    std::uint32_t firstStep);
+
+// Runs one step; none when there is no such step. Without a lazy send on this device, or without
+// anything to send, the result holds an error message.
+std::optional<platform::Dictionary> NandInfoExtractToEV_runStep(platform::Platform& platform,
+                                                                std::uint32_t step);
+
+// Sends an event; the sink's answer. The sink keeps the producer until it is done with it, and may
+// call it later and on its own thread.
+bool EventraSendEventLazyWrapper(platform::Platform& platform, std::string_view event,
+                                 platform::Eventra::PayloadProducer producer);
+
+// Sends how full the boot variables' memory is and how often it was written; the result is what
+// there was to send, empty without that memory's service.
+platform::Dictionary gatherNVRAMStats(platform::Platform& platform);
+
+// Sends the stats magazine's counters of the last day (0), week (1) or month (2), and returns what
+// was sent: nothing if the send failed; an error message for another type or without a magazine.
+platform::Dictionary createAndLogSMagFTLFieldsToEventraForEvent(platform::Platform& platform,
+                                                                std::int32_t deltaType);
+
+}  // namespace MORVEND_EXPORTED

@@ -1,0 +1,27 @@
+// Kernel snapshots. What is found is the payload of one of the snapshot's statistics items, and the
+// same again for the same bytes.
+#include <cstdint>
+#include <cstdlib>
+
+#include "NANDInfo/ByteReader.h"
+#include "NANDInfo/SnapshotReader.h"
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
+  const auto snapshot = std::as_bytes(std::span(bytes, size));
+  const auto find = [&](std::string_view name) {
+    const auto found = NANDInfo::getIOStatsWithThreadnameFromKCData(snapshot, name);
+    if (!found || found->empty()) return found;
+    const auto offset = static_cast<std::size_t>(found->data() - snapshot.data());
+    if (offset < 16 || offset > size || found->size() > size - offset) std::abort();
+    NANDInfo::ByteReader header(snapshot.subspan(offset - 16));
+    if (header.read<std::uint32_t>() != 0x901u) std::abort();
+    if (header.read<std::uint32_t>() != found->size()) std::abort();
+    return found;
+  };
+  const auto first = find("VM_swapout");
+  const auto second = find("VM_swapout");
+  if (first.has_value() != second.has_value()) std::abort();
+  if (first && (first->data() != second->data() || first->size() != second->size())) std::abort();
+  find("");
+  return 0;
+}

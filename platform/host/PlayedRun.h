@@ -1,0 +1,18 @@
+// A run at another time than now, as a device's past is made of.
+#pragma once
+
+#include <cstdint>
+
+#include "platform/Kernel.h"
+#include "platform/PropertyList.h"
+
+namespace platform::host {
+
+// What such a run is told of itself.
+struct PlayedRun {
+  Date now;                 // its clock stands
+  std::uint64_t sinceBoot;  // ticks
+  Kernel::Process process;
+};
+
+}  // namespace platform::host

@@ -1,0 +1,369 @@
+// The extraction: what each event may carry, and whole runs of the steps over a device that has it
+// all, or lacks one thing.
+
+#include "NANDInfo/Extraction.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstring>
+#include <functional>
+#include <set>
+
+#include "NANDInfo/Events.h"
+#include "NANDInfo/ExtractionSteps.h"
+#include "platform/testing/FaultInjector.h"
+#include "support/Fingerprint.h"
+#include "support/StorageDevice.h"
+
+namespace NANDInfo {
+namespace {
+
+using platform::Dictionary;
+using platform::Value;
+using support::StorageDevice;
+using u64 = std::uint64_t;
+using Names = std::set<std::string>;
+
+constexpr std::string_view kPrefix = "com.norba.massStorage.NANDInfo.";
+
+Names namesOf(std::initializer_list<const NameTable*> tables) {
+  Names names;
+  for (const NameTable* table : tables) {
+    for (const auto& entry : *table) names.emplace(entry.name);
+  }
+  return names;
+}
+
+// One wrong letter or number changes the fingerprint (of the names, a line each, in bytewise
+// order). What no collector lets through, and what the step sets itself, is listed: anything else
+// would be a typing error, here or in a whitelist.
+TEST(EventraConfig, AllowsEachEventItsFields) {
+  const Names ftl = namesOf({&WhitelistedRawNANDFTLCounters_SigDigDict()}),
+              msp = namesOf({&WhitelistedRawNANDMSPCounters_SigDigDict()}),
+              storage = namesOf({&WhitelistedStorageStats_SigDigDict()}),
+              magazine = namesOf({&PrivacyApprovedSMagNANDFTLCounters_Accum(),
+                                  &PrivacyApprovedSMagNANDFTLCounters_Dynamic()});
+  using Families = std::vector<const char*>;
+  const Families counters{"cbdrEarlyExits", "cbdrNotEnoughReads", "pcieClkreqHighTimeout"},
+      histograms{"cbdrRefreshedAgesSLC_{0..8}", "cpuBurstLength{0..7}",     "dmReasonsSlc{0..18}",
+                 "dmReasonsSlc_{4, 6}",         "dmReasonsTlc{0..18}",      "dmReasonsTlc_{4, 6}",
+                 "gcSearchPortion{0..15}",      "gcSearchTimeHistory{0..9}"},
+      ofMSP{"fw_version_identifier_{0..3}", "msp_index", "total_nof_msps"},
+      window{"TLM_Capacity_GB", "TLM_Diskfullness_BP", "TLM_SM_deltaDays"};
+  Families day = window;
+  day.push_back("TLM_instantaneous_gc_wamp_{0..5}");
+  const struct {
+    std::string_view event;
+    std::size_t fields;
+    u64 fingerprint;
+    const Names& collected;
+    Families others;
+  } rows[] = {{"FTLCounters_1", 438, 0x231e1a5d8507c36f, ftl, counters},
+              {"FTLHistograms_1", 990, 0x10056450f6a33a76, ftl, histograms},
+              {"FTLHistograms_2", 104, 0x7571d6ec4383806c, ftl, {}},
+              {"MSPCounters_1", 822, 0xf514c360659e121c, msp, ofMSP},
+              {"SM.Daily.FTLCounters_1", 52, 0x3ffbaf6b9d50242c, magazine, day},
+              {"SM.WeeklyMA.FTLCounters_1", 33, 0x8dac102a300c64f7, magazine, window},
+              {"SM.Monthly.FTLCounters_1", 33, 0x8dac102a300c64f7, magazine, window},
+              {"StorageStats_1", 17, 0x7ee0331be108bbaa, storage, {}}};
+  for (const auto& [event, fields, fingerprint, collected, others] : rows) {
+    SCOPED_TRACE(event);
+    const NameTable* const table = EventraConfigDetails(std::string(kPrefix).append(event));
+    ASSERT_NE(table, nullptr);
+    Names expected{"Count"}, uncollected;
+    for (const char* family : others) {
+      for (const std::string& name : expandFamily(family)) expected.insert(name);
+    }
+    std::string text;
+    for (const std::string& name : namesOf({table})) {
+      text += name + "\n";
+      if (!collected.contains(name)) uncollected.insert(name);
+    }
+    EXPECT_EQ(table->size(), fields);
+    EXPECT_EQ(support::fingerprint(text), fingerprint);
+    EXPECT_EQ(uncollected, expected);
+  }
+  EXPECT_EQ(EventraConfigDetails(kEventName_massStorage_NANDInfo_NORWrites), nullptr);
+}
+
+// A device with two MSPs, a magazine of 720 hours and NVRAM statistics.
+struct FullDevice : StorageDevice {
+  FullDevice() : StorageDevice(support::kQRT3) {
+    setCounters({"magazineFWVersion", {1, 2, 3}});
+    for (const std::uint32_t msp : {0, 1}) {
+      registry.alwaysTunnels(9, 221, msp, support::records({{0x1000, 4, {msp + 5}}}));
+    }
+    registry.add(
+        {.className = "NvramDiagService",
+         .properties = {{"Generation", "12"}, {"Version", 2}},
+         .children = {{.className = "child", .properties = {{"CommonUsed", 3}, {"Version", 1}}}}});
+  }
+
+  void setCounters(const support::FTLFields::value_type& version) {
+    setStatistics({version, {"hostWrites", {5000}}, {"vcurve", std::vector<u64>(32, 1)}});
+    for (const std::uint32_t hours : {0, 4, 8, 12, 16, 20, 24, 168, 720}) {
+      setSnapshot(hours, {version,
+                          {"magazineInstanceMeta", {(u64{4000000} - hours * 3600) << 24}},
+                          {"hostWrites", {5000 - hours}},
+                          {"gcWrites", {1000 - hours}},
+                          {"vcurve", std::vector<u64>(32, 1)}});
+    }
+  }
+
+  // The log, without what finding controllers and images says.
+  std::string said() const {
+    std::string text;
+    for (const std::string& line : log.lines()) {
+      if (line.find("findNandExporterNew") == std::string::npos &&
+          line.find("EANConnection") == std::string::npos &&
+          line.find("GetEAN") == std::string::npos) {
+        text += line.substr(std::strlen("default: "));
+      }
+    }
+    return text;
+  }
+
+  // The events so far, without their common prefix.
+  std::string sent() const {
+    std::string text;
+    for (const auto& [event, payload] : eventra.events) {
+      text += event.starts_with(kPrefix) ? event.substr(kPrefix.size()) + " " : "? " + event;
+    }
+    return text;
+  }
+};
+
+constexpr char kFirstSteps[] =
+    "FTLCounters_1 FTLHistograms_1 FTLHistograms_2 MSPCounters_1 MSPCounters_1 StorageStats_1 "
+    "NORWrites ";
+
+TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
+  const struct {
+    const char* what;
+    std::function<void(FullDevice&)> alter;
+    bool monthly;
+    std::uint32_t firstStep;
+    std::string events;
+    int successes, failures;  // lines of events
+  } rows[] = {
+      {"all", [](FullDevice&) {}, true, 0,
+       std::string(kFirstSteps) +
+           "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 SM.Monthly.FTLCounters_1 ",
+       9, 0},
+      {"from the magazine on", [](FullDevice&) {}, false, 4,
+       "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 ", 2, 0},
+      {"the month alone", [](FullDevice&) {}, true, 6, "SM.Monthly.FTLCounters_1 ", 1, 0},
+      {"not even that", [](FullDevice&) {}, false, 6, "", 0, 0},
+      {"beyond the last", [](FullDevice&) {}, true, 7, "", 0, 0},
+      {"some are unused",
+       [](FullDevice& device) {
+         device.eventra.unused = {kEventName_massStorage_NANDInfo_FTLHistograms_1,
+                                  kEventName_massStorage_NANDInfo_MSPCounters_1,
+                                  kEventName_massStorage_NANDInfo_SM_Daily_FTLCounters_1};
+       },
+       false, 0,
+       "FTLCounters_1 FTLHistograms_2 StorageStats_1 NORWrites SM.WeeklyMA.FTLCounters_1 ", 4, 4},
+      {"the queue is full", [](FullDevice& device) { device.eventra.queuesEvents = false; }, true,
+       0, "", 0, 9},
+      {"no sink", [](FullDevice& device) { device.eventra.hasLazySend = false; }, true, 0, "", 0,
+       0},
+      {"no magazine",
+       [](FullDevice& device) {
+         device.setCounters({"boots", {1}});
+       },
+       true, 0, kFirstSteps, 6, 0},
+      {"no controller and no NVRAM",
+       [](FullDevice& device) { device.registry.root = std::nullopt; }, true, 0,
+       "FTLCounters_1 FTLHistograms_1 FTLHistograms_2 StorageStats_1 ", 4, 0}};
+  for (const auto& [what, alter, monthly, firstStep, events, successes, failures] : rows) {
+    SCOPED_TRACE(what);
+    FullDevice device;
+    alter(device);
+    const auto summary = NandInfoExtractToEV_runAllSteps(device.platform, monthly, true, firstStep);
+    EXPECT_EQ(device.sent(), events);
+    EXPECT_EQ(device.log.count("SUCCESS in logging"), successes);
+    EXPECT_EQ(device.log.count("FAILED to log"), failures);
+    EXPECT_EQ(device.log.count("Skipping Stats Mag Monthly Delta"), monthly ? 0 : 1);
+    const int stepsRun = !device.eventra.hasLazySend ? 0 : (monthly ? 7 : 6) - int(firstStep);
+    EXPECT_EQ(device.log.count("successfully logged"), stepsRun);
+    ASSERT_TRUE(summary);
+    EXPECT_EQ(*summary->text(kNANDInfoErrorMessageKey), GetAPIErrorMessage());
+    EXPECT_EQ(device.registry.problems(), std::vector<std::string>());
+  }
+}
+
+TEST(Extraction, SendsWhatEachEventMayCarry) {
+  FullDevice device;
+  const auto summary = NandInfoExtractToEV_runAllSteps(device.platform, true, true, 0);
+  const struct {
+    std::vector<const char*> keys;
+    const char* values;  // "-" for what isn't sent
+  } rows[] = {{{"hostWrites", "vcurve_1", "TLM_hostWrites", "TLM_APIErrorMessage"}, "5000 - - - "},
+              {{"vcurve_31", "hostWrites", "TLM_hostWrites"}, "1 - 5000 "},
+              {{"TLM_hostWrites", "vcurve_1"}, "5000 - "},
+              {{"msp_index", "passWithTmodeHard"}, "0 5 "},
+              {{"msp_index", "passWithTmodeHard", "total_nof_msps"}, "1 6 2 "},
+              {{"TLM_hostWrites", "EAN_imageSize_BIC"}, "5000 0 "},
+              {{"norwrites", "commonused", "version", "systemused"}, "12 3 2 - "},
+              {{"hostWrites", "TLM_SM_deltaDays", "TLM_instantaneous_gc_wamp_5",
+                kNANDInfoIsStatMagSupported},
+               "24 1 1.070663811563169 - "},
+              {{"hostWrites", "TLM_SM_deltaDays", "TLM_instantaneous_gc_wamp_5"}, "168 7 - "},
+              {{"hostWrites", "TLM_SM_deltaDays"}, "720 30 "}};
+  const auto& events = device.eventra.events;
+  ASSERT_EQ(events.size(), std::size(rows));
+  for (std::size_t i = 0; i < events.size(); ++i) {
+    const auto& [event, payload] = events[i];
+    std::string values;
+    for (const char* key : rows[i].keys) {
+      const Value* const value = payload.find(key);
+      values += (value != nullptr ? description(*value) : "-") + " ";
+    }
+    EXPECT_EQ(values, rows[i].values) << event;
+    const NameTable* const fields = EventraConfigDetails(event);
+    for (const auto& [key, value] : payload) {
+      EXPECT_TRUE(fields == nullptr || fields->contains(key)) << event << " " << key;
+    }
+  }
+  EXPECT_EQ(*summary->find("hostWrites"), Value(720));
+  EXPECT_EQ(*summary->dictionary("msp_index"), events[4].second);
+  EXPECT_NE(events[4].second.text("msp_index"), nullptr);
+}
+
+TEST(Extraction, SaysWhatItDoes) {
+  FullDevice device;
+  device.eventra.unused = {kEventName_massStorage_NANDInfo_FTLHistograms_2,
+                           kEventName_massStorage_NANDInfo_StorageStats_1,
+                           kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1};
+  EXPECT_EQ(NandInfoExtractToEV_runAllSteps(device.platform, false, false, 0), std::nullopt);
+  EXPECT_EQ(device.said(), R"(NANDInfo: NandInfoExtractToEV_runStep: logging FTL big view
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.FTLCounters_1 enabled=1
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: SUCCESS in logging massStorage_NANDInfo_FTLCounters_1 using EventraSendEventLazy
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.FTLHistograms_1 enabled=1
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: SUCCESS in logging massStorage_NANDInfo_FTLHistograms_1 using EventraSendEventLazy
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.FTLHistograms_2 enabled=0
+NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: FAILED to log massStorage_NANDInfo_FTLHistograms_2 using EventraSendEventLazy
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged FTL big view
+NANDInfo: NandInfoExtractToEV_runStep: logging MSP stats
+NANDInfo: createAndLogMSPFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.MSPCounters_1 enabled=1
+NANDInfo: createAndLogMSPFieldsToEventraForEvent: SUCCESS in logging massStorage_NANDInfo_MSPCounters_1 using EventraSendEventLazy
+NANDInfo: createAndLogMSPFieldsToEventraForEvent: SUCCESS in logging massStorage_NANDInfo_MSPCounters_1 using EventraSendEventLazy
+NANDInfo: createAndLogMSPFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.MSPCounters_1 completed (total_nof_msps:2)
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged MSP stats
+NANDInfo: NandInfoExtractToEV_runStep: logging storage stats
+NANDInfo: createAndLogStorageStatsToEventraForEvent: com.norba.massStorage.NANDInfo.StorageStats_1 enabled=0
+NANDInfo: createAndLogStorageStatsToEventraForEvent: FAILED to log massStorage_NANDInfo_StorageStats_1 using EventraSendEventLazy
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged storage stats
+NANDInfo: NandInfoExtractToEV_runStep: logging NVRAM stat
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged NVRAM stat
+NANDInfo: NandInfoExtractToEV_runStep: logging FTL statsMag daily
+NANDInfo: createAndLogSMagFTLFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.SM.Daily.FTLCounters_1 enabled=1
+NANDInfo: createAndLogSMagFTLFieldsToEventraForEvent: SUCCESS in logging com.norba.massStorage.NANDInfo.SM.Daily.FTLCounters_1 using EventraSendEventLazy
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged FTL statsMag daily
+NANDInfo: NandInfoExtractToEV_runStep: logging FTL statsMag weekly
+NANDInfo: createAndLogSMagFTLFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.SM.WeeklyMA.FTLCounters_1 enabled=0
+NANDInfo: createAndLogSMagFTLFieldsToEventraForEvent: FAILED to log com.norba.massStorage.NANDInfo.SM.WeeklyMA.FTLCounters_1 using EventraSendEventLazy
+NANDInfo: NandInfoExtractToEV_runStep: successfully logged FTL statsMag weekly
+Skipping Stats Mag Monthly Delta)");
+}
+
+TEST(Extraction, HasNoHandlerBeyondTheMonth) {
+  constexpr char kSaid[] =
+      "NANDInfo: NandInfoExtractToEV_runStep: logging FTL counters\n"
+      "Unexpected step FTL counters"
+      "NANDInfo: NandInfoExtractToEV_runStep: unable to log FTL counters\n";
+  FullDevice device;
+  EXPECT_EQ(NandInfoExtractToEV_runStep(device.platform, 8), std::nullopt);
+  EXPECT_EQ(device.said(), "Invalid extraction step 8");
+  EXPECT_STREQ(GetAPIErrorMessage(), "NA");
+  device.log.clear();
+  EXPECT_EQ(NandInfoExtractToEV_runStep(device.platform, 7), std::nullopt);
+  EXPECT_EQ(device.said(), kSaid);
+  EXPECT_STREQ(GetAPIErrorMessage(), "NANDInfo/NANDInfo: unable to log FTL counters to EV");
+  device.eventra.hasLazySend = false;
+  EXPECT_EQ(NandInfoExtractToEV_runStep(device.platform, 0),
+            (Dictionary{{kNANDInfoErrorMessageKey, "Unable call EV API EventraSendEventLazy"}}));
+  EXPECT_EQ(device.said(), kSaid);
+}
+
+// A payload that isn't the producer's own would be gone, or another one, by then.
+TEST(Extraction, LeavesEachPayloadToTheSinksThread) {
+  FullDevice prompt;
+  NandInfoExtractToEV_runAllSteps(prompt.platform, true, false, 0);
+  FullDevice late;
+  late.eventra.defers = true;
+  NandInfoExtractToEV_runAllSteps(late.platform, true, false, 0);
+  EXPECT_EQ(late.sent(), "");
+  late.eventra.deliver();
+  EXPECT_EQ(late.eventra.events, prompt.eventra.events);
+}
+
+TEST(Extraction, GoesOnAfterAnyFailedCall) {
+  FullDevice device;
+  platform::fakes::FaultInjector faults(device.platform);
+  int calls = 0;
+  for (int failing = 0; failing <= calls; ++failing) {
+    SCOPED_TRACE(failing);
+    device.log.clear();
+    device.eventra.events.clear();
+    faults.failAt(failing);
+    ASSERT_TRUE(NandInfoExtractToEV_runAllSteps(faults.platform(), false, true, 3));
+    if (failing == 0) calls = faults.calls();
+    EXPECT_EQ(device.log.count("successfully logged"), 3);
+    EXPECT_EQ(device.registry.problems(), std::vector<std::string>());
+    EXPECT_GE(device.eventra.events.size(), 2u);
+    for (const auto& [event, payload] : device.eventra.events) {
+      EXPECT_FALSE(payload.empty()) << event;
+    }
+  }
+  EXPECT_GE(calls, 80);
+}
+
+TEST(ExtractionStep, SaysWhatItCouldNotGatherOrSend) {
+  FullDevice device;
+  const auto error = [](const char* text) { return Dictionary{{kNANDInfoErrorMessageKey, text}}; };
+  EXPECT_EQ(createAndLogFTLStatFieldsToEventraForEvent(device.platform, std::nullopt),
+            error("Unable gather FTL fields to log to EV"));
+  EXPECT_EQ(createAndLogMSPFieldsToEventraForEvent(device.platform, std::nullopt),
+            error("Unable gather MSP fields to log to EV"));
+  EXPECT_EQ(createAndLogStorageStatsToEventraForEvent(device.platform, std::nullopt),
+            error("Unable gather Storage fields to log to EV"));
+  EXPECT_EQ(device.said(), "");
+  for (const std::int32_t type : {-1, 3}) {
+    device.log.clear();
+    EXPECT_EQ(createAndLogSMagFTLFieldsToEventraForEvent(device.platform, type),
+              error("Wrong SM delta type"));
+    EXPECT_EQ(device.said(), "Unexpected SM delta type " + std::to_string(type));
+  }
+  StorageDevice bare;
+  EXPECT_EQ(createAndLogSMagFTLFieldsToEventraForEvent(bare.platform, 1),
+            error("Stats Magazine not supported"));
+
+  device.log.clear();
+  ResetAPIErrorMessage();
+  device.eventra.queuesEvents = false;
+  const Dictionary msps{{kTLM_APIErrorMessage, "NA"}, {"0", Dictionary()}};
+  EXPECT_EQ(createAndLogMSPFieldsToEventraForEvent(device.platform, msps), Dictionary());
+  EXPECT_EQ(createAndLogSMagFTLFieldsToEventraForEvent(device.platform, 0), Dictionary());
+  EXPECT_STREQ(GetAPIErrorMessage(),
+               "createAndLogMSPFieldsToEventraForEvent: EventraSendEventLazy failed to log to EV");
+}
+
+TEST(NVRAMStats, AreSentWhenThereAreAny) {
+  FullDevice device;
+  const Dictionary expected{{"commonused", 3}, {"norwrites", "12"}, {"version", 2}};
+  EXPECT_EQ(gatherNVRAMStats(device.platform), expected);
+  EXPECT_EQ(device.sent(), "NORWrites ");
+  device.eventra.queuesEvents = false;
+  EXPECT_EQ(gatherNVRAMStats(device.platform), expected);
+
+  FullDevice without;
+  without.registry.root->children[1] = {.className = "NvramDiagService"};
+  EXPECT_EQ(gatherNVRAMStats(without.platform), Dictionary());
+  EXPECT_EQ(without.sent(), "");
+  EXPECT_EQ(without.registry.problems(), std::vector<std::string>());
+}
+
+}  // namespace
+}  // namespace NANDInfo

@@ -1,0 +1,107 @@
+// The health figures and their three subsets.
+
+#include <gtest/gtest.h>
+
+#include "support/StorageDevice.h"
+
+namespace NANDInfo {
+namespace {
+
+using platform::Dictionary;
+using support::kQRT3;
+using support::kZMCStorage;
+using support::StorageDevice;
+
+constexpr std::uint64_t kNegative = 0xFFFFFFFF;  // in 32 bits
+
+struct Figures {
+  std::int64_t used, e2e, reads, bad = -1, spare = -1, dies = -1;
+};
+
+const struct {
+  const char* controller;
+  support::FTLFields fields;
+  Figures figures;
+  bool retirable;
+} kRows[] = {
+    {kQRT3, {{"hostWrites", {1}}}, {0, 0, 0}, false},
+    {kQRT3,
+     {{"fwUpdatesPercentUsed", {kNegative}}, {"slcPercentUsed", {12}}, {"percentUsed", {11}}},
+     {12, 0, 0},
+     false},
+    {kQRT3, {{"percentUsed", {(std::uint64_t{1} << 32) + 5}}}, {5, 0, 0}, false},
+    {kQRT3, {{"E2EDPErrorCounters", {1, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}, false},
+    {kQRT3,
+     {{"E2EDPErrorCounters", {~std::uint64_t{0}, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}},
+     {0, 3, 0},
+     false},
+    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 8}, false},
+    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative}}}, {0, 0, 0}, false},
+    {kZMCStorage, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 7}, false},
+    {kZMCStorage, {{"ueccReads", {kNegative}}}, {0, 0, 0}, false},
+    {kQRT3,
+     {{"numGrownBad", {3}},
+      {"spareAvailablePercent", {100}},
+      {"numDieFailures", {0}},
+      {"percentUsed", {99}}},
+     {99, 0, 0, 3, 100, 0},
+     false},
+    {kQRT3, {{"spareAvailablePercent", {99}}}, {0, 0, 0, -1, 99}, true},
+    {kQRT3, {{"spareAvailablePercent", {100}}, {"percentUsed", {100}}}, {100, 0, 0, -1, 100}, true},
+    {kQRT3, {{"percentUsed", {100}}}, {100, 0, 0}, false},
+};
+
+Dictionary prefixed(std::initializer_list<std::pair<const char*, std::int64_t>> entries) {
+  Dictionary dictionary;
+  for (const auto& [key, value] : entries) {
+    dictionary.set(std::string(kNANDHealthInfoPrefix) + key, value);
+  }
+  return dictionary;
+}
+
+TEST(HealthInfo, EachConsumerGetsItsFigures) {
+  for (const auto& [controller, fields, f, retirable] : kRows) {
+    SCOPED_TRACE(fields.front().first);
+    StorageDevice device(controller);
+    device.setStatistics(fields);
+    const Dictionary all = gatherNANDHealthInfo(device.platform);
+    EXPECT_EQ(all, prefixed({{"MaxPercentageNANDUsed", f.used},
+                             {"MaxE2EErrors", f.e2e},
+                             {"HostReadErrors", f.reads},
+                             {"NumGrownBadBlocks", f.bad},
+                             {"SpareAvailablePercent", f.spare},
+                             {"NumDieFailures", f.dies}}));
+    for (const auto& [key, value] : all) {
+      EXPECT_EQ(value.as<platform::Number>()->type(), platform::Number::Type::int64) << key;
+    }
+    const auto common = prefixed({{"MaxPercentageNANDUsed", f.used},
+                                  {"HostReadErrors", f.reads},
+                                  {"MaxE2EErrors", f.e2e},
+                                  {"NumGrownBadBlocks", f.bad}});
+    EXPECT_EQ(CopyOTANANDInfo(device.platform), common);
+    Dictionary servita = common, lab = common;
+    servita.set(kNANDHealthInfoNumDieFailures, f.dies);
+    lab.set(kNANDHealthInfoSpareAvailablePercent, f.spare);
+    lab.set(kNANDHealthInfoIsNANDRetirable, retirable ? 1 : 0);
+    for (Dictionary* subset : {&servita, &lab}) {
+      subset->set("TLM_APIErrorMessage", "Stat Magazine not supported");
+    }
+    EXPECT_EQ(CopyServitaNANDInfo(device.platform), servita);
+    EXPECT_EQ(CopyInternalLabNANDInfo(device.platform), lab);
+    EXPECT_TRUE(device.registry.problems().empty());
+  }
+}
+
+TEST(HealthInfo, WithoutAController) {
+  StorageDevice device;
+  const char text[] = "gatherZMCFTLData: Could not get nand_exporter_t";
+  EXPECT_TRUE(gatherNANDHealthInfo(device.platform).empty());
+  EXPECT_TRUE(CopyOTANANDInfo(device.platform).empty());
+  EXPECT_EQ(CopyServitaNANDInfo(device.platform), (Dictionary{{"TLM_APIErrorMessage", text}}));
+  EXPECT_EQ(CopyInternalLabNANDInfo(device.platform),
+            (Dictionary{{"com.norba.NANDInfo.Health.IsNANDRetirable", 0},
+                        {"TLM_APIErrorMessage", text}}));
+}
+
+}  // namespace
+}  // namespace NANDInfo

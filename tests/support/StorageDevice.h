@@ -1,0 +1,58 @@
+// A device in memory with a storage controller whose buffers a test names field by field.
+#pragma once
+
+#include <algorithm>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "NANDInfo/KeyTables.h"
+#include "NANDInfo/NANDInfo.h"
+#include "support/ControllerBuffers.h"
+#include "support/TestPlatform.h"
+
+namespace support {
+
+// Arrays by their names in the key table, with the values of their first elements.
+using FTLFields = std::vector<std::pair<std::string_view, std::vector<std::uint64_t>>>;
+
+inline Bytes ftlBuffer(const FTLFields& fields) {
+  std::vector<std::uint64_t> all;
+  for (const auto& [name, values] : fields) {
+    const auto table = NANDInfo::FTLKeyTable();
+    const auto row = std::find_if(table.begin(), table.end(),
+                                  [&](const NANDInfo::FTLKey& key) { return name == key.name; });
+    all.push_back(header(row->key, static_cast<std::uint32_t>(values.size())));
+    all.insert(all.end(), values.begin(), values.end());
+  }
+  return words(all);
+}
+
+struct StorageDevice : TestPlatform {
+  explicit StorageDevice(const char* controller = nullptr) {
+    NANDInfo::ResetExporters();
+    NANDInfo::ResetAPIErrorMessage();
+    if (controller != nullptr) registry.add({.className = controller});
+  }
+
+  // What the controller answers whenever it is asked for its statistics.
+  void setStatistics(const FTLFields& fields) {
+    for (const std::uint32_t method : {8, 9}) {
+      registry.alwaysTunnels(method, 13, 0, ftlBuffer(fields));
+    }
+  }
+
+  // The snapshot of its magazine so many hours back.
+  void setSnapshot(std::uint32_t hours, const FTLFields& fields) {
+    for (const std::uint32_t method : {8, 9}) {
+      registry.alwaysTunnels(method, 10, hours, ftlBuffer(fields));
+    }
+  }
+};
+
+inline constexpr char kQRT3[] = "NorbaQRT3NVMeController";
+inline constexpr char kEmbedded[] = "NorbaEmbeddedNVMeController";
+inline constexpr char kZMCStorage[] = "ZMCStorage";
+
+}  // namespace support

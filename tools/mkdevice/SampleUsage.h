@@ -1,0 +1,11 @@
+// What the processes of a sample device have sent and received.
+#pragma once
+
+#include "tools/mkdevice/Sample.h"
+
+namespace mkdevice {
+
+// As counted when `today` begins, each process since it was last started.
+platform::Dictionary networkUsage(const Sample& sample);
+
+}  // namespace mkdevice
