@@ -9,8 +9,6 @@
 
 namespace morvend {
 
-using platform::ChannelSample;
-using platform::Dictionary;
 using platform::LogLevel;
 using platform::Number;
 using platform::Platform;

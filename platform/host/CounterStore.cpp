@@ -12,6 +12,10 @@ namespace {
 constexpr int kDaysKept = 60;
 constexpr std::size_t kMostSamplesInRow = 65536;
 
+// A client's failure that takes this long, and how long it is then spared.
+constexpr std::chrono::seconds kSlow(1);
+constexpr std::chrono::minutes kPause(1);
+
 void write(sqlite::Connection& connection, const CounterChange& change) {
   switch (change.kind) {
     case CounterChange::Kind::set:
@@ -131,8 +135,15 @@ void CounterStore::PLClientSetValuesForScalarKeys(std::span<const ScalarValue> v
 }
 
 void CounterStore::record(const std::vector<CounterChange>& changes) {
+  const auto start = std::chrono::steady_clock::now();
+  {
+    const std::scoped_lock lock(mutex_);
+    if (start < droppedUntil_) return;
+  }
   const std::string error = apply(changes);
   const std::scoped_lock lock(mutex_);
+  const auto end = std::chrono::steady_clock::now();
+  if (!error.empty() && end - start > kSlow) droppedUntil_ = end + kPause;
   if (!error.empty() && error != clientError_) {
     place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());
   }

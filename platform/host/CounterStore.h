@@ -1,6 +1,7 @@
 // The counters service and the history store: an SQLite database below the device root.
 #pragma once
 
+#include <chrono>
 #include <mutex>
 #include <span>
 #include <vector>
@@ -40,7 +41,8 @@ class CounterStore : public CountersService, public HistoryStore {
   // write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
-  // Failures are logged, the same one once for as long as it lasts.
+  // Failures are logged, the same one once for as long as it lasts. After one that took its time
+  // (another program holds the database) values are dropped for a minute: a day has hundreds.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
   void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
   // In one transaction: each of its own costs a dozen system calls.
@@ -62,9 +64,10 @@ class CounterStore : public CountersService, public HistoryStore {
 
   CounterPlace place_;
   Clock& clock_;
-  std::mutex mutex_;  // over the two that follow
+  std::mutex mutex_;  // over all that follows
   CounterDatabase database_;
   std::string clientError_;
+  std::chrono::steady_clock::time_point droppedUntil_;
 };
 
 }  // namespace platform::host
