@@ -1,6 +1,8 @@
 #include "platform/host/CounterStore.h"
 
+#include <array>
 #include <cmath>
+#include <vector>
 
 #include "platform/CivilDate.h"
 #include "platform/host/SQLite.h"
@@ -110,27 +112,29 @@ Date CounterStore::PLDateFromDaysSince1970(std::int32_t day) {
 }
 
 void CounterStore::PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(
-      {{.kind = CounterChange::Kind::set, .key = key, .day = PLDaysSince1970(), .amount = value}});
+  record(CounterChange::Kind::set, std::array{ScalarValue{key, value}});
 }
 
 void CounterStore::PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(
-      {{.kind = CounterChange::Kind::add, .key = key, .day = PLDaysSince1970(), .amount = value}});
+  record(CounterChange::Kind::add, std::array{ScalarValue{key, value}});
 }
 
 void CounterStore::PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) {
+  record(CounterChange::Kind::set, values);
+}
+
+void CounterStore::PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) {
+  record(CounterChange::Kind::add, values);
+}
+
+void CounterStore::record(CounterChange::Kind kind, std::span<const ScalarValue> values) {
+  if (values.empty()) return;
   const std::int32_t today = PLDaysSince1970();
   std::vector<CounterChange> changes;
   changes.reserve(values.size());
   for (const auto& [key, value] : values) {
-    changes.push_back(
-        {.kind = CounterChange::Kind::set, .key = key, .day = today, .amount = value});
+    changes.push_back({.kind = kind, .key = key, .day = today, .amount = value});
   }
-  if (!changes.empty()) record(changes);
-}
-
-void CounterStore::record(const std::vector<CounterChange>& changes) {
   const std::string error = apply(changes);
   const std::scoped_lock lock(mutex_);
   if (!error.empty() && error != clientError_) {

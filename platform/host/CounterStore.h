@@ -3,7 +3,6 @@
 
 #include <mutex>
 #include <span>
-#include <vector>
 
 #include "platform/Clock.h"
 #include "platform/CountersService.h"
@@ -43,8 +42,9 @@ class CounterStore : public CountersService, public HistoryStore {
   // Failures are logged, the same one once for as long as it lasts.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
   void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
-  // In one transaction: each of its own costs a dozen system calls.
+  // Several in one transaction: each of its own costs a dozen system calls.
   void PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) override;
+  void PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) override;
 
   // The history lives no longer than the store.
   std::unique_ptr<PLHistory> initWithDefaultPath() override { return history(); }
@@ -58,7 +58,7 @@ class CounterStore : public CountersService, public HistoryStore {
   std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
 
  private:
-  void record(const std::vector<CounterChange>& changes);
+  void record(CounterChange::Kind kind, std::span<const ScalarValue> values);
 
   CounterPlace place_;
   Clock& clock_;
