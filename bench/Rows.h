@@ -8,6 +8,9 @@ namespace bench {
 // Start and end of the program, and whole reports, as processes.
 void addProcessRows(Table& table);
 
+// Whole days with a storage controller, as processes; prints below a row what the steps take.
+void addDailyRunRows(Table& table);
+
 // Reading and writing the counters store.
 void addCounterStoreRows(Table& table);
 

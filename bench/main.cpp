@@ -10,6 +10,7 @@ int main() {
   bench::addPropertyListRows(table);
   bench::addStorageParserRows(table);
   bench::addStorageTableRows(table);
+  bench::addDailyRunRows(table);
   table.finish();
   return 0;
 }

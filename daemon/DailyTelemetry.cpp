@@ -1,6 +1,7 @@
 #include "daemon/DailyTelemetry.h"
 
 #include <array>
+#include <string>
 #include <vector>
 
 #include "NANDInfo/NANDInfo.h"
@@ -61,10 +62,15 @@ void CollectReportChannels(Platform& platform) {
   const auto subscription = platform.reportingChannels.subscribe(channels);
   const auto samples = subscription ? subscription->createSamples() : std::nullopt;
   if (!samples) return;
+  std::vector<std::string> keys;
+  keys.reserve(samples->size());  // they are borrowed, and must not move
+  std::vector<ScalarValue> values;
   for (const auto& [channel, value] : *samples) {
     if (channel.format != platform::kSimpleChannelFormat) continue;
-    platform.counters.PLClientSetValueForScalarKey("com.norba.velquist." + channel.name, value);
+    keys.push_back("com.norba.velquist." + channel.name);
+    values.push_back({keys.back(), value});
   }
+  platform.counters.PLClientSetValuesForScalarKeys(values);
 }
 
 struct Collector {

@@ -2,6 +2,7 @@
 
 #include <memory>
 #include <semaphore>
+#include <vector>
 
 #include "daemon/DataUsageChanges.h"
 #include "platform/CivilDate.h"
@@ -25,9 +26,9 @@ void handleReply(const Platform& platform, const Array* records) {
   DataUsageChanges changes = dataUsageChanges(
       baseline != nullptr ? *baseline : Dictionary(), records != nullptr ? *records : Array(),
       platform.counters.PLDateFromDaysSince1970(platform::dayBefore(today)));
-  for (const CounterAddition& addition : changes.additions) {
-    platform.counters.PLClientAddValueForScalarKey(addition.key, addition.value);
-  }
+  std::vector<platform::ScalarValue> additions;
+  for (const auto& [key, value] : changes.additions) additions.push_back({key, value});
+  platform.counters.PLClientAddValuesForScalarKeys(additions);
   const platform::Value value(std::move(changes.baseline));
   platform.preferences.QNSPreferencesSetValue(kBaseline, &value, kDomain);
   platform.preferences.QNSPreferencesSynchronize(kDomain);

@@ -33,9 +33,12 @@ class CountersService {
   virtual void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) = 0;
   virtual void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) = 0;
 
-  // The same as setting one after the other; a service may record them as one, all or none.
+  // The same for several keys, one after the other; a service may record them as one, all or none.
   virtual void PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) {
     for (const auto& [key, value] : values) PLClientSetValueForScalarKey(key, value);
+  }
+  virtual void PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) {
+    for (const auto& [key, value] : values) PLClientAddValueForScalarKey(key, value);
   }
 };
 

@@ -2,16 +2,23 @@
 // samples, the appending of the XML, one durable write. No whitelist, no rounding, no other
 // service.
 //
-// bare_report DATABASE DAY OUTPUT
+// With a storage controller's buffers also what its counters need: reading and walking each buffer
+// once, with two zeroed allocations and a number's text for each field of the statistics and a
+// number's text for each word of the lists, one transaction for the counters' rows, and a durable
+// write of each text.
+//
+// bare_report DATABASE DAY OUTPUT [STATISTICS LIST...]
 
 #include <fcntl.h>
 #include <sqlite3.h>
 #include <unistd.h>
 
 #include <charconv>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -39,10 +46,88 @@ void appendKey(std::string& xml, sqlite3_stmt* statement) {
   xml += "</key>\n";
 }
 
+std::string read(const char* path) {
+  const int file = open(path, O_RDONLY);
+  const off_t size = lseek(file, 0, SEEK_END);
+  std::string bytes(size > 0 ? static_cast<std::size_t>(size) : 0, '\0');
+  if (pread(file, bytes.data(), bytes.size(), 0) != size) std::exit(1);
+  close(file);
+  return bytes;
+}
+
+void write(const std::string& path, const std::string& text) {
+  const int file = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
+  const bool written =
+      file >= 0 && ::write(file, text.data(), text.size()) == static_cast<ssize_t>(text.size()) &&
+      fsync(file) == 0;
+  if (!written) std::exit(1);
+  close(file);
+}
+
+template <typename Number>
+Number numberAt(const std::string& bytes, std::size_t at) {
+  Number number;
+  std::memcpy(&number, bytes.data() + at, sizeof number);
+  return number;
+}
+
+// What a field is to a parser: a name and a value, each with its text.
+struct Field {
+  char name[100], text[100];
+};
+
+std::vector<std::uint64_t> walkStatistics(const std::string& bytes, std::string& text) {
+  std::vector<std::uint64_t> values;
+  std::vector<void*> allocated;
+  for (std::size_t at = 0; at + 8 <= bytes.size();) {
+    const auto count = numberAt<std::uint32_t>(bytes, at + 4);
+    at += 8;
+    for (std::uint32_t i = 0; i < count && at + 8 <= bytes.size(); ++i, at += 8) {
+      values.push_back(numberAt<std::uint64_t>(bytes, at));
+      allocated.push_back(std::calloc(1, sizeof(Field)));
+      allocated.push_back(std::calloc(1, sizeof(Field)));
+      appendElement(text, "com.example.storage:", values.back(), ";");
+    }
+  }
+  for (void* memory : allocated) std::free(memory);
+  return values;
+}
+
+void addStorage(sqlite3* database, int today, const std::string& output, char** buffer,
+                char** end) {
+  std::string log, lists;
+  const auto values = walkStatistics(read(*buffer), log);
+  while (++buffer < end) {
+    const std::string bytes = read(*buffer);
+    for (std::size_t at = 0; at + 4 <= bytes.size(); at += 4) {
+      const auto word = numberAt<std::uint32_t>(bytes, at);
+      if (word != 0) appendElement(lists, "\"readStage\": ", word, ", ");
+    }
+  }
+  sqlite3_exec(database, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr);
+  sqlite3_stmt* row = nullptr;
+  if (sqlite3_prepare_v2(database, "REPLACE INTO scalars(day, key, value) VALUES(?, ?, ?)", -1,
+                         &row, nullptr) != SQLITE_OK) {
+    std::exit(1);
+  }
+  for (std::size_t i = 0; i < values.size(); ++i) {
+    const std::string key = "com.example.storage" + std::to_string(i);
+    sqlite3_bind_int(row, 1, today);
+    sqlite3_bind_text(row, 2, key.c_str(), -1, SQLITE_STATIC);
+    sqlite3_bind_int64(row, 3, static_cast<sqlite3_int64>(values[i]));
+    sqlite3_step(row);
+    sqlite3_reset(row);
+  }
+  sqlite3_finalize(row);
+  sqlite3_exec(database, "COMMIT", nullptr, nullptr, nullptr);
+  write(output + ".log", log);
+  write(output + ".lists", lists);
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc != 4) return 2;
+  if (argc < 4) return 2;
   const int day = std::atoi(argv[2]);
   sqlite3* database = nullptr;
   if (sqlite3_open_v2(argv[1], &database, SQLITE_OPEN_READWRITE, nullptr) != SQLITE_OK) return 1;
@@ -86,10 +171,8 @@ int main(int argc, char** argv) {
     appendElement(xml, "\t\t\t<integer>", count, "</integer>\n\t\t</array>\n");
   }
   sqlite3_finalize(rows);
+  if (argc > 4) addStorage(database, day + 1, argv[3], argv + 4, argv + argc);
   sqlite3_close(database);
-  const int file = open(argv[3], O_WRONLY | O_CREAT | O_TRUNC, 0600);
-  const bool written = file >= 0 &&
-                       write(file, xml.data(), xml.size()) == static_cast<ssize_t>(xml.size()) &&
-                       fsync(file) == 0;
-  return written ? 0 : 1;
+  write(argv[3], xml);
+  return 0;
 }

@@ -1,6 +1,8 @@
 #include "platform/host/CounterStore.h"
 
+#include <array>
 #include <cmath>
+#include <vector>
 
 #include "platform/CivilDate.h"
 #include "platform/host/SQLite.h"
@@ -11,10 +13,6 @@ namespace {
 
 constexpr int kDaysKept = 60;
 constexpr std::size_t kMostSamplesInRow = 65536;
-
-// A client's failure that takes this long, and how long it is then spared.
-constexpr std::chrono::seconds kSlow(1);
-constexpr std::chrono::minutes kPause(1);
 
 void write(sqlite::Connection& connection, const CounterChange& change) {
   switch (change.kind) {
@@ -114,36 +112,31 @@ Date CounterStore::PLDateFromDaysSince1970(std::int32_t day) {
 }
 
 void CounterStore::PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(
-      {{.kind = CounterChange::Kind::set, .key = key, .day = PLDaysSince1970(), .amount = value}});
+  record(CounterChange::Kind::set, std::array{ScalarValue{key, value}});
 }
 
 void CounterStore::PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) {
-  record(
-      {{.kind = CounterChange::Kind::add, .key = key, .day = PLDaysSince1970(), .amount = value}});
+  record(CounterChange::Kind::add, std::array{ScalarValue{key, value}});
 }
 
 void CounterStore::PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) {
+  record(CounterChange::Kind::set, values);
+}
+
+void CounterStore::PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) {
+  record(CounterChange::Kind::add, values);
+}
+
+void CounterStore::record(CounterChange::Kind kind, std::span<const ScalarValue> values) {
+  if (values.empty()) return;
   const std::int32_t today = PLDaysSince1970();
   std::vector<CounterChange> changes;
   changes.reserve(values.size());
   for (const auto& [key, value] : values) {
-    changes.push_back(
-        {.kind = CounterChange::Kind::set, .key = key, .day = today, .amount = value});
-  }
-  if (!changes.empty()) record(changes);
-}
-
-void CounterStore::record(const std::vector<CounterChange>& changes) {
-  const auto start = std::chrono::steady_clock::now();
-  {
-    const std::scoped_lock lock(mutex_);
-    if (start < droppedUntil_) return;
+    changes.push_back({.kind = kind, .key = key, .day = today, .amount = value});
   }
   const std::string error = apply(changes);
   const std::scoped_lock lock(mutex_);
-  const auto end = std::chrono::steady_clock::now();
-  if (!error.empty() && end - start > kSlow) droppedUntil_ = end + kPause;
   if (!error.empty() && error != clientError_) {
     place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());
   }

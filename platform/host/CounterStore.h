@@ -1,10 +1,8 @@
 // The counters service and the history store: an SQLite database below the device root.
 #pragma once
 
-#include <chrono>
 #include <mutex>
 #include <span>
-#include <vector>
 
 #include "platform/Clock.h"
 #include "platform/CountersService.h"
@@ -41,12 +39,12 @@ class CounterStore : public CountersService, public HistoryStore {
   // write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
-  // Failures are logged, the same one once for as long as it lasts. After one that took its time
-  // (another program holds the database) values are dropped for a minute: a day has hundreds.
+  // Failures are logged, the same one once for as long as it lasts.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
   void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
-  // In one transaction: each of its own costs a dozen system calls.
+  // Several in one transaction: each of its own costs a dozen system calls.
   void PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) override;
+  void PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) override;
 
   // The history lives no longer than the store.
   std::unique_ptr<PLHistory> initWithDefaultPath() override { return history(); }
@@ -60,14 +58,13 @@ class CounterStore : public CountersService, public HistoryStore {
   std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
 
  private:
-  void record(const std::vector<CounterChange>& changes);
+  void record(CounterChange::Kind kind, std::span<const ScalarValue> values);
 
   CounterPlace place_;
   Clock& clock_;
-  std::mutex mutex_;  // over all that follows
+  std::mutex mutex_;  // over the two that follow
   CounterDatabase database_;
   std::string clientError_;
-  std::chrono::steady_clock::time_point droppedUntil_;
 };
 
 }  // namespace platform::host
