@@ -9,7 +9,7 @@ namespace NANDInfo {
 namespace {
 
 constexpr std::uint64_t kHeaderUnit = 8, kRecordSize = 20;
-constexpr std::size_t kListOffset = 12, kValueOffset = 16;
+constexpr std::size_t kUnreadSize = 12;  // of a record, before the list's index
 
 }  // namespace
 
@@ -19,14 +19,14 @@ std::optional<ValidityLists> parseValidityList(std::span<const std::byte> buffer
   const std::uint64_t headerUnits = header.read<std::uint32_t>().value_or(UINT32_MAX);
   ByteReader body(buffer);
   if (count == 0 || !body.take(headerUnits * kHeaderUnit)) return std::nullopt;
-  const auto records = body.take(count * kRecordSize);
-  if (!records) return std::nullopt;
+  if (body.rest().size() < count * kRecordSize) return std::nullopt;
 
   ValidityLists lists;
-  for (std::size_t at = 0; at < records->size(); at += kRecordSize) {
-    const auto list = std::to_integer<std::size_t>((*records)[at + kListOffset]);
-    if (list >= lists.size()) continue;
-    lists[list].emplace_back(std::to_integer<std::int32_t>((*records)[at + kValueOffset]));
+  for (std::uint64_t i = 0; i < count; ++i) {
+    body.take(kUnreadSize);
+    const auto list = body.read<std::uint32_t>();
+    const auto value = body.read<std::uint32_t>();
+    if (*list < lists.size()) lists[*list].emplace_back(static_cast<std::int32_t>(*value));
   }
   return lists;
 }

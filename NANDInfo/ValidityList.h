@@ -1,7 +1,8 @@
 // The flash validity list: how much of the flash still holds valid data, as sixteen short lists.
 //
 // Little-endian: the number of records and the place of the first one in units of 8 bytes, 32 bits
-// each; then records of 20 bytes, with the index of a list at byte 12 and a value for it at 16.
+// each; then records of five 32-bit words, the fourth of them the index of a list, the last a value
+// for it.
 #pragma once
 
 #include <array>

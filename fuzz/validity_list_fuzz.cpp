@@ -14,7 +14,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
     values += list.size();
     for (const auto& value : list) {
       const auto* number = value.as<platform::Number>();
-      if (number == nullptr || number->int64Value() < 0 || number->int64Value() > 255) std::abort();
+      if (number == nullptr || number->type() != platform::Number::Type::int32) std::abort();
     }
   }
   std::uint32_t claimed;

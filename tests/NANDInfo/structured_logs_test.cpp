@@ -94,8 +94,8 @@ TEST(WriteAmplification, IsHighAboveAThresholdBetween0And10) {
 }
 
 TEST(ValidityList, RecordsGoToTheirListsInOrder) {
-  const std::vector<std::pair<std::uint8_t, std::uint8_t>> records = {
-      {3, 10}, {16, 1}, {7, 255}, {3, 5}, {255, 2}, {0, 0}, {15, 9}};
+  const std::vector<std::pair<std::uint32_t, std::uint32_t>> records = {
+      {3, 10}, {16, 1}, {7, 70000}, {3, 5}, {0x103, 2}, {0, 0}, {15, 0xFFFFFFFF}};
   for (const std::uint32_t headerUnits : {1u, 2u, 100u}) {
     const Bytes bytes = support::validityList(headerUnits, records);
     const auto lists = parseValidityList(bytes);
@@ -103,8 +103,8 @@ TEST(ValidityList, RecordsGoToTheirListsInOrder) {
     ValidityLists expected;
     expected[0] = {0};
     expected[3] = {10, 5};
-    expected[7] = {255};
-    expected[15] = {9};
+    expected[7] = {70000};
+    expected[15] = {-1};
     EXPECT_EQ(*lists, expected);
     for (std::size_t size = 0; size < bytes.size(); ++size) {
       EXPECT_FALSE(

@@ -17,14 +17,14 @@ inline Bytes words32(const std::vector<std::uint32_t>& all) {
 
 // Records of list index and value behind a header of `headerUnits` times 8 bytes.
 inline Bytes validityList(std::uint32_t headerUnits,
-                          const std::vector<std::pair<std::uint8_t, std::uint8_t>>& records) {
+                          const std::vector<std::pair<std::uint32_t, std::uint32_t>>& records) {
   Bytes bytes = words32({static_cast<std::uint32_t>(records.size()), headerUnits});
   bytes.resize(8 * headerUnits, std::byte{0xEE});
   for (const auto& [list, value] : records) {
     // What isn't read is not 0.
     for (const std::uint32_t word : {~0u, ~0u, ~0u}) put(bytes, word, 4);
-    put(bytes, 0xABCDEF00u | list, 4);
-    put(bytes, 0x12345600u | value, 4);
+    put(bytes, list, 4);
+    put(bytes, value, 4);
   }
   return bytes;
 }
