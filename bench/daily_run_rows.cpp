@@ -80,7 +80,7 @@ void printSteps(const ReportDevice& device) {
       since = now;
     };
     {
-      support::HostOnRoot host(device.path());
+      support::HostOnRoot host(device.path(), platform::LogLevel::error);
       morvend::DeviceContext context(host.platform());
       lap(kNumber);
       for (std::size_t step = 0; step < kNumber; ++step) {

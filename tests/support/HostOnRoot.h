@@ -9,7 +9,9 @@
 namespace support {
 
 struct HostOnRoot : platform::host::Host {
-  explicit HostOnRoot(const std::filesystem::path& root) : Host({.root = root.string()}) {
+  explicit HostOnRoot(const std::filesystem::path& root,
+                      platform::LogLevel lowest = platform::LogLevel::standard)
+      : Host({.root = root.string(), .lowestLevel = lowest}) {
     keepCountersBelow([this] { return &home; });
   }
 
