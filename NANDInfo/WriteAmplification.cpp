@@ -30,9 +30,8 @@ WriteAmplification writeAmplificationOf(const LegacyNandInfoCxt& context) {
   }
   WriteAmplification result;
   // In 32 bits, as the controller itself has the size of a virtual block.
-  result.user =
-      ratio(context.bandErases, in4KiB(context.bytesPerPage * context.pagesPerVirtualBlock),
-            context.hostWrites);
+  const std::uint32_t blockSize = context.bytesPerPage * context.pagesPerVirtualBlock;
+  result.user = ratio(context.bandErases, in4KiB(blockSize), context.hostWrites);
   if (intermediateBlocks != 0 && intermediateErases != 0) {
     result.intermediate = ratio(intermediateErases, intermediateBlocks, context.hostWrites);
   }

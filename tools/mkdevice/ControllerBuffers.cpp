@@ -49,7 +49,7 @@ std::string bandStatistics(const Wear& wear) {
   BufferWriter writer;
   writer.word(kBands32);
   writer.word(kHeaderWords / 2);
-  writer.zeros(4 * (kHeaderWords - 2));
+  writer.zeros(std::size_t{4} * (kHeaderWords - 2));
   for (std::uint32_t band = 0; band < kBands32; ++band) {
     writer.word(band);
     writer.zeros(8);
@@ -119,7 +119,7 @@ std::string kernelSnapshot(const Wear& wear) {
   const struct {
     std::string_view name;
     std::uint64_t bytesAnHour;
-  } kThreads[] = {{"VM_pageout_scan", 0}, {"VM_swapout", 4096 * 4096}, {"VM_swapin", 0}};
+  } kThreads[] = {{"VM_pageout_scan", 0}, {"VM_swapout", 16 << 20}, {"VM_swapin", 0}};
   BufferWriter writer, time;
   time.number(wear.time * 1'000'000, 8);
   writer.chunk(kTime, 0, time.bytes());

@@ -55,7 +55,8 @@ Wear::Wear(const Sample& sample, int hoursAgo) : seed(sample.seed) {
   const double fastAmplification = 0.6 + 0.4 * random.fraction();
 
   formatTime = static_cast<std::uint64_t>(formatDay * platform::kSecondsPerDay);
-  time = static_cast<std::uint64_t>(sample.today * platform::kSecondsPerDay - hoursAgo * 3600);
+  time = static_cast<std::uint64_t>(sample.today * platform::kSecondsPerDay -
+                                    std::int64_t{hoursAgo} * 3600);
   hours = (time - formatTime) / 3600;
   magazineMeta = (time & 0xFFFFFFFF) << 24 | (hours & 0xFFFFFF);
   hostWrites = sinceFormat(writesPerDay);
