@@ -122,7 +122,7 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
 std::string playDay(const std::string& root, Sample sample, const SampleCounters& counters) {
   DeviceHost host(root, dailyRun(sample));
   morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
-  const std::string error = host.counters().apply(counters.ofDay(sample.today));
+  std::string error = host.counters().apply(counters.ofDay(sample.today));
   if (!error.empty()) return error;
   ++sample.today;
   return writeFiles(host, filesOfDay(sample));
