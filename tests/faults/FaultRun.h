@@ -8,6 +8,9 @@
 
 namespace faults {
 
+// Every kind, for tests that go through all of them.
+inline constexpr const char* kKinds[] = {"kill-before", "kill-after", "EIO", "ENOSPC", "short"};
+
 // The shim can't be loaded into a program that is built with a sanitizer; why, for GTEST_SKIP.
 bool available();
 inline constexpr char kUnavailable[] = "a sanitizer's run-time library must be the first to load";
