@@ -28,7 +28,7 @@ cat >"$work/root/device/properties.plist" <<'EOF'
 EOF
 
 with_cmake() {
-  cmake -S "$here" -B "$work/$1" -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_PREFIX_PATH="$prefix" \
+  cmake -G Ninja -S "$here" -B "$work/$1" -DCMAKE_CXX_COMPILER="$cxx" -DCMAKE_PREFIX_PATH="$prefix" \
     -DNANDInfo_USE_STATIC_LIBS="$2" >/dev/null
   cmake --build "$work/$1" >/dev/null
 }
