@@ -114,7 +114,7 @@ bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error
   if (folder_) return true;
   // EBADF: there is no device root.
   if (!creates && (errno == ENOENT || errno == EBADF)) return false;
-  error = folderPath_ + ": " + std::strerror(errno);
+  error = folderPath_ + ": " + errorText(errno);
   return false;
 }
 

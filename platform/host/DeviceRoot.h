@@ -1,16 +1,18 @@
 // The device root: the directory that stands for a device's file system.
 //
 // Every path of the device is resolved below it, ".." and links included, so that nothing outside
-// is read or written. Paths are device paths, with or without a leading slash. Nothing here logs:
-// failures come back as error numbers, for the service that knows what they mean to its user.
+// is read or written: by the kernel where it offers that (openat2), else part by part. Links within
+// the root are followed to what is read, and refused on the way to what is written. Paths are
+// device paths, with or without a leading slash. Nothing here logs: failures come back as error
+// numbers, for the service that knows what they mean to its user.
 #pragma once
 
-#include <cstdint>
 #include <string>
 #include <string_view>
 
 #include "platform/Result.h"
 #include "platform/host/FileDescriptor.h"
+#include "platform/host/PathWalk.h"
 
 namespace platform::host {
 
@@ -37,12 +39,12 @@ class DeviceRoot {
   // within the root, as a system's own links from one of its folders to another do. On failure as
   // openForReading.
   enum class Missing { fails, create };
-  enum class Links { refused, followed };
+  using Links = platform::host::Links;
   FileDescriptor openFolder(std::string_view path, Missing missing,
                             Links links = Links::refused) const;
 
  private:
-  FileDescriptor open(const std::string& path, int flags, std::uint64_t resolve) const;
+  FileDescriptor open(const std::string& path, int flags, Links links) const;
 
   std::string path_;
   FileDescriptor root_;

@@ -1,5 +1,8 @@
 #include "platform/host/EventSink.h"
 
+#include <fcntl.h>
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <system_error>
 
@@ -110,8 +113,7 @@ void EventSink::write(const std::vector<Event>& events) {
         Dictionary{{"event", event.name}, {"time", event.time}, {"payload", event.producer()}});
     lines += '\n';
     if (lines.size() < kBatch && &event != &events.back()) continue;
-    const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
-    const int error = folder ? appendLines(folder.get(), kName, lines) : errno;
+    const int error = append(lines);
     if (error != 0 && !failed_) {
       log_.log(LogLevel::error, "Could not write %s/%s: %s; events are dropped", kFolder, kName,
                errorText(error));
@@ -119,6 +121,32 @@ void EventSink::write(const std::vector<Event>& events) {
     }
     lines.clear();
   }
+}
+
+// Both: 0 or an error number.
+int EventSink::append(const std::string& lines) {
+  const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
+  if (!folder) return errno;
+  const FileLock lock(folder.get());  // another process may roll the file over, too
+  const int error = makeRoom(folder.get(), lines.size());
+  return error == 0 ? appendLines(folder.get(), kName, lines) : error;
+}
+
+int EventSink::makeRoom(int folder, std::uint64_t bytes) {
+  struct stat status;
+  if (::fstatat(folder, kName, &status, AT_SYMLINK_NOFOLLOW) != 0) {
+    return errno == ENOENT ? 0 : errno;
+  }
+  // What is not a file of ours is refused by the append.
+  const auto size = static_cast<std::uint64_t>(status.st_size);
+  if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaximumFile) return 0;
+  std::string gone;
+  const int error = rollOver(folder, kName, kKept, gone);
+  if (error == 0 && !gone.empty()) {
+    log_.log(LogLevel::standard, "Dropped the events of %s/%s: there are newer ones", kFolder,
+             gone.c_str());
+  }
+  return error;
 }
 
 }  // namespace platform::host

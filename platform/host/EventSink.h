@@ -1,4 +1,6 @@
-// The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl.
+// The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl. A file that
+// would grow beyond kMaximumFile becomes events.jsonl.1 first, that .2, and so on; of more than
+// kKept the oldest is removed, with a line in the log.
 //
 // device/analytics.plist says which events are used ("UsedEvents", an array of names; missing: all)
 // and whether the device has the lazy-send operation ("Available"; default true). It is read when
@@ -6,6 +8,7 @@
 #pragma once
 
 #include <condition_variable>
+#include <cstdint>
 #include <functional>
 #include <mutex>
 #include <optional>
@@ -26,6 +29,9 @@ class EventSink final : public Eventra {
  public:
   // Events beyond this number of waiting ones aren't queued.
   static constexpr std::size_t kMaximumQueued = 65536;
+
+  static constexpr std::uint64_t kMaximumFile = std::uint64_t{16} << 20;
+  static constexpr int kKept = 4;
 
   // All are borrowed; the clock is asked on the sender's thread, the log used on both.
   EventSink(const DeviceRoot& root, PropertyListCodec& codec, Clock& clock, SystemLog& log)
@@ -63,6 +69,8 @@ class EventSink final : public Eventra {
   bool isServing();
   void serve();
   void write(const std::vector<Event>& events);
+  int append(const std::string& lines);
+  int makeRoom(int folder, std::uint64_t bytes);
 
   const DeviceRoot& root_;
   PropertyListCodec& codec_;

@@ -44,6 +44,7 @@ off_t sizeOfWholeLines(int file, off_t size) {
 }  // namespace
 
 const char* errorText(int error) {
+  if (error == ELOOP) return "too many links, or one where none is followed";
   return error == EINVAL ? "not a regular file" : std::strerror(error);
 }
 
@@ -130,6 +131,34 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes) {
 int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to) {
   return ::renameat2(fromFolder, from.c_str(), toFolder, to.c_str(), RENAME_NOREPLACE) == 0 ? 0
                                                                                             : errno;
+}
+
+bool isLink(int folder, const std::string& name) {
+  struct stat status;
+  return ::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 &&
+         S_ISLNK(status.st_mode);
+}
+
+int rollOver(int folder, const std::string& name, int oldest, std::string& at) {
+  const auto numbered = [&name](int number) {
+    return number == 0 ? name : name + "." + std::to_string(number);
+  };
+  int free = 0;
+  for (; free <= oldest; ++free) {
+    at = numbered(free);
+    struct stat status;
+    if (::fstatat(folder, at.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
+      if (errno != ENOENT) return errno;
+      break;
+    }
+      if (!S_ISREG(status.st_mode)) return EINVAL;
+  }
+  for (int number = std::min(free, oldest) - 1; number >= 0; --number) {
+    at = numbered(number);
+    if (::renameat(folder, at.c_str(), folder, numbered(number + 1).c_str()) != 0) return errno;
+  }
+  at = free > oldest ? numbered(oldest) : "";
+  return 0;
 }
 
 int appendLines(int folder, const std::string& name, std::string_view lines) {

@@ -15,8 +15,8 @@
 
 namespace platform::host {
 
-// What an error number of these functions says: "not a regular file" for EINVAL, else the system's
-// text.
+// What an error number of these functions says: "not a regular file" for EINVAL, for ELOOP that links
+// are in the way, else the system's text.
 const char* errorText(int error);
 
 // The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
@@ -47,6 +47,15 @@ int replaceFile(int folder, const std::string& name, std::string_view bytes);
 // Renames a file, within a folder or from one to another; EEXIST when the new name is taken, by
 // whatever it is.
 int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to);
+
+// Whether a name in an open folder is a link.
+bool isLink(int folder, const std::string& name);
+
+// Renames a file to <name>.1, that to <name>.2, and so on up to the first number that is free;
+// where none is, the content of the one with the number `oldest` goes. A kill leaves at most a free
+// number. 0 or an error number; `at` then names the file that the error is about, or the one whose
+// content went, and is empty when nothing did.
+int rollOver(int folder, const std::string& name, int oldest, std::string& at);
 
 // Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
 // file when it is missing. A line is in the file whole or not at all: what a failed write left is

@@ -1,7 +1,7 @@
 #include "platform/host/HostKernel.h"
 
-#include <dirent.h>
 #include <fcntl.h>
+#include <sys/stat.h>
 #include <sys/sysinfo.h>
 #include <unistd.h>
 
@@ -20,6 +20,7 @@ namespace platform::host {
 namespace {
 
 constexpr char kEventsFolder[] = "device/ecc-events";
+constexpr char kRejected[] = "rejected";
 constexpr std::size_t kSwapUsageSize = 32;
 
 Kernel::ReadResult failure(int error) { return {error, 0}; }
@@ -70,20 +71,17 @@ Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
   return deliver(record.data(), buffer.size() < record.size() ? 8 : record.size(), buffer);
 }
 
-std::vector<std::string> sortedNames(int folder) {
-  std::vector<std::string> names;
-  const int again = ::openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  DIR* stream = again < 0 ? nullptr : ::fdopendir(again);
-  if (stream == nullptr) {
-    if (again >= 0) ::close(again);
-    return names;
+// Moves a file of the folder to its rejected ones, under a name that is free. 0 or an error number.
+int reject(int folder, const std::string& name) {
+  if (::mkdirat(folder, kRejected, 0700) != 0 && errno != EEXIST) return errno;
+  const FileDescriptor rejected(
+      ::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!rejected) return errno;
+  for (int number = 1;; ++number) {
+    const std::string to = number == 1 ? name : name + "-" + std::to_string(number);
+    const int error = renameToFreeName(folder, name, rejected.get(), to);
+    if (error != EEXIST) return error;
   }
-  while (const dirent* entry = ::readdir(stream)) {
-    if (entry->d_name[0] != '.') names.emplace_back(entry->d_name);
-  }
-  ::closedir(stream);
-  std::sort(names.begin(), names.end());
-  return names;
 }
 
 }  // namespace
@@ -104,22 +102,36 @@ const Value* HostKernel::deviceValue(std::string_view name) {
 }
 
 std::optional<Kernel::ReadResult> HostKernel::nextEvent(std::span<std::byte> buffer) {
+  // Events are taken away, so the folder is one that is written to.
   const FileDescriptor folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
-  if (!folder) return std::nullopt;
-  for (const std::string& name : sortedNames(folder.get())) {
-    const FileDescriptor file(::openat(folder.get(), name.c_str(),
-                                       O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  const auto say = [this](const std::string& name, const std::string& what) {
+    log_.log(LogLevel::error, "%s%s%s: %s", kEventsFolder, name.empty() ? "" : "/",
+             shownText(name).c_str(), what.c_str());
+  };
+  if (!folder) {
+    if (errno != ENOENT) say("", errorText(errno));
+    return std::nullopt;
+  }
+  std::vector<std::string> names;
+  if (const int error = namesInFolder(folder.get(), names)) say("", errorText(error));
+  for (const std::string& name : names) {
+    if (name == kRejected) continue;
+    const FileDescriptor file = root_.openForReading(kEventsFolder + ("/" + name));
     const auto bytes = file ? readRegularFile(file.get(), buffer.size() + 1)
-                            : Result<std::string>::failure(std::strerror(errno));
+                            : Result<std::string>::failure(errorText(errno));
     if (!bytes) {
-      log_.log(LogLevel::error, "%s/%s: %s", kEventsFolder, name.c_str(), bytes.error.c_str());
+      say(name, bytes.error);
       continue;
     }
-    if (bytes->size() > buffer.size()) return failure(ENOMEM);
+    if (bytes->size() > buffer.size()) {
+      say(name, "longer than an event; moved to rejected/");
+      if (const int error = reject(folder.get(), name)) say(name, errorText(error));
+      continue;
+    }
     // Removed first: an event that stays would be delivered again and again.
     if (::unlinkat(folder.get(), name.c_str(), 0) != 0) {
       const int error = errno;
-      log_.log(LogLevel::error, "%s/%s: %s", kEventsFolder, name.c_str(), std::strerror(error));
+      say(name, errorText(error));
       return failure(error);
     }
     return deliver(bytes->data(), bytes->size(), buffer);

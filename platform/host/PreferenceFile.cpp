@@ -38,15 +38,7 @@ PreferenceFile::PreferenceFile(const DeviceRoot& root, PropertyListCodec& codec,
 std::optional<Value> PreferenceFile::value(std::string_view key) {
   if (const Value* value = set_.find(key)) return *value;
   if (removed_.contains(key)) return std::nullopt;
-  const FileDescriptor folder = root_.openFolder(folder_, DeviceRoot::Missing::fails);
-  if (folder) {
-    load(folder.get(), false);
-  } else if (errno == ENOENT) {
-    state_ = State::absent;
-    stored_ = {};
-  } else {
-    fail(State::unreadable, errorText(errno));
-  }
+  load(false);
   const Value* value = stored_.find(key);
   return value != nullptr ? std::optional(*value) : std::nullopt;
 }
@@ -74,9 +66,11 @@ void PreferenceFile::add(std::string_view key, std::int64_t delta) {
 
 // Reading
 
-void PreferenceFile::load(int folder, bool evenIfUnchanged) {
+void PreferenceFile::load(bool evenIfUnchanged) {
+  const FileDescriptor file = root_.openForReading(folder_ + "/" + name_);
   struct stat status;
-  if (::fstatat(folder, name_.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
+  if (!file || ::fstat(file.get(), &status) != 0) {
+    if (errno == ENXIO) return fail(State::broken, errorText(EINVAL));  // a socket
     if (errno != ENOENT) return fail(State::unreadable, errorText(errno));
     state_ = State::absent;
     stored_ = {};
@@ -88,10 +82,6 @@ void PreferenceFile::load(int folder, bool evenIfUnchanged) {
   if (!known) readError_.clear();
   status_ = status;
   if (!S_ISREG(status.st_mode)) return fail(State::broken, errorText(EINVAL));
-  const FileDescriptor file(
-      ::openat(folder, name_.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
-  // The file that is read may be a newer one.
-  if (!file || ::fstat(file.get(), &status_) != 0) return fail(State::unreadable, errorText(errno));
   if (static_cast<std::size_t>(status_.st_size) > kMaximumPropertyListSize) {
     return fail(State::broken, "larger than 16 MiB");
   }
@@ -136,8 +126,9 @@ std::string PreferenceFile::merge(const Edit& edit) {
       root_.openFolder(folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
   if (!folder) return errno == ENOENT && !adds ? "" : errorText(errno);
   const FileLock lock(folder.get());
+  if (isLink(folder.get(), name_)) return errorText(EINVAL);
   // Another process's writing may leave all that is compared as it was.
-  load(folder.get(), true);
+  load(true);
   if (state_ == State::unreadable) return readError_;
 
   Dictionary merged = stored_;

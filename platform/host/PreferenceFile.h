@@ -4,8 +4,9 @@
 // Reads see what other processes have written, and this process's changes before they are. Writing
 // merges under a lock on the user's folder: the file is read again and only the changed keys are
 // replaced. A file that can't be understood reads as empty and is kept as <domain>.plist.corrupt
-// before it is replaced. Failures are logged here: a state of the file, or a reason why it can't be
-// written, once for as long as it lasts. Not thread-safe.
+// before it is replaced. Links within the root are followed to what is read and refused where the
+// file would be replaced. Failures are logged here: a state of the file, or a reason why it can't
+// be written, once for as long as it lasts. Not thread-safe.
 #pragma once
 
 #include <sys/stat.h>
@@ -46,7 +47,7 @@ class PreferenceFile {
   enum class State { absent, whole, broken, unreadable };
   using Edit = std::function<void(Dictionary& values)>;
 
-  void load(int folder, bool evenIfUnchanged);
+  void load(bool evenIfUnchanged);
   void fail(State state, const std::string& why);
   void write(const Edit& edit);
   std::string merge(const Edit& edit);

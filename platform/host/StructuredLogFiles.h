@@ -19,8 +19,9 @@ class StructuredLogFiles final : public FaultwatchSupport {
   // A log that can't be written is dropped, with an error line.
   void logStructuredData(std::int32_t type, const Dictionary& data) override;
 
-  // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl. What
-  // isn't a regular file, or larger than the spool, stays where it is, with an error line.
+  // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl; one
+  // above 16 MiB in parts, with a line in the log. What isn't a regular file stays where it is,
+  // with an error line.
   void dumpAllOldStructuredDataLogs() override;
 
   std::string newIncidentIdentifier() override { return randomUUID(); }

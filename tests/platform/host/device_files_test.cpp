@@ -132,23 +132,31 @@ TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
              Dictionary{{"kern.next_ecc_event", Dictionary{{"Error", std::int64_t{EBUSY}}}}});
   folder.write("device/ecc-events/2", "two");
   folder.write("device/ecc-events/10", "ten");
-  folder.write("device/ecc-events/3", std::string(73, '3'));
-  folder.write("outside", "outside");
-  std::filesystem::create_symlink("../../outside", folder / "device/ecc-events/1-link");
+  folder.write("device/ecc-events/.1", "dot");
+  folder.write("device/ecc-events/1-long", std::string(73, '3'));
+  folder.write("device/ecc-events/rejected/1-long", "taken");
+  folder.write("linked", "linked");
+  std::filesystem::create_symlink("../../linked", folder / "device/ecc-events/1-within");
+  std::filesystem::create_symlink(folder.path() / "linked", folder / "device/ecc-events/1-out");
   std::filesystem::create_directories(folder / "device/ecc-events/1-folder");
   HostKernel kernel(root, codec, log);
   std::string buffer(72, '\0');
   const auto read = [&] {
     return kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
   };
-  for (const std::string_view expected : {"ten", "two"}) {
+  for (const std::string_view expected : {"dot", "linked", "ten", "two"}) {
     EXPECT_EQ(read().length, expected.size());
     EXPECT_TRUE(buffer.starts_with(expected)) << expected;
   }
-  EXPECT_EQ(read().error, ENOMEM);
-  std::filesystem::remove(folder / "device/ecc-events/3");
   EXPECT_EQ(read().error, EBUSY);
-  EXPECT_EQ(folder.read("outside"), "outside");
+  EXPECT_EQ(folder.read("linked"), "linked");
+  EXPECT_EQ(folder.read("device/ecc-events/rejected/1-long-2").size(), 73u);
+  EXPECT_EQ(log.count("error: device/ecc-events/1-long: longer than an event"), 1);
+  EXPECT_EQ(log.count("error: device/ecc-events/1-out: No such file"), 4);
+  std::filesystem::rename(folder / "device/ecc-events", folder / "device/elsewhere");
+  std::filesystem::create_symlink("elsewhere", folder / "device/ecc-events");
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(log.count("error: device/ecc-events: too many links"), 1);
 }
 
 TEST_F(DeviceFiles, DevicePropertiesAndContainers) {

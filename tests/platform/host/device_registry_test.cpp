@@ -223,7 +223,7 @@ TEST_F(Registry, ABufferFileThatCantBeReadIsSaidOnce) {
   } rows[] = {{50, "error: device/missing.bin: No such file"},
               {51, "error: device/../outside: not below device/"},
               {52, "error: device/controller: not a regular file"},
-              {53, "error: device/loop: Too many levels"},
+              {53, "error: device/loop: too many links"},
               {54, "error: device/: not a regular file"},
               {55, "error: device/absolute: No such file"}};
   for (const auto& [opType, line] : rows) {

@@ -42,6 +42,26 @@ TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
   EXPECT_EQ(lines(), 3);
 }
 
+TEST_F(EventSinkTest, AFullFileMakesRoomAndTheOldestOfFourIsDropped) {
+  const auto send = [this] {
+    sink.EventraSendEventLazy("event", nothing);
+    sink.drain();
+  };
+  const std::string name = kEvents;
+  for (int round = 0; round < 6; ++round) {
+    folder.write(kEvents, std::string(EventSink::kMaximumFile - 1, 'x') + '\n');
+    send();
+    send();
+    EXPECT_EQ(lines(), 2) << round;
+    for (int number = 1; number <= 5; ++number) {
+      EXPECT_EQ(std::filesystem::exists(folder / (name + "." + std::to_string(number))),
+                number <= std::min(round + 1, EventSink::kKept));
+    }
+  }
+  EXPECT_EQ(log.count("default: Dropped the events of /var/spool/morvend/events.jsonl.4"), 2);
+  EXPECT_EQ(log.lines().size(), 2u);
+}
+
 TEST_F(EventSinkTest, OnlyUsedEventsAreProduced) {
   folder.write("device/analytics.plist", xml({{"UsedEvents", Array{"used", 7}}}));
   const auto never = [] {

@@ -147,18 +147,35 @@ TEST_F(PreferenceFilesTest, WhatIsNoPreferenceFileIsPutAside) {
     EXPECT_EQ(log.lines().size(), 1u);
     std::filesystem::remove_all(folder / "var/preferences");
   };
-  for (const support::Kind kind : support::kOtherKinds) {
+  for (const support::Kind kind : {support::Kind::fifo, support::Kind::folder}) {
     support::put(kind, folder / kFile, folder / "target");
     check("not a regular file");
-    EXPECT_TRUE(kind == support::Kind::link ? folder.read("target") == "precious"
-                                            : !std::filesystem::exists(folder / "target"));
-    std::filesystem::remove(folder / "target");
   }
   folder.write(kFile, *codec.writeXML(Array{1}));
   check("the top level is not a dictionary");
   folder.write(kFile, xml({{"key", 1}}));
   std::filesystem::resize_file(folder / kFile, kMaximumPropertyListSize + 1);
   check("larger than 16 MiB");
+}
+
+TEST_F(PreferenceFilesTest, LinksAreFollowedToWhatIsReadAndRefusedWhereItIsWritten) {
+  for (const std::string link : {kFile, "var/preferences/mobile", "var/preferences", "var"}) {
+    log.clear();
+    folder.write(kFile, xml({{"key", 1}}));
+    std::filesystem::rename(folder / link, folder / "elsewhere");
+    const auto parent = (folder / link).parent_path();
+    std::filesystem::create_symlink(std::filesystem::relative(folder / "elsewhere", parent),
+                                    folder / link);
+    PreferenceFiles files(root, codec, log);
+    EXPECT_EQ(files.QNSPreferencesGetIntegerValue("key", kDomain), 1) << link;
+    set(files, "new", 1);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(folder.read(kFile), xml({{"key", 1}})) << link;
+    EXPECT_EQ(log.count("error: Could not write /var/preferences/mobile/com.example.plist: "), 1);
+    EXPECT_EQ(log.lines().size(), 1u);
+    std::filesystem::remove(folder / link);
+    std::filesystem::remove_all(folder / "elsewhere");
+  }
 }
 
 TEST_F(PreferenceFilesTest, AFailedWriteIsSaidOnceStaysVisibleAndIsTriedAgain) {

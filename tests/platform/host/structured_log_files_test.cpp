@@ -50,7 +50,7 @@ TEST_F(StructuredLogFilesTest, EarlierDaysGoToTheSpoolAndNothingElseDoes) {
   EXPECT_TRUE(log.lines().empty());
 }
 
-TEST_F(StructuredLogFilesTest, WhatIsNoFileOrTooLargeForTheSpoolStays) {
+TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
   const auto at = folder.path() / kStructured / "2026-11-20.jsonl", target = folder / "target";
   for (const support::Kind kind : support::kOtherKinds) {
     support::put(kind, at, target);
@@ -61,12 +61,20 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileOrTooLargeForTheSpoolStays) {
     std::filesystem::remove(target);
     log.clear();
   }
+  // Lines of which one is in the way of every cut, the second longer than a part.
+  const std::string lines = std::string((15 << 20), 'a') + '\n' + std::string((18 << 20), 'b') +
+                            '\n' + std::string((9 << 20), 'c') + '\n' + std::string(99, 'd');
   folder.write(kSubmitted + std::string("kept"), "kept");
-  folder.write(kStructured + std::string("2026-11-20.jsonl"), "");
-  std::filesystem::resize_file(at, (64 << 20) + 1);
+  folder.write(kStructured + std::string("2026-11-20.jsonl"), lines);
   logs.dumpAllOldStructuredDataLogs();
-  EXPECT_EQ(log.count("error: "), 1);
-  EXPECT_TRUE(std::filesystem::exists(at));
+  std::string whole;
+  for (const char* part : {"", "-4", "-3", "-2"}) {
+    const std::string text = submitted("structured-2026-11-20" + std::string(part) + ".jsonl");
+    EXPECT_LE(text.size(), std::size_t{16} << 20);
+    whole.insert(0, text);
+  }
+  EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-20.jsonl has"), 1);
+  EXPECT_EQ(log.lines().size(), 1u);
   EXPECT_EQ(submitted("kept"), "kept");
 }
 
