@@ -3,6 +3,8 @@
 #include <cstdarg>
 #include <cstdio>
 
+#include "NANDInfo/ProcessState.h"
+
 namespace NANDInfo {
 
 namespace {

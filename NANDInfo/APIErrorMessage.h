@@ -12,7 +12,4 @@ void SetAPIErrorMessage(const char* format, ...) __attribute__((format(printf, 1
 // The recorded message, or "NA". It stays as it is for the rest of the process's life.
 const char* GetAPIErrorMessage();
 
-// Forgets the message: the state of a process that has just begun.
-void ResetAPIErrorMessage();
-
 }  // namespace NANDInfo

@@ -127,8 +127,10 @@ bool openZMCConnection(Platform& platform, zmc_connection_t& connection) {
 void closeZMCConnection(Platform& platform, zmc_connection_t& connection) {
   if (const auto open = std::exchange(connection.connection, 0)) {
     platform.drivers.DrvServiceClose(open);
-    // The record shall not keep a handle that is gone.
-    if (connection.exporter != nullptr) connection.exporter->io_connection = 0;
+    // The record shall not keep a handle that is gone; one that it got since is not ours.
+    if (connection.exporter != nullptr && connection.exporter->io_connection == open) {
+      connection.exporter->io_connection = 0;
+    }
   }
   if (const auto service = std::exchange(connection.service, 0)) platform.registry.release(service);
 }

@@ -60,9 +60,6 @@ struct nand_exporter_t {
 inline constexpr std::size_t kExporters = 3;
 extern nand_exporter_t nand_exporters_tunnel[kExporters + 1];
 
-// Sets the table to what it is when the process begins.
-void ResetExporters();
-
 using Buffer = std::vector<std::byte>;
 
 // A driver that announces more than this is treated as if the memory were refused.

@@ -19,6 +19,13 @@ inline std::optional<std::int32_t> signed32(const platform::Dictionary& counters
   return static_cast<std::int32_t>(static_cast<std::uint32_t>(number->uint64Value()));
 }
 
+// The counter as a signed number; none when the dictionary doesn't have it.
+inline std::optional<std::int64_t> signed64(const platform::Dictionary& counters,
+                                            std::string_view name) {
+  const platform::Number* number = counters.number(name);
+  return number != nullptr ? std::optional(number->int64Value()) : std::nullopt;
+}
+
 // The name of an array's element.
 inline std::string indexed(std::string_view name, std::uint64_t index) {
   std::string text(name);

@@ -4,6 +4,7 @@
 #include <iterator>
 
 #include "NANDInfo/Controller.h"
+#include "NANDInfo/ProcessState.h"
 
 namespace NANDInfo {
 

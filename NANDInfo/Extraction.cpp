@@ -46,12 +46,13 @@ const ExtractionStep kEV_Extraction_Step_Names[] = {
     {"FTL counters", nullptr},
 };
 
-std::optional<Dictionary> NandInfoExtractToEV_runAllSteps(Platform& platform, bool allowsMonthly,
-                                                          bool wantsSummary,
-                                                          std::uint32_t firstStep) {
+std::optional<Dictionary> NandInfoExtractToEV_runAllSteps(Platform& platform,
+                                                          const platform::Value* /*context*/,
+                                                          std::uint32_t flags, bool wantsSummary,
+                                                          std::uint64_t firstStep) {
   Dictionary summary;
-  for (std::uint32_t step = firstStep; step < kLastStep; ++step) {
-    if (step == kMonthlyStep && !allowsMonthly) {
+  for (auto step = static_cast<std::uint32_t>(firstStep); step < kLastStep; ++step) {
+    if (step == kMonthlyStep && (flags & kAllowsMonthly) == 0) {
       platform.log.log(LogLevel::standard, "Skipping Stats Mag Monthly Delta");
       break;
     }

@@ -25,13 +25,18 @@ struct ExtractionStep {
 inline constexpr std::size_t kExtractionSteps = 8;
 extern const ExtractionStep kEV_Extraction_Step_Names[kExtractionSteps];
 
-// Runs the steps from the first one (below 7) on; the monthly one, which is the last, only when it
-// is allowed. The summary, if wanted, is what the steps sent (of equal keys the later), with the
-// error message of the process under "com.norba.NANDInfo.ErrorMessage".
+// A flag of NandInfoExtractToEV_runAllSteps: the monthly step may run.
+inline constexpr std::uint32_t kAllowsMonthly = 1;
+
+// Runs the steps from the first one (the low 32 bits; below 7) on; the monthly one, which is the
+// last, only when the flags allow it. `context` is not consulted. The summary, if wanted, is what
+// the steps sent (of equal keys the later), with the error message of the process under
+// "com.norba.NANDInfo.ErrorMessage".
 std::optional<platform::Dictionary> NandInfoExtractToEV_runAllSteps(platform::Platform& platform,
-                                                                    bool allowsMonthly,
+                                                                    const platform::Value* context,
+                                                                    std::uint32_t flags,
                                                                     bool wantsSummary,
-                                                                    std::uint32_t firstStep);
+                                                                    std::uint64_t firstStep);
 
 // Runs one step; none when there is no such step. Without a lazy send on this device, or without
 // anything to send, the result holds an error message.

@@ -39,8 +39,7 @@ std::int64_t maxPercentUsed(const Dictionary& ftl) {
 std::int64_t maxE2EErrors(const Dictionary& ftl) {
   std::int64_t most = 0;
   for (std::uint64_t i = 0; i < 12; ++i) {
-    const auto* errors = ftl.number(indexed("E2EDPErrorCounters_", i));
-    if (errors != nullptr) most = std::max(most, errors->int64Value());
+    most = std::max(most, signed64(ftl, indexed("E2EDPErrorCounters_", i)).value_or(0));
   }
   return most;
 }
@@ -48,13 +47,9 @@ std::int64_t maxE2EErrors(const Dictionary& ftl) {
 std::int64_t hostReadErrors(const Dictionary& ftl) {
   const auto* isQRT1 = ftl.number(kNANDInfoIsQRT1Controller);
   if (isQRT1 == nullptr) return 0;
-  const char* const name = isQRT1->boolValue() ? "ueccReads" : "raidSmartErrors";
-  return std::max(signed32(ftl, name).value_or(0), 0);
-}
-
-std::int64_t valueOrNone(const Dictionary& ftl, const char* name) {
-  const auto* number = ftl.number(name);
-  return number != nullptr ? number->int64Value() : -1;
+  const std::int64_t errors = isQRT1->boolValue() ? signed32(ftl, "ueccReads").value_or(0)
+                                                  : signed64(ftl, "raidSmartErrors").value_or(0);
+  return std::max<std::int64_t>(errors, 0);
 }
 
 // The figures that a consumer gets; empty when there are none.
@@ -81,12 +76,13 @@ Dictionary gatherNANDHealthInfo(Platform& platform) {
     SetAPIErrorMessage("gatherNANDHealthInfo: Unable to get FTL fields");
     return {};
   }
-  return {{kNANDHealthInfoMaxPercentUsed, maxPercentUsed(*ftl)},
-          {kNANDHealthInfoMaxE2EErrors, maxE2EErrors(*ftl)},
-          {kNANDHealthInfoHostReadErrors, hostReadErrors(*ftl)},
-          {kNANDHealthInfoNumGrownBadBlocks, valueOrNone(*ftl, "numGrownBad")},
-          {kNANDHealthInfoSpareAvailablePercent, valueOrNone(*ftl, "spareAvailablePercent")},
-          {kNANDHealthInfoNumDieFailures, valueOrNone(*ftl, "numDieFailures")}};
+  return {
+      {kNANDHealthInfoMaxPercentUsed, maxPercentUsed(*ftl)},
+      {kNANDHealthInfoMaxE2EErrors, maxE2EErrors(*ftl)},
+      {kNANDHealthInfoHostReadErrors, hostReadErrors(*ftl)},
+      {kNANDHealthInfoNumGrownBadBlocks, signed64(*ftl, "numGrownBad").value_or(-1)},
+      {kNANDHealthInfoSpareAvailablePercent, signed64(*ftl, "spareAvailablePercent").value_or(-1)},
+      {kNANDHealthInfoNumDieFailures, signed64(*ftl, "numDieFailures").value_or(-1)}};
 }
 
 Dictionary CopyServitaNANDInfo(Platform& platform) {

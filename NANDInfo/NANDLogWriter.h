@@ -5,13 +5,14 @@
 #include <string>
 #include <string_view>
 
+#include "platform/Exported.h"
 #include "platform/PropertyList.h"
 
 namespace platform {
 struct Platform;
 }
 
-namespace NANDInfo {
+namespace MORVEND_EXPORTED NANDInfo {
 
 // Submits the values as the log "StorageStatus" of the given type, and notes the time as
 // "SSLastLoggedAt" in the process's preferences, however the submission went. Within seven days of

@@ -29,14 +29,15 @@ struct Item {
   Bytes payload;
 };
 
-// The next item; none at the end of the buffer, or when the item runs over it.
+// The next item; none, with the reader where it is, when it runs over the end of the buffer.
 std::optional<Item> nextItem(ByteReader& reader) {
-  const auto type = reader.read<std::uint32_t>();
-  const auto size = reader.read<std::uint32_t>();
-  const auto flags = reader.read<std::uint64_t>();
-  if (!flags || *type == kEndOfBuffer) return std::nullopt;
-  const auto payload = reader.take(*size);
+  ByteReader ahead = reader;
+  const auto type = ahead.read<std::uint32_t>();
+  const auto size = ahead.read<std::uint32_t>();
+  const auto flags = ahead.read<std::uint64_t>();
+  const auto payload = flags ? ahead.take(*size) : std::nullopt;
   if (!payload) return std::nullopt;
+  reader = ahead;
   return Item{*type, *flags, *payload};
 }
 
@@ -61,29 +62,42 @@ struct Container {
 
 }  // namespace
 
-std::optional<Bytes> getIOStatsWithThreadnameFromKCData(Bytes snapshot,
-                                                        std::string_view threadName) {
+std::optional<Bytes> getIOStatsWithThreadnameFromKCDataHelper(Bytes snapshot,
+                                                              std::string_view threadName,
+                                                              KCDataPosition& stopped) {
+  stopped = {0, snapshot.size()};
+  if (threadName.data() == nullptr) return std::nullopt;
   ByteReader reader(snapshot);
   std::vector<Container> open;  // a stack of our own: how deep they nest is up to the input
-  while (const auto item = nextItem(reader)) {
-    if (item->type == kContainerBegin && item->payload.size() >= kSmallestContainerPayload) {
+  for (;;) {
+    stopped.item = snapshot.size() - reader.rest().size();
+    const auto item = nextItem(reader);
+    const bool begins =
+        item && item->type == kContainerBegin && item->payload.size() >= kSmallestContainerPayload;
+    const bool ends =
+        !item || item->type == kEndOfBuffer ||
+        (item->type == kContainerEnd && !open.empty() && item->flags == open.back().identifier);
+    if (begins) {
       open.push_back({item->flags, std::nullopt, {}});
-    } else if (open.empty()) {
-      continue;
-    } else if (item->type == kContainerEnd && item->flags == open.back().identifier) {
+    } else if (ends) {
+      if (open.empty()) return std::nullopt;
       if (open.back().isOfThread(threadName)) return open.back().statistics;
       open.pop_back();
       if (open.empty()) return std::nullopt;
+    } else if (open.empty()) {
+      continue;
     } else if (item->type == kThreadName) {
       open.back().threadName = item->payload;
     } else if (item->type == kIOStatistics) {
       open.back().statistics = item->payload;
     }
   }
-  const auto found = std::find_if(open.rbegin(), open.rend(), [&](const Container& container) {
-    return container.isOfThread(threadName);
-  });
-  return found != open.rend() ? std::optional(found->statistics) : std::nullopt;
+}
+
+std::optional<Bytes> getIOStatsWithThreadnameFromKCData(Bytes snapshot,
+                                                        std::string_view threadName) {
+  KCDataPosition stopped;
+  return getIOStatsWithThreadnameFromKCDataHelper(snapshot, threadName, stopped);
 }
 
 }  // namespace NANDInfo

@@ -12,6 +12,7 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/GenericParserContext.h"
+#include "NANDInfo/ProcessState.h"
 
 namespace fuzz {
 

@@ -4,6 +4,8 @@
 // "No value" is not a value: it is std::optional or a null pointer.
 #pragma once
 
+#include <concepts>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -19,18 +21,26 @@ namespace MORVEND_EXPORTED platform {
 
 class Value;
 
+// The types that a number can have. Nothing is converted into one of them silently: a pointer is
+// not a boolean.
+template <typename T>
+concept NumberType = std::same_as<T, std::int32_t> || std::same_as<T, std::int64_t> ||
+    std::same_as<T, std::uint64_t> || std::same_as<T, float> || std::same_as<T, double> ||
+    std::same_as<T, bool>;
+
 // A number that remembers the type it was stored with.
 class Number {
  public:
   enum class Type : std::uint8_t { int32, int64, uint64, float32, float64, boolean };
 
-  explicit Number(std::int32_t value) : type_(Type::int32), integer_(value) {}
-  explicit Number(std::int64_t value) : type_(Type::int64), integer_(value) {}
-  explicit Number(std::uint64_t value)
-      : type_(Type::uint64), integer_(static_cast<std::int64_t>(value)) {}
-  explicit Number(float value) : type_(Type::float32), real_(static_cast<double>(value)) {}
-  explicit Number(double value) : type_(Type::float64), real_(value) {}
-  explicit Number(bool value) : type_(Type::boolean), integer_(value ? 1 : 0) {}
+  template <NumberType T>
+  explicit Number(T value) : type_(typeOf<T>()) {
+    if constexpr (std::floating_point<T>) {
+      real_ = static_cast<double>(value);
+    } else {
+      integer_ = static_cast<std::int64_t>(value);
+    }
+  }
 
   Type type() const { return type_; }
   bool isReal() const { return type_ == Type::float32 || type_ == Type::float64; }
@@ -49,6 +59,15 @@ class Number {
   bool operator==(const Number& other) const;
 
  private:
+  template <NumberType T>
+  static constexpr Type typeOf() {
+    if (std::same_as<T, std::int32_t>) return Type::int32;
+    if (std::same_as<T, std::int64_t>) return Type::int64;
+    if (std::same_as<T, std::uint64_t>) return Type::uint64;
+    if (std::same_as<T, float>) return Type::float32;
+    return std::same_as<T, double> ? Type::float64 : Type::boolean;
+  }
+
   Type type_;
   union {
     std::int64_t integer_;  // the bits of the value, for uint64 too
@@ -128,15 +147,12 @@ class Value {
   using Variant = std::variant<Number, std::string, Array, Dictionary, Date, Data>;
 
   Value(Number value) : variant_(value) {}
-  Value(std::int32_t value) : variant_(Number(value)) {}
-  Value(std::int64_t value) : variant_(Number(value)) {}
-  Value(std::uint64_t value) : variant_(Number(value)) {}
-  Value(float value) : variant_(Number(value)) {}
-  Value(double value) : variant_(Number(value)) {}
-  Value(bool value) : variant_(Number(value)) {}
+  template <NumberType T>
+  Value(T value) : variant_(Number(value)) {}
   Value(std::string value) : variant_(std::move(value)) {}
   Value(std::string_view value) : variant_(std::string(value)) {}
   Value(const char* value) : variant_(std::string(value)) {}
+  Value(std::nullptr_t) = delete;
   Value(Array value) : variant_(std::move(value)) {}
   Value(Dictionary value) : variant_(std::move(value)) {}
   Value(Date value) : variant_(value) {}

@@ -4,6 +4,7 @@
 
 #include <functional>
 
+#include "NANDInfo/ProcessState.h"
 #include "platform/Text.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/StorageDevice.h"

@@ -3,6 +3,7 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/NameTable.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
 
 namespace NANDInfo {

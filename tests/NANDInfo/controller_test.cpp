@@ -8,6 +8,7 @@
 #include <functional>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/TestPlatform.h"
 
 namespace NANDInfo {

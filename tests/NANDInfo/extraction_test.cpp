@@ -12,6 +12,7 @@
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/ExtractionSteps.h"
+#include "NANDInfo/ProcessState.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/Fingerprint.h"
 #include "support/StorageDevice.h"
@@ -180,7 +181,9 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
     SCOPED_TRACE(what);
     FullDevice device;
     alter(device);
-    const auto summary = NandInfoExtractToEV_runAllSteps(device.platform, monthly, true, firstStep);
+    const auto summary =
+        NandInfoExtractToEV_runAllSteps(device.platform, nullptr, monthly ? 0xFFu : 0xFEu, true,
+                                        (std::uint64_t{9} << 32) + firstStep);
     EXPECT_EQ(device.sent(), events);
     EXPECT_EQ(device.log.count("SUCCESS in logging"), successes);
     EXPECT_EQ(device.log.count("FAILED to log"), failures);
@@ -195,7 +198,7 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
 
 TEST(Extraction, SendsWhatEachEventMayCarry) {
   FullDevice device;
-  const auto summary = NandInfoExtractToEV_runAllSteps(device.platform, true, true, 0);
+  const auto summary = NandInfoExtractToEV_runAllSteps(device.platform, nullptr, 1, true, 0);
   const struct {
     std::vector<const char*> keys;
     const char* values;  // "-" for what isn't sent
@@ -236,7 +239,7 @@ TEST(Extraction, SaysWhatItDoes) {
   device.eventra.unused = {kEventName_massStorage_NANDInfo_FTLHistograms_2,
                            kEventName_massStorage_NANDInfo_StorageStats_1,
                            kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1};
-  EXPECT_EQ(NandInfoExtractToEV_runAllSteps(device.platform, false, false, 0), std::nullopt);
+  EXPECT_EQ(NandInfoExtractToEV_runAllSteps(device.platform, nullptr, 0, false, 0), std::nullopt);
   EXPECT_EQ(device.said(), R"(NANDInfo: NandInfoExtractToEV_runStep: logging FTL big view
 NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: com.norba.massStorage.NANDInfo.FTLCounters_1 enabled=1
 NANDInfo: createAndLogFTLStatFieldsToEventraForEvent: SUCCESS in logging massStorage_NANDInfo_FTLCounters_1 using EventraSendEventLazy
@@ -290,10 +293,10 @@ TEST(Extraction, HasNoHandlerBeyondTheMonth) {
 // A payload that isn't the producer's own would be gone, or another one, by then.
 TEST(Extraction, LeavesEachPayloadToTheSinksThread) {
   FullDevice prompt;
-  NandInfoExtractToEV_runAllSteps(prompt.platform, true, false, 0);
+  NandInfoExtractToEV_runAllSteps(prompt.platform, nullptr, 1, false, 0);
   FullDevice late;
   late.eventra.defers = true;
-  NandInfoExtractToEV_runAllSteps(late.platform, true, false, 0);
+  NandInfoExtractToEV_runAllSteps(late.platform, nullptr, 1, false, 0);
   EXPECT_EQ(late.sent(), "");
   late.eventra.deliver();
   EXPECT_EQ(late.eventra.events, prompt.eventra.events);
@@ -308,7 +311,7 @@ TEST(Extraction, GoesOnAfterAnyFailedCall) {
     device.log.clear();
     device.eventra.events.clear();
     faults.failAt(failing);
-    ASSERT_TRUE(NandInfoExtractToEV_runAllSteps(faults.platform(), false, true, 3));
+    ASSERT_TRUE(NandInfoExtractToEV_runAllSteps(faults.platform(), nullptr, 0, true, 3));
     if (failing == 0) calls = faults.calls();
     EXPECT_EQ(device.log.count("successfully logged"), 3);
     EXPECT_EQ(device.registry.problems(), std::vector<std::string>());

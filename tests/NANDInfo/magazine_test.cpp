@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include "NANDInfo/MagazineDeltas.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {

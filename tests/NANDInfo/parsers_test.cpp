@@ -8,6 +8,7 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
 
 namespace NANDInfo {

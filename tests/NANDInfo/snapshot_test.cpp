@@ -47,7 +47,7 @@ const std::string kSwapout("VM_swapout\0", 11);
 struct Row {
   const char* what;
   Bytes snapshot;
-  int written;  // -1: the thread isn't found
+  std::int64_t written;  // -1: the thread isn't found
 };
 
 const Row kRows[] = {
@@ -80,6 +80,11 @@ const Row kRows[] = {
     {"a begin without a type inside", begin(1) + item(0x13, 2) + name(kSwapout) + statistics(7), 7},
     {"no end", begin(1) + begin(2) + name(kSwapout) + statistics(7), 7},
     {"the stop before the end", begin(1) + name(kSwapout) + kStop + statistics(7) + end(1), 0},
+    {"the stop in a nested one, and what follows it",
+     begin(1) + begin(2) + name("a") + kStop + thread(3, kSwapout, 7) + end(1), 7},
+    {"the stop in a nested one, and the outer one's name",
+     begin(1) + begin(2) + name("a") + kStop + name(kSwapout) + statistics(7) + end(1), 7},
+    {"more than 32 bits", thread(1, kSwapout, 5'000'000'000'000), 5'000'000'000'000},
     {"the stop before the container", kStop + thread(1, kSwapout, 7), -1},
     {"half a header", begin(1) + name(kSwapout) + statistics(7) + Bytes(15), 7},
 };
@@ -118,6 +123,16 @@ TEST(Snapshot, CutsAndLiesStayInside) {
       }
     }
   }
+}
+
+TEST(Snapshot, AWalkTellsWhereItStopped) {
+  const Bytes first = thread(1, "a", 7);
+  KCDataPosition stopped;
+  EXPECT_FALSE(getIOStatsWithThreadnameFromKCDataHelper(first + thread(2, kSwapout, 7),
+                                                        "VM_swapout", stopped));
+  EXPECT_EQ(stopped.item, first.size() - 16);
+  EXPECT_EQ(stopped.end, 2 * first.size() + kSwapout.size() - 1);
+  EXPECT_FALSE(getIOStatsWithThreadnameFromKCData(first, std::string_view()));
 }
 
 TEST(Snapshot, NamesAreComparedOverTheir64Characters) {

@@ -14,6 +14,7 @@
 #include "NANDInfo/DefectsList.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/ListHandlers.h"
+#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/StructuredLogState.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"

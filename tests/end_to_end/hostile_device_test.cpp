@@ -9,6 +9,7 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"
+#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/StructuredLogState.h"
 #include "daemon/Entry.h"
 #include "end_to_end/Device.h"

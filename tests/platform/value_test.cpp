@@ -13,6 +13,17 @@ namespace {
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 
+// A value is made from exactly the types that it can hold: nothing else compiles.
+template <typename T>
+constexpr bool kHolds = std::is_convertible_v<T, Value>&& std::is_constructible_v<Number, T>;
+static_assert(kHolds<std::int32_t> && kHolds<std::int64_t> && kHolds<std::uint64_t> &&
+              kHolds<float> && kHolds<double> && kHolds<bool>);
+template <typename T>
+constexpr bool kRefuses = !std::is_constructible_v<Value, T> && !std::is_constructible_v<Number, T>;
+static_assert(kRefuses<const Value*> && kRefuses<Dictionary*> && kRefuses<void*> &&
+              kRefuses<std::nullptr_t> && kRefuses<char> && kRefuses<unsigned> &&
+              kRefuses<std::uint16_t> && kRefuses<long double>);
+
 TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
   struct Row {
     double from;

@@ -9,6 +9,7 @@
 
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
 #include "support/TestPlatform.h"
 

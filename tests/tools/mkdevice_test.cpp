@@ -7,6 +7,7 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
+#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/TelemetryList.h"
 #include "platform/Text.h"

@@ -6,6 +6,7 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/ProcessState.h"
 #include "support/StorageDevice.h"
 #include "support/TemporaryFolder.h"
 #include "tools/nandinfo/Commands.h"

@@ -123,10 +123,9 @@ class Capture {
       invocation_.progress(what);
       NANDInfo::TunnelCommandBlock block{.argument = argument};
       NANDInfo::Buffer buffer;
-      NANDInfo::ResetAPIErrorMessage();
       if (!NANDInfo::executeTunnelCommand(platform_, exporter_.io_connection, &exporter_, selectors,
                                           block, buffer)) {
-        leaveOut(what, NANDInfo::GetAPIErrorMessage());
+        leaveOut(what, "the driver refused the command");
         if (kind.endsAtFailure) return {};
         continue;
       }

@@ -54,8 +54,9 @@ CommandResult magazine(const Invocation& invocation) {
 
 CommandResult extract(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
-  return result(NANDInfo::NandInfoExtractToEV_runAllSteps(invocation.platform, arguments.monthly,
-                                                          true, arguments.from));
+  return result(NANDInfo::NandInfoExtractToEV_runAllSteps(
+      invocation.platform, nullptr, arguments.monthly ? NANDInfo::kAllowsMonthly : 0, true,
+      arguments.from));
 }
 
 CommandResult dump(const Invocation& invocation) {
