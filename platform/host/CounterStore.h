@@ -10,7 +10,8 @@
 
 namespace platform::host {
 
-// One thing to be recorded: a scalar set or added to, or a sample pushed.
+// One thing to be recorded: a scalar set or added to, or a sample pushed. In the key, what can't be
+// written is recorded as U+FFFD.
 struct CounterChange {
   enum class Kind { set, add, push };
 
@@ -35,8 +36,8 @@ class CounterStore : public CountersService, public HistoryStore {
   std::int32_t PLDaysSince1970() override;
   Date PLDateFromDaysSince1970(std::int32_t day) override;
 
-  // Packs the samples, drops what is older than the newest 60 days that hold rows, and brings the
-  // write-ahead log into the database file. Failures are logged.
+  // Packs the samples, drops what is older than the newest 60 days up to today that hold rows, and
+  // brings the write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
   // Failures are logged, the same one once for as long as it lasts.
