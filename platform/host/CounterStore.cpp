@@ -163,6 +163,11 @@ void CounterStore::PLClientCheckpoint() {
   if (!error.empty()) place_.log.log(LogLevel::error, "%s", error.c_str());
 }
 
+std::string CounterStore::settle() {
+  const std::scoped_lock lock(mutex_);
+  return database_.settle();
+}
+
 std::string CounterStore::apply(std::span<const CounterChange> changes) {
   for (const CounterChange& change : changes) {
     if (std::isnan(change.sample)) return "not a number can't be recorded as a sample";

@@ -40,6 +40,10 @@ class CounterStore : public CountersService, public HistoryStore {
   // brings the write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
+  // Makes the database one file, as whoever copies it wants it. Returns the empty text or what went
+  // wrong.
+  std::string settle();
+
   // Failures are logged, the same one once for as long as it lasts.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
   void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
