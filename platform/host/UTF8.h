@@ -23,6 +23,12 @@ struct Character {
 // What a non-empty text begins with.
 Character firstCharacter(std::string_view text);
 
+// The length of what a non-empty text begins with; 0 when that isn't sound.
+inline std::size_t characterLength(std::string_view text) {
+  const Character character = firstCharacter(text);
+  return character.isSound() ? character.length : 0;
+}
+
 // Whether a text holds nothing but characters that XML 1.0 can hold, so that it is written as it
 // is.
 bool isWritable(std::string_view text);

@@ -53,9 +53,10 @@ std::string writeFile(const Host& host, const std::string& path, std::string_vie
   const auto slash = path.rfind('/');
   const FileDescriptor folder =
       host.root().openFolder(path.substr(0, slash), platform::host::DeviceRoot::Missing::create);
-  if (!folder) return located(path, std::strerror(errno));
-  const int error = platform::host::replaceFile(folder.get(), path.substr(slash + 1), bytes);
-  return error == 0 ? "" : located(path, platform::host::errorText(error));
+  const int error =
+      folder ? platform::host::replaceFile(folder.get(), path.substr(slash + 1), bytes) : errno;
+  if (error == 0) return {};
+  return located(fs::path(host.root().path()) / path, platform::host::errorText(error));
 }
 
 std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
