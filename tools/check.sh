@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Formatting, clang-tidy over the release build's commands, and the layering of the rooms.
+# Formatting, the manual pages' form, clang-tidy over the release build's commands, and the layering of the rooms.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 sources() { git ls-files -- '*.cpp' '*.h'; }
@@ -7,6 +7,11 @@ failed=0
 
 echo "== formatting"
 sources | xargs clang-format --dry-run --Werror || failed=1
+
+# Each other's pages are found where they are installed.
+echo "== manual pages"
+complaints=$(mandoc -Tlint packaging/man/*.[1-8] | grep -v 'referenced manual not found' || true)
+[ -z "$complaints" ] || { echo "$complaints"; failed=1; }
 
 # Which room may include what: the room's folder, then the folders that it must not name. The build
 # enforces the same with its include folders; this also sees the system's headers.

@@ -1,9 +1,12 @@
 #include "platform/host/BusMessage.h"
 
 #include <cstring>
+#include <string>
 #include <string_view>
 #include <type_traits>
 #include <utility>
+
+#include "platform/host/UTF8.h"
 
 namespace platform::host {
 
@@ -56,6 +59,7 @@ class Reader {
 };
 
 bool Reader::readEntries(Dictionary& dictionary, int depth) {
+  std::string room;
   for (std::size_t count = 0; !atEnd(); ++count) {
     if (count >= kMaximumElements) {
       ++dropped_;
@@ -68,7 +72,7 @@ bool Reader::readEntries(Dictionary& dictionary, int depth) {
     if (affordBytes(name.size())) {
       std::optional<Value> value;
       if (!readValue(value, depth)) return false;
-      if (value) dictionary.set(name, std::move(*value));
+      if (value) dictionary.set(writable(name, room), std::move(*value));
     } else if (!skip()) {
       return false;
     }
@@ -167,7 +171,8 @@ bool Reader::readText(char type, std::optional<Value>& value) {
   const char* text = nullptr;
   if (sd_bus_message_read_basic(message_, type, &text) <= 0) return false;
   const std::string_view view = text;
-  if (affordBytes(view.size())) value.emplace(view);
+  std::string room;
+  if (affordBytes(view.size())) value.emplace(writable(view, room));
   return true;
 }
 

@@ -27,7 +27,8 @@ struct BusDictionary {
 // signature.
 //
 // Integers of every type become int64, or uint64 where they are larger; booleans, doubles and texts
-// (object paths and signatures too) stay what they are; ay is data, other arrays are arrays, and a
+// (object paths and signatures too) stay what they are, but that what can't be written becomes
+// U+FFFD; of keys that become the same the last counts. ay is data, other arrays are arrays, and a
 // variant is what it holds. Values of other types are left out.
 std::optional<BusDictionary> readDictionary(sd_bus_message* message);
 

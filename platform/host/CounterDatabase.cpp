@@ -100,6 +100,18 @@ std::string CounterDatabase::write(Missing missing, const Work& work) {
   }
 }
 
+std::string CounterDatabase::settle() {
+  const std::string error = write(Missing::skip, [](Connection& connection) {
+    connection.checkpoint(Connection::Checkpoint::truncate);
+    connection.leaveNothingBeside();
+  });
+  if (connection_) {
+    const FileLock lock(folder_.get());
+    connection_.reset();
+  }
+  return error;
+}
+
 // False with an empty error: there is no home, or no folder, and none is to be made.
 bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error) {
   if (folder_) return true;

@@ -50,6 +50,10 @@ class CounterDatabase {
   enum class Missing { create, skip };
   std::string write(Missing missing, const Work& work);
 
+  // Brings everything into the database file and closes it; nothing stands beside it then, unless
+  // another connection is open. Returns as `write` does.
+  std::string settle();
+
  private:
   struct Identity {
     dev_t device = 0;

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "platform/host/SQLite.h"
+#include "platform/host/UTF8.h"
 
 namespace platform::host {
 
@@ -26,7 +27,7 @@ class Rows {
 
   bool valid() const { return valid_; }
   std::int32_t day() const { return day_; }
-  std::string_view key() const { return key_; }
+  std::string_view key() const { return key_; }  // as it is stored
   bool isAt(std::int32_t day, std::string_view key) const {
     return valid_ && day_ == day && key_ == key;
   }
@@ -42,7 +43,7 @@ class Rows {
       // The bounds of the query have 32 bits, and so has the day.
       day_ = static_cast<std::int32_t>(day.integer());
       key_ = key.bytes();
-      if (key_.starts_with(keyPrefix_)) return;
+      if (writable(key_, room_).starts_with(keyPrefix_)) return;
     }
   }
 
@@ -53,6 +54,7 @@ class Rows {
   bool valid_ = false;
   std::int32_t day_ = 0;
   std::string_view key_;
+  std::string room_;
 };
 
 // The samples of one day and key: what is packed, then what is still staged.
@@ -123,6 +125,8 @@ void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_
                                          std::int32_t maxDaysSince1970,
                                          const ScalarRowHandler& rowHandler) {
   if (failed_) return;
+  std::string prefixRoom, room;
+  const std::string_view prefix = writable(keyPrefix, prefixRoom);
   failed_ = !database_.read([&](sqlite::Connection& connection) {
     sqlite::Statement rows(connection,
                            "SELECT day, key, value FROM scalars WHERE day BETWEEN ? AND ? "
@@ -130,10 +134,11 @@ void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_
                            minDaysSince1970, maxDaysSince1970);
     bool stop = false;
     while (!stop && rows.step()) {
-      const sqlite::Column day = rows.column(0), key = rows.column(1), value = rows.column(2);
-      if (!day.isInteger() || !key.isText() || !value.isInteger()) continue;
-      if (!key.bytes().starts_with(keyPrefix)) continue;
-      rowHandler(key.bytes(), static_cast<std::int32_t>(day.integer()), value.integer(), stop);
+      const sqlite::Column day = rows.column(0), stored = rows.column(1), value = rows.column(2);
+      if (!day.isInteger() || !stored.isText() || !value.isInteger()) continue;
+      const std::string_view key = writable(stored.bytes(), room);
+      if (!key.starts_with(prefix)) continue;
+      rowHandler(key, static_cast<std::int32_t>(day.integer()), value.integer(), stop);
     }
   });
 }
@@ -143,6 +148,8 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
                                                std::int32_t maxDaysSince1970,
                                                const DistributionRowHandler& rowHandler) {
   if (failed_) return;
+  std::string prefixRoom, room;
+  const std::string_view prefix = writable(keyPrefix, prefixRoom);
   failed_ = !database_.read([&](sqlite::Connection& connection) {
     const sqlite::Transaction snapshot(connection, sqlite::Transaction::Kind::read);
     sqlite::Statement packed(connection,
@@ -155,9 +162,9 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
         "ORDER BY day, key, rowid",
         minDaysSince1970, maxDaysSince1970);
     // The type of the data is known without reading them.
-    Rows packedRows(packed, keyPrefix,
+    Rows packedRows(packed, prefix,
                     [](const sqlite::Statement& row) { return row.column(2).isBlob(); });
-    Rows stagedRows(staged, keyPrefix, [](const sqlite::Statement& row) {
+    Rows stagedRows(staged, prefix, [](const sqlite::Statement& row) {
       return row.column(2).isInteger() && row.column(3).isReal();
     });
     StoredSamples samples(packed, packedRows, staged, stagedRows);
@@ -165,7 +172,7 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
     while (!stop && (packedRows.valid() || stagedRows.valid())) {
       const Rows& first = stagedRows.isBefore(packedRows) ? stagedRows : packedRows;
       samples.begin(first.day(), first.key());
-      rowHandler(samples.key(), samples.day(), samples, stop);
+      rowHandler(writable(samples.key(), room), samples.day(), samples, stop);
       samples.finish();
     }
   });

@@ -17,6 +17,9 @@ class CounterHistory : public PLHistory {
 
   // Each query sees the database as it was when the query began. After a failure, which the log
   // tells, this history is empty. A handler may query this history and write to the store.
+  //
+  // A stored key that can't be written, which this store doesn't make, comes as it is written, in
+  // the place of what is stored. Rows whose keys become the same each come: the last counts.
   void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
                            std::int32_t maxDaysSince1970,
                            const ScalarRowHandler& rowHandler) override;

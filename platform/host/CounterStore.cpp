@@ -6,6 +6,7 @@
 
 #include "platform/CivilDate.h"
 #include "platform/host/SQLite.h"
+#include "platform/host/UTF8.h"
 
 namespace platform::host {
 
@@ -15,12 +16,14 @@ constexpr int kDaysKept = 60;
 constexpr std::size_t kMostSamplesInRow = 65536;
 
 void write(sqlite::Connection& connection, const CounterChange& change) {
+  std::string room;
+  const std::string_view key = writable(change.key, room);
   switch (change.kind) {
     case CounterChange::Kind::set:
       sqlite::Statement(connection,
                         "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
                         "ON CONFLICT(day, key) DO UPDATE SET value = excluded.value",
-                        change.day, change.key, change.amount)
+                        change.day, key, change.amount)
           .run();
       return;
     case CounterChange::Kind::add:
@@ -31,13 +34,13 @@ void write(sqlite::Connection& connection, const CounterChange& change) {
           "WHEN ?3 > 0 AND value > 9223372036854775807 - ?3 THEN 9223372036854775807 "
           "WHEN ?3 < 0 AND value < -9223372036854775807 - 1 - ?3 THEN -9223372036854775807 - 1 "
           "ELSE value + ?3 END",
-          change.day, change.key, change.amount)
+          change.day, key, change.amount)
           .run();
       return;
     case CounterChange::Kind::push:
       sqlite::Statement(connection,
                         "INSERT INTO staged(day, key, seconds, value) VALUES(?1, ?2, ?3, ?4)",
-                        change.day, change.key, change.seconds, change.sample)
+                        change.day, key, change.seconds, change.sample)
           .run();
   }
 }
@@ -81,8 +84,9 @@ void pack(sqlite::Connection& connection) {
 }
 
 // Samples are packed before this, so that none is staged. Each step back is one seek in each table.
-void dropOldDays(sqlite::Connection& connection) {
-  std::int64_t oldest = std::int64_t{INT32_MAX} + 1;
+// Days after today, of a clock that was wrong or of an import, are neither counted nor dropped.
+void dropOldDays(sqlite::Connection& connection, std::int32_t today) {
+  std::int64_t oldest = std::int64_t{today} + 1;
   for (int kept = 0; kept < kDaysKept; ++kept) {
     sqlite::Statement before(connection,
                              "SELECT max(day) FROM ("
@@ -144,18 +148,24 @@ void CounterStore::record(CounterChange::Kind kind, std::span<const ScalarValue>
 }
 
 void CounterStore::PLClientCheckpoint() {
+  const std::int32_t today = PLDaysSince1970();
   const std::scoped_lock lock(mutex_);
   const std::string error =
-      database_.write(CounterDatabase::Missing::skip, [](sqlite::Connection& connection) {
+      database_.write(CounterDatabase::Missing::skip, [today](sqlite::Connection& connection) {
         {
           sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
           pack(connection);
-          dropOldDays(connection);
+          dropOldDays(connection, today);
           transaction.commit();
         }
         connection.checkpoint(sqlite::Connection::Checkpoint::truncate);
       });
   if (!error.empty()) place_.log.log(LogLevel::error, "%s", error.c_str());
+}
+
+std::string CounterStore::settle() {
+  const std::scoped_lock lock(mutex_);
+  return database_.settle();
 }
 
 std::string CounterStore::apply(std::span<const CounterChange> changes) {

@@ -10,7 +10,8 @@
 
 namespace platform::host {
 
-// One thing to be recorded: a scalar set or added to, or a sample pushed.
+// One thing to be recorded: a scalar set or added to, or a sample pushed. In the key, what can't be
+// written is recorded as U+FFFD.
 struct CounterChange {
   enum class Kind { set, add, push };
 
@@ -35,9 +36,13 @@ class CounterStore : public CountersService, public HistoryStore {
   std::int32_t PLDaysSince1970() override;
   Date PLDateFromDaysSince1970(std::int32_t day) override;
 
-  // Packs the samples, drops what is older than the newest 60 days that hold rows, and brings the
-  // write-ahead log into the database file. Failures are logged.
+  // Packs the samples, drops what is older than the newest 60 days up to today that hold rows, and
+  // brings the write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
+
+  // Makes the database one file, as whoever copies it wants it. Returns the empty text or what went
+  // wrong.
+  std::string settle();
 
   // Failures are logged, the same one once for as long as it lasts.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;

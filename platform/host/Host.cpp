@@ -67,7 +67,9 @@ struct Host::Services {
                         },
                         [this] { countDamagedDatabase(); }};
   SubmissionSpool submission{root, codec, preferences, clock, log};
-  StructuredLogFiles structuredLogs{root, clock, log};
+  const std::unique_ptr<StructuredLogFiles> structuredLogs =
+      played ? std::make_unique<PlayedStructuredLogs>(root, clock, log, played->incident)
+             : std::make_unique<StructuredLogFiles>(root, clock, log);
   ServitaLogFiles servitaLogs{root, log};
   Bus bus{log};
   PlayedNotifications playedNotifications;
@@ -102,7 +104,7 @@ struct Host::Services {
                     preferences,
                     preferences,
                     submission,
-                    structuredLogs,
+                    *structuredLogs,
                     servitaLogs,
                     bus,
                     bus,

@@ -7,6 +7,7 @@
 #include "platform/host/Base64.h"
 #include "platform/host/Timestamp.h"
 #include "platform/host/UTF8.h"
+#include "platform/host/WritableKeys.h"
 
 namespace platform::host {
 
@@ -65,6 +66,7 @@ void append(std::string& out, const Array& array) {
 }
 
 void append(std::string& out, const Dictionary& dictionary) {
+  if (const auto written = withWritableKeys(dictionary)) return append(out, *written);
   out += '{';
   for (const Dictionary::Entry& entry : dictionary) {
     if (&entry != dictionary.begin()) out += ", ";
@@ -97,6 +99,9 @@ void appendIndented(std::string& out, const Value& value, std::size_t depth) {
   const auto newLine = [&](std::size_t level) { out.append(1, '\n').append(2 * level, ' '); };
   if (const auto* dictionary = value.as<Dictionary>();
       dictionary != nullptr && !dictionary->empty()) {
+    if (const auto written = withWritableKeys(*dictionary)) {
+      return appendIndented(out, Value(*written), depth);
+    }
     out += '{';
     for (const Dictionary::Entry& entry : *dictionary) {
       if (&entry != dictionary->begin()) out += ',';

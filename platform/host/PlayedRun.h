@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 
 #include "platform/Kernel.h"
 #include "platform/PropertyList.h"
@@ -13,6 +14,7 @@ struct PlayedRun {
   Date now;                 // its clock stands
   std::uint64_t sinceBoot;  // ticks
   Kernel::Process process;
+  std::string incident;  // the identifier of its logs
 };
 
 }  // namespace platform::host

@@ -1,11 +1,13 @@
 // The services that differ in a run at another time.
 #pragma once
 
+#include <string>
 #include <utility>
 
 #include "platform/EventLoop.h"
 #include "platform/host/HostKernel.h"
 #include "platform/host/PlayedRun.h"
+#include "platform/host/StructuredLogFiles.h"
 #include "platform/host/SystemClock.h"
 
 namespace platform::host {
@@ -28,6 +30,16 @@ class PlayedKernel final : public HostKernel {
 
  private:
   PlayedRun run_;
+};
+
+class PlayedStructuredLogs final : public StructuredLogFiles {
+ public:
+  PlayedStructuredLogs(const DeviceRoot& root, Clock& clock, SystemLog& log, std::string incident)
+      : StructuredLogFiles(root, clock, log), incident_(std::move(incident)) {}
+  std::string newIncidentIdentifier() override { return incident_; }
+
+ private:
+  const std::string incident_;
 };
 
 // Nobody hears today what happened then.

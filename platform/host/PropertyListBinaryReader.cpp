@@ -212,12 +212,12 @@ class Reader {
     const std::optional<Range> range = elements(object, width);
     if (!range) return std::nullopt;
     std::string text;
-    text.reserve(range->size);
     if (object.marker == kUTF16) {
+      text.reserve(range->size);
       appendUTF16(text, *range);
     } else {
-      static constexpr EscapedCharacters kNone;
-      appendEscaped(text, bytes_.substr(range->begin, range->size), kNone, [](auto&, char) {});
+      std::string room;
+      text = writable(bytes_.substr(range->begin, range->size), room);
     }
     if (!takeContent(object, text.size())) return std::nullopt;
     return text;

@@ -4,6 +4,7 @@
 #include "platform/host/Base64.h"
 #include "platform/host/Timestamp.h"
 #include "platform/host/UTF8.h"
+#include "platform/host/WritableKeys.h"
 
 namespace platform::host {
 
@@ -111,6 +112,7 @@ class Writer {
 
   void write(const Dictionary& dictionary, std::size_t depth) {
     if (!enters(depth)) return;
+    if (const auto written = withWritableKeys(dictionary)) return write(*written, depth);
     indent(depth);
     if (dictionary.empty()) {
       out += "<dict/>\n";

@@ -1,8 +1,5 @@
 #include "platform/host/RandomUUID.h"
 
-#include <array>
-#include <cstddef>
-#include <cstdint>
 #include <random>
 
 #include "platform/Text.h"
@@ -13,6 +10,10 @@ std::string randomUUID() {
   std::random_device device;
   std::array<std::uint32_t, 4> words;
   for (std::uint32_t& word : words) word = device();
+  return UUIDFrom(words);
+}
+
+std::string UUIDFrom(std::array<std::uint32_t, 4> words) {
   words[1] = (words[1] & 0xffff0fffu) | 0x4000u;      // version 4
   words[2] = (words[2] & 0x3fffffffu) | 0x80000000u;  // variant 1
   return format("%08x-%04x-%04x-%04x-%04x%08x", words[0], words[1] >> 16, words[1] & 0xffffu,

@@ -113,6 +113,10 @@ void Connection::checkpoint(Checkpoint mode) {
                                   nullptr, nullptr));
 }
 
+void Connection::leaveNothingBeside() {
+  sqlite3_db_config(database_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 0, nullptr);
+}
+
 Connection::Prepared* Connection::prepare(const char* sql) {
   if (failure_) return nullptr;
   for (Prepared& prepared : prepared_) {

@@ -57,6 +57,9 @@ class Connection {
   // Brings the log into the file. `passive` does what it can without waiting for anybody.
   void checkpoint(Checkpoint mode);
 
+  // Lets the end of this connection, if it is the last to the file, remove what stands beside it.
+  void leaveNothingBeside();
+
  private:
   friend class Statement;
 

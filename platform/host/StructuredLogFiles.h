@@ -10,7 +10,7 @@
 
 namespace platform::host {
 
-class StructuredLogFiles final : public FaultwatchSupport {
+class StructuredLogFiles : public FaultwatchSupport {
  public:
   // All are borrowed.
   StructuredLogFiles(const DeviceRoot& root, Clock& clock, SystemLog& log)

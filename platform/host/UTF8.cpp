@@ -1,34 +1,73 @@
 #include "platform/host/UTF8.h"
 
 #include <cstdint>
+#include <cstring>
 
 namespace platform::host {
 
-std::size_t characterLength(std::string_view text) {
-  const auto byte = [text](std::size_t i) -> std::uint32_t {
+namespace {
+
+constexpr EscapedCharacters kForbidden("\t\n\r", "");
+
+constexpr std::uint64_t eachByte(std::uint64_t byte) { return byte * 0x0101010101010101; }
+
+// Whether eight bytes are ASCII without control characters.
+bool areEightPlain(const char* bytes) {
+  std::uint64_t word = 0;
+  std::memcpy(&word, bytes, sizeof word);
+  return (((word - eachByte(0x20)) | word) & eachByte(0x80)) == 0;
+}
+
+}  // namespace
+
+Character firstCharacter(std::string_view text) {
+  const auto byte = [text](std::size_t i) -> char32_t {
     return i < text.size() ? static_cast<unsigned char>(text[i]) : 0;
   };
-  const auto continues = [&](std::size_t i) { return (byte(i) & 0xC0) == 0x80; };
-  const std::uint32_t first = byte(0);
-  if (first < 0x80) return 1;
-  if (first >= 0xC2 && first <= 0xDF) return continues(1) ? 2 : 0;
-  if (first >= 0xE0 && first <= 0xEF && continues(1) && continues(2)) {
-    const std::uint32_t c = (first & 0xF) << 12 | (byte(1) & 0x3F) << 6 | (byte(2) & 0x3F);
-    const bool surrogate = c >= 0xD800 && c <= 0xDFFF;
-    return c >= 0x800 && !surrogate && c < 0xFFFE ? 3 : 0;
+  const char32_t first = byte(0);
+  if (first < 0x80) return {first, 1};
+  const std::size_t length = first >= 0xF0 ? 4 : first >= 0xE0 ? 3 : 2;
+  char32_t code = first & (0x7F >> length);
+  for (std::size_t i = 1; i < length; ++i) {
+    if ((byte(i) & 0xC0) != 0x80) return {0, 0};
+    code = code << 6 | (byte(i) & 0x3F);
   }
-  if (first >= 0xF0 && first <= 0xF4 && continues(1) && continues(2) && continues(3)) {
-    const std::uint32_t top = (first & 0x7) << 6 | (byte(1) & 0x3F);
-    return top >= 0x10 && top <= 0x10F ? 4 : 0;
+  constexpr char32_t kLeast[] = {0x80, 0x800, 0x10000};  // of each length from 2
+  const bool surrogate = code >= 0xD800 && code <= 0xDFFF;
+  const bool sound =
+      first >= 0xC0 && first < 0xF8 && code >= kLeast[length - 2] && !surrogate && code <= 0x10FFFF;
+  return sound ? Character{code, length} : Character{0, 0};
+}
+
+bool isWritable(std::string_view text) {
+  for (std::size_t i = 0; i < text.size();) {
+    if (text.size() - i >= 8 && areEightPlain(text.data() + i)) {
+      i += 8;
+    } else if (!kForbidden.stopsAt(text[i])) {
+      ++i;
+    } else {
+      const Character character = firstCharacter(text.substr(i));
+      if (character.code < 0x80 || !character.isSound()) return false;
+      i += character.length;
+    }
   }
-  return 0;
+  return true;
+}
+
+std::string_view writable(std::string_view text, std::string& room) {
+  if (isWritable(text)) return text;
+  room.clear();
+  appendEscaped(room, text, kForbidden, [](std::string& to, char) { to += kReplacementCharacter; });
+  return room;
 }
 
 void appendCharacter(std::string& out, char32_t character) {
   const auto append = [&out](char32_t byte) { out += static_cast<char>(byte); };
   const bool surrogate = character >= 0xD800 && character <= 0xDFFF;
   const bool never = character == 0xFFFE || character == 0xFFFF || character > 0x10FFFF;
-  if (surrogate || never) {
+  const bool forbidden =
+      character < 0x20 && character != '\t' && character != '\n' && character != '\r';
+  if (surrogate || never || forbidden) {
     out += kReplacementCharacter;
   } else if (character < 0x80) {
     append(character);

@@ -1,6 +1,7 @@
 // Text as UTF-8, and its way into formats that can't hold every character.
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <string>
@@ -11,20 +12,38 @@ namespace platform::host {
 // U+FFFD, which stands for what can't be text.
 inline constexpr std::string_view kReplacementCharacter = "\xEF\xBF\xBD";
 
-// The length, 1 to 4, of the character that a non-empty text begins with. 0 when the text doesn't
-// begin with well-formed UTF-8, or begins with U+FFFE or U+FFFF, which are never characters.
-std::size_t characterLength(std::string_view text);
+struct Character {
+  char32_t code;
+  std::size_t length;  // in bytes, 1 to 4; 0: the text doesn't begin with well-formed UTF-8
 
-// Appends a character, as UTF-8; U+FFFD for what isn't one.
+  // Neither malformed nor U+FFFE or U+FFFF, which are never characters.
+  bool isSound() const { return length > 0 && code != 0xFFFE && code != 0xFFFF; }
+};
+
+// What a non-empty text begins with.
+Character firstCharacter(std::string_view text);
+
+// The length of what a non-empty text begins with; 0 when that isn't sound.
+inline std::size_t characterLength(std::string_view text) {
+  const Character character = firstCharacter(text);
+  return character.isSound() ? character.length : 0;
+}
+
+// Whether a text holds nothing but characters that XML 1.0 can hold, so that it is written as it
+// is.
+bool isWritable(std::string_view text);
+
+// A text as it is written: itself if it is writable, else made in `room`, with U+FFFD for each
+// character that XML 1.0 forbids and for each byte that is not part of a character. What reads a
+// text that comes from outside takes it through this: then what is compared is what is written.
+std::string_view writable(std::string_view text, std::string& room);
+
+// Appends a character, as UTF-8; U+FFFD for what isn't one, or can't be written.
 void appendCharacter(std::string& out, char32_t character);
 
 // The ASCII characters that a format can't hold as they are.
 class EscapedCharacters {
  public:
-  constexpr EscapedCharacters() : EscapedCharacters({}, {}) {
-    for (std::size_t c = 0; c < 0x20; ++c) stops_[c] = false;
-  }
-
   // All control characters but those in `plain`, and those in `escaped`.
   constexpr EscapedCharacters(std::string_view plain, std::string_view escaped) {
     for (std::size_t c = 0; c < 0x20; ++c) stops_[c] = true;
@@ -47,8 +66,8 @@ class EscapedCharacters {
   std::array<bool, 256> stops_{};
 };
 
-// Appends a text; `escape(out, c)` appends each escaped ASCII character, and each byte that is not
-// part of a character becomes U+FFFD.
+// Appends a text; `escape(out, c)` appends each escaped ASCII character. U+FFFE and U+FFFF become
+// U+FFFD, and so does each byte that is not part of well-formed UTF-8.
 template <typename Escape>
 void appendEscaped(std::string& out, std::string_view text, const EscapedCharacters& escaped,
                    Escape escape) {
@@ -62,18 +81,19 @@ void appendEscaped(std::string& out, std::string_view text, const EscapedCharact
       ++i;
       continue;
     }
+    const Character character = firstCharacter(text.substr(i));
     const bool ascii = static_cast<unsigned char>(text[i]) < 0x80;
-    if (const std::size_t length = ascii ? 0 : characterLength(text.substr(i)); length > 0) {
-      i += length;
-      continue;
+    const std::size_t end = i + std::max<std::size_t>(character.length, 1);
+    if (ascii || !character.isSound()) {
+      out.append(text, begin, i - begin);
+      if (ascii) {
+        escape(out, text[i]);
+      } else {
+        out += kReplacementCharacter;
+      }
+      begin = end;
     }
-    out.append(text, begin, i - begin);
-    if (ascii) {
-      escape(out, text[i]);
-    } else {
-      out += kReplacementCharacter;
-    }
-    begin = ++i;
+    i = end;
   }
   out.append(text, begin);
 }

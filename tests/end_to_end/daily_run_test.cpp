@@ -8,6 +8,7 @@
 #include <thread>
 
 #include "end_to_end/Device.h"
+#include "support/BinaryPropertyList.h"
 #include "support/HostOnRoot.h"
 
 namespace end_to_end {
@@ -163,6 +164,29 @@ TEST(DailyRun, ReportsADamagedDatabaseTheNextDay) {
   constexpr char kCount[] = "com.norba.quenset.prnd.database.corruptions";
   EXPECT_EQ(*logs[0].dictionary("PLScalars")->find(kCount), Value(1));
   EXPECT_EQ(*logs[1].dictionary("PLScalars")->find(kCount), Value(0));
+}
+
+// A key that XML can't hold, from its record over the baseline, the history and the whitelist to
+// the log: one day later the baseline knows it again.
+TEST(DailyRun, KnowsAKeyAgainThatIsNotWrittenAsItCame) {
+  Device device;
+  device.fill();
+  const std::string key = "datausage.wifiInKB.com.norba.p";
+  const Dictionary record{{"procName", "p\x01"},
+                          {"since", platform::Date{device.today() * 86400.0}},
+                          {"wifiInBytes", 2048}};
+  const Dictionary keys{{key + "\x01", Dictionary()}};
+  using List = support::BinaryPropertyList;
+  device.root().write("device/network-usage.plist",
+                      List::of(Dictionary{{"Records", Array{record}}}));
+  device.root().write(kWhitelist,
+                      List::of(Dictionary{{"Group", Dictionary{{"ScalarKeys", keys}}}}));
+  for (int run = 0; run < 3; ++run) device.run("morvend", {"-t"});
+  const Dictionary reported{{key + "\xEF\xBF\xBD", 2}};
+  ASSERT_EQ(device.dailyLogs().size(), 2u) << "the first run finds nothing to report";
+  for (const Dictionary& log : device.dailyLogs()) {
+    EXPECT_EQ(*log.dictionary("PLScalars"), reported);
+  }
 }
 
 // A link in the place of a file or a folder that is written must lead nothing out of the root, and

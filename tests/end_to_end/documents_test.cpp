@@ -1,12 +1,16 @@
-// The documents, against what they are about: the programs' help, and the names in the source.
+// The documents, against what they are about: the programs and their help, and the names in the
+// source.
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <regex>
 #include <set>
 #include <sstream>
+#include <vector>
 
 #include "end_to_end/Device.h"
 
@@ -74,6 +78,186 @@ TEST(Documents, TheDayAndItsDataNameEveryKey) {
   EXPECT_GT(names.size(), 30u);
   for (const std::string& name : names) {
     EXPECT_NE(documents.find(name), std::string::npos) << name;
+  }
+}
+
+// README.md, docs/*.md and the manual pages.
+std::vector<std::filesystem::path> documents() {
+  std::vector<std::filesystem::path> paths = {"README.md"};
+  for (const char* folder : {"docs", "packaging/man"}) {
+    for (const auto& file : std::filesystem::directory_iterator(kSource / folder)) {
+      paths.push_back(file.path().lexically_relative(kSource));
+    }
+  }
+  std::sort(paths.begin(), paths.end());
+  return paths;
+}
+
+using Block = std::vector<std::string>;
+
+// The blocks of commands: what is indented by four blanks, or fenced without a language or as a
+// shell's. One with a line drawn in it is a picture.
+std::vector<Block> blocksOfMarkdown(std::istream& text) {
+  std::vector<Block> blocks;
+  bool fenced = false, taken = false, blank = true;
+  for (std::string line; std::getline(text, line);) {
+    if (line.starts_with("```")) {
+      fenced = !fenced;
+      taken = fenced && (line == "```" || line == "```sh");
+      if (taken) blocks.emplace_back();
+    } else if (fenced ? taken : line.starts_with("    ") && (blank || taken)) {
+      if (!fenced && !taken) blocks.emplace_back();
+      taken = true;
+      blocks.back().push_back(fenced ? line : line.substr(4));
+    } else if (!fenced) {
+      taken = taken && line.empty();
+    }
+    blank = line.empty();
+  }
+  std::erase_if(blocks, [](const Block& block) {
+    return std::ranges::any_of(block, [](const std::string& line) {
+      return line.find("\xE2\x94") != line.npos;  // box drawing
+    });
+  });
+  return blocks;
+}
+
+// Literal displays, and lines by themselves.
+std::vector<Block> blocksOfManual(std::istream& text) {
+  const auto unescaped = [](std::string line) {
+    for (const auto& [escape, meant] : {std::pair{"\\e", "\\"}, {"\\(dq", "\""}, {"\\&", ""}}) {
+      for (std::size_t at = 0; (at = line.find(escape, at)) != line.npos;) {
+        line.replace(at, std::strlen(escape), meant);
+        at += std::strlen(meant);
+      }
+    }
+    return line;
+  };
+  std::vector<Block> blocks;
+  bool within = false;
+  for (std::string line; std::getline(text, line);) {
+    if (line.starts_with(".Dl ")) {
+      blocks.push_back({unescaped(line.substr(4))});
+    } else if (line.starts_with(".Bd -literal")) {
+      within = true;
+      blocks.emplace_back();
+    } else if (line == ".Ed") {
+      within = false;
+    } else if (within) {
+      blocks.back().push_back(unescaped(line));
+    }
+  }
+  return blocks;
+}
+
+// Each command with the lines that go on with it, which are indented or close its brace.
+std::vector<std::string> commandsOf(const std::filesystem::path& document) {
+  std::istringstream text(contentOf(document));
+  std::vector<std::string> commands;
+  for (const Block& block :
+       document.extension() == ".md" ? blocksOfMarkdown(text) : blocksOfManual(text)) {
+    for (const std::string& line : block) {
+      if (&line != &block.front() && (line.empty() || line[0] == ' ' || line[0] == '}')) {
+        commands.back() += "\n" + line;
+      } else {
+        commands.push_back(line);
+      }
+    }
+  }
+  return commands;
+}
+
+// What isn't run as it stands, and why: not at all, or with another word in front and that status.
+struct Otherwise {
+  const char *beginning, *reason, *inFront = nullptr;
+  int status = 0;
+};
+constexpr Otherwise kOtherwise[] = {
+    {"./dev ", "it builds the tree, or runs this test"},
+    {"busctl ", "it listens on the system's bus"},
+    {"journalctl ", "it reads the machine's journal"},
+    {"message", "it sends over the system's bus; the service's own test does that"},
+    {"<", "a whitelist"},
+    {"{\"set\"|", "the form of a line, not a line"},
+    {"pelloran sample --every 60 ", "it goes on for an hour", "timeout 2 ", 124},
+};
+
+// Whether a command begins with one of our programs, or with one that does no harm.
+bool mayBeRun(const std::string& command) {
+  std::smatch word;
+  std::regex_search(command, word, std::regex("^(?:[A-Z_]+=\\S+ +)*(\\S+)"));
+  static const std::set<std::string> kHarmless = {"cd", "cp", "echo", "export", "ls", "mkdir"};
+  return kHarmless.contains(word[1]) || std::filesystem::exists(PROGRAMS "/" + word[1].str());
+}
+
+// A command that has changed, or a page that hasn't: each document's commands in their order, in a
+// folder that holds a sample device, unless the document makes that itself.
+TEST(Documents, TheirCommandsDoWhatTheySay) {
+  std::set<const Otherwise*> used;
+  int ran = 0;
+  for (const auto& document : documents()) {
+    std::string script =
+        "set -o pipefail\nexport PATH=" PROGRAMS ":$PATH DBUS_SYSTEM_BUS_ADDRESS=unix:path=/none\n";
+    const auto commands = commandsOf(document);
+    if (std::ranges::none_of(commands, [](const std::string& command) {
+          return command.starts_with("mkdevice device");
+        })) {
+      script += "mkdevice device\nexport MORVEND_ROOT=$PWD/device\n";
+    }
+    std::string expected;
+    for (const std::string& command : commands) {
+      const auto* otherwise = std::ranges::find_if(
+          kOtherwise, [&](const Otherwise& row) { return command.starts_with(row.beginning); });
+      const bool asItStands = otherwise == std::end(kOtherwise);
+      if (!asItStands) used.insert(otherwise);
+      if (!asItStands && otherwise->inFront == nullptr) continue;
+      if (!mayBeRun(command)) {
+        ADD_FAILURE() << document << ": neither run nor listed: " << command;
+        continue;
+      }
+      ++ran;
+      const int number = ran;
+      script += (asItStands ? "" : otherwise->inFront) + command + "\necho " +
+                std::to_string(number) + " $? >> statuses\n";
+      expected +=
+          std::to_string(number) + " " + std::to_string(asItStands ? 0 : otherwise->status) + "\n";
+    }
+    if (expected.empty()) continue;
+    const support::TemporaryFolder folder;
+    folder.write("script", script);
+    const auto outcome = faults::run(
+        {"/bin/bash", "-c", "cd " + folder.path().string() + " && exec bash script > output"},
+        {"LC_ALL=C"});
+    EXPECT_EQ(folder.read("statuses"), expected) << document << "\n"
+                                                 << script << outcome.standardError;
+  }
+  EXPECT_GT(ran, 15);
+  for (const Otherwise& row : kOtherwise) {
+    EXPECT_TRUE(used.contains(&row)) << "no document has it any more: " << row.beginning;
+  }
+}
+
+// A macro that is misspelt, a list that isn't closed, a reference to no page.
+TEST(Documents, ManualPagesAreWellFormed) {
+  const support::TemporaryFolder folder;
+  const std::string mandoc =
+      "command -v mandoc && cd " + kSource.string() + " && mandoc -Tlint packaging/man/*.[1-8]";
+  const auto outcome = faults::run(
+      {"/bin/sh", "-c", "(" + mandoc + ") > " + (folder / "complaints").string()}, {"LC_ALL=C"});
+  const std::string complaints = folder.read("complaints");
+  if (complaints.empty()) GTEST_SKIP() << "mandoc is not installed: " << outcome.standardError;
+  std::istringstream lines(complaints);
+  const std::regex reference(": referenced manual not found: Xr (\\S+) (\\d)");
+  for (std::string line; std::getline(lines, line);) {
+    std::smatch page;
+    if (!line.starts_with("mandoc: packaging/")) continue;
+    // Ours are found where they are installed; others may not be.
+    const bool known =
+        std::regex_search(line, page, reference) &&
+        (std::filesystem::exists(kSource /
+                                 ("packaging/man/" + page[1].str() + "." + page[2].str())) ||
+         std::regex_match(page[1].str(), std::regex("(busctl|journalctl|systemctl|systemd.*)")));
+    EXPECT_TRUE(known) << line;
   }
 }
 

@@ -37,7 +37,7 @@ TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
   const Lines commands[] = {
       {"set", "a", "5"},
       {"add", "a", "-7"},
-      {"add", "b", "-3", "--day", "-2"},
+      {"add", "b", "-3", "--day", "2024-02-29"},
       {"set", "c", "9223372036854775807", "--day", "yesterday"},
       {"add", "c", "1", "--day=19999"},
       {"push", "d", "-1.5e3", "--day", "today"},
@@ -49,11 +49,11 @@ TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
     EXPECT_EQ(run(command), 0) << err;
     EXPECT_EQ(out + err, "");
   }
-  EXPECT_EQ(here.rows(), (Lines{"-2 b -3", "19999 c 9223372036854775807", "20000 -dash 1",
+  EXPECT_EQ(here.rows(), (Lines{"19782 b -3", "19999 c 9223372036854775807", "20000 -dash 1",
                                 "20000 a -2", "20000 d 3600:-1500 86399:2 0:3"}));
 }
 
-TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineAndWritesNothing) {
+TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineWithAHintAndWritesNothing) {
   const std::string longKey(1025, 'k');
   const Lines commands[] = {
       {},
@@ -73,6 +73,12 @@ TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineAndWritesNothing) {
       {"set", "a", "1", "--day", ""},
       {"set", "a", "1", "--day", "2147483648"},
       {"set", "a", "1", "--day", "tomorrow"},
+      {"set", "a", "1", "--day", "-1"},
+      {"add", "a", "1", "--day=-1"},
+      {"push", "a", "1", "--day", "1969-12-31"},
+      {"push", "a", "1", "--day", "2026-02-29"},
+      {"push", "a", "1", "--day", "2026-11-22T00:00:00Z"},
+      {"show", "--day", "-1"},
       {"push", "a", "nan"},
       {"push", "a", "inf"},
       {"push", "a", "1e999"},
@@ -88,10 +94,16 @@ TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineAndWritesNothing) {
   for (const auto& command : commands) {
     EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
     EXPECT_TRUE(err.starts_with("pelloran: ")) << err;
+    EXPECT_TRUE(err.ends_with(" --help')\n")) << err;
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
     EXPECT_EQ(out, "");
   }
   EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
+  run({"shwo", "--json"});
+  EXPECT_EQ(err,
+            "pelloran: there is no command 'shwo'; did you mean 'show'? (see 'pelloran --help')\n");
+  run({"set", "a", "\x1b[5m"});
+  EXPECT_EQ(err, "pelloran: '?[5m' is not an integer of 64 bits (see 'pelloran set --help')\n");
   EXPECT_EQ(run({"--help"}), 0);
   EXPECT_NE(out.find("import"), std::string::npos);
   EXPECT_EQ(run({"--version"}), 0);
@@ -102,7 +114,7 @@ TEST_F(PelloranCommand, AnImportIsRecordedWholeOrNamesTheLineThatStoppedIt) {
   const std::string sound =
       "{\"set\": \"a\", \"value\": 5.0}\r\n\n  \t\n"
       "{\"value\": -2, \"add\": \"a\", \"day\": \"yesterday\"}\n"
-      "{\"push\": \"\\u00e4\", \"value\": 1, \"day\": -4, \"seconds\": 7}\n";
+      "{\"push\": \"\\u00e4\", \"value\": 1, \"day\": \"1970-01-05\", \"seconds\": 7}\n";
   const std::string longest(std::size_t{1} << 20, ' ');
   EXPECT_EQ(run({"import"}, sound + "[]"), 1);
   EXPECT_EQ(err, "pelloran: line 6: not a JSON object\n");
@@ -110,7 +122,7 @@ TEST_F(PelloranCommand, AnImportIsRecordedWholeOrNamesTheLineThatStoppedIt) {
   EXPECT_EQ(err, "pelloran: line 6: longer than 1 MiB\n");
   EXPECT_EQ(here.rows(), Lines{});
   EXPECT_EQ(run({"import"}, longest + "\n" + sound), 0) << err;
-  EXPECT_EQ(here.rows(), (Lines{"19999 a -2", "20000 a 5", "-4 \xc3\xa4 7:1"}));
+  EXPECT_EQ(here.rows(), (Lines{"19999 a -2", "20000 a 5", "4 \xc3\xa4 7:1"}));
 
   folder.write("changes", "{\"add\": \"a\", \"value\": 1}");
   const std::string file = (folder / "changes").string();
@@ -123,22 +135,29 @@ TEST_F(PelloranCommand, AnImportIsRecordedWholeOrNamesTheLineThatStoppedIt) {
 
 TEST_F(PelloranCommand, ShowOrdersScalarsAndDistributionsTogether) {
   here.store.set("b", 2, 1);
-  here.store.set("a\n\"", 1, 1);
+  here.store.set("a\n\x7f\"", 1, 1);
   here.store.set("c", 3, 0);
   here.store.push("b", 4, 1, 9);
   here.store.push("b", 1e22, 1, 8);
   EXPECT_EQ(run({"show", "--json"}), 0);
   EXPECT_EQ(out,
             "{\"day\": 0, \"key\": \"c\", \"value\": 3}\n"
-            "{\"day\": 1, \"key\": \"a\\n\\\"\", \"value\": 1}\n"
+            "{\"day\": 1, \"key\": \"a\\n\x7f\\\"\", \"value\": 1}\n"
             "{\"day\": 1, \"key\": \"b\", \"value\": 2}\n"
             "{\"day\": 1, \"key\": \"b\", \"samples\": [[9, 4.0], [8, 1e+22]]}\n");
   EXPECT_EQ(run({"show", "--day", "1"}), 0);
   EXPECT_EQ(out,
+            "DAY  DATE        KEY   VALUE\n"
+            "1    1970-01-02  a??\"  1\n"
+            "1    1970-01-02  b     2\n"
+            "1    1970-01-02  b     count 2  min 4  mean 5e+21  max 1e+22\n");
+  here.store.set("\xe8\xa8\x88", 1, 2);        // two columns wide
+  here.store.set("u\xcc\x88\xc2\x9b!", 2, 2);  // combined with the one before; a control
+  EXPECT_EQ(run({"show", "--day", "1970-01-03"}), 0);
+  EXPECT_EQ(out,
             "DAY  DATE        KEY  VALUE\n"
-            "1    1970-01-02  a?\"  1\n"
-            "1    1970-01-02  b    2\n"
-            "1    1970-01-02  b    count 2  min 4  mean 5e+21  max 1e+22\n");
+            "2    1970-01-03  u\xcc\x88?!  2\n"
+            "2    1970-01-03  \xe8\xa8\x88   1\n");
   EXPECT_EQ(run({"show", "--prefix", "c", "--json"}), 0);
   EXPECT_EQ(out, "{\"day\": 0, \"key\": \"c\", \"value\": 3}\n");
   EXPECT_EQ(run({"show", "--prefix", "x"}), 0);

@@ -27,7 +27,7 @@ TEST(PelloranImportLine, NumbersKeepTheirValueAndMissingFieldsMeanNow) {
        19999, 0},
       {R"( {"seconds": 86399, "day": "today", "value": 1, "push": "k"} )", Kind::push, 0, 1, 20000,
        86399},
-      {R"({"set": "k", "value": 1, "day": -2147483648})", Kind::set, 1, 0, INT32_MIN, 3600},
+      {R"({"set": "k", "value": 1, "day": "2026-11-22"})", Kind::set, 1, 0, 20779, 3600},
   };
   for (const auto& row : cases) {
     const auto parsed = pelloran::parseImportLine(row.line, kNow);
@@ -73,6 +73,8 @@ TEST(PelloranImportLine, AnythingElseIsRefusedWithAReason) {
       "{\"push\": \"\xff\", \"value\": 1}",
       R"({"push": "k", "value": 1, "day": 2147483648})",
       R"({"push": "k", "value": 1, "day": 0.5})",
+      R"({"push": "k", "value": 1, "day": -1})",
+      R"({"push": "k", "value": 1, "day": "-1"})",
       R"({"push": "k", "value": 1, "day": "soon"})",
       R"({"push": "k", "value": 1, "seconds": 86400})",
       R"({"push": "k", "value": 1, "seconds": -1})",

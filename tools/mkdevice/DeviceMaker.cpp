@@ -3,6 +3,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include <array>
 #include <cerrno>
 #include <cstring>
 #include <filesystem>
@@ -15,6 +16,7 @@
 #include "platform/Text.h"
 #include "platform/host/Files.h"
 #include "platform/host/Host.h"
+#include "platform/host/RandomUUID.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Wear.h"
 
@@ -51,9 +53,10 @@ std::string writeFile(const Host& host, const std::string& path, std::string_vie
   const auto slash = path.rfind('/');
   const FileDescriptor folder =
       host.root().openFolder(path.substr(0, slash), platform::host::DeviceRoot::Missing::create);
-  if (!folder) return located(path, std::strerror(errno));
-  const int error = platform::host::replaceFile(folder.get(), path.substr(slash + 1), bytes);
-  return error == 0 ? "" : located(path, platform::host::errorText(error));
+  const int error =
+      folder ? platform::host::replaceFile(folder.get(), path.substr(slash + 1), bytes) : errno;
+  if (error == 0) return {};
+  return located(fs::path(host.root().path()) / path, platform::host::errorText(error));
 }
 
 std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
@@ -103,7 +106,7 @@ std::string makeRoot(const MakingOptions& options, const Sample& first,
     error = host.counters().apply(counters.ofDay(first.today - kDaysOfCounters + done));
     host.counters().PLClientCheckpoint();
   }
-  return error;
+  return error.empty() ? host.counters().settle() : error;
 }
 
 // The run of the day that begins with `sample.today`, by the timer some minutes past midnight.
@@ -113,9 +116,12 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
   const std::int64_t second = random.between(600, 2400);
   const auto sinceBoot =
       Wear(sample, 0).hoursSinceBoot() * 3600 + static_cast<std::uint64_t>(second);
+  std::array<std::uint32_t, 4> words;
+  for (std::uint32_t& word : words) word = static_cast<std::uint32_t>(random.next());
   return {.now = {static_cast<double>(sample.today * platform::kSecondsPerDay + second)},
           .sinceBoot = sinceBoot * kTicksPerSecond,
-          .process = {"morvend", static_cast<std::int32_t>(random.between(300, 30000))}};
+          .process = {"morvend", static_cast<std::int32_t>(random.between(300, 30000))},
+          .incident = platform::host::UUIDFrom(words)};
 }
 
 // The day that begins with `sample.today`, and what is new when the next one begins.
@@ -123,6 +129,7 @@ std::string playDay(const std::string& root, Sample sample, const SampleCounters
   DeviceHost host(root, dailyRun(sample));
   morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
   std::string error = host.counters().apply(counters.ofDay(sample.today));
+  if (error.empty()) error = host.counters().settle();
   if (!error.empty()) return error;
   ++sample.today;
   return writeFiles(host, filesOfDay(sample));

@@ -61,7 +61,7 @@ int main(int argc, char** argv) {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
     if (error.get_exit_code() == 0) return app.exit(error);
-    std::cerr << "mkdevice: " << error.what() << '\n';
+    std::cerr << "mkdevice: " << error.what() << " (see 'mkdevice --help')\n";
     return kUsage;
   }
 

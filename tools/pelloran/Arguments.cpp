@@ -7,6 +7,8 @@
 #include "platform/CivilDate.h"
 #include "platform/Convert.h"
 #include "platform/Text.h"
+#include "platform/host/Timestamp.h"
+#include "platform/host/UTF8.h"
 
 namespace pelloran {
 
@@ -24,25 +26,11 @@ bool parsed(std::string_view text, T& value) {
   return error == std::errc() && end == text.data() + text.size();
 }
 
-// Shortest forms only, no surrogates, nothing beyond U+10FFFF.
-bool isUtf8(std::string_view text) {
-  for (std::size_t i = 0; i < text.size();) {
-    const auto byte = [&](std::size_t at) -> std::uint32_t {
-      return at < text.size() ? static_cast<unsigned char>(text[at]) : 0;
-    };
-    const std::uint32_t first = byte(i++);
-    if (first < 0x80) continue;
-    const std::size_t more = first >= 0xf0 ? 3 : first >= 0xe0 ? 2 : 1;
-    if (first < 0xc2 || first > 0xf4) return false;
-    std::uint32_t character = first & (0x3fu >> more);
-    for (std::size_t n = 0; n < more; ++n, ++i) {
-      if ((byte(i) & 0xc0) != 0x80) return false;
-      character = character << 6 | (byte(i) & 0x3f);
-    }
-    if (more == 2 && (character < 0x800 || (character >= 0xd800 && character < 0xe000))) {
-      return false;
-    }
-    if (more == 3 && (character < 0x10000 || character > 0x10ffff)) return false;
+bool isUTF8(std::string_view text) {
+  while (!text.empty()) {
+    const std::size_t length = platform::host::firstCharacter(text).length;
+    if (length == 0) return false;
+    text.remove_prefix(length);
   }
   return true;
 }
@@ -55,17 +43,19 @@ std::string keyProblem(std::string_view key) {
     return platform::format("the key has %zu bytes, more than %zu", key.size(), kLongestKey);
   }
   if (key.find('\0') != std::string_view::npos) return "the key holds a NUL";
-  if (!isUtf8(key)) return "the key is not UTF-8";
+  if (!isUTF8(key)) return "the key is not UTF-8";
   return {};
 }
 
 Result<std::int32_t> parseDay(std::string_view text, std::int32_t today) {
   if (text == "today") return Result<std::int32_t>::success(today);
   if (text == "yesterday") return Result<std::int32_t>::success(platform::dayBefore(today));
-  std::int32_t day = 0;
-  if (parsed(text, day)) return Result<std::int32_t>::success(day);
-  return Result<std::int32_t>::failure(quoted(text) +
-                                       " is not a day: a day number, today or yesterday");
+  std::int64_t day = 0;
+  if (parsed(text, day)) return dayOf(day);
+  const auto midnight = platform::host::secondsFromTimestamp(std::string(text) + "T00:00:00Z");
+  if (midnight && *midnight >= 0) return dayOf(platform::dayNumber(*midnight));
+  return Result<std::int32_t>::failure(
+      quoted(text) + " is not a day: a day number, a date as 2026-11-22, today or yesterday");
 }
 
 Result<std::int64_t> parseInteger(std::string_view text) {
@@ -98,11 +88,11 @@ Result<std::int32_t> secondInDay(std::int64_t second) {
 }
 
 Result<std::int32_t> dayOf(std::int64_t number) {
-  if (number >= std::numeric_limits<std::int32_t>::min() &&
-      number <= std::numeric_limits<std::int32_t>::max()) {
+  if (number >= 0 && number <= std::numeric_limits<std::int32_t>::max()) {
     return Result<std::int32_t>::success(static_cast<std::int32_t>(number));
   }
-  return Result<std::int32_t>::failure(std::to_string(number) + " is not a day number of 32 bits");
+  return Result<std::int32_t>::failure(std::to_string(number) +
+                                       " is not a day number, 0 to 2147483647");
 }
 
 }  // namespace pelloran

@@ -13,7 +13,7 @@ namespace pelloran {
 // What is wrong with a key, or the empty text. A key is 1 to 1,024 bytes of UTF-8 without a NUL.
 std::string keyProblem(std::string_view key);
 
-// A day number, or "today" or "yesterday".
+// A day number, a date such as "2026-11-22", or "today" or "yesterday"; none before 1970.
 platform::Result<std::int32_t> parseDay(std::string_view text, std::int32_t today);
 
 platform::Result<std::int64_t> parseInteger(std::string_view text);
@@ -27,6 +27,7 @@ platform::Result<std::int64_t> integral(double value);
 // A second within a day.
 platform::Result<std::int32_t> secondInDay(std::int64_t second);
 
+// A day number, from 0.
 platform::Result<std::int32_t> dayOf(std::int64_t number);
 
 }  // namespace pelloran

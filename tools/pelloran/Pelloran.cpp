@@ -9,8 +9,11 @@
 #include <optional>
 #include <ostream>
 #include <unordered_set>
+#include <vector>
 
 #include "platform/Convert.h"
+#include "tools/common/ClosestName.h"
+#include "tools/common/TerminalText.h"
 #include "tools/pelloran/Arguments.h"
 #include "tools/pelloran/ImportLine.h"
 #include "tools/pelloran/MachineFigures.h"
@@ -45,10 +48,17 @@ class Progress {
 
 // What the command line says, as text; each command looks at its own part.
 struct Arguments {
+  std::string command;
   std::string key, value, prefix;
   std::optional<std::string> day, seconds, file, every, lasting;
   bool json = false;
 };
+
+// `command` is empty, or begins with a blank.
+int wrongUsage(std::ostream& err, const std::string& why, const std::string& command) {
+  err << "pelloran: " << tools::printable(why) << " (see 'pelloran" << command << " --help')\n";
+  return kUsage;
+}
 
 class Command {
  public:
@@ -127,12 +137,11 @@ class Command {
 
  private:
   int failed(const std::string& why) {
-    environment_.err << "pelloran: " << why << '\n';
+    environment_.err << "pelloran: " << tools::printable(why) << '\n';
     return kFailed;
   }
   int usage(const std::string& why) {
-    failed(why);
-    return kUsage;
+    return wrongUsage(environment_.err, why, " " + arguments_.command);
   }
   template <typename From, typename To>
   bool given(const platform::Result<From>& result, To& value) {
@@ -206,11 +215,31 @@ class Command {
 
 }  // namespace
 
+namespace {
+
+// What is wrong with a command line that names no command, or one that isn't there.
+std::string withoutCommand(const CLI::App& app, const CLI::ParseError& error) {
+  const std::vector<std::string> words = app.remaining();
+  if (words.empty()) return error.what();
+  if (words.front().starts_with('-')) return CLI::ExtrasError(words).what();
+  std::vector<std::string> names;
+  for (const CLI::App* command : app.get_subcommands({})) names.push_back(command->get_name());
+  const std::string_view closest =
+      tools::closestName(words.front(), std::vector<std::string_view>(names.begin(), names.end()));
+  return "there is no command '" + words.front() + "'" +
+         (closest.empty() ? "" : "; did you mean '" + std::string(closest) + "'?");
+}
+
+}  // namespace
+
 int runPelloran(const Environment& environment, int argc, const char* const* argv) {
   Arguments arguments;
   int (*work)(Command&) = nullptr;
-  const auto runs = [&work](CLI::App* command, int (*itsWork)(Command&)) {
-    command->callback([&work, itsWork] { work = itsWork; });
+  const auto runs = [&](CLI::App* command, int (*itsWork)(Command&)) {
+    command->callback([&arguments, &work, command, itsWork] {
+      arguments.command = command->get_name();
+      work = itsWork;
+    });
   };
 
   CLI::App app("Writes and reads the counters of a device.", "pelloran");
@@ -228,7 +257,7 @@ int runPelloran(const Environment& environment, int argc, const char* const* arg
       {"push", "Add a sample to a distribution", "a number",
        [](Command& command) { return command.change(CounterChange::Kind::push); }},
   };
-  constexpr char dayDescription[] = "a day number, today or yesterday";
+  constexpr char dayDescription[] = "a day number, a date as 2026-11-22, today or yesterday";
   for (const auto& writer : writers) {
     CLI::App* command = app.add_subcommand(writer.name, writer.description);
     command->add_option("KEY", arguments.key, "the counter")->required();
@@ -263,8 +292,9 @@ int runPelloran(const Environment& environment, int argc, const char* const* arg
     app.parse(argc, argv);
   } catch (const CLI::ParseError& error) {
     if (error.get_exit_code() == 0) return app.exit(error, environment.out, environment.err);
-    environment.err << "pelloran: " << error.what() << '\n';
-    return kUsage;
+    const auto named = app.get_subcommands();
+    return named.empty() ? wrongUsage(environment.err, withoutCommand(app, error), "")
+                         : wrongUsage(environment.err, error.what(), " " + named[0]->get_name());
   }
   Command command(environment, arguments);
   return work(command);

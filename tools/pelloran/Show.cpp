@@ -10,6 +10,7 @@
 
 #include "platform/CivilDate.h"
 #include "platform/Text.h"
+#include "tools/common/TerminalText.h"
 
 namespace pelloran {
 
@@ -81,14 +82,6 @@ std::string summary(PLHistoryDistributionEnumerator& samples) {
   return text + platform::format("  min %.10g  mean %.10g  max %.10g", least, mean, most);
 }
 
-// A key as a terminal may show it: nothing in it moves the cursor.
-std::string printable(std::string key) {
-  for (char& c : key) {
-    if (static_cast<unsigned char>(c) < 0x20 || c == 0x7f) c = '?';
-  }
-  return key;
-}
-
 std::string dateText(std::int32_t day) {
   const platform::CivilDate date = platform::civilFromDays(day);
   return platform::format("%04lld-%02d-%02d", static_cast<long long>(date.year), date.month,
@@ -100,19 +93,19 @@ std::string dateText(std::int32_t day) {
 void showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
   std::vector<std::array<std::string, 4>> lines = {{"DAY", "DATE", "KEY", "VALUE"}};
   for (Row& row : rowsOf(history, shown, scalarText, summary)) {
-    lines.push_back({std::to_string(row.day), dateText(row.day), printable(std::move(row.key)),
+    lines.push_back({std::to_string(row.day), dateText(row.day), tools::printable(row.key),
                      std::move(row.text)});
   }
   if (lines.size() == 1) return;
   std::array<std::size_t, 3> widths{};
   for (const auto& line : lines) {
     for (std::size_t i = 0; i < widths.size(); ++i) {
-      widths[i] = std::max(widths[i], line[i].size());
+      widths[i] = std::max(widths[i], tools::columnsOf(line[i]));
     }
   }
   for (const auto& line : lines) {
     for (std::size_t i = 0; i < widths.size(); ++i) {
-      out << line[i] << std::string(widths[i] - line[i].size() + 2, ' ');
+      out << line[i] << std::string(widths[i] - tools::columnsOf(line[i]) + 2, ' ');
     }
     out << line.back() << '\n';
   }

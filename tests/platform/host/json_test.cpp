@@ -33,6 +33,8 @@ TEST(JSON, Form) {
             R"("\"\\/\u0008\n\r\t\u001f)"
             "\x7F\xC3\xA4\xEF\xBF\xBD"
             R"(\u0000z")");
+  const Dictionary twice{{"\x01", 1}, {"\xFF", 2}};
+  EXPECT_EQ(json(twice), "{\"\xEF\xBF\xBD\": 2}") << "a key stands once";
 }
 
 TEST(JSON, IsValidWhateverTheBytes) {

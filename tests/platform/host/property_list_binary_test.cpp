@@ -49,6 +49,8 @@ TEST(PropertyListBinary, ReadsEveryObject) {
                "\xEF\xBF\xBD\xEF\xBF\xBD"
                "a"},
            Row{"\x61\xD8\x3D"sv, "\xEF\xBF\xBD"},
+           Row{"\x53\x01\t\x7F"sv, "\xEF\xBF\xBD\t\x7F"},
+           Row{"\x62\0\x1F\xFF\xFF"sv, "\xEF\xBF\xBD\xEF\xBF\xBD"},
            Row{"\xA0"sv, Array{}},
            Row{"\xD0"sv, Dictionary{}},
        }) {
@@ -118,8 +120,11 @@ TEST(PropertyListBinary, KeysAreTextsAndTheLaterCounts) {
   BinaryPropertyList list;
   const std::size_t key = list.add("k"), one = list.add(1), two = list.add(2);
   const std::size_t twice = list.container(0xD, {key, key, one, two});
+  const std::size_t asWritten = list.container(0xD, {list.add("\x01"), list.add("\xFF"), one, two});
   const std::size_t wrong = list.container(0xD, {one, key});
   EXPECT_EQ(*readBinaryPropertyList(list.finish(twice)), Value(Dictionary{{"k", 2}}));
+  EXPECT_EQ(*readBinaryPropertyList(list.finish(asWritten)),
+            Value(Dictionary{{"\xEF\xBF\xBD", 2}}));
   EXPECT_FALSE(readBinaryPropertyList(list.finish(wrong)));
 }
 

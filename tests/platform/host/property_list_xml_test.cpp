@@ -133,6 +133,10 @@ TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
            "<data>A*AA</data>",
            "<string>&nbsp;</string>",
            "<string>&#0;</string>",
+           "<string>&#1;</string>",
+           "<key>\x1F</key>",
+           "<string>&#xFFFE;</string>",
+           "<string>\xEF\xBF\xBF</string>",
            "<string>\xFF</string>",
            "<string>a",
            "<array><true/></dict>",
@@ -225,7 +229,8 @@ TEST(PropertyListXML, WritesThisAndNothingElse) {
             "</plist>\n");
 }
 
-TEST(PropertyListXML, WhatCantBeTextIsReplacedByteByByte) {
+// A key alone, and beside one that becomes the same: the later counts.
+TEST(PropertyListXML, WhatCantBeTextIsReplaced) {
   const std::string r = "\xEF\xBF\xBD";
   struct Row {
     const char* bytes;
@@ -236,7 +241,8 @@ TEST(PropertyListXML, WhatCantBeTextIsReplacedByteByByte) {
            Row{"\x80\xC0\xAF\xC3", r + r + r + r},
            Row{"\xE0\x9F\xBF", r + r + r},
            Row{"\xED\xA0\x80", r + r + r},
-           Row{"\xEF\xBF\xBE\xEF\xBF\xBF", r + r + r + r + r + r},
+           Row{"\xEF\xBF\xBE\xEF\xBF\xBF", r + r},
+           Row{"eight bytes, and then\x1F", "eight bytes, and then" + r},
            Row{"\xF0\x8F\xBF\xBF", r + r + r + r},
            Row{"\xF4\x90\x80\x80", r + r + r + r},
            Row{"\xE2\x82z", r + r + "z"},
@@ -244,6 +250,7 @@ TEST(PropertyListXML, WhatCantBeTextIsReplacedByteByByte) {
                "\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80"},
        }) {
     EXPECT_EQ(*read(*write(row.bytes)), Value(row.text)) << row.text;
+    EXPECT_EQ(*write(Dictionary{{row.bytes, 1}, {row.text, 2}}), *write(Dictionary{{row.text, 2}}));
   }
 }
 
