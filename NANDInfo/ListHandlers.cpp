@@ -48,15 +48,14 @@ const std::string* characteristic(Platform& platform, const Dictionary& device, 
   return text;
 }
 
-// The first six bytes of the identifier but the lowest, in the order in which they are read.
+}  // namespace
+
 std::uint64_t vendorCode(Platform& platform, std::string_view identifier) {
   const auto high = hexStringToInt32(platform, identifier.substr(0, 4)) & 0xFFFF;
   const auto low =
       hexStringToInt32(platform, identifier.substr(std::min<std::size_t>(4, identifier.size())));
   return std::uint64_t{high} << 32 | (low & 0xFFFFFF00);
 }
-
-}  // namespace
 
 bool DumpValidityList(Platform& platform, std::span<const std::byte> list, const platform::Value&,
                       std::string_view) {

@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <span>
 #include <string_view>
 
@@ -28,6 +29,10 @@ ListHandler DumpValidityList;
 
 // A structured-data log for each channel.
 ListHandler DumpTelemetryList;
+
+// The vendor that a "manufacturer-id" names: its first six bytes but the lowest, in the order in
+// which they are read.
+std::uint64_t vendorCode(platform::Platform& platform, std::string_view identifier);
 
 // A structured-data log for the list, and one for each defect.
 ListHandler DumpDefectsList;

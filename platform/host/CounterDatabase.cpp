@@ -121,8 +121,9 @@ bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error
     if (creates) error = "there is no home folder for the counters database";
     return false;
   }
-  folderPath_ = *home + "/Library/Pelloran";
-  folder_ = place_.root.openFolder(folderPath_, missing);
+  const std::string folder = *home + "/Library/Pelloran";
+  folderPath_ = place_.root.hostPath(folder);
+  folder_ = place_.root.openFolder(folder, missing);
   if (folder_) return true;
   // EBADF: there is no device root.
   if (!creates && (errno == ENOENT || errno == EBADF)) return false;

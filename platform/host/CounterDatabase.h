@@ -72,7 +72,7 @@ class CounterDatabase {
   std::string located(const std::string& text) const;
 
   const CounterPlace& place_;
-  std::string folderPath_;  // of the device
+  std::string folderPath_;  // of the host, for messages
   FileDescriptor folder_;
   Identity opened_;
   std::unique_ptr<sqlite::Connection> connection_;

@@ -22,7 +22,19 @@ std::string relative(std::string_view path) {
 }  // namespace
 
 DeviceRoot::DeviceRoot(std::string path)
-    : path_(std::move(path)), root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)) {}
+    : path_(std::move(path)),
+      root_(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC)),
+      error_(root_ ? 0 : errno) {}
+
+std::string DeviceRoot::problem(const char* what) const {
+  return error_ == 0 ? "" : std::string(what) + " " + path_ + ": " + std::strerror(error_);
+}
+
+std::string DeviceRoot::hostPath(std::string_view path) const {
+  std::string hostPath = path_;
+  if (!hostPath.ends_with('/')) hostPath += '/';
+  return hostPath + relative(path);
+}
 
 FileDescriptor DeviceRoot::open(const std::string& path, int flags, Links links) const {
   if (!root_ || path.find('\0') != std::string::npos) {

@@ -23,6 +23,13 @@ class DeviceRoot {
 
   const std::string& path() const { return path_; }
 
+  // Why nothing can be had from this root: its path, which is `what`, and the reason. Empty when it
+  // is a folder.
+  std::string problem(const char* what = "the device root") const;
+
+  // A device path as a path of the host, for who is to find the file.
+  std::string hostPath(std::string_view path) const;
+
   // Opens a file for reading; links are followed, within the root. The file may be of any kind, and
   // opening never blocks. On failure the descriptor is empty and errno says why.
   FileDescriptor openForReading(std::string_view path) const;
@@ -48,6 +55,7 @@ class DeviceRoot {
 
   std::string path_;
   FileDescriptor root_;
+  int error_;  // of the root's opening; 0
 };
 
 }  // namespace platform::host

@@ -42,14 +42,18 @@ HostOptions HostOptions::fromEnvironment() {
 // In the order of construction: each service stands after those that it uses.
 struct Host::Services {
   explicit Services(const HostOptions& options)
-      : root(options.root), log(options.lowestLevel), played(options.played) {}
+      : root(options.root),
+        ownLog(options.lowestLevel),
+        log(options.log != nullptr ? *options.log : ownLog),
+        played(options.played) {}
 
   void countDamagedDatabase() {
     preferences.addToInteger("DatabaseCorruptionCount", "com.norba.pellorand", 1);
   }
 
   DeviceRoot root;
-  StandardErrorLog log;
+  StandardErrorLog ownLog;
+  SystemLog& log;
   const std::optional<PlayedRun> played;
   HostStandardStreams streams;
   const std::unique_ptr<SystemClock> ownClock =

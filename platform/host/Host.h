@@ -17,6 +17,7 @@ struct HostOptions {
   std::string root = "/";  // the device root, a path of the host
   LogLevel lowestLevel = LogLevel::standard;
   std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
+  SystemLog* log = nullptr;              // borrowed; instead of the one on standard error
 
   // As the environment says: MORVEND_ROOT and MORVEND_LOG.
   static HostOptions fromEnvironment();

@@ -93,7 +93,8 @@ CallResult deliverData(const Answer& answer, DriverFiles& files, std::span<std::
 
 void DriverFiles::say(const std::string& name, const char* problem) {
   if (!said_.insert(name).second) return;
-  log_.log(LogLevel::error, "device/%s: %s", shownText(name).c_str(), problem);
+  log_.log(LogLevel::error, "%s/%s: %s", root_.hostPath("device").c_str(), shownText(name).c_str(),
+           problem);
 }
 
 bool DriverFiles::isBelowDevice(const std::string& name) {

@@ -10,9 +10,10 @@
 // The fuzz targets as they are, each entry renamed after its file (see tests/CMakeLists.txt).
 extern "C" {
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
-FuzzTarget binary_property_list_fuzz, bus_message_fuzz, defects_list_fuzz, ftl_statistics_fuzz,
-    import_lines_fuzz, kernel_snapshot_fuzz, legacy_statistics_fuzz, msp_statistics_fuzz,
-    registry_fuzz, telemetry_list_fuzz, validity_list_fuzz, xml_property_list_fuzz;
+FuzzTarget binary_property_list_fuzz, bus_message_fuzz, decoded_buffer_fuzz, defects_list_fuzz,
+    ftl_statistics_fuzz, import_lines_fuzz, kernel_snapshot_fuzz, legacy_statistics_fuzz,
+    msp_statistics_fuzz, registry_fuzz, telemetry_list_fuzz, validity_list_fuzz,
+    xml_property_list_fuzz;
 }
 
 namespace {
@@ -25,6 +26,7 @@ struct Row {
 constexpr Row kTargets[] = {
     {"binary_property_list_fuzz", binary_property_list_fuzz},
     {"bus_message_fuzz", bus_message_fuzz},
+    {"decoded_buffer_fuzz", decoded_buffer_fuzz},
     {"defects_list_fuzz", defects_list_fuzz},
     {"ftl_statistics_fuzz", ftl_statistics_fuzz},
     {"import_lines_fuzz", import_lines_fuzz},

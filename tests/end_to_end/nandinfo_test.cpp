@@ -18,16 +18,19 @@ struct Output {
   std::string out, err;
 };
 
-// Runs nandinfo with standard output in a file, as the shell would have it in a pipe.
-Output nandinfo(const Device& device, const std::string& arguments, std::string to = "") {
+// Runs a line of the shell in which "$p" is the folder of the programs, with standard output in a
+// file; as a user does, who doesn't ask for the log.
+Output shell(const std::string& root, const std::string& line, std::string to = "") {
   const support::TemporaryFolder folder;
   if (to.empty()) to = folder / "out";
-  const std::string command = PROGRAMS "/nandinfo " + arguments + " > " + to + " < /dev/null";
   const auto outcome =
-      faults::run({"/bin/sh", "-c", command},
-                  {"MORVEND_ROOT=" + device.root().path().string(), "MORVEND_LOG=error",
-                   "DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent"});
+      faults::run({"/bin/sh", "-c", "p=" PROGRAMS "; exec > " + to + " < /dev/null; " + line},
+                  {"MORVEND_ROOT=" + root, "DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent"});
   return {outcome.status, folder.read("out"), outcome.standardError};
+}
+
+Output nandinfo(const Device& device, const std::string& arguments, const std::string& to = "") {
+  return shell(device.root().path(), "$p/nandinfo " + arguments, to);
 }
 
 Device deviceWithController() {
@@ -56,7 +59,8 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
       {"magazine --hours 24", 0, "\"hostWrites\": 24,\n", ""},
       {"nvram", 0, "{}", ""},
       {"decode msp -", 1, "\"ok\": false", "nandinfo: decode msp: "},
-      {"ftl --unknown", 2, "", "nandinfo: The following argument was not expected: --unknown\n"},
+      {"ftl --unknown", 2, "",
+       "nandinfo: The following argument was not expected: --unknown (see "},
   };
   for (const auto& row : rows) {
     const Output output = nandinfo(device, row.arguments);
@@ -68,6 +72,68 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
   }
   EXPECT_EQ(nandinfo(device, "disk", "/dev/full").err,
             "nandinfo: disk: the output can't be written\n");
+}
+
+// Reasons name the file as the user finds it; nothing else is said unless it is asked for.
+TEST(NandinfoProgram, SaysInOneLineWhatWentWrong) {
+  const Device device = deviceWithController();
+  const std::string root = device.root().path();
+  EXPECT_EQ(nandinfo(device, "ftl").err, "");
+  EXPECT_EQ(shell(root, "MORVEND_LOG=default $p/nandinfo ftl --compact").err,
+            "<5>NANDInfo: findNandExporterNew: Controller found: NorbaQRT3NVMeController\n");
+  const std::string dump = nandinfo(device, "dump").err;
+  EXPECT_TRUE(dump.starts_with("nandinfo: dump: not every list was dumped: DrvCall")) << dump;
+  EXPECT_NE(dump.find("; ERROR: Could not determine the manufacturer-id; "), std::string::npos);
+  std::filesystem::remove(device.root() / "device/statistics");
+  EXPECT_EQ(nandinfo(device, "health lab").err,
+            "nandinfo: health lab: the storage controller NorbaQRT3NVMeController answers no "
+            "command (status 0x1): " +
+                root + "/device/statistics: No such file or directory\n");
+  device.root().write("device/registry.plist", "<plist><dict>");
+  const Output broken = nandinfo(device, "extract");
+  EXPECT_EQ(broken.status, 1);
+  EXPECT_EQ(broken.out, "");
+  EXPECT_TRUE(broken.err.starts_with("nandinfo: extract: no storage controller found: "));
+  EXPECT_NE(broken.err.find(": " + root + "/device/registry.plist: "), std::string::npos);
+  EXPECT_EQ(std::count(broken.err.begin(), broken.err.end(), '\n'), 1) << broken.err;
+  EXPECT_EQ(device.names("var/spool/morvend"), Lines());
+}
+
+TEST(Programs, ARootThatIsNoneIsAnError) {
+  const Device device;
+  device.root().write("file", "");
+  for (const std::string name : {"none", "file"}) {
+    const std::string root = device.root() / name.c_str();
+    const std::string problem = "the device root " + root + ": ";
+    for (const char* line : {"$p/nandinfo disk", "$p/nandinfo decode ftl -", "$p/pelloran show",
+                             "$p/pelloran set key 1"}) {
+      const Output output = shell(root, line);
+      EXPECT_EQ(output.status, 1) << line;
+      EXPECT_NE(output.err.find(problem), std::string::npos) << output.err;
+      EXPECT_EQ(std::count(output.err.begin(), output.err.end(), '\n'), 1) << output.err;
+      EXPECT_EQ(output.out, "");
+    }
+    EXPECT_TRUE(shell(root, "$p/morvend -d").err.starts_with("<3>" + problem));
+    EXPECT_EQ(shell(root, "$p/nandinfo --version && $p/pelloran --help").status, 0);
+  }
+}
+
+// A reader that goes away ends a command as the signal does, after its work is done.
+TEST(Programs, AReaderThatGoesAwayIsNoFailure) {
+  const Device device = deviceWithController();
+  const std::string root = device.root().path();
+  shell(root, "for i in 1 2 3 4; do $p/pelloran set key.$i 1; done");
+  for (const char* line :
+       {"$p/nandinfo ftl --all", "$p/nandinfo --help", "$p/pelloran show", "$p/nandinfo extract"}) {
+    // The reader closes the pipe, and then lets the command begin.
+    const Output output = shell(root, std::string("mkfifo $MORVEND_ROOT/gone; { read x < "
+                                                  "$MORVEND_ROOT/gone; ") +
+                                          line +
+                                          "; echo $? >&2; } | { exec <&-; echo x > "
+                                          "$MORVEND_ROOT/gone; }; rm $MORVEND_ROOT/gone");
+    EXPECT_EQ(output.err, "141\n") << line;
+  }
+  EXPECT_EQ(device.names("var/spool/morvend"), Lines{"events.jsonl"});
 }
 
 // On a made device, all of whose events are used.

@@ -7,6 +7,8 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/ProcessState.h"
+#include "support/ControllerLists.h"
+#include "support/ControllerRoot.h"
 #include "support/StorageDevice.h"
 #include "support/TemporaryFolder.h"
 #include "tools/nandinfo/Commands.h"
@@ -51,7 +53,8 @@ class Nandinfo : public testing::Test {
 TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
   const Words commands[] = {
       {},
-      {"cookbook"},
+      {"helth"},
+      {"--json", "cookbook"},
       {"info", "disk"},
       {"info", "--round"},
       {"ftl", "--round", "--all"},
@@ -81,9 +84,20 @@ TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
   for (const auto& command : commands) {
     EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
     EXPECT_TRUE(err.starts_with("nandinfo: ")) << err;
+    EXPECT_TRUE(err.ends_with(" --help')\n")) << err;
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
     EXPECT_EQ(err.find('\x1b'), std::string::npos);
     EXPECT_EQ(out, "");
+  }
+  const std::pair<Words, const char*> messages[] = {
+      {{"helth"}, "there is no command 'helth'; did you mean 'health'? (see 'nandinfo --help')"},
+      {{"--json", "zzz"}, "there is no command 'zzz' (see 'nandinfo --help')"},
+      {{"decode", "tfl", "x"}, "no command 'decode tfl'; did you mean 'ftl'? (see "},
+      {{"ean", "image-size"}, "(see 'nandinfo ean image-size --help')"},
+  };
+  for (const auto& [command, message] : messages) {
+    run(command);
+    EXPECT_NE(err.find(message), std::string::npos) << err;
   }
   for (const nandinfo::Command& command : nandinfo::commands()) {
     Words words{command.name, "--help"};
@@ -130,6 +144,148 @@ TEST_F(Nandinfo, DecodesAFileOrSaysWhatIsWrongWithIt) {
   }
 }
 
+// Every kind of bytes, given to every decoder that isn't for it.
+TEST_F(Nandinfo, RefusesABufferOfAnotherKind) {
+  const auto text = [](std::string_view characters) {
+    const auto* bytes = reinterpret_cast<const std::byte*>(characters.data());
+    return support::Bytes(bytes, bytes + characters.size());
+  };
+  const struct {
+    const char* name;
+    std::string_view decoder;
+    support::Bytes bytes;
+  } kinds[] = {
+      {"FTL statistics", "ftl", support::everyFTLCounter()},
+      {"MSP statistics", "msp", support::everyMSPCounter(1)},
+      {"a validity list", "validity", support::validityList(2, {{3, 70}, {3, 80}, {15, 90}})},
+      {"a defects list", "defects", support::defectsList(9, {{0x20001, 1, 2, 3, 4, 5, 0xFB, 1}})},
+      {"a kernel snapshot", "snapshot", support::kernelSnapshot(4096)},
+      {"a property list", "", text("<?xml version=\"1.0\"?>\n<plist><dict/></plist>")},
+      {"a property list", "", text("bplist00\1\2\3\4\5\6")},
+      {"a text", "", text("hostWrites 17, and 18 \xC3\xA4\n")},
+  };
+  for (const auto& kind : kinds) {
+    const std::string path = file("buffer", kind.bytes);
+    for (const std::string_view decoder :
+         {"ftl", "ftl-stat", "legacy", "msp", "validity", "defects", "snapshot"}) {
+      const bool ftl = decoder.starts_with("ftl") || decoder == "legacy";
+      const bool own = kind.decoder == (ftl ? "ftl" : decoder);
+      EXPECT_EQ(run({"decode", std::string(decoder), path, "--compact"}), own ? 0 : 1) << err;
+      EXPECT_EQ(out.starts_with(R"({"ok": true)"), own) << out.substr(0, 200);
+      const std::string refusal = own ? "" : path + ": it holds " + kind.name + ", not ";
+      EXPECT_NE(err.find(refusal), std::string::npos) << err;
+    }
+    EXPECT_EQ(run({"decode", "counters", "q8", path}), 1);
+    support::Bytes cut(kind.bytes.begin(), kind.bytes.begin() + 3);
+    for (const char* decoder : {"ftl", "msp", "validity", "defects", "snapshot"}) {
+      EXPECT_EQ(run({"decode", decoder, file("cut", cut)}), 1);
+      EXPECT_NE(err.find("/cut: 3 bytes are too few for "), std::string::npos) << err;
+    }
+  }
+}
+
+TEST_F(Nandinfo, DecodesListsAndSnapshots) {
+  const auto validity = file("v", support::validityList(2, {{3, 70}, {16, 0}, {3, 80}, {15, 90}}));
+  const auto defects = file("d", support::defectsList(9, {{0x20001, 1, 2, 3, 4, 5, 0xFB, 2}}));
+  const auto telemetry = file("t", support::telemetryList(2));
+  const auto snapshot = file("s", support::kernelSnapshot(4096));
+  auto bytes = support::telemetryList(2);
+  bytes.push_back(std::byte{0});
+  const auto longer = file("l", bytes);
+  const struct {
+    Words command;
+    int status;
+    const char* out;
+  } rows[] = {
+      {{"validity", validity},
+       0,
+       R"("fields": [["ValidityList[3]", [70, 80]], ["ValidityList[15]", [90]]], "error": "NA"})"},
+      {{"defects", defects},
+       0,
+       R"("Factory Count": 9, "defects": [{"Bus": 1, "CE": 2, "CAU": 1, "Block": 2, "Cycle": 3, )"
+       R"("Reason": 4, "Page": 5, "Temperature": -5, "Mode": 2}], "error")"},
+      {{"telemetry", "q8", telemetry}, 0, R"("1": {"RD": 100, "PE": 101, )"},
+      {{"telemetry", "1y", telemetry}, 0, R"("dspExceptionParameter[11]": 1)"},
+      {{"telemetry", "1y", longer}, 1, "8257 bytes are no whole number of channels"},
+      {{"telemetry", "1y", longer, "--channels", "2"}, 0, R"("channels": {"0": {"RD": 0, )"},
+      {{"telemetry", "1y", longer, "--channels", "3"}, 1, "there are not 3 channels in it"},
+      {{"telemetry", "1y", snapshot}, 1, "it holds a kernel snapshot, not a telemetry list"},
+      {{"snapshot", snapshot},
+       0,
+       R"(["VM_swapout[3]", 4096]], "items": [{"type": "container begin", "count": 1, "bytes": 8}, )"},
+      {{"snapshot", telemetry}, 1, "no container"},
+  };
+  for (auto [command, status, part] : rows) {
+    command.insert(command.begin(), {"decode", "--compact"});
+    EXPECT_EQ(run(command), status) << err;
+    EXPECT_NE((out + err).find(part), std::string::npos) << out;
+  }
+  terminal = true;
+  EXPECT_EQ(run({"decode", "telemetry", "1y", telemetry}), 0);
+  EXPECT_NE(out.find("channels:\n"), std::string::npos);
+  EXPECT_NE(out.find("\nPE                               1    101\n"), std::string::npos) << out;
+}
+
+// What a capture says of itself is as foreign as its buffers.
+TEST_F(Nandinfo, DecodesAWholeCapture) {
+  const auto capture = [this](const Dictionary& buffers) {
+    platform::host::HostPropertyListCodec codec;
+    const Dictionary chip{{"chip-id", "QM8"}, {"manufacturer-id", "00"}, {"num-bus", 1}};
+    folder.write(
+        "c/registry.plist",
+        *codec.writeXML(Dictionary{
+            {"Children",
+             Array{5, Dictionary{{"Class", support::kQRT3},
+                                 {"Properties", Dictionary{{"Controller Characteristics", chip}}},
+                                 {"Driver", Dictionary{{"Buffers", buffers}}}}}}}));
+    return run({"decode", "capture", folder / "c", "--compact"});
+  };
+  const Array refused{Dictionary{{"File", "none"}, {"FailSize", 5}}};
+  file("outside", support::everyFTLCounter());
+  file("c/ftl", support::words({header(4, 1), 7}));
+  file("c/kernel-snapshot.bin", support::kernelSnapshot(4096));
+  const Dictionary good{{"13", "ftl"},
+                        {"221:1", support::data(support::everyMSPCounter(1))},
+                        {"17:0", support::data(support::telemetryList(1))},
+                        {"11:0", Dictionary{{"Data", platform::Data()}, {"Announce", 5}}},
+                        {"15:0", refused.front()},
+                        {"39\x1b:0", "ftl"},
+                        {"22:0", "ftl"}};
+  EXPECT_EQ(capture(good), 0) << err;
+  for (const char* part :
+       {R"({"ok": true, "class": "NorbaQRT3NVMeController", "statistics 0": {"ok": true, )"
+        R"("fields": [["hostWrites", 7]], "error": "NA"}, "msp 1": {"ok": true, "fields": [["pass)",
+        R"("telemetry 0": {"ok": true, "channels": {"0": {"RD": 0, )",
+        R"("retentionIndication[0]")",
+        R"("kernel-snapshot": {"ok": true, "fields": [["VM_swapout[0]", 1])",
+        R"("undecoded": ["buffer 39)", R"(, "snapshot 0"], "error": "NA"})"}) {
+    EXPECT_NE(out.find(part), std::string::npos) << part << out;
+  }
+  const struct {
+    Dictionary buffers;
+    const char* err;
+  } rows[] = {
+      {{{"13", "../outside"}}, "/c: statistics 0: No such file or directory\n"},
+      {{{"13:0", support::data(support::everyMSPCounter(1))}, {"221:0", "ftl"}},
+       "/c: statistics 0: it holds MSP statistics, not FTL statistics\n"},
+      {{{"10:4", "big"}}, "/c: read-statistics 4: the capture is longer than 16 MiB\n"},
+  };
+  file("c/big", support::Bytes(NANDInfo::kLargestBuffer));
+  for (const auto& row : rows) {
+    EXPECT_EQ(capture(row.buffers), 1);
+    EXPECT_NE(err.find(row.err), std::string::npos) << err;
+    EXPECT_TRUE(out.starts_with(R"({"ok": false, )")) << out;
+  }
+  std::filesystem::remove(folder / "c/kernel-snapshot.bin");
+  EXPECT_EQ(capture({{"22:0", "ftl"}}), 1);
+  folder.write("c/registry.plist", "<plist><dict>");
+  for (const char* path : {"c", "outside", "none"}) {
+    EXPECT_EQ(run({"decode", "capture", folder / path}), 1);
+    EXPECT_EQ(out, "null\n");
+    EXPECT_NE(err.find(folder / path), std::string::npos) << err;
+  }
+}
+
 // The bounds are those of the layouts: one word less than they read isn't enough, and what lies
 // beyond is as good as zero.
 TEST_F(Nandinfo, DecodesCounterBlocksThatHoldWhatTheLayoutReads) {
@@ -155,43 +311,83 @@ TEST_F(Nandinfo, DecodesCounterBlocksThatHoldWhatTheLayoutReads) {
   }
 }
 
-TEST_F(Nandinfo, SaysWhenThereIsNoController) {
+// A verdict, a sum or an event that nobody has answered for.
+TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
+  const Words commands[] = {{"info"},
+                            {"daily"},
+                            {"ftl"},
+                            {"ftl", "--all"},
+                            {"msp", "--round"},
+                            {"storage"},
+                            {"health", "servita"},
+                            {"health", "lab"},
+                            {"health", "ota"},
+                            {"magazine", "--hours", "24"},
+                            {"magazine", "--history"},
+                            {"extract", "--monthly"},
+                            {"extract", "--from", "3"},
+                            {"dump"}};
+  auto& registry = device.registry;
+  registry.add({.className = "NvramDiagService", .properties = {{"CommonUsed", 5}}});
   const struct {
-    Words command;
-    int status;
-    const char* out;
-  } rows[] = {
-      {{"info"}, 1, "com.norba.NANDInfo.Error"},
-      {{"ftl"}, 1, "TLM_APIErrorMessage"},
-      {{"ftl", "--all"}, 1, ""},
-      {{"msp", "--round"}, 1, "TLM_APIErrorMessage"},
-      {{"storage"}, 0, "EAN_imageSize_BIC"},
-      {{"health", "servita"}, 1, "TLM_APIErrorMessage"},
-      {{"health", "lab"}, 0, "IsNANDRetirable"},
-      {{"health", "ota"}, 0, "{}"},
-      {{"daily"}, 1, "com.norba.NANDInfo.Error"},
-      {{"magazine", "--hours", "24"}, 0, "IsStatMagSupported"},
-      {{"magazine", "--history"}, 0, "TLM_instantaneous_gc_wamp_5"},
-      {{"extract"}, 0, "EAN_imageSize_BIC"},
-      {{"dump"}, 1, "false\n"},
-      {{"recommends-deletion"}, 0, "false"},
-      {{"capture", folder / "capture"}, 1, "null"},
-  };
-  for (const auto& row : rows) {
-    EXPECT_EQ(run(row.command), row.status) << row.command[0];
-    EXPECT_TRUE(nlohmann::json::accept(out)) << out;
-    EXPECT_NE(out.find(row.out), std::string::npos) << out;
-    EXPECT_NE(err.find("no storage controller found: "), std::string::npos) << err;
-    EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
+    const char* err;
+    bool there;
+    platform::DriverStatus openStatus;
+    const char* standing;  // the only command that is answered
+  } states[] = {
+      {"no storage controller found: the device registry names none of Norba", false, 0, "x"},
+      {"the storage controller NorbaQRT3NVMeController can't be opened (status 0xd)", true, 13,
+       "x"},
+      {"the storage controller NorbaQRT3NVMeController answers no command (status 0x2d)", true, 0,
+       "x"},
+      {"the storage controller NorbaQRT3NVMeController answers no", true, 0, "9 size 13/0"}};
+  for (const auto& state : states) {
+    registry.root->children.resize(1);
+    if (state.there) {
+      registry.add({.className = support::kQRT3,
+                    .properties = {{"Controller Characteristics", Dictionary()}},
+                    .openStatus = state.openStatus});
+    }
+    registry.standing = {{state.standing, registry.announce(16)}};
+    for (const auto& command : commands) {
+      EXPECT_EQ(run(command), 1) << command[0] << state.err;
+      EXPECT_EQ(out, "") << command[0];
+      EXPECT_NE(err.find(state.err), std::string::npos) << err;
+      EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
+    }
+    EXPECT_TRUE(device.eventra.events.empty());
   }
+  registry.root->children.resize(1);
+  EXPECT_EQ(run({"recommends-deletion"}), 1);
+  EXPECT_EQ(out, "");
+  EXPECT_EQ(run({"capture", folder / "capture"}), 1);
   EXPECT_FALSE(std::filesystem::exists(folder / "capture"));
-  for (const char* command : {"freezer", "nvram"}) {
-    EXPECT_EQ(run({command}), 0);
-    EXPECT_EQ(out + err, "{}\n");
+  EXPECT_EQ(run({"freezer"}), 0);
+  EXPECT_EQ(out + err, "{}\n");
+
+  registry.add({.className = "ZMCStorage"});
+  EXPECT_EQ(run({"recommends-deletion"}), 1);
+  EXPECT_NE(err.find("ZMCStorage answers no command (status 0x2d)"), std::string::npos) << err;
+  EXPECT_EQ(run({"msp"}), 1);
+  EXPECT_NE(out.find("Controller does not support MSP data"), std::string::npos) << out;
+  registry.root->children.resize(1);
+
+  // A controller without the query has nothing to recommend; statistics that aren't any, no health.
+  registry.add({.className = support::kQRT3});
+  EXPECT_EQ(run({"recommends-deletion"}), 0);
+  EXPECT_EQ(out + err, "false\n");
+  registry.alwaysTunnels(9, 13, 0, support::words({1}));
+  for (const char* whom : {"lab", "ota"}) {
+    EXPECT_EQ(run({"health", whom}), 1);
+    EXPECT_EQ(out, "null\n") << whom;
+    EXPECT_NE(err.find("parseFTL failed"), std::string::npos) << err;
   }
-  root = "/not/there";
-  EXPECT_EQ(run({"disk"}), 0);
-  EXPECT_EQ(err, "nandinfo: disk: there is no device root /not/there\n");
+  root = "the device root /not/there: No such file or directory";
+  for (const Words& command : {Words{"disk"}, {"decode", "ftl", "x"}, {"extract"}}) {
+    EXPECT_EQ(run(command), 1);
+    EXPECT_EQ(out, "");
+    EXPECT_NE(err.find(": " + root + "\n"), std::string::npos) << err;
+  }
 }
 
 // An option that goes to the wrong argument, or to none.
@@ -251,6 +447,10 @@ TEST_F(Nandinfo, ShowsTablesOnATerminalOnly) {
             "    [\"hostReads\", 89]\n  ],\n  \"error\": \"NA\"\n}\n");
   EXPECT_EQ(run({"freezer"}), 0);
   EXPECT_TRUE(out.starts_with("(there is no kernel snapshot")) << out;
+  device.registry.add({.className = "NvramDiagService",
+                       .properties = {{"Version", "\x1b[2J\x7f\xC2\x9B\xC2\xA0\xC3\x84"}}});
+  EXPECT_EQ(run({"nvram", "--compact"}), 0);
+  EXPECT_EQ(out, "{\"version\": \"\\u001b[2J\\u007f\\u009b\xC2\xA0\xC3\x84\"}\n");
 }
 
 TEST(NandinfoTable, ShowsEveryShape) {
@@ -274,6 +474,13 @@ TEST(NandinfoTable, ShowsEveryShape) {
       {Array{one, other}, 80, "a      name?[2J  b\n1,000  x\n   22            -1,234,567\n"},
       {Array{Dictionary{{"k", "\xC3\xA4\xC3\xB6\xC3\xBC\xC3\xA4"}}}, 3,
        "k\n\xC3\xA4\xC3\xB6\xE2\x80\xA6\n"},
+      // Wide characters, one that combines, one that turns the direction of writing.
+      {Array{Array{"\xE6\x97\xA5\xE6\x9C\xAC", 1}, Array{"e\xCC\x81", 2},
+             Array{"a\xE2\x80\xAE", 3}},
+       80, "\xE6\x97\xA5\xE6\x9C\xAC  1\ne\xCC\x81     2\na?    3\n"},
+      {Array{Dictionary{{"\xE6\x97\xA5\xE6\x9C\xAC", 1}}}, 3, "\xE6\x97\xA5\xE2\x80\xA6\n1\n"},
+      {Dictionary{{"c", Dictionary{{"a", Array{1}}, {"0", one}}}, {"z", 1}}, 80,
+       "z  1\n\nc:\n\n0:\na         1,000\nname?[2J  x\n\na:\n0:  1\n"},
       {Array{0, 1, 2, 3, 4, 5, 6, 7, 100, 0.5}, 80,
        "0:    0    1  2  3  4  5  6  7\n8:  100  0.5\n"},
       {Array{-1234.5, 123456.0, 1e300}, 80, "0:  -1,234.5  123,456  1e+300\n"},

@@ -86,8 +86,10 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
 
 // The host as the device has it.
 struct DeviceHost : Host {
-  DeviceHost(const std::string& root, const std::optional<platform::host::PlayedRun>& played)
-      : Host({.root = root, .lowestLevel = platform::LogLevel::error, .played = played}),
+  DeviceHost(const std::string& root, const std::optional<platform::host::PlayedRun>& played,
+             platform::SystemLog* log)
+      : Host(
+            {.root = root, .lowestLevel = platform::LogLevel::error, .played = played, .log = log}),
         context(std::make_shared<morvend::DeviceContext>(platform())) {
     keepCountersBelow([owned = context] { return owned->GetHomeDirectoryPath(); });
   }
@@ -96,7 +98,7 @@ struct DeviceHost : Host {
 
 std::string makeRoot(const MakingOptions& options, const Sample& first,
                      const SampleCounters& counters, const Listener& listener) {
-  DeviceHost host(options.folder, std::nullopt);
+  DeviceHost host(options.folder, std::nullopt, options.log);
   listener.progress("writing files");
   std::string error = writeFiles(host, lastingFiles(first));
   if (error.empty()) error = writeFiles(host, filesOfDay(first));
@@ -125,8 +127,8 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
 }
 
 // The day that begins with `sample.today`, and what is new when the next one begins.
-std::string playDay(const std::string& root, Sample sample, const SampleCounters& counters) {
-  DeviceHost host(root, dailyRun(sample));
+std::string playDay(const MakingOptions& options, Sample sample, const SampleCounters& counters) {
+  DeviceHost host(options.folder, dailyRun(sample), options.log);
   morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
   std::string error = host.counters().apply(counters.ofDay(sample.today));
   if (error.empty()) error = host.counters().settle();
@@ -146,7 +148,7 @@ std::string makeDevice(const MakingOptions& options, const Listener& listener) {
   for (; error.empty() && sample.today < options.sample.today; ++sample.today) {
     const int played = options.days - (options.sample.today - sample.today);
     listener.progress(platform::format("playing day %d of %d", played + 1, options.days));
-    error = playDay(options.folder, sample, counters);
+    error = playDay(options, sample, counters);
   }
   return error;
 }

@@ -4,6 +4,7 @@
 #include <functional>
 #include <string>
 
+#include "platform/SystemLog.h"
 #include "tools/mkdevice/Sample.h"
 
 namespace mkdevice {
@@ -15,6 +16,7 @@ struct MakingOptions {
   Sample sample;
   int days = 0;        // so many before `sample.today` are played, at most kMostDays
   std::string module;  // of the host: the crash-reporting support library for the device
+  platform::SystemLog* log = nullptr;  // of the device's services; else errors on standard error
 };
 
 // Reports what goes on, and what the root will lack.

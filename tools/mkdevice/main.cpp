@@ -11,6 +11,7 @@
 
 #include "platform/CivilDate.h"
 #include "platform/host/SystemClock.h"
+#include "tools/common/CommandLog.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/SampleController.h"
 
@@ -33,6 +34,8 @@ int main(int argc, char** argv) {
   constexpr int kDone = 0, kFailed = 1, kUsage = 2;
   mkdevice::MakingOptions options;
   options.module = moduleBesideProgram();
+  tools::CommandLog log("mkdevice");
+  options.log = &log;
 
   CLI::App app("Makes a complete sample device root, with some weeks of counters up to yesterday.",
                "mkdevice");

@@ -5,6 +5,7 @@
 #include "NANDInfo/NANDInfo.h"
 #include "tools/nandinfo/Capture.h"
 #include "tools/nandinfo/Decode.h"
+#include "tools/nandinfo/DecodeCapture.h"
 
 namespace nandinfo {
 
@@ -33,6 +34,13 @@ template <auto function>
 CommandResult callRounding(const Invocation& invocation) {
   return result(function(invocation.platform, invocation.arguments.round));
 }
+// Without the statistics, the health is what the library says when it doesn't know.
+template <auto function>
+CommandResult health(const Invocation& invocation) {
+  Dictionary figures = function(invocation.platform);
+  if (figures.find(NANDInfo::kNANDHealthInfoMaxPercentUsed) == nullptr) return {};
+  return result(std::move(figures));
+}
 template <auto function>
 CommandResult callWithCode(const Invocation& invocation) {
   std::uint32_t code = 0;
@@ -52,8 +60,28 @@ CommandResult magazine(const Invocation& invocation) {
                                                     arguments.noDelta ? 0 : 1, arguments.mode));
 }
 
+// Whether the controller answers any of the commands that the extraction is made of.
+bool answers(platform::Platform& platform) {
+  NANDInfo::nand_exporter_t* exporter = nullptr;
+  if (!NANDInfo::findNandExporterNew(platform, exporter)) return false;
+  bool answered = false;
+  for (const auto getter : {exporter->getStatsSelectors, exporter->getReadStatsSelectors,
+                            exporter->getMSPStatsSelectors}) {
+    NANDInfo::TunnelCommandBlock block;
+    NANDInfo::Buffer buffer;
+    if (getter == nullptr || answered) continue;
+    answered = NANDInfo::executeTunnelCommand(platform, exporter->io_connection, exporter, getter(),
+                                              block, buffer);
+  }
+  NANDInfo::ReleaseIOInterfaces(platform, exporter);
+  NANDInfo::ResetAPIErrorMessage();
+  return answered;
+}
+
+// Sends nothing when there is nobody to tell how the storage does.
 CommandResult extract(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
+  if (!answers(invocation.platform)) return {};
   return result(NANDInfo::NandInfoExtractToEV_runAllSteps(
       invocation.platform, nullptr, arguments.monthly ? NANDInfo::kAllowsMonthly : 0, true,
       arguments.from));
@@ -69,52 +97,61 @@ CommandResult recommendsDeletion(const Invocation& invocation) {
 }
 
 constexpr Command kCommands[] = {
-    {nullptr, "info", "The basic counters, for the counters service", kNothing, true, nullptr,
-     call<NANDInfo::CopyNANDInfo>},
-    {nullptr, "daily", "The basic counters as the day's telemetry has them", kNothing, true,
-     "today all storage counters go to the analytics sink", daily},
-    {nullptr, "ftl", "The whitelisted FTL statistics, or all of them", kRound | kAll, true, nullptr,
-     ftl},
-    {nullptr, "msp", "The whitelisted statistics of each MSP", kRound, true, nullptr,
+    {nullptr, "info", "The basic counters, for the counters service", kNothing, Needs::answer,
+     nullptr, call<NANDInfo::CopyNANDInfo>},
+    {nullptr, "daily", "The basic counters as the day's telemetry has them", kNothing,
+     Needs::answer, "today all storage counters go to the analytics sink", daily},
+    {nullptr, "ftl", "The whitelisted FTL statistics, or all of them", kRound | kAll, Needs::answer,
+     nullptr, ftl},
+    {nullptr, "msp", "The whitelisted statistics of each MSP", kRound, Needs::answer, nullptr,
      callRounding<NANDInfo::CopyWhitelistedNANDMSPInfo>},
-    {nullptr, "magazine", "What the FTL counters came to over the last hours", kWindow, true,
-     nullptr, magazine},
-    {nullptr, "storage", "The storage summary with the EAN images", kRound, true, nullptr,
+    {nullptr, "magazine", "What the FTL counters came to over the last hours", kWindow,
+     Needs::answer, nullptr, magazine},
+    {nullptr, "storage", "The storage summary with the EAN images", kRound, Needs::answer, nullptr,
      callRounding<NANDInfo::CopyWhitelistedStorageStats>},
-    {nullptr, "disk", "Capacity, fullness and available space", kNothing, false, nullptr,
+    {nullptr, "disk", "Capacity, fullness and available space", kNothing, Needs::nothing, nullptr,
      call<NANDInfo::GetDiskInfo>},
-    {nullptr, "freezer", "What the kernel's swap-out thread has written", kNothing, false,
+    {nullptr, "freezer", "What the kernel's swap-out thread has written", kNothing, Needs::nothing,
      "there is no kernel snapshot, or no swap-out thread in it",
      call<NANDInfo::CopyVMFreezerNANDInfo>},
-    {"health", "servita", "The health for the warranty service", kNothing, true, nullptr,
+    {"health", "servita", "The health for the warranty service", kNothing, Needs::answer, nullptr,
      call<NANDInfo::CopyServitaNANDInfo>},
-    {"health", "lab", "The health for internal lab tools", kNothing, true, nullptr,
-     call<NANDInfo::CopyInternalLabNANDInfo>},
-    {"health", "ota", "The health for system updates", kNothing, true,
-     "the controller gave no statistics", call<NANDInfo::CopyOTANANDInfo>},
+    {"health", "lab", "The health for internal lab tools", kNothing, Needs::answer, nullptr,
+     health<NANDInfo::CopyInternalLabNANDInfo>},
+    {"health", "ota", "The health for system updates", kNothing, Needs::answer, nullptr,
+     health<NANDInfo::CopyOTANANDInfo>},
     {nullptr, "recommends-deletion", "Whether the controller asks for content to be deleted",
-     kNothing, true, nullptr, recommendsDeletion},
-    {"ean", "image-size", "The size of an EAN image, in bytes", kCode, false, nullptr,
+     kNothing, Needs::answer, nullptr, recommendsDeletion},
+    {"ean", "image-size", "The size of an EAN image, in bytes", kCode, Needs::nothing, nullptr,
      callWithCode<NANDInfo::GetEANImageSize>},
-    {"ean", "update-count", "The number of an EAN image's updates", kCode, false, nullptr,
+    {"ean", "update-count", "The number of an EAN image's updates", kCode, Needs::nothing, nullptr,
      callWithCode<NANDInfo::GetEANUpdateCount>},
-    {nullptr, "nvram", "Send the use of the boot variables' memory", kNothing, false,
+    {nullptr, "nvram", "Send the use of the boot variables' memory", kNothing, Needs::nothing,
      "there is no such memory that tells", call<NANDInfo::gatherNVRAMStats>},
-    {nullptr, "extract", "Send the storage health as events, and sum it up", kSteps, true, nullptr,
-     extract},
-    {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, true, nullptr,
-     dump},
-    {nullptr, "capture", "Save all that the controller answers, as a device folder", kFolder, true,
-     nullptr, capture},
-    {"decode", "ftl", "A buffer's FTL statistics under their names", kFile, false, nullptr,
+    {nullptr, "extract", "Send the storage health as events, and sum it up", kSteps, Needs::answer,
+     nullptr, extract},
+    {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, Needs::answer,
+     nullptr, dump},
+    {nullptr, "capture", "Save all that the controller answers, as a device folder", kFolder,
+     Needs::controller, nullptr, capture},
+    {"decode", "ftl", "A buffer's FTL statistics under their names", kFile, Needs::nothing, nullptr,
      decodeFTL},
-    {"decode", "ftl-stat", "A buffer's FTL statistics under their keys", kFile, false, nullptr,
-     decodeFTLStat},
-    {"decode", "legacy", "A buffer's FTL statistics in their legacy form", kFile, false, nullptr,
-     decodeLegacy},
-    {"decode", "msp", "A buffer's statistics of an MSP", kFile, false, nullptr, decodeMSP},
+    {"decode", "ftl-stat", "A buffer's FTL statistics under their keys", kFile, Needs::nothing,
+     nullptr, decodeFTLStat},
+    {"decode", "legacy", "A buffer's FTL statistics in their legacy form", kFile, Needs::nothing,
+     nullptr, decodeLegacy},
+    {"decode", "msp", "A buffer's statistics of an MSP", kFile, Needs::nothing, nullptr, decodeMSP},
+    {"decode", "validity", "A validity list: the values of each of its lists", kFile,
+     Needs::nothing, nullptr, decodeValidity},
+    {"decode", "telemetry", "A telemetry list: the summary and the counters of each channel",
+     kLayout | kFile | kChannels, Needs::nothing, nullptr, decodeTelemetry},
+    {"decode", "defects", "A defects list", kFile, Needs::nothing, nullptr, decodeDefects},
+    {"decode", "snapshot", "A kernel snapshot: the swap-out thread's figures, and its items", kFile,
+     Needs::nothing, nullptr, decodeSnapshot},
+    {"decode", "capture", "Every buffer of a captured device", kCapture, Needs::nothing, nullptr,
+     decodeCapture},
     {"decode", "counters", "A counter block as the 177 words of the common layout", kLayout | kFile,
-     false, nullptr, decodeCounters},
+     Needs::nothing, nullptr, decodeCounters},
 };
 
 }  // namespace

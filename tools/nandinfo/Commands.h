@@ -16,7 +16,7 @@ namespace nandinfo {
 struct Arguments {
   bool round = false, all = false, statKeys = false, noDelta = false, history = false,
        monthly = false;
-  std::uint32_t hours = 0, mode = 2, from = 0;
+  std::uint32_t hours = 0, mode = 2, from = 0, channels = 0;  // channels: 0 if it isn't said
   std::string code, layout, file, folder;
 };
 
@@ -31,7 +31,7 @@ struct Invocation {
 using CommandResult = platform::Result<platform::Value>;
 
 // The parts of the command line that a command takes.
-enum Takes : std::uint8_t {
+enum Takes : std::uint16_t {
   kNothing = 0,
   kRound = 1,
   kAll = 2,
@@ -41,15 +41,21 @@ enum Takes : std::uint8_t {
   kFolder = 32,
   kWindow = 64,
   kSteps = 128,
+  kCapture = 256,
+  kChannels = 512,
 };
+
+// What a command needs of a storage controller before its result means something: nothing, that it
+// can be opened (and the command itself says so when it can't), or an answer.
+enum class Needs : std::uint8_t { nothing, controller, answer };
 
 struct Command {
   const char* group;  // the word before the name, or null
   const char* name;
   const char* description;
-  std::uint8_t takes;   // of Takes
-  bool asksController;  // without one it has little to say
-  const char* empty;    // what an empty result means to a person, or null
+  std::uint16_t takes;  // of Takes
+  Needs needs;
+  const char* empty;  // what an empty result means to a person, or null
   CommandResult (*run)(const Invocation& invocation);
 };
 

@@ -10,27 +10,26 @@
 #include "NANDInfo/NANDInfo.h"
 #include "platform/Text.h"
 #include "platform/host/FileDescriptor.h"
+#include "tools/nandinfo/BufferKind.h"
+#include "tools/nandinfo/DecodedBuffer.h"
 
 namespace nandinfo {
 
 namespace {
 
-using NANDInfo::GenericParserCxt;
 using platform::Array;
-using platform::Dictionary;
-using platform::Value;
-using Bytes = std::vector<std::byte>;
+using FileBytes = std::vector<std::byte>;
 
 // Of a file of any kind that can be read to its end.
-platform::Result<Bytes> readInput(const std::string& path) {
+platform::Result<FileBytes> readInput(const std::string& path) {
   constexpr std::size_t kStep = std::size_t{1} << 16;
   const auto failed = [&path](const char* why) {
-    return platform::Result<Bytes>::failure(path + ": " + why);
+    return platform::Result<FileBytes>::failure(path + ": " + why);
   };
   const platform::host::FileDescriptor file(
       path == "-" ? ::dup(STDIN_FILENO) : ::open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (!file) return failed(std::strerror(errno));
-  Bytes bytes;
+  FileBytes bytes;
   for (;;) {
     const std::size_t filled = bytes.size();
     bytes.resize(filled + kStep);
@@ -39,57 +38,52 @@ platform::Result<Bytes> readInput(const std::string& path) {
     bytes.resize(filled + static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
     if (got < 0 && error == EINTR) continue;
     if (got < 0) return failed(std::strerror(error));
-    if (got == 0) return platform::Result<Bytes>::success(std::move(bytes));
+    if (got == 0) return platform::Result<FileBytes>::success(std::move(bytes));
     if (bytes.size() > NANDInfo::kLargestBuffer) return failed("longer than 16 MiB");
   }
 }
 
-CommandResult decoded(bool ok, const GenericParserCxt& context) {
-  Array fields;
-  fields.reserve(context.size());
-  for (std::size_t i = 0; i < context.size(); ++i) {
-    const GenericParserCxt::Field field = context[i];
-    fields.push_back(Array{Value(field.name), Value(field.value)});
-  }
-  return CommandResult::success(Dictionary{
-      {"ok", ok}, {"fields", std::move(fields)}, {"error", NANDInfo::GetAPIErrorMessage()}});
+// What has been read; a failed one says which file it is about.
+CommandResult outcome(const std::string& path, platform::Dictionary decoded) {
+  const std::string* error = decoded.text("error");
+  std::string why = decoded.number("ok")->boolValue() ? "" : path + ": ";
+  if (!why.empty()) why += *error != "NA" ? *error : "nothing in it can be decoded";
+  return {std::move(decoded), std::move(why)};
 }
 
-template <auto parse>
-CommandResult decode(const Invocation& invocation) {
-  const auto bytes = readInput(invocation.arguments.file);
-  if (!bytes) return CommandResult::failure(bytes.error);
-  GenericParserCxt context;
-  const bool ok = parse(&context, *bytes) > 0;
-  return decoded(ok, context);
+template <auto decode>
+CommandResult decodeFile(const Invocation& invocation) {
+  const std::string& path = invocation.arguments.file;
+  const auto bytes = readInput(path);
+  return bytes ? outcome(path, decode(*bytes)) : CommandResult::failure(bytes.error);
 }
-
-constexpr CounterLayout kLayouts[] = {
-    {"1y", 533, NANDInfo::parseCounters1y},
-    {"1x-sandisk", 316, NANDInfo::parseCounters1xSandisk},
-    {"1x-hynix", 312, NANDInfo::parseCounters1xHynix},
-    {"generic", 121, NANDInfo::parseCountersAlgoGeneric},
-    {"q8", 127, NANDInfo::parseCountersAlgoGenericQ8},
-};
 
 }  // namespace
 
-CommandResult decodeFTL(const Invocation& invocation) {
-  return decode<NANDInfo::ZMCFTLParseBufferToCxt>(invocation);
-}
+CommandResult decodeFTL(const Invocation& invocation) { return decodeFile<decodedFTL>(invocation); }
 CommandResult decodeFTLStat(const Invocation& invocation) {
-  return decode<NANDInfo::ZMCFTLParseStatKeyBufferToCxt>(invocation);
+  return decodeFile<decodedFTLStat>(invocation);
 }
-CommandResult decodeMSP(const Invocation& invocation) {
-  return decode<NANDInfo::ZMCMSPParseBufferToCxt>(invocation);
+CommandResult decodeLegacy(const Invocation& invocation) {
+  return decodeFile<decodedLegacy>(invocation);
+}
+CommandResult decodeMSP(const Invocation& invocation) { return decodeFile<decodedMSP>(invocation); }
+CommandResult decodeValidity(const Invocation& invocation) {
+  return decodeFile<decodedValidity>(invocation);
+}
+CommandResult decodeDefects(const Invocation& invocation) {
+  return decodeFile<decodedDefects>(invocation);
+}
+CommandResult decodeSnapshot(const Invocation& invocation) {
+  return decodeFile<decodedSnapshot>(invocation);
 }
 
-CommandResult decodeLegacy(const Invocation& invocation) {
-  const auto bytes = readInput(invocation.arguments.file);
+CommandResult decodeTelemetry(const Invocation& invocation) {
+  const Arguments& arguments = invocation.arguments;
+  const auto bytes = readInput(arguments.file);
   if (!bytes) return CommandResult::failure(bytes.error);
-  NANDInfo::LegacyNandInfoCxt context;
-  const bool ok = NANDInfo::ZMCParseBufferToCxt(&context, *bytes);
-  return decoded(ok, context.fields);
+  return outcome(arguments.file, decodedTelemetry(*bytes, *findCounterLayout(arguments.layout),
+                                                  arguments.channels));
 }
 
 CommandResult decodeCounters(const Invocation& invocation) {
@@ -97,6 +91,9 @@ CommandResult decodeCounters(const Invocation& invocation) {
   const CounterLayout* layout = findCounterLayout(arguments.layout);
   auto bytes = readInput(arguments.file);
   if (!bytes) return CommandResult::failure(bytes.error);
+  if (const std::string why = whyNot(BufferKind::counters, *bytes); !why.empty()) {
+    return CommandResult::failure(arguments.file + ": " + why);
+  }
   if (bytes->size() < layout->words * sizeof(std::uint32_t)) {
     return CommandResult::failure(
         platform::format("%s: %zu bytes, but the layout %s reads %zu", arguments.file.c_str(),
@@ -108,14 +105,6 @@ CommandResult decodeCounters(const Invocation& invocation) {
   Array words;
   for (const std::uint32_t word : record) words.push_back(std::uint64_t{word});
   return CommandResult::success(std::move(words));
-}
-
-std::span<const CounterLayout> counterLayouts() { return kLayouts; }
-
-const CounterLayout* findCounterLayout(std::string_view name) {
-  const auto* layout = std::find_if(std::begin(kLayouts), std::end(kLayouts),
-                                    [&](const CounterLayout& row) { return row.name == name; });
-  return layout != std::end(kLayouts) ? layout : nullptr;
 }
 
 }  // namespace nandinfo

@@ -8,12 +8,14 @@
 #include <span>
 #include <string_view>
 
-#include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/NANDInfo.h"
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
+#include "tools/common/ClosestName.h"
+#include "tools/common/TerminalText.h"
 #include "tools/nandinfo/Commands.h"
-#include "tools/nandinfo/Decode.h"
+#include "tools/nandinfo/ControllerWatch.h"
+#include "tools/nandinfo/DecodedBuffer.h"
 #include "tools/nandinfo/Table.h"
 
 namespace nandinfo {
@@ -33,8 +35,10 @@ constexpr char kFooter[] =
     "  nandinfo magazine --hours 24\n"
     "  nandinfo extract --monthly --from 4\n"
     "  nandinfo ean image-size dBIC\n"
-    "  nandinfo decode counters 1y block.bin\n"
-    "  MORVEND_ROOT=/srv/device nandinfo capture /tmp/device\n"
+    "  nandinfo capture copy\n"
+    "  nandinfo decode ftl copy/statistics-0.bin\n"
+    "  nandinfo decode counters 1y copy/telemetry-0.bin\n"
+    "  nandinfo decode capture copy\n"
     "Exit status: 0 done; 1 the work failed; 2 wrong usage.";
 
 constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
@@ -62,24 +66,6 @@ class Progress {
   bool shown_, begun_ = false;
 };
 
-bool hasController(platform::Platform& platform) {
-  for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
-    const char* className = NANDInfo::nand_exporters_tunnel[i].className;
-    const NANDInfo::RegistryHandle service(platform,
-                                           NANDInfo::FindServiceUsingIterator(platform, className));
-    if (service.get() != 0) return true;
-  }
-  return false;
-}
-
-std::string controllerNames() {
-  std::string names;
-  for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
-    names.append(i > 0 ? ", " : "").append(NANDInfo::nand_exporters_tunnel[i].className);
-  }
-  return names;
-}
-
 // Why the work failed, or none if it didn't: no result, one that is an error, one that holds
 // nothing but the library's message, or one that says itself that it isn't right.
 std::optional<std::string> failure(const CommandResult& result) {
@@ -97,14 +83,23 @@ std::optional<std::string> failure(const CommandResult& result) {
   if (dictionary->size() == 1 && dictionary->find(NANDInfo::kTLM_APIErrorMessage) != nullptr) {
     return messageOr("the result is empty");
   }
-  const auto* ok = dictionary->number("ok");
-  if (ok != nullptr && !ok->boolValue()) return messageOr("nothing can be decoded");
   return std::nullopt;
 }
 
 bool isEmpty(const Value& value) {
   const auto* dictionary = value.as<Dictionary>();
   return dictionary != nullptr && dictionary->empty();
+}
+
+// JSON in which the control characters that it may hold as they are, are escaped: those beyond
+// ASCII, which some terminals obey, and the one at its end.
+std::string escaped(std::string json) {
+  for (std::size_t i = 0; (i = json.find_first_of("\x7f\xC2", i)) != std::string::npos; ++i) {
+    const bool ascii = json[i] == '\x7f';
+    const auto code = static_cast<unsigned char>(json[ascii ? i : i + 1]);
+    if (ascii || code < 0xA0) json.replace(i, ascii ? 1 : 2, platform::format("\\u%04x", code));
+  }
+  return json;
 }
 
 std::string shown(const CommandServices& services, const Command& command, Form form,
@@ -122,7 +117,7 @@ std::string shown(const CommandServices& services, const Command& command, Form 
   } else {
     platform::host::appendIndentedJSON(json, *result);
   }
-  return json + '\n';
+  return escaped(std::move(json)) + '\n';
 }
 
 std::string nameOf(const Command& command) {
@@ -130,32 +125,58 @@ std::string nameOf(const Command& command) {
                                   : command.name;
 }
 
-int run(const CommandServices& services, const Command& command, const Arguments& arguments,
-        Form form) {
-  CommandResult result;
-  {
-    Progress progress(services);
-    result = command.run(
-        {services.platform, arguments, [&](const std::string& text) { progress.show(text); }});
+class Run {
+ public:
+  Run(const CommandServices& services, const Command& command)
+      : services_(services),
+        command_(command),
+        watch_(services.platform, services.log != nullptr && services.log->isSystemLog()
+                                      ? ControllerWatch::DirectTexts::passed
+                                      : ControllerWatch::DirectTexts::kept) {}
+
+  int run(const Arguments& arguments, Form form) {
+    if (!services_.rootProblem.empty()) return failed(services_.rootProblem);
+    const CommandResult result = resultOf(arguments);
+    const std::string problem = command_.needs == Needs::answer ? watch_.problem() : "";
+    if (services_.log != nullptr) complaints_ = services_.log->take();
+    // What the library makes of no answer is no verdict.
+    if (!problem.empty()) return failed(problem);
+    complaints_.insert(complaints_.end(), watch_.texts().begin(), watch_.texts().end());
+    services_.out << shown(services_, command_, form, result) << std::flush;
+    if (!services_.out) {
+      say("the output can't be written");
+      return kFailed;
+    }
+    if (const auto why = failure(result)) return failed(*why);
+    for (const std::string& complaint : complaints_) say(complaint);
+    return kDone;
   }
-  services.out << shown(services, command, form, result) << std::flush;
-  const auto say = [&](const std::string& what) {
-    services.err << "nandinfo: " << nameOf(command) << ": " << printable(what) << '\n';
-  };
-  if (!services.out) {
-    say("the output can't be written");
+
+ private:
+  CommandResult resultOf(const Arguments& arguments) {
+    if (services_.log != nullptr) services_.log->keep();
+    Progress progress(services_);
+    return command_.run(
+        {watch_.platform(), arguments, [&](const std::string& text) { progress.show(text); }});
+  }
+
+  void say(const std::string& what) {
+    services_.err << "nandinfo: " << nameOf(command_) << ": " << tools::printable(what) << '\n';
+  }
+  // In one line, with what there was to complain of as the reasons.
+  int failed(std::string why) {
+    for (const std::string& complaint : complaints_) {
+      why += (&complaint == &complaints_.front() ? ": " : "; ") + complaint;
+    }
+    say(why);
     return kFailed;
   }
-  auto why = failure(result);
-  const int status = why ? kFailed : kDone;
-  if (!services.missingRoot.empty() && (command.takes & kFile) == 0) {
-    why = "there is no device root " + services.missingRoot;
-  } else if (command.asksController && !hasController(services.platform)) {
-    why = "no storage controller found: the device registry names none of " + controllerNames();
-  }
-  if (why) say(*why);
-  return status;
-}
+
+  const CommandServices& services_;
+  const Command& command_;
+  ControllerWatch watch_;
+  std::vector<std::string> complaints_;  // of the services, who know the file, then the library's
+};
 
 // An option with a decimal number, at most `most`.
 CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& number,
@@ -221,7 +242,7 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("CODE", arguments.code, "four letters, such as dBIC")
         ->required()
         ->check([](const std::string& code) {
-          return isCode(code) ? "" : "'" + printable(code) + "' is not four letters";
+          return isCode(code) ? "" : "'" + tools::printable(code) + "' is not four letters";
         });
   }
   if (takes(kLayout)) {
@@ -234,7 +255,7 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
         ->check([names](const std::string& name) {
           return findCounterLayout(name) != nullptr
                      ? ""
-                     : "'" + printable(name) + "' is not a layout: " + names;
+                     : "'" + tools::printable(name) + "' is not a layout: " + names;
         });
   }
   if (takes(kFile)) {
@@ -244,8 +265,59 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("DIR", arguments.folder, "an empty folder, or one that is to be made")
         ->required();
   }
+  if (takes(kCapture)) {
+    app.add_option("DIR", arguments.folder, "what 'nandinfo capture' has made, or a folder device/")
+        ->required();
+  }
+  if (takes(kChannels)) {
+    addNumber(app, "--channels", arguments.channels, NANDInfo::kLargestBuffer / kChannelSize,
+              "of the controller (default: as many as the file has room for, if it is full)");
+  }
   if (takes(kWindow)) addWindow(app, arguments);
   if (takes(kSteps)) addSteps(app, arguments);
+}
+
+// What is wrong with the names of the command; empty when nothing is, or there are none. No option
+// that stands before them has a value.
+std::string unknownCommand(int argc, const char* const* argv) {
+  std::string name;
+  bool isGroup = false;
+  for (const std::string_view word : std::span(argv, static_cast<std::size_t>(argc)).subspan(1)) {
+    if (word.starts_with('-')) continue;
+    std::vector<std::string_view> known;
+    bool isKnown = false;
+    for (const Command& command : commands()) {
+      const std::string_view group = command.group != nullptr ? command.group : "";
+      if (isGroup && group != name) continue;
+      known.push_back(isGroup || group.empty() ? command.name : group);
+      isKnown |= known.back() == word;
+    }
+    const std::string whole = (isGroup ? name + " " : "") + std::string(word);
+    if (!isKnown) {
+      const std::string_view closest = tools::closestName(word, known);
+      return "there is no command '" + whole + "'" +
+             (closest.empty() ? "" : "; did you mean '" + std::string(closest) + "'?");
+    }
+    const auto all = commands();
+    if (isGroup || std::none_of(all.begin(), all.end(), [&](const Command& command) {
+          return command.group != nullptr && command.group == word;
+        })) {
+      break;
+    }
+    name = word;
+    isGroup = true;
+  }
+  return {};
+}
+
+// The command that the command line has named so far, each name after a blank.
+std::string namesOfCommand(const CLI::App& app) {
+  std::string names;
+  for (const CLI::App* command = &app; !command->get_subcommands().empty();) {
+    command = command->get_subcommands().front();
+    names += " " + command->get_name();
+  }
+  return names;
 }
 
 }  // namespace
@@ -271,6 +343,14 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
   const bool help = std::any_of(argv, argv + argc, [](std::string_view word) {
     return word == "-h" || word.starts_with("--help");
   });
+  const auto wrong = [&services](const std::string& what, const std::string& command) {
+    services.err << "nandinfo: " << tools::printable(what) << " (see 'nandinfo" << command
+                 << " --help')\n";
+    return kUsage;
+  };
+  if (const std::string unknown = unknownCommand(argc, argv); !help && !unknown.empty()) {
+    return wrong(unknown, "");
+  }
   CLI::App* group = nullptr;
   for (const Command& command : commands()) {
     if (!help && !named(command.group != nullptr ? command.group : command.name)) continue;
@@ -289,11 +369,10 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
   } catch (const CLI::ParseError& error) {
     if (error.get_exit_code() == 0) return app.exit(error, services.out, services.err);
     const auto unknown = app.remaining(true);
-    const std::string what = unknown.empty() ? error.what() : CLI::ExtrasError(unknown).what();
-    services.err << "nandinfo: " << printable(what) << '\n';
-    return kUsage;
+    return wrong(unknown.empty() ? error.what() : CLI::ExtrasError(unknown).what(),
+                 namesOfCommand(app));
   }
-  return run(services, *chosen, arguments, form);
+  return Run(services, *chosen).run(arguments, form);
 }
 
 }  // namespace nandinfo

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "platform/Platform.h"
+#include "tools/common/CommandLog.h"
 
 namespace nandinfo {
 
@@ -13,10 +14,11 @@ struct CommandServices {
   platform::Platform& platform;
   std::ostream& out;
   std::ostream& err;
-  bool outIsTerminal = false;    // then results are tables for people, else JSON
-  bool errIsTerminal = false;    // then long work shows its progress there
-  std::size_t width = 80;        // of the terminal, in columns
-  std::string missingRoot = {};  // the device root's path, if nothing is there
+  bool outIsTerminal = false;        // then results are tables for people, else JSON
+  bool errIsTerminal = false;        // then long work shows its progress there
+  std::size_t width = 80;            // of the terminal, in columns
+  std::string rootProblem = {};      // why the device root can't be used, if it can't
+  tools::CommandLog* log = nullptr;  // the services', for the reasons of a failure
 };
 
 // Runs the command line; returns the exit status: 0 done; 1 the work failed, with one line on

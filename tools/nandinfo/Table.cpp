@@ -9,7 +9,7 @@
 #include "platform/Text.h"
 #include "platform/host/JSON.h"
 #include "platform/host/Timestamp.h"
-#include "platform/host/UTF8.h"
+#include "tools/common/TerminalText.h"
 
 namespace nandinfo {
 
@@ -19,18 +19,15 @@ using platform::Array;
 using platform::Dictionary;
 using platform::Number;
 using platform::Value;
+using tools::columnsOf;
+using tools::cutToColumns;
+using tools::printable;
 
 struct Cell {
   std::string text;
   bool right = false;
 };
 using Row = std::vector<Cell>;
-
-bool continues(char byte) { return (static_cast<unsigned char>(byte) & 0xc0) == 0x80; }
-
-std::size_t columnsOf(std::string_view text) {
-  return text.size() - static_cast<std::size_t>(std::count_if(text.begin(), text.end(), continues));
-}
 
 // A number's text with its whole part in groups of three.
 std::string grouped(std::string text) {
@@ -89,8 +86,7 @@ class Grid {
         line.append(end - columnsOf(line), ' ');
       }
       line.resize(line.find_last_not_of(' ') + 1);
-      if (columnsOf(line) > most) cut(line, most);
-      out += line + '\n';
+      out += cutToColumns(std::move(line), most) + '\n';
     }
   }
 
@@ -98,15 +94,6 @@ class Grid {
   struct Column {
     std::size_t width = 0, numbers = 0;  // of all cells, of the numbers among them
   };
-
-  static void cut(std::string& line, std::size_t most) {
-    std::size_t end = 0;
-    for (std::size_t columns = 0; end < line.size(); ++end) {
-      if (!continues(line[end]) && columns++ == most - 1) break;
-    }
-    line.resize(end);
-    line += "\xE2\x80\xA6";  // an ellipsis
-  }
 
   std::vector<Row> rows_;
   std::vector<Column> columns_;
@@ -222,13 +209,23 @@ void appendNested(std::string& out, std::span<const Nested> rest, std::size_t wi
   }
 }
 
-void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_t width) {
+// Whether every value is shown in one cell.
+bool isFlat(const Dictionary& dictionary) {
+  return std::all_of(dictionary.begin(), dictionary.end(), [](const Dictionary::Entry& entry) {
+    const auto* array = entry.value.as<Array>();
+    return entry.value.as<Dictionary>() == nullptr && (array == nullptr || array->empty());
+  });
+}
+
+// `title` names what the dictionary is a part of, for the titles of its own parts.
+void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_t width,
+                      const std::string& title = {}) {
   Grid scalars;
-  std::vector<Nested> nested;
+  std::vector<Nested> nested, deeper;
   std::vector<std::pair<std::string, const Array*>> arrays;
   for (const auto& [key, value] : dictionary) {
     if (const auto* inner = value.as<Dictionary>()) {
-      nested.push_back({printable(key), inner});
+      (isFlat(*inner) ? nested : deeper).push_back({printable(key), inner});
     } else if (const auto* array = value.as<Array>(); array != nullptr && !array->empty()) {
       arrays.emplace_back(printable(key), array);
     } else {
@@ -242,20 +239,14 @@ void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_
     out += key + ":\n";
     appendArray(out, *array, width);
   }
+  for (const auto& [key, inner] : deeper) {
+    if (!out.empty()) out += '\n';
+    out += title + key + ":\n";
+    appendDictionary(out, *inner, width, title + key + ", ");
+  }
 }
 
 }  // namespace
-
-std::string printable(std::string_view text) {
-  static constexpr platform::host::EscapedCharacters kControls("", "\x7f");
-  std::string shown;
-  platform::host::appendEscaped(shown, text, kControls, [](std::string& to, char) { to += '?'; });
-  // The control characters beyond ASCII, which some terminals obey.
-  for (std::size_t i = 0; (i = shown.find('\xC2', i)) != std::string::npos; ++i) {
-    if (static_cast<unsigned char>(shown[i + 1]) < 0xA0) shown.replace(i, 2, "?");
-  }
-  return shown;
-}
 
 std::string tableText(const Value& value, std::size_t width) {
   std::string out;

@@ -9,12 +9,9 @@
 
 namespace nandinfo {
 
-// A text from elsewhere as one line of a terminal may show it: "?" stands for control characters,
-// U+FFFD for what isn't UTF-8.
-std::string printable(std::string_view text);
-
 // A value as lines. Dictionaries within a dictionary stand side by side, as many as `width` columns
-// allow, then the next ones; rows of dictionaries are cut at that width.
+// allow, then the next ones, after them those that hold arrays or dictionaries themselves, one by
+// one; rows of dictionaries are cut at that width.
 std::string tableText(const platform::Value& value, std::size_t width);
 
 }  // namespace nandinfo

@@ -296,6 +296,10 @@ int runPelloran(const Environment& environment, int argc, const char* const* arg
     return named.empty() ? wrongUsage(environment.err, withoutCommand(app, error), "")
                          : wrongUsage(environment.err, error.what(), " " + named[0]->get_name());
   }
+  if (!environment.rootProblem.empty()) {
+    environment.err << "pelloran: " << environment.rootProblem << '\n';
+    return kFailed;
+  }
   Command command(environment, arguments);
   return work(command);
 }

@@ -20,6 +20,7 @@ struct Environment {
   bool errIsTerminal;       // then long work shows its progress there
   std::string figuresRoot;  // below which proc and sys lie; "/" for this machine
   std::function<void(std::chrono::steady_clock::time_point)> waitUntil;
+  std::string rootProblem = {};  // why the device root can't be used, if it can't
 };
 
 // Runs one command line. Returns the exit status: 0 done; 1 the work failed, with one line on `err`

@@ -7,20 +7,33 @@
 
 #include "daemon/context/DeviceContext.h"
 #include "platform/host/Host.h"
+#include "tools/common/CommandLog.h"
+#include "tools/common/StandardOutput.h"
 #include "tools/pelloran/Pelloran.h"
 
-int main(int argc, char** argv) {
-  platform::host::Host host;
+namespace {
+
+int run(std::ostream& out, int argc, char** argv) {
+  tools::CommandLog log("pelloran");
+  platform::host::Host host(log.hostOptions());
   morvend::DeviceContext context(host.platform());
   host.keepCountersBelow([&context] { return context.GetHomeDirectoryPath(); });
   return pelloran::runPelloran(
       {.store = host.counters(),
        .clock = host.platform().clock,
        .in = std::cin,
-       .out = std::cout,
+       .out = out,
        .err = std::cerr,
        .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
        .figuresRoot = "/",
-       .waitUntil = [](auto moment) { std::this_thread::sleep_until(moment); }},
+       .waitUntil = [](auto moment) { std::this_thread::sleep_until(moment); },
+       .rootProblem = host.root().problem()},
       argc, argv);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  tools::StandardOutput out;
+  return out.end(run(out, argc, argv));
 }

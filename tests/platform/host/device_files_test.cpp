@@ -58,7 +58,7 @@ TEST_F(DeviceFiles, ABrokenFileIsSaidOnceAndCountsAsMissing) {
     const std::string path = std::string("device/") + name + ".plist";
     DeviceFile file(root, codec, log, path);
     for (int i = 0; i < 2; ++i) EXPECT_EQ(file.value(), nullptr) << name;
-    EXPECT_EQ(log.count("error: " + path + ": "), 1) << name;
+    EXPECT_EQ(log.count("error: " + (folder / path).string() + ": "), 1) << name;
   }
   log.clear();
   DeviceFile missing(root, codec, log, "device/missing.plist");

@@ -1,0 +1,148 @@
+#include "tools/nandinfo/BufferKind.h"
+
+#include <algorithm>
+#include <optional>
+#include <string_view>
+
+#include "NANDInfo/ByteReader.h"
+#include "NANDInfo/DefectsList.h"
+#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
+#include "platform/Text.h"
+#include "platform/host/UTF8.h"
+#include "tools/nandinfo/SnapshotItems.h"
+
+namespace nandinfo {
+
+namespace {
+
+using NANDInfo::ByteReader;
+using NANDInfo::GenericParserCxt;
+using Bytes = std::span<const std::byte>;
+
+std::string_view textOf(Bytes bytes) {
+  return {reinterpret_cast<const char*>(bytes.data()), bytes.size()};
+}
+
+// UTF-8 without control characters but those of a text file. The first part of a file is enough.
+bool isText(Bytes bytes) {
+  constexpr std::size_t kLooked = 4096, kLongestCharacter = 4;
+  std::string_view text = textOf(bytes);
+  const std::size_t rest = text.size() > kLooked ? text.size() - kLooked : 0;
+  while (text.size() > rest) {
+    const std::size_t length = platform::host::characterLength(text);
+    const bool control = static_cast<unsigned char>(text[0]) < 0x20 &&
+                         std::string_view("\t\n\f\r").find(text[0]) == std::string_view::npos;
+    if (length == 0 || control) return false;
+    text.remove_prefix(length);
+  }
+  return bytes.size() >= kLongestCharacter;
+}
+
+bool isPropertyList(Bytes bytes) {
+  const std::string_view text = textOf(bytes);
+  return text.starts_with("bplist00") ||
+         (isText(bytes) && text.substr(0, 1024).find("<plist") != std::string_view::npos);
+}
+
+// What a parser makes of the bytes without any complaint.
+template <auto parse>
+std::optional<GenericParserCxt> parsedWithoutComplaint(Bytes bytes) {
+  NANDInfo::ResetAPIErrorMessage();
+  GenericParserCxt fields;
+  const bool parsed =
+      parse(&fields, bytes) > 0 && NANDInfo::GetAPIErrorMessage() == std::string_view("NA");
+  NANDInfo::ResetAPIErrorMessage();
+  return parsed ? std::optional(std::move(fields)) : std::nullopt;
+}
+
+// Most fields have a name of their own, and the fields take up the bytes.
+bool isFTLStatistics(Bytes bytes) {
+  constexpr std::size_t kLargestField = 16;  // a header and one value
+  const auto fields = parsedWithoutComplaint<NANDInfo::ZMCFTLParseBufferToCxt>(bytes);
+  if (!fields || fields->size() * kLargestField < bytes.size()) return false;
+  std::size_t named = 0;
+  for (std::size_t i = 0; i < fields->size(); ++i) {
+    if (!std::string_view((*fields)[i].name).starts_with("Stat_")) ++named;
+  }
+  return named * 2 >= fields->size();
+}
+
+bool isMSPStatistics(Bytes bytes) {
+  constexpr std::size_t kLargestField = 12;
+  const auto fields = parsedWithoutComplaint<NANDInfo::ZMCMSPParseBufferToCxt>(bytes);
+  return fields && fields->size() * kLargestField >= bytes.size();
+}
+
+bool isSnapshot(Bytes bytes) {
+  SnapshotItems items(bytes);
+  bool hasContainer = false;
+  while (const auto item = items.next()) hasContainer |= item->type == kContainerBegin;
+  return hasContainer && items.isWhole();
+}
+
+bool isDefectsList(Bytes bytes) {
+  const auto defects = NANDInfo::DefectsList::parse(bytes);
+  if (!defects || defects->size() == 0) return false;
+  for (std::size_t i = 0; i < defects->size(); ++i) {
+    if (!NANDInfo::reasonOffset((*defects)[i].mode)) return false;
+  }
+  ByteReader header(bytes);
+  header.read<std::uint64_t>();
+  return header.read<std::uint32_t>() == defects->size() &&
+         bytes.size() == NANDInfo::DefectsList::kHeaderSize +
+                             defects->size() * NANDInfo::DefectsList::kRecordSize;
+}
+
+// Every record of the list is one of a list that there is, and the last one ends the bytes.
+bool isValidityList(Bytes bytes) {
+  constexpr std::uint64_t kHeaderUnit = 8, kRecordSize = 20;
+  const auto lists = NANDInfo::parseValidityList(bytes);
+  if (!lists) return false;
+  ByteReader header(bytes);
+  const std::uint64_t count = *header.read<std::uint32_t>();
+  const std::uint64_t end = *header.read<std::uint32_t>() * kHeaderUnit + count * kRecordSize;
+  std::size_t values = 0;
+  for (const auto& list : *lists) values += list.size();
+  return values == count && bytes.size() - end < kHeaderUnit;
+}
+
+bool isUnknown(Bytes) { return false; }
+
+// In the order of the enumeration.
+struct Row {
+  BufferKind kind;
+  const char* name;
+  std::size_t least;  // bytes that hold anything
+  bool (*recognise)(Bytes bytes);
+};
+constexpr Row kRows[] = {
+    {BufferKind::text, "a text", 0, isText},
+    {BufferKind::propertyList, "a property list", 0, isPropertyList},
+    {BufferKind::snapshot, "a kernel snapshot", 16, isSnapshot},
+    {BufferKind::FTLStatistics, "FTL statistics", 8, isFTLStatistics},
+    {BufferKind::MSPStatistics, "MSP statistics", 4, isMSPStatistics},
+    {BufferKind::defects, "a defects list", NANDInfo::DefectsList::kHeaderSize, isDefectsList},
+    {BufferKind::validity, "a validity list", 8, isValidityList},
+    {BufferKind::telemetry, "a telemetry list",
+     NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize, isUnknown},
+    {BufferKind::counters, "a counter block", 0, isUnknown},
+};
+
+}  // namespace
+
+std::string whyNot(BufferKind wanted, Bytes bytes) {
+  const Row& own = kRows[static_cast<std::size_t>(wanted)];
+  if (own.recognise(bytes)) return {};
+  // A property list is a text, too: the last row that agrees says more.
+  const auto other = std::find_if(std::rbegin(kRows), std::rend(kRows),
+                                  [bytes](const Row& row) { return row.recognise(bytes); });
+  if (other != std::rend(kRows)) {
+    return platform::format("it holds %s, not %s", other->name, own.name);
+  }
+  if (bytes.size() >= own.least) return {};
+  return platform::format("%zu bytes are too few for %s", bytes.size(), own.name);
+}
+
+}  // namespace nandinfo

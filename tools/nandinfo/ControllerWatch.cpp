@@ -1,0 +1,147 @@
+#include "tools/nandinfo/ControllerWatch.h"
+
+#include <algorithm>
+#include <span>
+
+#include "NANDInfo/DriverHandles.h"
+#include "NANDInfo/NANDInfo.h"
+#include "platform/Text.h"
+
+namespace nandinfo {
+
+using platform::DriverConnection;
+using platform::DriverStatus;
+using platform::RegistryObject;
+
+namespace {
+
+std::span<const NANDInfo::nand_exporter_t> exporters() {
+  return {NANDInfo::nand_exporters_tunnel, NANDInfo::kExporters};
+}
+
+bool isController(std::string_view className) {
+  for (const auto& exporter : exporters()) {
+    if (className == exporter.className) return true;
+  }
+  return false;
+}
+
+std::string controllerNames() {
+  std::string names;
+  for (const auto& exporter : exporters()) {
+    names.append(names.empty() ? "" : ", ").append(exporter.className);
+  }
+  return names;
+}
+
+// The size phase of a tunnel command, which tells nothing yet.
+bool asksForSize(std::span<const std::byte> input) {
+  constexpr std::size_t kFlags = 4;
+  return input.size() > kFlags && (input[kFlags] & std::byte{1}) != std::byte{0};
+}
+
+}  // namespace
+
+ControllerWatch::ControllerWatch(platform::Platform& inner, DirectTexts texts)
+    : inner_(inner),
+      directTexts_(texts),
+      platform_{inner.log,
+                *this,
+                inner.clock,
+                inner.digest,
+                inner.propertyLists,
+                inner.files,
+                inner.counters,
+                inner.history,
+                inner.preferences,
+                inner.analyticsConfiguration,
+                inner.privilegedPreferences,
+                inner.submission,
+                inner.faultwatch,
+                inner.servitaLogs,
+                inner.eventLoop,
+                inner.namedServices,
+                inner.notifications,
+                inner.eventra,
+                inner.deviceProperties,
+                inner.systemVersion,
+                inner.kernel,
+                inner.snapshots,
+                *this,
+                *this,
+                inner.purgeableSpace,
+                inner.reportingChannels,
+                inner.networkUsage,
+                inner.applications,
+                inner.locale,
+                inner.libraries,
+                inner.runLock} {}
+
+std::string ControllerWatch::problem() {
+  if (!lookedUp_) {
+    for (const auto& exporter : exporters()) {
+      NANDInfo::RegistryHandle(platform_,
+                               NANDInfo::FindServiceUsingIterator(platform_, exporter.className));
+    }
+  }
+  if (found_.empty()) {
+    return "no storage controller found: the device registry names none of " + controllerNames();
+  }
+  if (answered_ || stage_ == Stage::nothing || stage_ == Stage::opened) return {};
+  const std::string status =
+      lastFailure_ != 0 ? platform::format(" (status 0x%x)", lastFailure_) : std::string();
+  return "the storage controller " + found_ +
+         (stage_ == Stage::asked ? " answers no command" : " can't be opened") + status;
+}
+
+void ControllerWatch::noteLookUp(std::string_view className, RegistryObject found) {
+  if (!isController(className)) return;
+  lookedUp_ = true;
+  if (found == 0) return;
+  found_ = className;
+  controllers_.insert(found);
+}
+
+RegistryObject ControllerWatch::DrvGetMatchingService(std::string_view className) {
+  const RegistryObject found = inner_.registry.DrvGetMatchingService(className);
+  noteLookUp(className, found);
+  return found;
+}
+
+bool ControllerWatch::conformsTo(RegistryObject entry, std::string_view className) {
+  const bool conforms = inner_.registry.conformsTo(entry, className);
+  noteLookUp(className, conforms ? entry : 0);
+  return conforms;
+}
+
+platform::DriverConnections::OpenResult ControllerWatch::DrvServiceOpen(RegistryObject service,
+                                                                        std::uint32_t type) {
+  const OpenResult result = inner_.drivers.DrvServiceOpen(service, type);
+  if (controllers_.contains(service)) {
+    if (result.status != 0) lastFailure_ = result.status;
+    stage_ = std::max(stage_, result.status == 0 ? Stage::opened : Stage::refused);
+    if (result.connection != 0) connections_.insert(result.connection);
+  }
+  return result;
+}
+
+platform::DriverConnections::CallResult ControllerWatch::DrvCallStructMethod(
+    DriverConnection connection, std::uint32_t method, std::span<const std::byte> input,
+    std::span<std::byte> output) {
+  const CallResult result = inner_.drivers.DrvCallStructMethod(connection, method, input, output);
+  if (connections_.contains(connection)) {
+    stage_ = Stage::asked;
+    if (result.status != 0) lastFailure_ = result.status;
+    if (result.status == 0 && !asksForSize(input)) answered_ = true;
+  }
+  return result;
+}
+
+void ControllerWatch::writeError(std::string_view text) {
+  if (directTexts_ == DirectTexts::passed) return inner_.streams.writeError(text);
+  while (text.ends_with('\n')) text.remove_suffix(1);
+  // "trying iterator...": a text that says what goes on, not what went wrong.
+  if (!text.ends_with("...")) texts_.emplace_back(text);
+}
+
+}  // namespace nandinfo

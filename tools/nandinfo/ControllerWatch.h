@@ -1,0 +1,78 @@
+// Watches what the storage library asks the storage controller for, so that a command can tell an
+// answer from a result that only looks like one.
+#pragma once
+
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "platform/Platform.h"
+
+namespace nandinfo {
+
+class ControllerWatch : private platform::DeviceRegistry,
+                        private platform::DriverConnections,
+                        private platform::StandardStreams {
+ public:
+  // Keeps the texts that are written to standard error directly, or lets them pass.
+  enum class DirectTexts { kept, passed };
+  ControllerWatch(platform::Platform& inner, DirectTexts texts);
+
+  // The inner platform, watched.
+  platform::Platform& platform() { return platform_; }
+
+  // Why nothing that the library said can come from a controller: none is there, none can be
+  // opened, or it answered no command. The empty text when one was asked and answered something, or
+  // when one is there and was asked nothing.
+  std::string problem();
+
+  // What was kept.
+  const std::vector<std::string>& texts() const { return texts_; }
+
+ private:
+  platform::RegistryObject DrvGetMatchingService(std::string_view className) override;
+  platform::RegistryObject rootEntry() override { return inner_.registry.rootEntry(); }
+  platform::RegistryObject createIterator() override { return inner_.registry.createIterator(); }
+  platform::RegistryObject next(platform::RegistryObject iterator) override {
+    return inner_.registry.next(iterator);
+  }
+  bool conformsTo(platform::RegistryObject entry, std::string_view className) override;
+  std::optional<platform::Value> searchProperty(platform::RegistryObject entry,
+                                                std::string_view key,
+                                                Direction direction) override {
+    return inner_.registry.searchProperty(entry, key, direction);
+  }
+  void release(platform::RegistryObject object) override { inner_.registry.release(object); }
+
+  OpenResult DrvServiceOpen(platform::RegistryObject service, std::uint32_t type) override;
+  platform::DriverStatus DrvServiceClose(platform::DriverConnection connection) override {
+    return inner_.drivers.DrvServiceClose(connection);
+  }
+  CallResult DrvCallStructMethod(platform::DriverConnection connection, std::uint32_t method,
+                                 std::span<const std::byte> input,
+                                 std::span<std::byte> output) override;
+  platform::DriverStatus DrvCallMethod(platform::DriverConnection connection, std::uint32_t method,
+                                       std::span<const std::uint64_t> input,
+                                       std::span<std::uint64_t> output) override {
+    return inner_.drivers.DrvCallMethod(connection, method, input, output);
+  }
+
+  void writeError(std::string_view text) override;
+  void writeOutput(std::string_view text) override { inner_.streams.writeOutput(text); }
+
+  void noteLookUp(std::string_view className, platform::RegistryObject found);
+
+  platform::Platform& inner_;
+  const DirectTexts directTexts_;
+  std::vector<std::string> texts_;
+  bool lookedUp_ = false, answered_ = false;
+  enum class Stage { nothing, refused, opened, asked } stage_ = Stage::nothing;  // the farthest
+  std::string found_;                                 // the class of the last one that was found
+  std::set<platform::RegistryObject> controllers_;    // every handle that was given out
+  std::set<platform::DriverConnection> connections_;  // to controllers
+  platform::DriverStatus lastFailure_ = 0;            // of an opening or a command; 0: none so far
+  platform::Platform platform_;
+};
+
+}  // namespace nandinfo

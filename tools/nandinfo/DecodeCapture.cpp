@@ -1,0 +1,236 @@
+#include "tools/nandinfo/DecodeCapture.h"
+
+#include <algorithm>
+#include <charconv>
+#include <optional>
+#include <string>
+#include <string_view>
+
+#include "NANDInfo/ListHandlers.h"
+#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/TelemetryList.h"
+#include "platform/Text.h"
+#include "platform/host/DeviceRoot.h"
+#include "tools/nandinfo/DecodedBuffer.h"
+
+namespace nandinfo {
+
+namespace {
+
+using platform::Array;
+using platform::Dictionary;
+using platform::Value;
+
+struct CapturedController {
+  const char* className;
+  const char* propertyKey;
+  const Dictionary* entry;
+};
+
+bool isOfClass(const Dictionary& entry, std::string_view className) {
+  const std::string* own = entry.text("Class");
+  return own != nullptr && *own == className;
+}
+
+// The first entry of a class with a driver that answers anything, parents before children. The
+// depth is that of a property list, which is limited.
+const Dictionary* findEntry(const Dictionary& entry, std::string_view className) {
+  const Dictionary* driver = entry.dictionary("Driver");
+  if (isOfClass(entry, className) && driver != nullptr &&
+      driver->dictionary("Buffers") != nullptr) {
+    return &entry;
+  }
+  if (const Array* children = entry.array("Children")) {
+    for (const Value& child : *children) {
+      const auto* below = child.as<Dictionary>();
+      if (below == nullptr) continue;
+      if (const Dictionary* found = findEntry(*below, className)) return found;
+    }
+  }
+  return nullptr;
+}
+
+std::optional<CapturedController> findController(const Dictionary& registry) {
+  for (std::size_t i = 0; i < NANDInfo::kExporters; ++i) {
+    const auto& exporter = NANDInfo::nand_exporters_tunnel[i];
+    if (const Dictionary* entry = findEntry(registry, exporter.className)) {
+      return CapturedController{exporter.className, exporter.propertyKey, entry};
+    }
+  }
+  return std::nullopt;
+}
+
+// What tells how a telemetry list is read.
+struct Characteristics {
+  const CounterLayout* layout;
+  std::uint32_t channels;  // 0 if it isn't known
+};
+
+Characteristics characteristicsOf(platform::Platform& platform,
+                                  const CapturedController& controller) {
+  static const Dictionary kNone;
+  const Dictionary* properties = controller.entry->dictionary("Properties");
+  const Dictionary* device =
+      properties != nullptr ? properties->dictionary(controller.propertyKey) : nullptr;
+  if (device == nullptr) device = &kNone;
+  const std::string *chip = device->text("chip-id"), *vendor = device->text("manufacturer-id");
+  auto* const convert =
+      NANDInfo::counterConverter(NANDInfo::chipKind(chip != nullptr ? *chip : ""),
+                                 vendor != nullptr ? NANDInfo::vendorCode(platform, *vendor) : 0);
+  const auto layouts = counterLayouts();
+  const auto layout = std::find_if(layouts.begin(), layouts.end(),
+                                   [&](const CounterLayout& row) { return row.parse == convert; });
+  const platform::Number* channels = device->number("num-bus");
+  const std::int64_t count = channels != nullptr ? channels->int64Value() : 0;
+  return {&*layout, count > 0 && count < INT32_MAX ? static_cast<std::uint32_t>(count) : 0};
+}
+
+// The names of the capture's buffers and what decodes them.
+struct OpType {
+  std::uint32_t number;
+  const char* name;
+  Dictionary (*decode)(Bytes bytes);
+};
+constexpr OpType kOpTypes[] = {
+    {13, "statistics", decodedFTL},    {10, "read-statistics", decodedFTL},
+    {221, "msp", decodedMSP},          {15, "defects", decodedDefects},
+    {17, "telemetry", nullptr},        {11, "band-statistics", decodedValidity},
+    {39, "task-scheduler", nullptr},   {22, "snapshot", nullptr},
+    {145, "snapshot-header", nullptr},
+};
+constexpr std::uint32_t kTelemetry = 17;
+
+// The numbers of a buffer's key: "13:0", or "13" for argument 0.
+bool parseKey(std::string_view key, std::uint32_t& opType, std::uint32_t& argument) {
+  const auto number = [](std::string_view text, std::uint32_t& value) {
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    return error == std::errc() && end == text.data() + text.size();
+  };
+  const std::size_t colon = key.find(':');
+  argument = 0;
+  return number(key.substr(0, colon), opType) &&
+         (colon == key.npos || number(key.substr(colon + 1), argument));
+}
+
+class Capture {
+ public:
+  explicit Capture(const Invocation& invocation)
+      : platform_(invocation.platform), folder_(invocation.arguments.folder) {}
+
+  CommandResult decode() {
+    if (!folder_.problem().empty()) {
+      return CommandResult::failure(folder_.problem("the folder"));
+    }
+    constexpr char kRegistry[] = "registry.plist";
+    const auto bytes = read(kRegistry);
+    if (!bytes) return failed(kRegistry, bytes.error);
+    const auto registry = platform_.propertyLists.read(*bytes);
+    if (!registry) return failed(kRegistry, registry.error);
+    const auto* top = registry->as<Dictionary>();
+    const auto controller = top != nullptr ? findController(*top) : std::nullopt;
+    if (!controller) return failed(kRegistry, "it has no controller with buffers");
+    decoded_ = {{"ok", true}, {"class", controller->className}};
+    decodeBuffers(*controller);
+    decodeSnapshotOfKernel();
+    decoded_.set("undecoded", std::move(undecoded_));
+    decoded_.set("ok", why_.empty() && count_ > 0);
+    if (why_.empty() && count_ == 0) why_ = "no buffer in it can be decoded";
+    decoded_.set("error", why_.empty() ? "NA" : why_);
+    return {std::move(decoded_), why_.empty() ? "" : folder_.path() + ": " + why_};
+  }
+
+ private:
+  CommandResult failed(const char* name, const std::string& why) const {
+    return CommandResult::failure(folder_.hostPath(name) + ": " + why);
+  }
+
+  // A file of the capture, as long as all of them together aren't too long.
+  platform::Result<std::string> read(const std::string& name) {
+    using Result = platform::Result<std::string>;
+    auto bytes = folder_.readFile(name, left_ + 1);
+    if (!bytes) return bytes;
+    if (bytes->size() > left_) return Result::failure("the capture is longer than 16 MiB");
+    left_ -= bytes->size();
+    return bytes;
+  }
+
+  // A driver's answer: the bytes, a file, or a dictionary with either; none if it answers a
+  // failure.
+  std::optional<platform::Result<std::string>> answer(const Value& value) {
+    const auto* options = value.as<Dictionary>();
+    const auto* file = options != nullptr ? options->text("File") : value.as<std::string>();
+    const auto* data = options != nullptr ? options->data("Data") : value.as<platform::Data>();
+    for (const char* failure : {"FailSize", "FailData"}) {
+      const auto* status = options != nullptr ? options->number(failure) : nullptr;
+      if (status != nullptr && status->boolValue()) return std::nullopt;
+    }
+    if (file != nullptr) return read(*file);
+    if (data == nullptr) return std::nullopt;
+    return platform::Result<std::string>::success(std::string(data->begin(), data->end()));
+  }
+
+  void decodeBuffers(const CapturedController& controller) {
+    const Characteristics device = characteristicsOf(platform_, controller);
+    for (const auto& [key, value] :
+         *controller.entry->dictionary("Driver")->dictionary("Buffers")) {
+      std::uint32_t opType = 0, argument = 0;
+      const auto* row =
+          parseKey(key, opType, argument)
+              ? std::find_if(std::begin(kOpTypes), std::end(kOpTypes),
+                             [&](const OpType& known) { return known.number == opType; })
+              : std::end(kOpTypes);
+      const std::string name = row != std::end(kOpTypes)
+                                   ? platform::format("%s %u", row->name, argument)
+                                   : "buffer " + key;
+      if (row == std::end(kOpTypes) || (row->decode == nullptr && opType != kTelemetry)) {
+        undecoded_.push_back(name);
+        continue;
+      }
+      const auto bytes = answer(value);
+      if (!bytes) continue;
+      if (!*bytes) {
+        note(name, (*bytes).error);
+      } else if (!(**bytes).empty()) {  // nothing was delivered, and that was the answer
+        add(name, opType == kTelemetry
+                      ? decodedTelemetry(spanOf(**bytes), *device.layout, device.channels)
+                      : row->decode(spanOf(**bytes)));
+      }
+    }
+  }
+
+  void decodeSnapshotOfKernel() {
+    constexpr char kName[] = "kernel-snapshot";
+    const std::string file = std::string(kName) + ".bin";
+    if (!folder_.openForStatus(file)) return;
+    const auto bytes = read(file);
+    if (!bytes) return note(kName, bytes.error);
+    add(kName, decodedSnapshot(spanOf(*bytes)));
+  }
+
+  static Bytes spanOf(const std::string& bytes) { return std::as_bytes(std::span(bytes)); }
+
+  // The first one that fails is the one that is said.
+  void note(const std::string& name, const std::string& why) {
+    if (why_.empty()) why_ = name + ": " + (why == "NA" ? "nothing in it can be decoded" : why);
+  }
+
+  void add(const std::string& name, Dictionary decoded) {
+    ++count_;
+    if (!decoded.number("ok")->boolValue()) note(name, *decoded.text("error"));
+    decoded_.set(name, std::move(decoded));
+  }
+
+  platform::Platform& platform_;
+  const platform::host::DeviceRoot folder_;
+  std::size_t left_ = NANDInfo::kLargestBuffer;  // bytes that may still be read
+  std::size_t count_ = 0;                        // of decoded buffers
+  Dictionary decoded_;
+  Array undecoded_;
+  std::string why_;  // it failed
+};
+
+}  // namespace
+
+CommandResult decodeCapture(const Invocation& invocation) { return Capture(invocation).decode(); }
+
+}  // namespace nandinfo

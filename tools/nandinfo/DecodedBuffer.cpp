@@ -1,0 +1,206 @@
+#include "tools/nandinfo/DecodedBuffer.h"
+
+#include <algorithm>
+#include <iterator>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "NANDInfo/ByteReader.h"
+#include "NANDInfo/DefectsList.h"
+#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/SnapshotReader.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
+#include "platform/Text.h"
+#include "tools/nandinfo/BufferKind.h"
+#include "tools/nandinfo/SnapshotItems.h"
+
+namespace nandinfo {
+
+namespace {
+
+using NANDInfo::GenericParserCxt;
+using platform::Array;
+using platform::Dictionary;
+using platform::Value;
+
+static_assert(kChannelSize == NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize);
+
+Dictionary whole(Dictionary content, bool ok, const std::string& error) {
+  Dictionary decoded{{"ok", ok}};
+  for (auto& [key, value] : content) decoded.set(key, value);
+  decoded.set("error", error);
+  return decoded;
+}
+
+Dictionary refused(const std::string& why) { return whole({{"fields", Array{}}}, false, why); }
+
+Dictionary withFields(const GenericParserCxt& context, bool ok) {
+  Array fields;
+  fields.reserve(context.size());
+  for (std::size_t i = 0; i < context.size(); ++i) {
+    const GenericParserCxt::Field field = context[i];
+    fields.push_back(Array{Value(field.name), Value(field.value)});
+  }
+  return whole({{"fields", std::move(fields)}}, ok, NANDInfo::GetAPIErrorMessage());
+}
+
+template <auto parse>
+Dictionary parsed(BufferKind kind, Bytes bytes) {
+  if (const std::string why = whyNot(kind, bytes); !why.empty()) return refused(why);
+  GenericParserCxt context;
+  NANDInfo::ResetAPIErrorMessage();
+  const bool ok = parse(&context, bytes) > 0;
+  return withFields(context, ok);
+}
+
+std::string typeName(std::uint32_t type) {
+  switch (type) {
+    case kContainerBegin:
+      return "container begin";
+    case kContainerEnd:
+      return "container end";
+    case kIOStatistics:
+      return "I/O statistics";
+    case kThreadName:
+      return "thread name";
+    default:
+      return platform::format("0x%x", type);
+  }
+}
+
+// One row for each type in the order of their first items; what comes after so many types is one.
+Array summedItems(Bytes snapshot) {
+  constexpr std::size_t kMostTypes = 100;
+  struct Sum {
+    std::string type;
+    std::uint64_t count = 0, bytes = 0;
+  };
+  std::vector<Sum> sums;
+  SnapshotItems items(snapshot);
+  std::vector<std::uint32_t> types;
+  while (const auto item = items.next()) {
+    auto place =
+        static_cast<std::size_t>(std::find(types.begin(), types.end(), item->type) - types.begin());
+    if (place == types.size() && place < kMostTypes) types.push_back(item->type);
+    if (place == sums.size()) {
+      sums.push_back({place < kMostTypes ? typeName(item->type) : "others"});
+    }
+    ++sums[place].count;
+    sums[place].bytes += item->payload.size();
+  }
+  Array rows;
+  for (const Sum& sum : sums) {
+    rows.push_back(Dictionary{{"type", sum.type}, {"count", sum.count}, {"bytes", sum.bytes}});
+  }
+  return rows;
+}
+
+constexpr CounterLayout kLayouts[] = {
+    {"1y", 533, "", NANDInfo::parseCounters1y},
+    {"1x-sandisk", 316, "", NANDInfo::parseCounters1xSandisk},
+    {"1x-hynix", 312, "", NANDInfo::parseCounters1xHynix},
+    {"generic", 121, "QM7", NANDInfo::parseCountersAlgoGeneric},
+    {"q8", 127, "QM8", NANDInfo::parseCountersAlgoGenericQ8},
+};
+
+}  // namespace
+
+Dictionary decodedFTL(Bytes bytes) {
+  return parsed<NANDInfo::ZMCFTLParseBufferToCxt>(BufferKind::FTLStatistics, bytes);
+}
+
+Dictionary decodedFTLStat(Bytes bytes) {
+  return parsed<NANDInfo::ZMCFTLParseStatKeyBufferToCxt>(BufferKind::FTLStatistics, bytes);
+}
+
+Dictionary decodedMSP(Bytes bytes) {
+  return parsed<NANDInfo::ZMCMSPParseBufferToCxt>(BufferKind::MSPStatistics, bytes);
+}
+
+Dictionary decodedLegacy(Bytes bytes) {
+  if (const auto why = whyNot(BufferKind::FTLStatistics, bytes); !why.empty()) return refused(why);
+  NANDInfo::LegacyNandInfoCxt context;
+  NANDInfo::ResetAPIErrorMessage();
+  const bool ok = NANDInfo::ZMCParseBufferToCxt(&context, bytes);
+  return withFields(context.fields, ok);
+}
+
+Dictionary decodedValidity(Bytes bytes) {
+  if (const auto why = whyNot(BufferKind::validity, bytes); !why.empty()) return refused(why);
+  auto lists = NANDInfo::parseValidityList(bytes);
+  if (!lists) return refused("it has no records, or more than the bytes hold");
+  Array fields;
+  for (std::size_t i = 0; i < lists->size(); ++i) {
+    if ((*lists)[i].empty()) continue;
+    fields.push_back(Array{platform::format("ValidityList[%zu]", i), std::move((*lists)[i])});
+  }
+  return whole({{"fields", std::move(fields)}}, true, "NA");
+}
+
+Dictionary decodedDefects(Bytes bytes) {
+  if (const auto why = whyNot(BufferKind::defects, bytes); !why.empty()) return refused(why);
+  const auto list = NANDInfo::DefectsList::parse(bytes);
+  Array defects;
+  for (std::size_t i = 0; i < list->size(); ++i) {
+    const NANDInfo::Defect defect = (*list)[i];
+    Dictionary row = NANDInfo::defectLog(defect);
+    row.set("Mode", std::uint64_t{defect.mode});
+    defects.push_back(std::move(row));
+  }
+  return whole(
+      {{"Factory Count", std::uint64_t{list->factoryCount()}}, {"defects", std::move(defects)}},
+      true, "NA");
+}
+
+Dictionary decodedSnapshot(Bytes bytes) {
+  if (const auto why = whyNot(BufferKind::snapshot, bytes); !why.empty()) return refused(why);
+  Array items = summedItems(bytes);
+  const bool hasContainer = std::any_of(items.begin(), items.end(), [](const Value& item) {
+    return *item.as<Dictionary>()->text("type") == typeName(kContainerBegin);
+  });
+  if (!hasContainer) return refused("it has no container, as a snapshot has");
+  Array fields;
+  constexpr char kThread[] = "VM_swapout";
+  if (const auto statistics = NANDInfo::getIOStatsWithThreadnameFromKCData(bytes, kThread)) {
+    constexpr int kMostCounters = 64;
+    NANDInfo::ByteReader reader(*statistics);
+    for (int i = 0; i < kMostCounters; ++i) {
+      const auto counter = reader.read<std::uint64_t>();
+      if (!counter) break;
+      fields.push_back(Array{platform::format("%s[%d]", kThread, i), *counter});
+    }
+  }
+  return whole({{"fields", std::move(fields)}, {"items", std::move(items)}}, true, "NA");
+}
+
+Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout, std::uint32_t channels) {
+  if (const auto why = whyNot(BufferKind::telemetry, bytes); !why.empty()) return refused(why);
+  if (channels == 0) {
+    if (bytes.size() % kChannelSize != 0) {
+      return refused(
+          platform::format("%zu bytes are no whole number of channels, of %zu bytes each",
+                           bytes.size(), kChannelSize));
+    }
+    channels = static_cast<std::uint32_t>(bytes.size() / kChannelSize);
+  }
+  const auto list = NANDInfo::parseTelemetryList(bytes, static_cast<std::int32_t>(channels));
+  if (!list) return refused(platform::format("there are not %u channels in it", channels));
+  Dictionary byIndex;
+  for (std::size_t i = 0; i < list->size(); ++i) {
+    byIndex.set(std::to_string(i),
+                NANDInfo::telemetryLog((*list)[i], NANDInfo::chipKind(layout.chip), layout.parse));
+  }
+  return whole({{"channels", std::move(byIndex)}}, true, "NA");
+}
+
+std::span<const CounterLayout> counterLayouts() { return kLayouts; }
+
+const CounterLayout* findCounterLayout(std::string_view name) {
+  const auto* layout = std::find_if(std::begin(kLayouts), std::end(kLayouts),
+                                    [&](const CounterLayout& row) { return row.name == name; });
+  return layout != std::end(kLayouts) ? layout : nullptr;
+}
+
+}  // namespace nandinfo

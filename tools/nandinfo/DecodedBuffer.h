@@ -1,0 +1,55 @@
+// Captured buffers as dictionaries.
+//
+// Each has "ok", whether the bytes are a buffer of its kind and could be read, and "error", the
+// library's message or why they are none. What was read stands between them: "fields" is an array
+// of [name, value] in the buffer's order.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <string_view>
+
+#include "NANDInfo/CounterRecords.h"
+#include "platform/PropertyList.h"
+
+namespace nandinfo {
+
+using Bytes = std::span<const std::byte>;
+
+// "fields".
+platform::Dictionary decodedFTL(Bytes bytes);
+platform::Dictionary decodedFTLStat(Bytes bytes);
+platform::Dictionary decodedLegacy(Bytes bytes);
+platform::Dictionary decodedMSP(Bytes bytes);
+
+// "fields": the values of each list, an array.
+platform::Dictionary decodedValidity(Bytes bytes);
+
+// "Factory Count", and "defects", a dictionary for each, whose "Reason" is without what its "Mode"
+// adds when it is logged.
+platform::Dictionary decodedDefects(Bytes bytes);
+
+// "fields": what the swap-out thread has written, and its counters; none when it isn't in the
+// snapshot. "items": a dictionary for each type, with how many there are and their bytes.
+platform::Dictionary decodedSnapshot(Bytes bytes);
+
+// A vendor's layout of the counter block.
+struct CounterLayout {
+  const char* name;
+  std::size_t words;  // the highest that it reads, and one
+  const char* chip;   // the identifier of the chips that have it; empty if the vendor decides
+  void (*parse)(NANDInfo::CounterBlock block, NANDInfo::NandCountersRecord& record);
+};
+std::span<const CounterLayout> counterLayouts();
+const CounterLayout* findCounterLayout(std::string_view name);
+
+// "channels": a dictionary for each, under its index: the summary and the counters. `channels` is
+// how many the controller has; 0: as many as fill the bytes.
+platform::Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout,
+                                      std::uint32_t channels);
+
+// The bytes of a channel in a telemetry list.
+inline constexpr std::size_t kChannelSize = 4096 + 32;
+
+}  // namespace nandinfo
