@@ -2,6 +2,7 @@
 
 #include <cstdarg>
 #include <cstdio>
+#include <utility>
 
 #include "NANDInfo/ProcessState.h"
 
@@ -25,6 +26,12 @@ void SetAPIErrorMessage(const char* format, ...) {
 
 const char* GetAPIErrorMessage() { return recorded ? message : "NA"; }
 
-void ResetAPIErrorMessage() { recorded = false; }
+APIErrorScope::APIErrorScope()
+    : outer_(recorded ? message : ""), outerRecorded_(std::exchange(recorded, false)) {}
+
+APIErrorScope::~APIErrorScope() {
+  recorded = outerRecorded_;
+  if (recorded) std::snprintf(message, sizeof message, "%s", outer_.c_str());
+}
 
 }  // namespace NANDInfo

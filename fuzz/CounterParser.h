@@ -7,6 +7,7 @@
 #include <memory_resource>
 #include <span>
 #include <string>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -45,23 +46,21 @@ inline bool isSubsequence(const Fields& some, const Fields& all) {
 template <typename Parse>
 Fields checkCounterParser(Parse parse, std::span<const std::byte> bytes, std::size_t narrowest) {
   const auto run = [&](std::pmr::memory_resource* memory) {
-    NANDInfo::ResetAPIErrorMessage();
+    const NANDInfo::APIErrorScope errors;
     NANDInfo::GenericParserCxt context(memory);
     const std::uint32_t total = parse(&context, bytes);
-    return std::pair(total, fieldsOf(context));
+    return std::tuple(total, fieldsOf(context), std::string(NANDInfo::GetAPIErrorMessage()));
   };
-  const auto [total, fields] = run(std::pmr::new_delete_resource());
-  const std::string message = NANDInfo::GetAPIErrorMessage();
+  const auto [total, fields, message] = run(std::pmr::new_delete_resource());
   require(fields.size() <= bytes.size() / narrowest);
   // The two differ only by what is dropped from an array of more than 65,535 elements.
   require(total == fields.size() || (total > fields.size() && bytes.size() > 65535 * narrowest));
-  require(run(std::pmr::new_delete_resource()) == std::pair(total, fields));
-  require(NANDInfo::GetAPIErrorMessage() == message);
+  require(run(std::pmr::new_delete_resource()) == std::tuple(total, fields, message));
 
   std::vector<std::byte> room(bytes.size());
   std::pmr::monotonic_buffer_resource little(room.data(), room.size(),
                                              std::pmr::null_memory_resource());
-  const auto [lessTotal, fewer] = run(&little);
+  const auto [lessTotal, fewer, noMemory] = run(&little);
   require(lessTotal <= total && isSubsequence(fewer, fields));
   return fields;
 }

@@ -14,7 +14,6 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
     const auto channels = buffer.empty() ? 0u : std::to_integer<std::uint32_t>(buffer.front());
     return decodedTelemetry(buffer, counterLayouts().front(), channels % 4);
   };
-  NANDInfo::ResetAPIErrorMessage();
   for (platform::Dictionary (*decode)(Bytes buffer) :
        {decodedFTL, decodedFTLStat, decodedLegacy, decodedMSP, decodedValidity, decodedDefects,
         decodedSnapshot, +telemetry}) {

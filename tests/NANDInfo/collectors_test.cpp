@@ -4,9 +4,9 @@
 
 #include <functional>
 
-#include "NANDInfo/ProcessState.h"
 #include "platform/Text.h"
 #include "platform/testing/FaultInjector.h"
+#include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {
@@ -217,7 +217,7 @@ TEST(Collectors, AnyCallMayFail) {
       int calls = 0;
       for (int failing = 0; failing <= calls; ++failing) {
         SCOPED_TRACE(std::string(row.name) + " " + std::to_string(failing));
-        ResetAPIErrorMessage();
+        support::freshErrors();
         faults.failAt(failing);
         const Dictionary result = row.collect(faults.platform());
         if (failing == 0) whole = result, calls = faults.calls();

@@ -3,8 +3,8 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/NameTable.h"
-#include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
+#include "support/FreshErrors.h"
 
 namespace NANDInfo {
 namespace {
@@ -106,15 +106,15 @@ TEST(GenericParserContext, SurvivesARefusalAtEachAllocation) {
 }
 
 TEST(APIErrorMessage, KeepsTheFirstOne) {
-  ResetAPIErrorMessage();
+  support::freshErrors();
   EXPECT_STREQ(GetAPIErrorMessage(), "NA");
   SetAPIErrorMessage("%s(%d)", std::string(2000, 'm').c_str(), 1);
   SetAPIErrorMessage("second");
   EXPECT_EQ(GetAPIErrorMessage(), std::string(1023, 'm'));
-  ResetAPIErrorMessage();
+  support::freshErrors();
   SetAPIErrorMessage("failed: %d", 7);
   EXPECT_STREQ(GetAPIErrorMessage(), "failed: 7");
-  ResetAPIErrorMessage();
+  support::freshErrors();
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/ProcessState.h"
+#include "support/FreshErrors.h"
 #include "support/TestPlatform.h"
 
 namespace NANDInfo {
@@ -31,7 +32,7 @@ class ControllerTest : public ::testing::Test {
 
   void restart() {
     ResetExporters();
-    ResetAPIErrorMessage();
+    support::freshErrors();
     registry = FakeDeviceRegistry();
     fakes.streams.errors.clear();
     fakes.log.clear();
@@ -210,7 +211,7 @@ TEST_F(ControllerTest, TunnelCommandsThatCannotBeSent) {
                {1, &mute, getStatsSelectors(), "exporter"},
                {1, &nand_exporters_tunnel[0], nullptr, "opType Selector"}};
   for (const auto& row : cases) {
-    ResetAPIErrorMessage();
+    support::freshErrors();
     TunnelCommandBlock block;
     Buffer buffer;
     EXPECT_FALSE(

@@ -12,9 +12,9 @@
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/ExtractionSteps.h"
-#include "NANDInfo/ProcessState.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/Fingerprint.h"
+#include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {
@@ -344,7 +344,7 @@ TEST(ExtractionStep, SaysWhatItCouldNotGatherOrSend) {
             error("Stats Magazine not supported"));
 
   device.log.clear();
-  ResetAPIErrorMessage();
+  support::freshErrors();
   device.eventra.queuesEvents = false;
   const Dictionary msps{{kTLM_APIErrorMessage, "NA"}, {"0", Dictionary()}};
   EXPECT_EQ(createAndLogMSPFieldsToEventraForEvent(device.platform, msps), Dictionary());

@@ -6,7 +6,7 @@
 #include <gtest/gtest.h>
 
 #include "NANDInfo/MagazineDeltas.h"
-#include "NANDInfo/ProcessState.h"
+#include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {
@@ -209,7 +209,7 @@ TEST(Magazine, WalksSixWindowsOfFourHours) {
 
   EXPECT_EQ(CopySMagNANDFTLCustomHistoryInfo(device.platform, 1), Dictionary());
   device.setSnapshot(0, snapshotAt(kDay, {}, false));
-  ResetAPIErrorMessage();
+  support::freshErrors();
   for (const std::uint32_t skips : {0, 1}) {
     EXPECT_EQ(CopySMagNANDFTLCustomHistoryInfo(device.platform, skips),
               (Dictionary{{kNANDInfoErrorMessageKey, "Stat Magazine not supported"}}));

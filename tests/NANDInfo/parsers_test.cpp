@@ -8,8 +8,8 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
-#include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
+#include "support/FreshErrors.h"
 
 namespace NANDInfo {
 namespace {
@@ -21,7 +21,7 @@ using GenericParser = std::uint32_t(GenericParserCxt*, std::span<const std::byte
 // Runs a parser over the bytes as they lie in memory of exactly their size.
 void expectParse(GenericParser parse, const Bytes& bytes, const Fields& fields, std::uint32_t total,
                  const std::string& message) {
-  ResetAPIErrorMessage();
+  support::freshErrors();
   GenericParserCxt context;
   EXPECT_EQ(parse(&context, Bytes(bytes)), total);
   EXPECT_EQ(fieldsOf(context), fields);
@@ -34,7 +34,7 @@ void expectRefusal(GenericParser parse, const Bytes& bytes, std::uint32_t total,
   RefusingMemory memory;
   GenericParserCxt refused(&memory);
   for (GenericParserCxt* context : {&refused, static_cast<GenericParserCxt*>(nullptr)}) {
-    ResetAPIErrorMessage();
+    support::freshErrors();
     EXPECT_EQ(parse(context, bytes), total);
     EXPECT_EQ(GetAPIErrorMessage(), message);
   }

@@ -15,6 +15,7 @@
 #include "end_to_end/Device.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/testing/FaultInjector.h"
+#include "support/FreshErrors.h"
 #include "support/HostOnRoot.h"
 
 namespace end_to_end {
@@ -35,7 +36,7 @@ std::string runDay(
         [](Platform& platform, const auto& run) { run(platform); }) {
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent", 1);
   NANDInfo::ResetExporters();
-  NANDInfo::ResetAPIErrorMessage();
+  support::freshErrors();
   NANDInfo::ResetStructuredLogState();
   const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
   ::testing::internal::CaptureStderr();

@@ -11,6 +11,7 @@
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/ProcessState.h"
 #include "support/ControllerBuffers.h"
+#include "support/FreshErrors.h"
 #include "support/TestPlatform.h"
 
 namespace support {
@@ -33,7 +34,7 @@ inline Bytes ftlBuffer(const FTLFields& fields) {
 struct StorageDevice : TestPlatform {
   explicit StorageDevice(const char* controller = nullptr) {
     NANDInfo::ResetExporters();
-    NANDInfo::ResetAPIErrorMessage();
+    support::freshErrors();
     if (controller != nullptr) registry.add({.className = controller});
   }
 

@@ -7,12 +7,12 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
-#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/TelemetryList.h"
 #include "platform/Text.h"
 #include "platform/host/Host.h"
 #include "platform/host/JSON.h"
+#include "support/FreshErrors.h"
 #include "support/HostOnRoot.h"
 #include "support/TemporaryFolder.h"
 #include "tools/demo/Device.h"
@@ -250,7 +250,7 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
 template <typename Parse>
 std::map<std::string, std::uint64_t> fieldsOf(const std::string& bytes, Parse parse,
                                               std::size_t expected) {
-  NANDInfo::ResetAPIErrorMessage();
+  support::freshErrors();
   NANDInfo::GenericParserCxt context;
   EXPECT_EQ(parse(&context, std::as_bytes(std::span(bytes))), expected);
   EXPECT_STREQ(NANDInfo::GetAPIErrorMessage(), "NA");

@@ -6,9 +6,9 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/ProcessState.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
+#include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 #include "support/TemporaryFolder.h"
 #include "tools/nandinfo/Commands.h"
@@ -29,7 +29,7 @@ class Nandinfo : public testing::Test {
     std::vector<const char*> argv = {"nandinfo"};
     for (const auto& argument : arguments) argv.push_back(argument.c_str());
     std::ostringstream outStream, errStream;
-    NANDInfo::ResetAPIErrorMessage();
+    support::freshErrors();
     const int status =
         nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60, root},
                               static_cast<int>(argv.size()), argv.data());

@@ -7,6 +7,7 @@
 #include "NANDInfo/ByteReader.h"
 #include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
 #include "platform/Text.h"
@@ -49,11 +50,10 @@ bool isPropertyList(Bytes bytes) {
 // What a parser makes of the bytes without any complaint.
 template <auto parse>
 std::optional<GenericParserCxt> parsedWithoutComplaint(Bytes bytes) {
-  NANDInfo::ResetAPIErrorMessage();
+  const NANDInfo::APIErrorScope errors;
   GenericParserCxt fields;
   const bool parsed =
       parse(&fields, bytes) > 0 && NANDInfo::GetAPIErrorMessage() == std::string_view("NA");
-  NANDInfo::ResetAPIErrorMessage();
   return parsed ? std::optional(std::move(fields)) : std::nullopt;
 }
 

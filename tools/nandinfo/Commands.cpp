@@ -60,28 +60,8 @@ CommandResult magazine(const Invocation& invocation) {
                                                     arguments.noDelta ? 0 : 1, arguments.mode));
 }
 
-// Whether the controller answers any of the commands that the extraction is made of.
-bool answers(platform::Platform& platform) {
-  NANDInfo::nand_exporter_t* exporter = nullptr;
-  if (!NANDInfo::findNandExporterNew(platform, exporter)) return false;
-  bool answered = false;
-  for (const auto getter : {exporter->getStatsSelectors, exporter->getReadStatsSelectors,
-                            exporter->getMSPStatsSelectors}) {
-    NANDInfo::TunnelCommandBlock block;
-    NANDInfo::Buffer buffer;
-    if (getter == nullptr || answered) continue;
-    answered = NANDInfo::executeTunnelCommand(platform, exporter->io_connection, exporter, getter(),
-                                              block, buffer);
-  }
-  NANDInfo::ReleaseIOInterfaces(platform, exporter);
-  NANDInfo::ResetAPIErrorMessage();
-  return answered;
-}
-
-// Sends nothing when there is nobody to tell how the storage does.
 CommandResult extract(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
-  if (!answers(invocation.platform)) return {};
   return result(NANDInfo::NandInfoExtractToEV_runAllSteps(
       invocation.platform, nullptr, arguments.monthly ? NANDInfo::kAllowsMonthly : 0, true,
       arguments.from));

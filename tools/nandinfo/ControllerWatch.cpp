@@ -62,7 +62,7 @@ ControllerWatch::ControllerWatch(platform::Platform& inner, DirectTexts texts)
                 inner.eventLoop,
                 inner.namedServices,
                 inner.notifications,
-                inner.eventra,
+                *this,
                 inner.deviceProperties,
                 inner.systemVersion,
                 inner.kernel,
@@ -135,6 +135,21 @@ platform::DriverConnections::CallResult ControllerWatch::DrvCallStructMethod(
     if (result.status == 0 && !asksForSize(input)) answered_ = true;
   }
   return result;
+}
+
+bool ControllerWatch::EventraSendEventLazy(std::string_view event, PayloadProducer producer) {
+  if (answered_) {
+    sendEvents();
+    return inner_.eventra.EventraSendEventLazy(event, std::move(producer));
+  }
+  events_.emplace_back(event, std::move(producer));
+  return inner_.eventra.EventraIsEventUsed(event);
+}
+
+void ControllerWatch::sendEvents() {
+  for (auto& [event, producer] : std::exchange(events_, {})) {
+    inner_.eventra.EventraSendEventLazy(event, std::move(producer));
+  }
 }
 
 void ControllerWatch::writeError(std::string_view text) {

@@ -5,6 +5,7 @@
 #include <set>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "platform/Platform.h"
@@ -13,6 +14,7 @@ namespace nandinfo {
 
 class ControllerWatch : private platform::DeviceRegistry,
                         private platform::DriverConnections,
+                        private platform::Eventra,
                         private platform::StandardStreams {
  public:
   // Keeps the texts that are written to standard error directly, or lets them pass.
@@ -26,6 +28,9 @@ class ControllerWatch : private platform::DeviceRegistry,
   // opened, or it answered no command. The empty text when one was asked and answered something, or
   // when one is there and was asked nothing.
   std::string problem();
+
+  // Events wait until a controller has answered; this sends those that still wait.
+  void sendEvents();
 
   // What was kept.
   const std::vector<std::string>& texts() const { return texts_; }
@@ -58,6 +63,12 @@ class ControllerWatch : private platform::DeviceRegistry,
     return inner_.drivers.DrvCallMethod(connection, method, input, output);
   }
 
+  bool offersLazySend() override { return inner_.eventra.offersLazySend(); }
+  bool EventraIsEventUsed(std::string_view event) override {
+    return inner_.eventra.EventraIsEventUsed(event);
+  }
+  bool EventraSendEventLazy(std::string_view event, PayloadProducer producer) override;
+
   void writeError(std::string_view text) override;
   void writeOutput(std::string_view text) override { inner_.streams.writeOutput(text); }
 
@@ -66,6 +77,7 @@ class ControllerWatch : private platform::DeviceRegistry,
   platform::Platform& inner_;
   const DirectTexts directTexts_;
   std::vector<std::string> texts_;
+  std::vector<std::pair<std::string, PayloadProducer>> events_;  // that wait
   bool lookedUp_ = false, answered_ = false;
   enum class Stage { nothing, refused, opened, asked } stage_ = Stage::nothing;  // the farthest
   std::string found_;                                 // the class of the last one that was found

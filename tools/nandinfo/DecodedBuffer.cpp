@@ -9,6 +9,7 @@
 #include "NANDInfo/ByteReader.h"
 #include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/SnapshotReader.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
@@ -50,7 +51,7 @@ template <auto parse>
 Dictionary parsed(BufferKind kind, Bytes bytes) {
   if (const std::string why = whyNot(kind, bytes); !why.empty()) return refused(why);
   GenericParserCxt context;
-  NANDInfo::ResetAPIErrorMessage();
+  const NANDInfo::APIErrorScope errors;
   const bool ok = parse(&context, bytes) > 0;
   return withFields(context, ok);
 }
@@ -122,7 +123,7 @@ Dictionary decodedMSP(Bytes bytes) {
 Dictionary decodedLegacy(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::FTLStatistics, bytes); !why.empty()) return refused(why);
   NANDInfo::LegacyNandInfoCxt context;
-  NANDInfo::ResetAPIErrorMessage();
+  const NANDInfo::APIErrorScope errors;
   const bool ok = NANDInfo::ZMCParseBufferToCxt(&context, bytes);
   return withFields(context.fields, ok);
 }

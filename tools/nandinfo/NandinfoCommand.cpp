@@ -141,6 +141,7 @@ class Run {
     if (services_.log != nullptr) complaints_ = services_.log->take();
     // What the library makes of no answer is no verdict.
     if (!problem.empty()) return failed(problem);
+    watch_.sendEvents();
     complaints_.insert(complaints_.end(), watch_.texts().begin(), watch_.texts().end());
     services_.out << shown(services_, command_, form, result) << std::flush;
     if (!services_.out) {

@@ -1,0 +1,15 @@
+// The library's first error message, as it is when a process begins.
+#pragma once
+
+#include <optional>
+
+#include "NANDInfo/ProcessState.h"
+
+namespace support {
+
+inline void freshErrors() {
+  static std::optional<NANDInfo::APIErrorScope> errors;
+  errors.emplace();
+}
+
+}  // namespace support
