@@ -5,16 +5,35 @@
 
 #include "daemon/Entry.h"
 #include "platform/host/Host.h"
+#include "platform/host/StandardErrorLog.h"
 
-int main(int argc, char** argv) {
-  platform::host::Host host;
+namespace {
+
+using platform::LogLevel;
+
+// Returns what of the day couldn't be kept, or the empty text.
+std::string run(const platform::host::HostOptions& options, int argc, char** argv) {
+  platform::host::Host host(options);
   if (const std::string problem = host.root().problem(); !problem.empty()) {
     // Said, and then a run like any other on a device that has nothing.
-    host.platform().log.log(platform::LogLevel::error, "%s", problem.c_str());
+    host.platform().log.log(LogLevel::error, "%s", problem.c_str());
   }
   // The host's too: it may record what comes in late, up to its end.
   const auto context = std::make_shared<morvend::DeviceContext>(host.platform());
   host.keepCountersBelow([context] { return context->GetHomeDirectoryPath(); });
   morvend::RunProcess(host.platform(), *context, argc, argv);
+  return host.unkept();
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  auto options = platform::host::HostOptions::fromEnvironment();
+  platform::host::StandardErrorLog log(options.lowestLevel);
+  options.log = &log;
+  // The last line, after all that the host says at its end: the exit status doesn't tell.
+  if (const std::string unkept = run(options, argc, argv); !unkept.empty()) {
+    log.log(LogLevel::error, "the day is not done: %s", unkept.c_str());
+  }
   return 0;
 }

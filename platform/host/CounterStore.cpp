@@ -145,6 +145,12 @@ void CounterStore::record(CounterChange::Kind kind, std::span<const ScalarValue>
     place_.log.log(LogLevel::error, "Could not record counters: %s", error.c_str());
   }
   clientError_ = error;
+  if (unrecorded_.empty()) unrecorded_ = error;
+}
+
+std::string CounterStore::unrecorded() {
+  const std::scoped_lock lock(mutex_);
+  return unrecorded_;
 }
 
 void CounterStore::PLClientCheckpoint() {

@@ -51,6 +51,9 @@ class CounterStore : public CountersService, public HistoryStore {
   void PLClientSetValuesForScalarKeys(std::span<const ScalarValue> values) override;
   void PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) override;
 
+  // Why the first of these values that was lost couldn't be recorded; empty when none was.
+  std::string unrecorded();
+
   // The history lives no longer than the store.
   std::unique_ptr<PLHistory> initWithDefaultPath() override { return history(); }
   std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
@@ -67,9 +70,9 @@ class CounterStore : public CountersService, public HistoryStore {
 
   CounterPlace place_;
   Clock& clock_;
-  std::mutex mutex_;  // over the two that follow
+  std::mutex mutex_;  // over what follows
   CounterDatabase database_;
-  std::string clientError_;
+  std::string clientError_, unrecorded_;
 };
 
 }  // namespace platform::host

@@ -140,6 +140,12 @@ Platform& Host::platform() { return services_->platform; }
 CounterStore& Host::counters() { return services_->counters; }
 const DeviceRoot& Host::root() const { return services_->root; }
 
+std::string Host::unkept() {
+  if (std::string why = services_->preferences.flushAll(); !why.empty()) return why;
+  if (std::string why = services_->submission.unsubmitted(); !why.empty()) return why;
+  return services_->counters.unrecorded();
+}
+
 void Host::keepCountersBelow(std::function<const std::string*()> home) {
   services_->home = std::move(home);
 }

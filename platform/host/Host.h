@@ -36,6 +36,10 @@ class Host {
   CounterStore& counters();
   const DeviceRoot& root() const;
 
+  // Brings the preferences to disk, and tells what couldn't be kept of all that this process was to
+  // keep: one file's path, and why. Empty when everything is kept.
+  std::string unkept();
+
   // Tells where the counters' data lie: `home` yields a device path (borrowed), or null while there
   // is no such place. Until it is told, there are no counters. Called from any thread, to the end
   // of the host.

@@ -57,6 +57,10 @@ void PreferenceFile::flush() {
   if (!set_.empty() || !removed_.empty()) write(nullptr);
 }
 
+std::string PreferenceFile::unwritten() const {
+  return writeError_.empty() ? "" : root_.hostPath(folder_) + "/" + name_ + ": " + writeError_;
+}
+
 void PreferenceFile::add(std::string_view key, std::int64_t delta) {
   write([key, delta](Dictionary& values) {
     const Number* number = values.number(key);

@@ -38,6 +38,9 @@ class PreferenceFile {
   // Brings the changes to the file. What couldn't be written stays a change.
   void flush();
 
+  // Why the last change or addition isn't in the file, the file's path first; empty when all are.
+  std::string unwritten() const;
+
   // Flushes, and adds to an integer in the same write: no process's addition is lost. A value that
   // is missing or not a number counts as 0; the sum saturates. An addition that can't be written is
   // lost.

@@ -18,9 +18,14 @@ constexpr std::size_t kLongestDomain = kLongestFileName - std::string_view(".pli
 
 PreferenceFiles::~PreferenceFiles() { flushAll(); }
 
-void PreferenceFiles::flushAll() {
+std::string PreferenceFiles::flushAll() {
   const std::scoped_lock lock(mutex_);
-  for (auto& [name, file] : files_) file.flush();
+  std::string unwritten;
+  for (auto& [name, file] : files_) {
+    file.flush();
+    if (unwritten.empty()) unwritten = file.unwritten();
+  }
+  return unwritten;
 }
 
 // The file of a domain, or null when there can't be one. The mutex is held.

@@ -86,6 +86,9 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
   const auto fail = [&](const char* why) {
     log_.log(LogLevel::error, "Could not submit %s/%s: %s", SpoolFolder::kPath,
              shownText(stem).c_str(), why);
+    if (unsubmitted_.empty()) {
+      unsubmitted_ = root_.hostPath(SpoolFolder::kPath) + "/" + shownText(stem) + ": " + why;
+    }
     return false;
   };
   if (logType.empty() || logName.empty() || logName.starts_with('.') ||

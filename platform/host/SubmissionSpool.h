@@ -3,6 +3,8 @@
 // "DiagnosticLogSubmissionEnabled".
 #pragma once
 
+#include <string>
+
 #include "platform/Clock.h"
 #include "platform/LogSubmission.h"
 #include "platform/PreferenceStore.h"
@@ -29,6 +31,9 @@ class SubmissionSpool final : public LogSubmission {
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                 const Dictionary* options, const Writer& writer) override;
 
+  // The path of the first log that couldn't be submitted, and why; empty when there is none.
+  const std::string& unsubmitted() const { return unsubmitted_; }
+
  private:
   static int submit(SpoolFolder& spool, const std::string& stem, const std::string* options,
                     const Writer& writer);
@@ -38,6 +43,7 @@ class SubmissionSpool final : public LogSubmission {
   PreferenceStore& preferences_;
   Clock& clock_;
   SystemLog& log_;
+  std::string unsubmitted_;
 };
 
 }  // namespace platform::host

@@ -240,6 +240,13 @@ Lines linesOf(const std::string& standardError) {
   return lines;
 }
 
+std::string lastLine(const faults::Outcome& outcome) {
+  const std::string& said = outcome.standardError;
+  if (said.empty()) return {};
+  const std::size_t start = said.rfind('\n', said.size() - 2) + 1;
+  return said.substr(start, said.size() - 1 - start);
+}
+
 bool ended(const faults::Outcome& outcome) {
   const Lines lines = linesOf(outcome.standardError);
   return outcome.status == 0 &&

@@ -86,6 +86,9 @@ class Device {
 // The lines of a program's standard error, without their priority prefix.
 Lines linesOf(const std::string& standardError);
 
+// The last of them, with its prefix.
+std::string lastLine(const faults::Outcome& outcome);
+
 // Whether morvend came to its end; only what is written at the end of the process may follow.
 bool ended(const faults::Outcome& outcome);
 

@@ -120,6 +120,40 @@ TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
   EXPECT_TRUE(empty.history().empty());
 }
 
+// The exit status is the same for a day that left nothing: the last line, an error, is all that
+// tells.
+TEST(DailyRun, EndsWithWhatCouldNotBeKept) {
+  const std::string preference = std::string("var/preferences/mobile/") + kDomain + ".plist";
+  const struct {
+    const char *option, *fileInTheWay;
+    std::string unkept;
+  } rows[] = {{"-d", "elsewhere", ""},
+              {"-x", "var", ""},
+              {"-d", "var", preference + ": "},
+              {"-f", "var/preferences/mobile", "var/preferences/mobile/com.example.plist: "},
+              {"-d", "var/spool", "var/spool/morvend/submitted/log-pellorand.193."},
+              {"-t", "var/mobile/Library/Pelloran", "var/mobile/Library/Pelloran: "}};
+  Device filled;
+  filled.fill();
+  for (const auto& row : rows) {
+    Device device;
+    device.become(filled);
+    std::filesystem::remove_all(device.root() / row.fileInTheWay);
+    device.root().write(row.fileInTheWay, "");
+    const auto outcome = device.run("morvend", {row.option});
+    EXPECT_EQ(outcome.status, 0);
+    const std::string last = lastLine(outcome);
+    if (row.unkept.empty()) {
+      EXPECT_EQ(last, "<5>morvend ended") << row.fileInTheWay;
+    } else {
+      const std::string place = (device.root() / row.unkept).string();
+      EXPECT_TRUE(last.starts_with("<3>the day is not done: " + place) &&
+                  last.ends_with(": Not a directory"))
+          << outcome.standardError;
+    }
+  }
+}
+
 // A timer's run beside another one: the second waits, and then finds the gate closed.
 TEST(DailyRun, MakesOneLogWhenSeveralRunAtOnce) {
   Device device;
