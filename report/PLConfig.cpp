@@ -100,8 +100,9 @@ std::unique_ptr<PLConfig> PLConfig::init(platform::Platform& platform,
   return config;
 }
 
+const CounterOptions PLConfig::kUnnamed{};
+
 const CounterOptions* PLConfig::optionsForKey(const Table& table, std::string_view key) const {
-  static const CounterOptions kUnrounded;
   if (const auto* exact = table.keys.find(key)) return exact;
   const int length = static_cast<int>(key.size());
   if (const auto match = table.prefixes.longestPrefix(key); match.options != nullptr) {
@@ -111,7 +112,7 @@ const CounterOptions* PLConfig::optionsForKey(const Table& table, std::string_vi
   }
   if (!isInternalDevice_) return nullptr;
   log_.log(LogLevel::debug, "passing @{} for %.*s as device is Norba Internal", length, key.data());
-  return &kUnrounded;
+  return &kUnnamed;
 }
 
 const CounterOptions* PLConfig::configOptionsForScalarKey(std::string_view key) const {

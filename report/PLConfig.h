@@ -23,10 +23,13 @@ class PLConfig {
                                         morvend::DeviceContext& context);
 
   // The options that apply to a key: those of the key itself, else of the longest prefix with which
-  // it begins, else, on an internal device, empty ones. Null when the key is not to be reported.
-  // The options are borrowed from this object.
+  // it begins, else, on an internal device, kUnnamed. Null when the key is not to be reported. The
+  // options are borrowed from this object.
   const CounterOptions* configOptionsForScalarKey(std::string_view key) const;
   const CounterOptions* configOptionsForDistributionKey(std::string_view key) const;
+
+  // Of a key that no entry names: empty. Told from an entry's own options by its address.
+  static const CounterOptions kUnnamed;
 
   // MD5 of the file's bytes, 32 lowercase hexadecimal digits.
   const std::string& configFileDigest() const { return configFileDigest_; }

@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "platform/CivilDate.h"
+#include "platform/Text.h"
 #include "report/Arithmetic.h"
 
 namespace report {
@@ -25,6 +26,10 @@ PLReport::PLReport(platform::Platform& platform, morvend::DeviceContext& context
 
 void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) {
   platform_.log.log(LogLevel::info, "writing pellorand log. yesterday=%d", day);
+  std::set<std::string, std::less<>> refused;  // as long as nothing is let through
+  const auto refuse = [&](std::string_view key) {
+    if (isEmpty()) refused.emplace(key);
+  };
   if (config_ != nullptr) {
     const auto history = platform_.history.initWithDefaultPath();
     const std::int32_t first = platform::dayBefore(day);
@@ -32,25 +37,42 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
         "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
           if (const auto* options = config_->configOptionsForScalarKey(key)) {
             addScalar(value, key, *options);
+          } else {
+            refuse(key);
           }
         });
     history->distributionsForKeyPrefix(
         "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
           if (const auto* options = config_->configOptionsForDistributionKey(key)) {
             computeAndAddDistribution(samples, key, *options);
+          } else {
+            refuse(key);
           }
         });
+  }
+  if (isEmpty()) {
+    const std::string why =
+        config_ == nullptr ? "the whitelist couldn't be read"
+        : refused.empty()
+            ? "no counter was recorded on that day or the day before"
+            : platform::format("the whitelist names none of the %zu counters", refused.size());
+    platform_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
   }
   serializeWithDate(day, appInfo);
 }
 
 void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo) {
-  if (scalarsOutput_.empty() && distributionsOutput_.empty() && histogramsOutput_.empty()) return;
+  if (isEmpty()) return;
   addInstalledAppInfo();
   addMetadataKeys();
   reportDatabaseSize();
   reportCPUUptime();
   reportVMStats();
+  if (!unnamed_.empty()) {
+    platform_.log.log(LogLevel::standard,
+                      "reporting %zu keys that no whitelist entry names: this is an internal build",
+                      unnamed_.size());
+  }
 
   const auto log = platform_.propertyLists.writeXML(buildLog(day, appInfo));
   if (!log) {
@@ -104,12 +126,21 @@ void PLReport::submit(const std::string& log) {
   if (!submitted) platform_.log.log(LogLevel::error, "Failed to write pellorand log");
 }
 
+bool PLReport::isEmpty() const {
+  return scalarsOutput_.empty() && distributionsOutput_.empty() && histogramsOutput_.empty();
+}
+
+void PLReport::noteOptions(std::string_view key, const CounterOptions& options) {
+  if (&options == &PLConfig::kUnnamed) unnamed_.emplace(key);
+}
+
 const CounterOptions* PLReport::scalarOptions(std::string_view key) const {
   return config_ != nullptr ? config_->configOptionsForScalarKey(key) : nullptr;
 }
 
 std::int64_t PLReport::addScalar(std::int64_t value, std::string_view key,
                                  const CounterOptions& options) {
+  noteOptions(key, options);
   const std::int64_t rounded = roundScalar(value, options);
   scalarsOutput_.set(key, rounded);
   return rounded;
@@ -122,6 +153,7 @@ void PLReport::addScalarForKey(std::string_view key,
 
 void PLReport::computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
                                          std::string_view key, const CounterOptions& options) {
+  noteOptions(key, options);
   const int length = static_cast<int>(key.size());
   const Intervals* intervals = options.intervals ? &*options.intervals : nullptr;
   if (intervals != nullptr) {

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <set>
 #include <string>
 #include <string_view>
 
@@ -25,11 +26,13 @@ class PLReport {
 
   // Fills the report from the history rows of the day (and of the day before it: a later day's row
   // replaces an earlier one's) and submits it. `day` is the day that is reported; `appInfo` may be
-  // null, which is not the same as empty. Failures are logged.
+  // null, which is not the same as empty. Failures are logged, and why there is no report when no
+  // counter is let through.
   void writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo);
 
   // Runs the collectors, builds the log and submits it; does nothing at all when no counter has
-  // been added so far. Drops the whitelist.
+  // been added so far. Tells how many keys are in it that no whitelist entry names. Drops the
+  // whitelist.
   void serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo);
 
   // Stores a scalar, rounded as its options ask, and returns what it stored.
@@ -57,7 +60,9 @@ class PLReport {
   const platform::Dictionary& metadataOutput() const { return metadataOutput_; }
 
  private:
+  bool isEmpty() const;
   const CounterOptions* scalarOptions(std::string_view key) const;
+  void noteOptions(std::string_view key, const CounterOptions& options);
   platform::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
   void submit(const std::string& log);
 
@@ -65,6 +70,7 @@ class PLReport {
   morvend::DeviceContext& context_;
   std::unique_ptr<PLConfig> config_;
   platform::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;
+  std::set<std::string, std::less<>> unnamed_;  // the keys that no whitelist entry names
 };
 
 }  // namespace report

@@ -35,7 +35,7 @@ class ServiceTest : public ::testing::Test {
   ServiceTest() {
     platform.counters.today = 20001;
     platform.whitelistScalars({"key"});
-    platform.history.scalars[{20000, "key"}] = 1;
+    for (const std::int32_t day : {-1, 20000}) platform.history.scalars[{day, "key"}] = 1;
   }
 
   // One process in service mode that gets these events; its standard and error lines.

@@ -181,11 +181,55 @@ TEST_F(PLReportTest, CarriesTaskingAndTellsAMissingAppInfoFromAnEmptyOne) {
   EXPECT_TRUE(second.array("PLActivatedAppInfo")->empty());
 }
 
-TEST_F(PLReportTest, RecordsTheVersionOnlyWithALog) {
-  write();  // nothing whitelisted for the day: no log, no collector, no record
+// Nothing is let through: no log, no collector, no record, but a line that says why.
+TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
+  const struct {
+    std::map<platform::fakes::FakeHistory::RowKey, std::int64_t> scalars;
+    std::map<platform::fakes::FakeHistory::RowKey, std::vector<double>> distributions;
+    const char* why;
+  } rows[] = {
+      {{{{kDay - 2, "exact"}, 1}, {{kDay + 1, "exact"}, 1}},
+       {},
+       "no counter was recorded on that day or the day before"},
+      {{{{kDay - 1, "secret"}, 1}, {{kDay, "secret"}, 2}, {{kDay, "plain"}, 3}},
+       {{{kDay, "exact"}, {1}}},
+       "the whitelist names none of the 3 counters"},
+  };
+  for (const auto& row : rows) {
+    platform.history.scalars = row.scalars;
+    platform.history.distributions = row.distributions;
+    platform.log.clear();
+    write();
+    EXPECT_EQ(
+        platform.log.lines(),
+        (std::vector<std::string>{"info: writing pellorand log. yesterday=20000",
+                                  std::string("default: no report for day 20000: ") + row.why}));
+  }
+  platform.files.contents.clear();
+  write();
+  EXPECT_EQ(platform.log.lines().back(),
+            "default: no report for day 20000: the whitelist couldn't be read");
   EXPECT_TRUE(platform.journal.empty());
-  EXPECT_EQ(platform.log.lines(),
-            std::vector<std::string>{"info: writing pellorand log. yesterday=20000"});
+}
+
+// Counters of two days and the report's own, each key once; those that are named don't count.
+TEST_F(PLReportTest, SaysHowManyKeysAnInternalBuildAddsToTheWhitelist) {
+  platform.history.scalars = {
+      {{kDay - 1, "secret"}, 1}, {{kDay, "secret"}, 2}, {{kDay, "exact"}, 3}, {{kDay, "p.q"}, 4}};
+  platform.history.distributions = {{{kDay, "hidden"}, {1}}, {{kDay, "plain"}, {1}}};
+  write();
+  EXPECT_EQ(platform.log.count("internal build"), 0);
+  platform.device.internalBuild = true;
+  write();
+  const auto log = platform.parse(platform.submission.logs.back().contents);
+  const std::size_t own = log.dictionary("PLScalars")->size() - 3;
+  EXPECT_GT(own, 5u);
+  EXPECT_EQ(platform.log.count("default: reporting " + std::to_string(own + 2) +
+                               " keys that no whitelist entry names: this is an internal build"),
+            1);
+}
+
+TEST_F(PLReportTest, RecordsTheVersionOnlyWithALog) {
   platform.history.distributions = {{{kDay, "counted"}, {}}};  // an empty one is a report
   const struct {
     const char* version;
