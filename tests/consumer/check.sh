@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# Installs a build elsewhere, builds a program against it in every way that is offered, and compares
-# what they print. Usage: check.sh BUILD LIBDIR CXX
+# Installs a build elsewhere, looks at what its units start, builds a program against it in every way
+# that is offered, and compares what they print. Usage: check.sh BUILD LIBDIR CXX
 set -euo pipefail
 build=$1 libdir=$2 cxx=$3
 here=$(dirname "$(readlink -f "$0")")
@@ -9,6 +9,15 @@ trap 'rm -rf "$work"' EXIT
 fail() { echo "$*" >&2; exit 1; }
 
 cmake --install "$build" --prefix "$work/installed" >/dev/null
+DESTDIR=$work/staged cmake --install "$build" --prefix /opt/elsewhere >/dev/null
+for file in lib/systemd/system/morvend{,-daily}.service \
+  share/dbus-1/system-services/com.norba.pellorand.morvend.service; do
+  program=$(sed -nE 's/^Exec(Start)?=([^ ]*).*/\2/p' "$work/installed/$file")
+  [[ $program == "$work"/installed/* && -x $program ]] || fail "$file starts '$program'"
+  grep -qE '^Exec(Start)?=/opt/elsewhere/bin/morvend( -d)?$' "$work/staged/opt/elsewhere/$file" ||
+    fail "$file, staged, starts another program"
+  ! grep -H '@[a-z_]*@' "$work/installed/$file" || fail "a place was left open"
+done
 # Nothing may depend on where it was installed.
 mv "$work/installed" "$work/moved"
 prefix=$work/moved lib=$work/moved/$libdir
