@@ -7,7 +7,7 @@
 
 #include "bench/Process.h"
 #include "platform/PropertyList.h"
-#include "support/HostOnRoot.h"
+#include "platform/host/Host.h"
 #include "support/TemporaryFolder.h"
 #include "tools/mkdevice/Sample.h"
 
@@ -42,7 +42,7 @@ class ReportDevice {
   void fill(int scalars, int distributions, int samples);
 
   support::TemporaryFolder root_;
-  support::HostOnRoot host_{root_.path()};
+  platform::host::Host host_{{.root = root_.path()}};
   std::string path_ = root_.path();
   std::int32_t yesterday_ = 0;
   Arguments buffers_;  // of the controller: the statistics, then the lists

@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "bench/Rows.h"
-#include "support/HostOnRoot.h"
+#include "platform/host/Host.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
@@ -19,7 +19,7 @@ constexpr int kAppends = 2000;
 // A device root in a temporary folder, with a store.
 struct Device {
   support::TemporaryFolder root;
-  support::HostOnRoot host{root.path()};
+  platform::host::Host host{{.root = root.path()}};
   platform::host::CounterStore& store = host.counters();
 };
 

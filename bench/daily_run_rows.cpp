@@ -17,6 +17,7 @@
 #include "daemon/DailyTelemetry.h"
 #include "daemon/DataUsage.h"
 #include "daemon/Tasking.h"
+#include "platform/host/Host.h"
 #include "report/PLReport.h"
 
 namespace bench {
@@ -80,7 +81,7 @@ void printSteps(const ReportDevice& device) {
       since = now;
     };
     {
-      support::HostOnRoot host(device.path(), platform::LogLevel::error);
+      platform::host::Host host({.root = device.path(), .lowestLevel = platform::LogLevel::error});
       morvend::DeviceContext context(host.platform());
       lap(kNumber);
       for (std::size_t step = 0; step < kNumber; ++step) {

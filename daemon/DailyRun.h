@@ -3,7 +3,7 @@
 
 #include <cstdint>
 
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 #include "report/PLReport.h"
 

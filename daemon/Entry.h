@@ -1,7 +1,7 @@
 // The process: what morvend does between its start and its end.
 #pragma once
 
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 
 namespace morvend {

@@ -1,7 +1,7 @@
 // The messages of the named service "com.norba.pellorand.morvend".
 #pragma once
 
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 
 namespace morvend {

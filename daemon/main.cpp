@@ -1,6 +1,5 @@
 // morvend: turns the device's counters into its daily report, and exits.
 
-#include <memory>
 #include <string>
 
 #include "daemon/Entry.h"
@@ -18,10 +17,7 @@ std::string run(const platform::host::HostOptions& options, int argc, char** arg
     // Said, and then a run like any other on a device that has nothing.
     host.platform().log.log(LogLevel::error, "%s", problem.c_str());
   }
-  // The host's too: it may record what comes in late, up to its end.
-  const auto context = std::make_shared<morvend::DeviceContext>(host.platform());
-  host.keepCountersBelow([context] { return context->GetHomeDirectoryPath(); });
-  morvend::RunProcess(host.platform(), *context, argc, argv);
+  morvend::RunProcess(host.platform(), host.context(), argc, argv);
   return host.unkept();
 }
 

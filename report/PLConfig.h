@@ -8,7 +8,7 @@
 #include <string>
 #include <string_view>
 
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 #include "report/OptionsTable.h"
 #include "report/PrefixTable.h"

@@ -9,7 +9,7 @@
 #include <string>
 #include <string_view>
 
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 #include "report/PLConfig.h"
 

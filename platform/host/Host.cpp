@@ -63,11 +63,14 @@ struct Host::Services {
   HostPropertyListCodec codec;
   DeviceFileSystem files{root};
   PreferenceFiles preferences{root, codec, log};
-  std::function<const std::string*()> home;
+  DeviceFile propertiesFile{root, codec, log, "device/properties.plist"};
+  HostDeviceProperties deviceProperties{root, propertiesFile};
+  HostLibraryLoader libraries{root, preferences};
+  morvend::DeviceContext context{deviceProperties, files, libraries, log};
   CounterStore counters{root, clock, log,
                         [this]() -> std::optional<std::string> {
-                          const std::string* path = home ? home() : nullptr;
-                          return path ? std::optional(*path) : std::nullopt;
+                          const std::string* home = context.GetHomeDirectoryPath();
+                          return home ? std::optional(*home) : std::nullopt;
                         },
                         [this] { countDamagedDatabase(); }};
   SubmissionSpool submission{root, codec, preferences, clock, log};
@@ -80,8 +83,6 @@ struct Host::Services {
   NotificationCenter& notifications =
       played ? static_cast<NotificationCenter&>(playedNotifications) : bus;
   EventSink eventSink{root, codec, clock, log};
-  DeviceFile propertiesFile{root, codec, log, "device/properties.plist"};
-  HostDeviceProperties deviceProperties{root, propertiesFile};
   HostSystemVersion systemVersion{root, codec, log};
   const std::unique_ptr<HostKernel> kernel =
       played ? std::make_unique<PlayedKernel>(root, codec, log, *played)
@@ -92,7 +93,6 @@ struct Host::Services {
   HostReportingChannels reportingChannels{root, codec, log};
   HostApplications applications{root, codec, log};
   HostLocale locale{root, codec, log};
-  HostLibraryLoader libraries{root, preferences};
   RunLockFile runLock{root, log};
   HostNetworkUsage networkUsage{root, codec, log};  // last: its replies use the others
 
@@ -137,6 +137,7 @@ Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(op
 Host::~Host() = default;
 
 Platform& Host::platform() { return services_->platform; }
+morvend::DeviceContext& Host::context() { return services_->context; }
 CounterStore& Host::counters() { return services_->counters; }
 const DeviceRoot& Host::root() const { return services_->root; }
 
@@ -144,10 +145,6 @@ std::string Host::unkept() {
   if (std::string why = services_->preferences.flushAll(); !why.empty()) return why;
   if (std::string why = services_->submission.unsubmitted(); !why.empty()) return why;
   return services_->counters.unrecorded();
-}
-
-void Host::keepCountersBelow(std::function<const std::string*()> home) {
-  services_->home = std::move(home);
 }
 
 }  // namespace platform::host

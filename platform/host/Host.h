@@ -1,11 +1,11 @@
 // The Linux host: every service of the platform, assembled over one device root.
 #pragma once
 
-#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
 
+#include "device/DeviceContext.h"
 #include "platform/Platform.h"
 #include "platform/host/CounterStore.h"
 #include "platform/host/DeviceRoot.h"
@@ -33,17 +33,13 @@ class Host {
 
   // The services live as long as the host.
   Platform& platform();
+  morvend::DeviceContext& context();  // says where the counters lie
   CounterStore& counters();
   const DeviceRoot& root() const;
 
   // Brings the preferences to disk, and tells what couldn't be kept of all that this process was to
   // keep: one file's path, and why. Empty when everything is kept.
   std::string unkept();
-
-  // Tells where the counters' data lie: `home` yields a device path (borrowed), or null while there
-  // is no such place. Until it is told, there are no counters. Called from any thread, to the end
-  // of the host.
-  void keepCountersBelow(std::function<const std::string*()> home);
 
  private:
   struct Services;

@@ -9,4 +9,9 @@ std::shared_ptr<Platform> makeHostPlatform() {
   return {host, &host->platform()};
 }
 
+bool PLIsInternalDevice() {
+  static const bool internal = Host().context().PLIsInternalDevice();
+  return internal;
+}
+
 }  // namespace platform::host

@@ -15,5 +15,9 @@ namespace MORVEND_EXPORTED host {
 // on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
 std::shared_ptr<Platform> makeHostPlatform();
 
+// Whether that device is an internal (development) build. Asked once in the life of the process, by
+// whichever thread comes first; for a symbol look-up too, whence the plain name.
+extern "C" bool PLIsInternalDevice();
+
 }  // namespace host
 }  // namespace platform

@@ -6,7 +6,7 @@
 #include <limits>
 
 #include "daemon/DataUsageChanges.h"
-#include "support/HostOnRoot.h"
+#include "platform/host/Host.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 
@@ -197,7 +197,7 @@ class DataUsageThreads : public ::testing::Test {
 
   // The sum of the day's scalars.
   std::int64_t recorded() {
-    support::HostOnRoot host(folder.path());
+    platform::host::Host host({.root = folder.path()});
     std::int64_t sum = 0;
     host.platform().history.initWithDefaultPath()->scalarsForKeyPrefix(
         "", INT32_MIN, INT32_MAX,
@@ -216,7 +216,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   }
   answer(records, 0);
   {
-    support::HostOnRoot host(folder.path());
+    platform::host::Host host({.root = folder.path()});
     platform::Platform& platform = host.platform();
     CollectDataUsage(platform, std::chrono::nanoseconds(0));
     for (int i = 0; i < kOthers; ++i) {
@@ -237,7 +237,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
 TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
   answer({bundle(1e11, {4096})}, std::numeric_limits<double>::infinity());
   for (int i = 0; i < 3; ++i) {
-    support::HostOnRoot host(folder.path());
+    platform::host::Host host({.root = folder.path()});
     CollectDataUsage(host.platform(), std::chrono::milliseconds(i));
   }
   EXPECT_EQ(recorded(), 0);
@@ -247,7 +247,7 @@ TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
 TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
   answer({bundle(1e11, {4096}), bundle(1e11, {4096})}, 0);
   for (int i = 0; i < 20; ++i) {
-    support::HostOnRoot host(folder.path());
+    platform::host::Host host({.root = folder.path()});
     CollectDataUsage(host.platform(),
                      i < 19 ? std::chrono::microseconds(20 * i) : kUsageServicePatience);
   }

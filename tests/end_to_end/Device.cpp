@@ -5,11 +5,11 @@
 
 #include "platform/CivilDate.h"
 #include "platform/Text.h"
+#include "platform/host/Host.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/host/SystemClock.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
-#include "support/HostOnRoot.h"
 
 namespace end_to_end {
 
@@ -50,7 +50,7 @@ Device::Device()
       today_(platform::dayNumber(platform::host::SystemClock().now().secondsSince1970)) {}
 
 void Device::fill() {
-  support::HostOnRoot host(root_->path());
+  platform::host::Host host({.root = root_->path()});
   for (std::int32_t day = today_ - 3; day < today_; ++day) {
     for (const char* key : {"exact", "family.a", "family.b", "secret"}) {
       host.counters().set(key, 1000 * (day % 7) + 123, day);
@@ -207,7 +207,7 @@ Dictionary Device::expectedSections() const {
 }
 
 Lines Device::rows(std::int32_t first, std::int32_t last) const {
-  support::HostOnRoot host(root_->path());
+  platform::host::Host host({.root = root_->path()});
   Lines rows;
   const auto history = host.platform().history.initWithDefaultPath();
   history->scalarsForKeyPrefix(

@@ -8,8 +8,9 @@
 #include <thread>
 
 #include "end_to_end/Device.h"
+#include "platform/host/Host.h"
 #include "support/BinaryPropertyList.h"
-#include "support/HostOnRoot.h"
+#include "support/TemporaryFolder.h"
 
 namespace end_to_end {
 namespace {

@@ -13,10 +13,10 @@
 #include "NANDInfo/StructuredLogState.h"
 #include "daemon/Entry.h"
 #include "end_to_end/Device.h"
+#include "platform/host/Host.h"
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/FreshErrors.h"
-#include "support/HostOnRoot.h"
 
 namespace end_to_end {
 namespace {
@@ -41,7 +41,7 @@ std::string runDay(
   const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
   ::testing::internal::CaptureStderr();
   {
-    support::HostOnRoot host(device.root().path());
+    platform::host::Host host({.root = device.root().path()});
     wrap(host.platform(), [](Platform& platform) {
       morvend::DeviceContext context(platform);
       const char* const arguments[] = {"morvend", "-d"};

@@ -10,6 +10,9 @@
 
 namespace support {
 
+// Where a single-user device's counters lie below its root.
+inline constexpr char kCountersDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
+
 class TemporaryFolder {
  public:
   TemporaryFolder() {

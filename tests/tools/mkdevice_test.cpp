@@ -13,7 +13,6 @@
 #include "platform/host/Host.h"
 #include "platform/host/JSON.h"
 #include "support/FreshErrors.h"
-#include "support/HostOnRoot.h"
 #include "support/TemporaryFolder.h"
 #include "tools/demo/Device.h"
 #include "tools/mkdevice/ControllerBuffers.h"
@@ -137,8 +136,6 @@ TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
     EXPECT_FALSE(files.contains(support::kCountersDatabase + std::string("-shm")));
 
     platform::host::Host host({.root = folder / "a"});
-    const std::string home = "/var/mobile";
-    host.keepCountersBelow([&home] { return &home; });
     std::vector<std::int32_t> recorded;
     host.counters().history()->scalarsForKeyPrefix(
         scalarTable().front().key, INT32_MIN, INT32_MAX,
@@ -226,7 +223,7 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
     const auto start = device.readLog(logs[i])->content.date("PLStartDate")->secondsSince1970;
     EXPECT_EQ(start, (kToday - 4.0 + static_cast<double>(i)) * 86400);
   }
-  support::HostOnRoot host(folder / "a");
+  platform::host::Host host({.root = folder / "a"});
   EXPECT_EQ(host.platform().preferences.QNSPreferencesGetIntegerValue(
                 "LastCrashLogSerializationDateInDaysSince1970", "com.norba.pellorand.morvend"),
             kToday - 2);
@@ -446,7 +443,7 @@ TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
     support::TemporaryFolder folder;
     ASSERT_EQ(Maker().make(folder.path(), {.today = kToday, .chip = chipNamed(row.name)}), "");
     {
-      support::HostOnRoot host(folder.path());
+      platform::host::Host host({.root = folder.path()});
       EXPECT_TRUE(NANDInfo::DumpStorageStructuredLog(host.platform(), false));
     }
     std::string logs;

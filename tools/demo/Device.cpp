@@ -28,10 +28,7 @@ Result<std::string> readHostFile(const std::string& path) {
 Device::Device(std::string root)
     : root_(std::move(root)),
       host_({.root = root_, .lowestLevel = platform::LogLevel::error}),
-      context_(host_.platform()) {
-  host_.keepCountersBelow([this] { return context_.GetHomeDirectoryPath(); });
-  whitelist_ = report::PLConfig::init(host_.platform(), context_);
-}
+      whitelist_(report::PLConfig::init(host_.platform(), host_.context())) {}
 
 std::vector<std::string> Device::logs() {
   std::vector<std::string> paths;

@@ -9,7 +9,6 @@
 #include <string>
 #include <vector>
 
-#include "daemon/context/DeviceContext.h"
 #include "platform/Result.h"
 #include "platform/host/Host.h"
 #include "report/PLConfig.h"
@@ -61,7 +60,6 @@ class Device {
  private:
   std::string root_;
   platform::host::Host host_;
-  morvend::DeviceContext context_;
   std::unique_ptr<report::PLConfig> whitelist_;
 };
 

@@ -11,7 +11,6 @@
 #include <optional>
 
 #include "daemon/DailyRun.h"
-#include "daemon/context/DeviceContext.h"
 #include "platform/CivilDate.h"
 #include "platform/Text.h"
 #include "platform/host/Files.h"
@@ -84,21 +83,9 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
   return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error.c_str());
 }
 
-// The host as the device has it.
-struct DeviceHost : Host {
-  DeviceHost(const std::string& root, const std::optional<platform::host::PlayedRun>& played,
-             platform::SystemLog* log)
-      : Host(
-            {.root = root, .lowestLevel = platform::LogLevel::error, .played = played, .log = log}),
-        context(std::make_shared<morvend::DeviceContext>(platform())) {
-    keepCountersBelow([owned = context] { return owned->GetHomeDirectoryPath(); });
-  }
-  std::shared_ptr<morvend::DeviceContext> context;
-};
-
 std::string makeRoot(const MakingOptions& options, const Sample& first,
                      const SampleCounters& counters, const Listener& listener) {
-  DeviceHost host(options.folder, std::nullopt, options.log);
+  Host host({.root = options.folder, .lowestLevel = platform::LogLevel::error, .log = options.log});
   listener.progress("writing files");
   std::string error = writeFiles(host, lastingFiles(first));
   if (error.empty()) error = writeFiles(host, filesOfDay(first));
@@ -128,8 +115,11 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
 
 // The day that begins with `sample.today`, and what is new when the next one begins.
 std::string playDay(const MakingOptions& options, Sample sample, const SampleCounters& counters) {
-  DeviceHost host(options.folder, dailyRun(sample), options.log);
-  morvend::RunDailyTasksIfDue(host.platform(), *host.context, nullptr);
+  Host host({.root = options.folder,
+             .lowestLevel = platform::LogLevel::error,
+             .played = dailyRun(sample),
+             .log = options.log});
+  morvend::RunDailyTasksIfDue(host.platform(), host.context(), nullptr);
   std::string error = host.counters().apply(counters.ofDay(sample.today));
   if (error.empty()) error = host.counters().settle();
   if (!error.empty()) return error;

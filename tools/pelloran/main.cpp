@@ -5,7 +5,6 @@
 #include <iostream>
 #include <thread>
 
-#include "daemon/context/DeviceContext.h"
 #include "platform/host/Host.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/StandardOutput.h"
@@ -16,8 +15,6 @@ namespace {
 int run(std::ostream& out, int argc, char** argv) {
   tools::CommandLog log("pelloran");
   platform::host::Host host(log.hostOptions());
-  morvend::DeviceContext context(host.platform());
-  host.keepCountersBelow([&context] { return context.GetHomeDirectoryPath(); });
   return pelloran::runPelloran(
       {.store = host.counters(),
        .clock = host.platform().clock,

@@ -1,4 +1,4 @@
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 
 #include "platform/FaultwatchSupport.h"
 
@@ -19,21 +19,18 @@ constexpr char kCorruptionDomain[] = "com.norba.pellorand";
 }  // namespace
 
 bool DeviceContext::PLIsInternalDevice() {
-  std::call_once(internalOnce_,
-                 [&] { internal_ = platform_.deviceProperties.booleanProperty(kInternalBuild); });
+  std::call_once(internalOnce_, [&] { internal_ = properties_.booleanProperty(kInternalBuild); });
   return internal_;
 }
 
 // The property is read directly here, not through the flag that PLIsInternalDevice keeps.
 bool DeviceContext::determineMultiUserMode() {
-  if (platform_.deviceProperties.booleanProperty(kInternalBuild) &&
-      platform_.files.fileStatus(kForceMultiUserMode)) {
-    platform_.log.log(LogLevel::standard,
-                      "Forcing Multi User Mode behavior due to the presence of %s",
-                      kForceMultiUserMode);
+  if (properties_.booleanProperty(kInternalBuild) && files_.fileStatus(kForceMultiUserMode)) {
+    log_.log(LogLevel::standard, "Forcing Multi User Mode behavior due to the presence of %s",
+             kForceMultiUserMode);
     return true;
   }
-  return platform_.deviceProperties.multiUserIndicator().value_or(0) != 0;
+  return properties_.multiUserIndicator().value_or(0) != 0;
 }
 
 const std::string* DeviceContext::GetHomeDirectoryPath() {
@@ -42,10 +39,10 @@ const std::string* DeviceContext::GetHomeDirectoryPath() {
   if (!multiUser_) multiUser_ = determineMultiUserMode();
   if (*multiUser_) {
     std::uint64_t error = 1;
-    home_ = platform_.deviceProperties.systemGroupContainerPath(kSystemGroupContainer, error);
+    home_ = properties_.systemGroupContainerPath(kSystemGroupContainer, error);
     if (!home_) {
-      platform_.log.log(LogLevel::standard, "Error getting system group container: %llu",
-                        static_cast<unsigned long long>(error));
+      log_.log(LogLevel::standard, "Error getting system group container: %llu",
+               static_cast<unsigned long long>(error));
       return nullptr;
     }
   } else {
@@ -57,27 +54,26 @@ const std::string* DeviceContext::GetHomeDirectoryPath() {
 std::int64_t DeviceContext::GetCountersDatabaseSizeMB() {
   const std::string* home = GetHomeDirectoryPath();
   if (home == nullptr) return -1;
-  const auto size = platform_.files.fileStatus(*home + kDatabaseBelowHome);
+  const auto size = files_.fileStatus(*home + kDatabaseBelowHome);
   return size ? static_cast<std::int64_t>(*size / 1048576) : -1;
 }
 
 void DeviceContext::LoadPreferenceFunctions() {
-  void* library = platform_.libraries.load(platform::kFaultwatchSupportPath);
+  void* library = libraries_.load(platform::kFaultwatchSupportPath);
   if (library == nullptr) {
-    platform_.log.log(LogLevel::error,
-                      "Failed to dynamically load the FaultwatchSupport framework");
+    log_.log(LogLevel::error, "Failed to dynamically load the FaultwatchSupport framework");
     return;
   }
   readInteger_ = reinterpret_cast<platform::QNSPreferencesGetIntegerValueFunction*>(
-      platform_.libraries.symbol(library, "QNSPreferencesGetIntegerValue"));
+      libraries_.symbol(library, "QNSPreferencesGetIntegerValue"));
   if (readInteger_ == nullptr) {
     // The spelling is the one that log readers look for.
-    platform_.log.log(LogLevel::error, "Failed to dyanmically link QNSPreferencesGetIntegerValue");
+    log_.log(LogLevel::error, "Failed to dyanmically link QNSPreferencesGetIntegerValue");
   }
   writeValue_ = reinterpret_cast<platform::QNSPreferencesSetValueFunction*>(
-      platform_.libraries.symbol(library, "QNSPreferencesSetValue"));
+      libraries_.symbol(library, "QNSPreferencesSetValue"));
   if (writeValue_ == nullptr) {
-    platform_.log.log(LogLevel::error, "Failed to dynamically link QNSPreferencesSetValue");
+    log_.log(LogLevel::error, "Failed to dynamically link QNSPreferencesSetValue");
   }
 }
 

@@ -1,4 +1,4 @@
-#include "daemon/context/DeviceContext.h"
+#include "device/DeviceContext.h"
 
 #include <gtest/gtest.h>
 

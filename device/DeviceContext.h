@@ -16,7 +16,12 @@ namespace morvend {
 
 class DeviceContext {
  public:
-  explicit DeviceContext(platform::Platform& platform) : platform_(platform) {}
+  DeviceContext(platform::DeviceProperties& properties, platform::FileSystem& files,
+                platform::LibraryLoader& libraries, platform::SystemLog& log)
+      : properties_(properties), files_(files), libraries_(libraries), log_(log) {}
+  explicit DeviceContext(platform::Platform& platform)
+      : DeviceContext(platform.deviceProperties, platform.files, platform.libraries, platform.log) {
+  }
   DeviceContext(const DeviceContext&) = delete;
   DeviceContext& operator=(const DeviceContext&) = delete;
 
@@ -40,7 +45,10 @@ class DeviceContext {
   bool determineMultiUserMode();
   void LoadPreferenceFunctions();
 
-  platform::Platform& platform_;
+  platform::DeviceProperties& properties_;
+  platform::FileSystem& files_;
+  platform::LibraryLoader& libraries_;
+  platform::SystemLog& log_;
   std::once_flag internalOnce_;
   bool internal_ = false;
   std::mutex homeMutex_;  // over the two that follow
