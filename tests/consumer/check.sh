@@ -23,17 +23,19 @@ mv "$work/installed" "$work/moved"
 prefix=$work/moved lib=$work/moved/$libdir
 export PKG_CONFIG_PATH=$lib/pkgconfig LD_LIBRARY_PATH=$lib
 
-strangers=$(nm -DC --defined-only "$lib/libNANDInfo.so" | cut -d' ' -f3- | grep -vE '^(NANDInfo|platform)::' || true)
+strangers=$(nm -DC --defined-only "$lib/libNANDInfo.so" | cut -d' ' -f3- |
+  grep -vE '^(NANDInfo|platform)::|^PLIsInternalDevice$' || true)
 [ -z "$strangers" ] || fail "exported: $strangers"
 readelf -d "$lib/libNANDInfo.so" | grep -q 'SONAME.*\[libNANDInfo\.so\.0\]' || fail "no SONAME"
 
+export MORVEND_ROOT=$work/root DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent
 mkdir -p "$work/root/device"
 cat >"$work/root/device/properties.plist" <<'EOF'
 <plist version="1.0"><dict><key>DiskUsage</key><dict>
 <key>TotalDiskCapacity</key><integer>124780544000</integer>
 <key>TotalDataAvailable</key><integer>31195136000</integer>
 <key>AmountDataAvailable</key><integer>30000000000</integer>
-</dict></dict></plist>
+</dict><key>InternalBuild</key><true/></dict></plist>
 EOF
 
 with_cmake() {
@@ -58,7 +60,10 @@ for job in $(jobs -p); do wait "$job"; done
 for way in cmake-shared cmake-static pkg-config-shared pkg-config-static; do
   needed=$(readelf -d "$work/$way/consumer" | grep -c 'NEEDED.*libNANDInfo' || true)
   [[ $way == *shared && $needed == 1 || $way == *static && $needed == 0 ]] || fail "$way: linked otherwise"
-  printed=$(MORVEND_ROOT=$work/root DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent "$work/$way/consumer")
-  [[ $printed == *"TLM_UserCapacity_MB = 119000"* && $printed == "${first:=$printed}" ]] ||
+  printed=$("$work/$way/consumer")
+  [[ $printed == *"TLM_UserCapacity_MB = 119000"*internal && $printed == "${first:=$printed}" ]] ||
     fail "$way printed $printed"
 done
+# Each has added to the counter, where the commands find it.
+shown=$("$prefix/bin/pelloran" show --prefix consumer)
+[[ $shown == *consumer*20* ]] || fail "the counter: $shown"

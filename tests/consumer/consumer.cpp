@@ -8,4 +8,6 @@ int main() {
   platform->log.log(platform::LogLevel::debug, "not shown");
   platform->streams.writeOutput(description(platform::Value(NANDInfo::GetDiskInfo(*platform))) +
                                 "\n");
+  platform->counters.PLClientAddValueForScalarKey("consumer", 5);
+  if (platform::host::PLIsInternalDevice()) platform->streams.writeOutput("internal\n");
 }
