@@ -13,6 +13,7 @@ using support::kZMCStorage;
 using support::StorageDevice;
 
 constexpr std::uint64_t kNegative = 0xFFFFFFFF;  // in 32 bits
+constexpr std::uint64_t kNegative64 = ~std::uint64_t{0};
 
 struct Figures {
   std::int64_t used, e2e, reads, bad = -1, spare = -1, dies = -1;
@@ -29,14 +30,24 @@ const struct {
      {{"fwUpdatesPercentUsed", {kNegative}}, {"slcPercentUsed", {12}}, {"percentUsed", {11}}},
      {12, 0, 0},
      false},
-    {kQRT3, {{"percentUsed", {(std::uint64_t{1} << 32) + 5}}}, {5, 0, 0}, false},
     {kQRT3, {{"E2EDPErrorCounters", {1, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}, false},
     {kQRT3,
-     {{"E2EDPErrorCounters", {~std::uint64_t{0}, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}},
+     {{"E2EDPErrorCounters", {kNegative64, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}},
      {0, 3, 0},
      false},
     {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 8}, false},
-    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative}}}, {0, 0, 0}, false},
+    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative64}}}, {0, 0, 0}, false},
+    // All but these two are read as the 64-bit numbers that they are.
+    {kQRT3,
+     {{"percentUsed", {0x1'0000'0002}},
+      {"E2EDPErrorCounters", {0, 0x1'0000'0003, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}},
+      {"raidSmartErrors", {kNegative}},
+      {"numGrownBad", {0x1'0000'0005}},
+      {"spareAvailablePercent", {0x1'0000'0006}},
+      {"numDieFailures", {0x1'0000'0007}}},
+     {2, 4294967299, 4294967295, 4294967301, 4294967302, 4294967303},
+     false},
+    {kZMCStorage, {{"ueccReads", {0x1'0000'0004}}}, {0, 0, 4}, false},
     {kZMCStorage, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 7}, false},
     {kZMCStorage, {{"ueccReads", {kNegative}}}, {0, 0, 0}, false},
     {kQRT3,
