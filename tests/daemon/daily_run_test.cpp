@@ -39,8 +39,9 @@ class DailyRunTest : public ::testing::Test {
   std::vector<std::int64_t> reportedDays() {
     std::vector<std::int64_t> days;
     for (const auto& log : platform.submission.logs) {
-      days.push_back(
-          platform.parse(log.contents).dictionary("PLScalars")->number("key")->int64Value());
+      const Dictionary contents = platform.parse(log.contents);
+      days.push_back(contents.dictionary("PLScalars")->number("key")->int64Value());
+      EXPECT_EQ(contents.find("PLActivatedAppInfo"), nullptr) << "none was delivered";
     }
     return days;
   }

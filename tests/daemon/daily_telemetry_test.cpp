@@ -7,6 +7,7 @@
 #include "NANDInfo/NANDInfo.h"
 #include "daemon/EccEvents.h"
 #include "support/ControllerBuffers.h"
+#include "support/ControllerLists.h"
 #include "support/TestPlatform.h"
 
 namespace morvend {
@@ -70,19 +71,20 @@ TEST_F(DailyTelemetryTest, DiskUsageIsInWholeMebibytesOrMinusOne) {
 TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReportsAnError) {
   constexpr char kFailure[] =
       "default: error reading nand info, error 1 with message Unable to parse buffer";
-  platform.snapshots.snapshot = support::kernelSnapshot(4096);
+  platform.snapshots.snapshot = support::kernelSnapshot(5'000'000'000'000);
   constexpr std::size_t kDiskUsage = 2;  // recorded before
   EXPECT_EQ(recorded("").size(), kDiskUsage);
   EXPECT_EQ(platform.log.count(kFailure), 1);
 
-  platform.registry.add({"NorbaEmbeddedNVMeController"});
+  platform.registry.add({.className = "NorbaEmbeddedNVMeController",
+                         .properties = {{"Controller Characteristics", Dictionary()}}});
   for (const std::uint32_t method : {8, 9}) {
     platform.registry.alwaysTunnels(method, 13, 0, support::words({support::header(1, 1), 7}));
   }
   Dictionary info = *NANDInfo::CopyNANDInfo(platform.platform);
   EXPECT_GT(info.size(), 20u);
-  info.set("TLM_VMFreezer_bytesWritten", 4096);
-  info.set("com.norba.NANDInfo.VMFreezer.NumPhysicalWrites", 4096);
+  info.set("TLM_VMFreezer_bytesWritten", 5'000'000'000'000);
+  info.set("com.norba.NANDInfo.VMFreezer.NumPhysicalWrites", 5'000'000'000'000);
   Lines expected;
   for (const auto& [key, value] : info) expected.push_back(key + " " + description(value));
   Lines lines = recorded("");
@@ -90,6 +92,38 @@ TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReports
   EXPECT_EQ(lines, expected);
   EXPECT_EQ(platform.log.count(kFailure), 1);
   EXPECT_EQ(platform.registry.problems(), Lines());
+  // The day's dump of the lists sends no flag of its own beside the size query and the argument.
+  Lines listCommands;
+  for (const auto& input : platform.registry.inputs) {
+    const auto word = [&input](int i) { return std::to_string(std::to_integer<int>(input[i])); };
+    if (word(0) == "15" || word(0) == "17") listCommands.push_back(word(0) + "/" + word(4));
+  }
+  EXPECT_EQ(listCommands, (Lines{"17/1", "17/5", "17/9", "15/1"}));
+}
+
+// The beginnings of what each leaves, where lines of one follow each other only the first.
+TEST_F(DailyTelemetryTest, RunsItsCollectorsInOrder) {
+  platform.registry.add({.className = "NorbaEmbeddedNVMeController",
+                         .properties = {{"Controller Characteristics", Dictionary()}}});
+  platform.registry.alwaysTunnels(9, 13, 0, support::words({support::header(1, 1), 7}));
+  platform.registry.alwaysTunnels(9, 15, 0, support::defectsList(2, {{0, 0, 0, 0, 0, 0, 0, 0}}));
+  platform.kernel.deliveries[kNextEvent] = {{0, event(1, 0)}};
+  platform.networkUsage.records = {
+      Dictionary{{"procName", "p"}, {"since", platform::Date{0}}, {"wifiInBytes", 4096}}};
+  platform.reportingChannels.samples = {{{1, 1, "a"}, 5}};
+  CollectDailyTelemetry(platform.platform);
+  const auto beginnings = [](const Lines& lines, std::size_t length) {
+    Lines all;
+    for (const std::string& line : lines) all.push_back(line.substr(0, length));
+    all.erase(std::unique(all.begin(), all.end()), all.end());
+    return all;
+  };
+  EXPECT_EQ(beginnings(platform.counters.records, 18),
+            (Lines{"set com.norba.tarv", "set com.norba.NAND", "add datausage.wifi",
+                   "set com.norba.velq"}));
+  EXPECT_EQ(beginnings(platform.journal, 14),
+            (Lines{"structured 176", "structured 172", "set mobile/com", "synchronize co"}));
+  EXPECT_EQ(platform.registry.calls.back(), "9 data 13/0") << "the statistics, after the lists";
 }
 
 TEST_F(DailyTelemetryTest, AnEccEventIsLoggedWithTheEntriesThatCount) {

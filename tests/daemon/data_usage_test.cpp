@@ -234,6 +234,21 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   EXPECT_EQ(recorded(), 4 * kProcesses + kOthers);
 }
 
+// The reply is written by the time that the step returns, which is the last thing that it brings
+// about.
+TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
+  EXPECT_EQ(kUsageServicePatience, std::chrono::seconds(10));
+  Array records;
+  for (int i = 0; i < 2000; ++i) {
+    records.push_back(usage({{"procName", std::to_string(i)}}, 1e11, {4096}));
+  }
+  answer(records, 0);
+  platform::host::Host host({.root = folder.path()});
+  CollectDataUsage(host.platform());
+  const std::string file = folder.read("var/preferences/mobile/" + std::string(kDomain) + ".plist");
+  EXPECT_NE(file.find("<key>1999</key>"), file.npos);
+}
+
 TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
   answer({bundle(1e11, {4096})}, std::numeric_limits<double>::infinity());
   for (int i = 0; i < 3; ++i) {

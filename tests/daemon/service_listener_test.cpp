@@ -107,6 +107,12 @@ TEST_F(ServiceTest, ActsOnMessagesAsTheHandshakeSays) {
   for (const auto& row : rows) {
     EXPECT_EQ(serve(row.events), row.log) << &row - rows;
     EXPECT_EQ(posted(), row.posted) << &row - rows;
+    // Delivered none is another thing than none delivered.
+    const bool delivered = std::count(row.log.begin(), row.log.end(), kRequested) == 1;
+    for (const auto& log : platform.submission.logs) {
+      const auto contents = platform.parse(log.contents);
+      EXPECT_EQ(contents.find("PLActivatedAppInfo") != nullptr, delivered) << &row - rows;
+    }
   }
 }
 

@@ -107,8 +107,9 @@ TEST_F(TaskingTest, AppliesKeepsReplacesAndReappliesATasking) {
   replaced.insert(replaced.end(), undone.begin(), undone.end());
   replaced.insert(replaced.end(), {"synchronize com.example", kSynchronized, kPosted});
   EXPECT_EQ(run(), replaced);
-  EXPECT_EQ(stored("TaskingID"), std::nullopt);
-  EXPECT_EQ(stored("TaskingPayload"), std::nullopt);
+  for (const char* key : {"TaskingID", "TaskingDigest", "TaskingPayload"}) {
+    EXPECT_EQ(stored(key), std::nullopt) << key;
+  }
   EXPECT_EQ(stored("TaskingOS"), Value("A2"));
   // Nothing stored and no payload: the notification is posted every day.
   EXPECT_EQ(run(), Lines{kPosted});

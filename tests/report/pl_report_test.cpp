@@ -240,9 +240,18 @@ TEST_F(PLReportTest, RecordsTheVersionOnlyWithALog) {
               {"17.5", std::nullopt}};
   for (const auto& row : rows) {
     platform.device.versionText = row.version;
+    platform.journal.clear();
     write();
     EXPECT_EQ(platform.submission.logs.back().options, row.options);
     EXPECT_EQ(platform.preferences.mobile(kDomain, "LastOSVersion"), Value(row.version));
+    // On disk before the log is submitted.
+    std::vector<std::string> done{"submit log-pellorand"};
+    if (row.options) {
+      const std::string domain = kDomain;
+      done.insert(done.begin(), {"set mobile/" + domain + "/LastOSVersion = " + row.version,
+                                 "synchronize " + domain});
+    }
+    EXPECT_EQ(platform.journal, done);
   }
   const auto log = platform.parse(platform.submission.logs.back().contents);
   EXPECT_EQ(log.dictionary("PLDistributions")->array("counted")->size(), 5u);
@@ -327,16 +336,98 @@ TEST_F(PLReportTest, TellsMinutesSinceBoot) {
   EXPECT_EQ(platform.log.count("error: Couldn't retrieve mach_timebase_info"), 2);
 }
 
-// Every key of the memory statistics, with the kernel values that make it what it is.
+// The whole of what the report adds by itself, in its order: each value from its own source, none
+// cut to 32 bits that has more.
+TEST_F(PLReportTest, AddsEachOfItsOwnValuesFromItsSource) {
+  using Type = platform::InstalledApplications::BundleType;
+  const struct {
+    std::string key, kernelName;  // no name: from elsewhere
+    std::uint64_t stored;
+    std::int64_t reported;
+  } rows[] = {
+      {"tarvenn.numAllInstalledApps", "", 0, 3},
+      {"tarvenn.numThirdPartyApps", "", 0, 2},
+      {"quenset.prnd.database.size", "", 0, 7},
+      {"quenset.prnd.database.corruptions", "", 0, 98},
+      {"usage.cur_boot_session_cpu_uptime", "", 0, 99},
+      {"kernel.vmtc_total", "vm.vmtc_total", 101, 101},
+      {"kernel.vmtc_one_bit_flip", "vm.vmtc_one_bit_flip", 102, 102},
+      {"kernel.vmtc_not_found", "vm.vmtc_not_found", 103, 103},
+      {"kernel.vmtc_1_byte", "vm.vmtc_1_byte", 104, 104},
+      {"kernel.vmtc_2_byte", "vm.vmtc_2_byte", 105, 105},
+      {"kernel.vmtc_4_byte", "vm.vmtc_4_byte", 106, 106},
+      {"kernel.vmtc_8_byte", "vm.vmtc_8_byte", 107, 107},
+      {"kernel.vmtc_16_byte", "vm.vmtc_16_byte", 108, 108},
+      {"kernel.vmtc_32_byte", "vm.vmtc_32_byte", 109, 109},
+      {"kernel.vmtc_64_byte", "vm.vmtc_64_byte", 110, 110},
+      {"kernel.vmtc_128_byte", "vm.vmtc_128_byte", 111, 111},
+      {"kernel.vmtc_256_byte", "vm.vmtc_256_byte", 112, 112},
+      {"kernel.vmtc_undiagnosed", "vm.vmtc_undiagnosed", 113, 113},
+      {"kernel.memorystatus_freeze_count", "kern.memorystatus_freeze_count", 114, 114},
+      {"kernel.memorystatus_freeze_pageouts", "kern.memorystatus_freeze_pageouts", 5ull << 32,
+       5ll << 32},  // 81920 GiB
+      {"memorystatus_freezer_thaws_per_gb", "kern.memorystatus_thaw_count_since_boot",
+       3 * 81920ull << 32, 3ll << 32},
+      {"kernel.memorystatus_freeze_budget_pages_remaining",
+       "kern.memorystatus_freeze_budget_pages_remaining", 1ull << 40, 1ll << 40},
+      {"kernel.memorystatus_thaw_count", "kern.memorystatus_thaw_count", 115, 115},
+      {"kernel.swapusage", "vm.swapusage", 7ull << 40, 7ll << 40},
+      {"memorystatus_freezer_error_no_compressor_space_count",
+       "kern.memorystatus_freezer_error_no_compressor_space_count", 2ull << 40, 25},
+      {"memorystatus_freezer_error_no_swap_space_count",
+       "kern.memorystatus_freezer_error_no_swap_space_count", 3ull << 40, 37},
+      {"memorystatus_freezer_error_below_min_pages_count",
+       "kern.memorystatus_freezer_error_below_min_pages_count", 4ull << 40, 50},
+      {"memorystatus_freezer_error_low_probability_of_use_count",
+       "kern.memorystatus_freezer_error_low_probability_of_use_count", 5ull << 40, 62},
+      {"memorystatus_freezer_error_other_count", "kern.memorystatus_freezer_error_other_count",
+       6ull << 40, 75},
+      {"memorystatus_freezer_process_considered_count",
+       "kern.memorystatus_freezer_process_considered_count", 8ull << 40, 8ll << 40},
+      {"memorystatus_freezer_skipped_full_count", "kern.memorystatus_freezer_skipped_full_count",
+       3ull << 33, 75},
+      {"memorystatus_freezer_thaw_percentage", "kern.memorystatus_freezer_thaw_percentage",
+       9ull << 40, 9ll << 40},
+      {"memorystatus_freezer_refreeze_average", "kern.memorystatus_freezer_bytes_refrozen",
+       120ull << 40, 10ll << 40},
+  };
+  auto& integers = platform.kernel.integers;
+  integers = {{"kern.memorystatus_freezer_below_threshold_count", 4ull << 33},
+              {"kern.memorystatus_freezer_refreeze_count", 12}};
+  std::vector<std::string> expected{"exact 1"}, reported;
+  for (const auto& row : rows) {
+    if (!row.kernelName.empty()) integers[row.kernelName] = row.stored;
+    expected.push_back("com.norba." + row.key + " " + std::to_string(row.reported));
+  }
+  platform.device.bundles = {Type::user, Type::system, Type::user};
+  platform.files.contents["/var/mobile/Library/Pelloran/PLDataStore.sqlitedb"].resize(7 << 20);
+  platform::QNSPreferencesGetIntegerValueFunction* const read =
+      [](const char*, const char*, bool*) -> std::int64_t { return 98; };
+  platform::QNSPreferencesSetValueFunction* const reset = [](const char*, const Value*,
+                                                             const char*) {};
+  platform.device.symbols = {{"QNSPreferencesGetIntegerValue", reinterpret_cast<void*>(read)},
+                             {"QNSPreferencesSetValue", reinterpret_cast<void*>(reset)}};
+  platform.kernel.ticks = 99'000'000'000ull * 60 + 1;
+  platform.setWhitelist(
+      {{"Group", Dictionary{{"ScalarKeys", Dictionary{{"exact", Dictionary()}}},
+                            {"ScalarKeyPrefixes", Dictionary{{"com.norba.", Dictionary()}}}}}});
+  platform.history.scalars = {{{kDay, "exact"}, 1}};
+  write();
+  const auto log = platform.parse(platform.submission.logs.at(0).contents);
+  for (const auto& [key, value] : *log.dictionary("PLScalars")) {
+    reported.push_back(key + " " + description(value));
+  }
+  EXPECT_EQ(reported, expected);
+}
+
+// Every gate of the memory statistics, with the kernel values that make it what it is.
 TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
-  constexpr std::uint64_t kLarge = std::uint64_t{1} << 62;
   constexpr auto kMax = std::numeric_limits<std::int64_t>::max();
   using Integers = std::map<std::string, std::uint64_t, std::less<>>;
   const std::string frozen = "kern.memorystatus_freeze_pageouts",
                     thaws = "kern.memorystatus_thaw_count_since_boot",
                     considered = "kern.memorystatus_freezer_process_considered_count",
                     other = "kern.memorystatus_freezer_error_other_count",
-                    below = "kern.memorystatus_freezer_below_threshold_count",
                     skipped = "kern.memorystatus_freezer_skipped_full_count",
                     refreezes = "kern.memorystatus_freezer_refreeze_count",
                     refrozen = "kern.memorystatus_freezer_bytes_refrozen";
@@ -354,21 +445,18 @@ TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
        {{"kern.memorystatus_freeze_count", 0x1'0000'0007}},
        7},
       {"com.norba.kernel.memorystatus_freeze_pageouts", {}, {}},
-      {"com.norba.kernel.memorystatus_freeze_pageouts", {{frozen, 9}}, 9},
       {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262143}, {thaws, 9}}, {}},
       {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262144 * 2}, {thaws, 9}}, 4},
       {"com.norba.memorystatus_freezer_thaws_per_gb", {{frozen, 262144}}, kMax},
       {"com.norba.kernel.memorystatus_freeze_budget_pages_remaining", {}, -1},
       {"com.norba.kernel.memorystatus_thaw_count", {}, 4294967295},
       {"com.norba.kernel.swapusage", {}, -1},
-      {"com.norba.kernel.swapusage", {{"vm.swapusage", kLarge}}, kLarge},
       {"com.norba.memorystatus_freezer_error_other_count", {{other, 5}}, {}},
       {"com.norba.memorystatus_freezer_error_other_count", {{considered, 3}, {other, 2}}, 66},
       {"com.norba.memorystatus_freezer_error_other_count", {{considered, 0}, {other, 2}}, kMax},
       {"com.norba.memorystatus_freezer_error_other_count", {{considered, 0}, {other, 0}}, 0},
       {"com.norba.memorystatus_freezer_error_other_count", {{considered, 100}}, kMax},
       {"com.norba.memorystatus_freezer_process_considered_count", {{considered, ~0ull}}, -1},
-      {"com.norba.memorystatus_freezer_skipped_full_count", {{below, 8}, {skipped, 2}}, 25},
       {"com.norba.memorystatus_freezer_skipped_full_count", {{skipped, 2}}, {}},
       {"com.norba.memorystatus_freezer_thaw_percentage", {}, -1},
       {"com.norba.memorystatus_freezer_refreeze_average", {{refreezes, 9}, {refrozen, 90}}, {}},
