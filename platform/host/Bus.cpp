@@ -54,8 +54,8 @@ class Bus::Listener : public NamedServiceListener {
   bool ownsName() const { return ownsName_; }
   bool isReleasing() const { return releasing_; }
 
-  // Whether a message was delivered since the last call.
-  bool takeDelivered() { return std::exchange(delivered_, false); }
+  // Whether the service was called since this was last asked.
+  bool takeCalled() { return std::exchange(called_, false); }
 
   // All three: 0 or above on success, else a negative error number.
   int addObject();
@@ -69,21 +69,23 @@ class Bus::Listener : public NamedServiceListener {
     calls_.reset();
     declaration_.reset();
     if (handler_) handler_(nullptr);
+    filter_.reset();
   }
 
  private:
   static int onCall(sd_bus_message* call, void* listener, sd_bus_error*);
+  static int onAnything(sd_bus_message* message, void* listener, sd_bus_error*);
   static int onReleased(sd_bus_message* answer, void* listener, sd_bus_error*);
   void deliver(sd_bus_message* message);
   sd_bus* connection() const { return bus_.bus_.get(); }
 
   Bus& bus_;
   std::string name_;
-  Slot declaration_, calls_, release_;
+  Slot filter_, declaration_, calls_, release_;
   EventHandler handler_;
   bool ownsName_ = false;
   bool releasing_ = false;
-  bool delivered_ = false;
+  bool called_ = false;
 };
 
 int Bus::Listener::addObject() {
@@ -97,7 +99,10 @@ int Bus::Listener::addObject() {
   std::string path = "/" + name_;
   std::replace(path.begin(), path.end(), '.', '/');
   sd_bus_slot* slot = nullptr;
-  int result = sd_bus_add_object_vtable(connection(), &slot, path.c_str(), name(), methods, this);
+  int result = sd_bus_add_filter(connection(), &slot, onAnything, this);
+  if (result < 0) return result;
+  filter_.reset(slot);
+  result = sd_bus_add_object_vtable(connection(), &slot, path.c_str(), name(), methods, this);
   if (result < 0) return result;
   declaration_.reset(slot);
   result = sd_bus_add_object(connection(), &slot, path.c_str(), onCall, this);
@@ -132,6 +137,13 @@ int Bus::Listener::onReleased(sd_bus_message*, void* listener, sd_bus_error*) {
 }
 
 int Bus::Listener::onCall(sd_bus_message* call, void* listener, sd_bus_error*) {
+int Bus::Listener::onAnything(sd_bus_message* message, void* listener, sd_bus_error*) {
+  if (sd_bus_message_is_method_call(message, nullptr, nullptr) > 0) {
+    static_cast<Listener*>(listener)->called_ = true;
+  }
+  return 0;  // for the others to see
+}
+
   auto& self = *static_cast<Listener*>(listener);
   const char* interface = sd_bus_message_get_interface(call);
   if (sd_bus_message_is_method_call(call, nullptr, kMethod) <= 0) return 0;
@@ -154,7 +166,6 @@ void Bus::Listener::deliver(sd_bus_message* message) {
                   read->dropped, sender);
   }
   handler_(&read->dictionary);
-  delivered_ = true;
 }
 
 std::unique_ptr<NamedServiceListener> Bus::listen(std::string_view serviceName) {
@@ -185,7 +196,7 @@ bool Bus::closeService() {
   auto end = Clock::now() + patience_;
   while (bus_ && listener_->isReleasing()) {
     serve(end - Clock::now());
-    if (listener_->takeDelivered()) {
+    if (listener_->takeCalled()) {
       served = true;
       end = Clock::now() + patience_;
     } else if (Clock::now() >= end) {
@@ -208,8 +219,8 @@ Bus::RunResult Bus::run(double seconds, bool returnAfterSourceHandled) {
   const auto end = Clock::now() + std::chrono::microseconds(duration);
   do {
     serve(end - Clock::now());
-    const bool delivered = listener_ != nullptr && listener_->takeDelivered();
-    if (delivered && returnAfterSourceHandled && Clock::now() < end) {
+    const bool called = listener_ != nullptr && listener_->takeCalled();
+    if (called && returnAfterSourceHandled && Clock::now() < end) {
       return RunResult::handledSource;
     }
   } while (Clock::now() < end);

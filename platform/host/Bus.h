@@ -5,7 +5,10 @@
 // the connection is lost, there is no bus. Whatever the bus does, connecting and waiting for its
 // answers take a few seconds at most. All of it belongs to one thread.
 //
-// Who may send is the bus's policy; every message that it lets through is delivered.
+// Who may send is the bus's policy; every message that it lets through is delivered. A bus may keep
+// a message that starts the service for as long only as its sender stays (dbus-daemon does). A
+// sender that leaves at once calls Ping first: an answer means that the service is up, and waits
+// for messages anew.
 #pragma once
 
 #include <chrono>
@@ -30,16 +33,16 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   // first.
   ~Bus() override;
 
-  // EventLoop. A handled event is a message that was given to the listener's handler; the bus's own
-  // traffic isn't. A run whose time is out closes the service: it releases the bus name and
-  // delivers what was sent while the name was owned. If there was anything, it takes the name again
-  // and reports a handled source; else the run has timed out, and the service stays closed. Without
-  // a bus a run waits for its time.
+  // EventLoop. A handled event is a call to the service, whatever becomes of it: one of another
+  // signature, or a sign of life (Ping), too. The bus's own traffic isn't. A run whose time is out
+  // closes the service: it releases the bus name and serves what was sent while the name was owned.
+  // If there was anything, it takes the name again and reports a handled source; else the run has
+  // timed out, and the service stays closed. Without a bus a run waits for its time.
   RunResult run(double seconds, bool returnAfterSourceHandled) override;
 
   // NamedServices. Takes the service's name on the bus, without queueing for it, and serves the
   // method Message(a{sv}) of the interface with that name, on the object whose path is the name
-  // with slashes. Nothing is ever answered; a call with another signature is dropped. Null without
+  // with slashes. No message is ever answered; one with another signature is dropped. Null without
   // a bus, when the name is taken or isn't ours to take, and while there is another listener.
   std::unique_ptr<NamedServiceListener> listen(std::string_view serviceName) override;
 
