@@ -25,9 +25,13 @@ void serve(Platform& platform, DeviceContext& context) {
       HandleServiceMessage(platform, context, state, message);
     });
   }
-  while (platform.eventLoop.run(kIdleSeconds, true) != EventLoop::RunResult::timedOut) {
+  auto result = EventLoop::RunResult::handledSource;
+  while (result != EventLoop::RunResult::timedOut && result != EventLoop::RunResult::toldToEnd) {
+    result = platform.eventLoop.run(kIdleSeconds, true);
   }
-  if (state.AwaitingAppInfo) {
+  if (result == EventLoop::RunResult::toldToEnd) {
+    platform.log.log(LogLevel::standard, "told to end, so no longer waiting for messages");
+  } else if (state.AwaitingAppInfo) {
     platform.log.log(LogLevel::standard,
                      "never received requested AAI, so moving along without it");
     RunDailyTasksIfDue(platform, context, nullptr);

@@ -7,8 +7,9 @@
 namespace morvend {
 
 // Acts on the argument vector as `main` gets it: without arguments serves messages until ten
-// seconds pass without one, with "-d" runs the gate, with "-f" or "-t" the daily sequence for
-// yesterday or today. Everything that goes wrong is logged; the exit status is 0 in every case.
+// seconds pass without one or the process is told to end, with "-d" runs the gate, with "-f" or
+// "-t" the daily sequence for yesterday or today. Everything that goes wrong is logged; the exit
+// status is 0 in every case.
 void RunProcess(platform::Platform& platform, DeviceContext& context, int argumentCount,
                 const char* const* arguments);
 

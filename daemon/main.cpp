@@ -3,6 +3,7 @@
 #include <string>
 
 #include "daemon/Entry.h"
+#include "platform/host/EndSignals.h"
 #include "platform/host/Host.h"
 #include "platform/host/StandardErrorLog.h"
 
@@ -24,6 +25,7 @@ std::string run(const platform::host::HostOptions& options, int argc, char** arg
 }  // namespace
 
 int main(int argc, char** argv) {
+  platform::host::deferEndSignals();  // a day's work that has begun is finished
   auto options = platform::host::HostOptions::fromEnvironment();
   platform::host::StandardErrorLog log(options.lowestLevel);
   options.log = &log;

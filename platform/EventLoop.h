@@ -11,7 +11,8 @@ namespace platform {
 
 class EventLoop {
  public:
-  enum class RunResult { finished, stopped, timedOut, handledSource };
+  // `toldToEnd`: the process is asked to end, and nothing is to be waited for any more.
+  enum class RunResult { finished, stopped, timedOut, handledSource, toldToEnd };
 
   virtual ~EventLoop() = default;
 

@@ -11,6 +11,7 @@
 
 #include "platform/Convert.h"
 #include "platform/host/BusMessage.h"
+#include "platform/host/EndSignals.h"
 
 namespace platform::host {
 
@@ -68,13 +69,13 @@ class Bus::Listener : public NamedServiceListener {
     release_.reset();
     calls_.reset();
     declaration_.reset();
-    if (handler_) handler_(nullptr);
     filter_.reset();
+    if (handler_) handler_(nullptr);
   }
 
  private:
-  static int onCall(sd_bus_message* call, void* listener, sd_bus_error*);
   static int onAnything(sd_bus_message* message, void* listener, sd_bus_error*);
+  static int onCall(sd_bus_message* call, void* listener, sd_bus_error*);
   static int onReleased(sd_bus_message* answer, void* listener, sd_bus_error*);
   void deliver(sd_bus_message* message);
   sd_bus* connection() const { return bus_.bus_.get(); }
@@ -136,7 +137,6 @@ int Bus::Listener::onReleased(sd_bus_message*, void* listener, sd_bus_error*) {
   return 1;
 }
 
-int Bus::Listener::onCall(sd_bus_message* call, void* listener, sd_bus_error*) {
 int Bus::Listener::onAnything(sd_bus_message* message, void* listener, sd_bus_error*) {
   if (sd_bus_message_is_method_call(message, nullptr, nullptr) > 0) {
     static_cast<Listener*>(listener)->called_ = true;
@@ -144,6 +144,7 @@ int Bus::Listener::onAnything(sd_bus_message* message, void* listener, sd_bus_er
   return 0;  // for the others to see
 }
 
+int Bus::Listener::onCall(sd_bus_message* call, void* listener, sd_bus_error*) {
   auto& self = *static_cast<Listener*>(listener);
   const char* interface = sd_bus_message_get_interface(call);
   if (sd_bus_message_is_method_call(call, nullptr, kMethod) <= 0) return 0;
@@ -218,20 +219,31 @@ Bus::RunResult Bus::run(double seconds, bool returnAfterSourceHandled) {
   const auto duration = saturatingCast<std::int64_t>(std::clamp(seconds, 0.0, 1e9) * 1e6);
   const auto end = Clock::now() + std::chrono::microseconds(duration);
   do {
+    if (isToldToEnd()) return RunResult::toldToEnd;
     serve(end - Clock::now());
     const bool called = listener_ != nullptr && listener_->takeCalled();
     if (called && returnAfterSourceHandled && Clock::now() < end) {
       return RunResult::handledSource;
     }
   } while (Clock::now() < end);
+  if (isToldToEnd()) return RunResult::toldToEnd;
   return closeService() ? RunResult::handledSource : RunResult::timedOut;
 }
 
 bool Bus::haveLoop() {
   sd_event* loop = nullptr;
-  if (!loop_ && sd_event_new(&loop) >= 0) loop_.reset(loop);
-  return loop_ != nullptr;
+  if (loop_ || sd_event_new(&loop) < 0) return loop_ != nullptr;
+  loop_.reset(loop);
+  const auto take = [](sd_event_source*, const signalfd_siginfo*, void* bus) {
+    static_cast<Bus*>(bus)->endSignalTaken_ = true;
+    return 0;
+  };
+  // Refused for signals that aren't deferred.
+  for (const int signal : kEndSignals) sd_event_add_signal(loop, nullptr, signal, take, this);
+  return true;
 }
+
+bool Bus::isToldToEnd() const { return endSignalTaken_ || endSignalWaits(); }
 
 void Bus::serve(Clock::duration atMost) {
   if (!haveLoop() || sd_event_run(loop_.get(), microseconds(atMost)) < 0) {

@@ -38,6 +38,10 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   // closes the service: it releases the bus name and serves what was sent while the name was owned.
   // If there was anything, it takes the name again and reports a handled source; else the run has
   // timed out, and the service stays closed. Without a bus a run waits for its time.
+  //
+  // End signals, if they are deferred (EndSignals.h), end this run and all others: what is queued
+  // stays undelivered. One that comes while the service is being closed doesn't count for this run,
+  // whose time is out; who supervises the process may send it because the name is gone.
   RunResult run(double seconds, bool returnAfterSourceHandled) override;
 
   // NamedServices. Takes the service's name on the bus, without queueing for it, and serves the
@@ -65,6 +69,7 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   int finishHandshake();
   void disconnect();
   bool haveLoop();
+  bool isToldToEnd() const;
   void serve(Clock::duration atMost);
   bool openService();
   bool closeService();
@@ -77,6 +82,7 @@ class Bus : public EventLoop, public NamedServices, public NotificationCenter {
   std::unique_ptr<sd_bus, CloseBus> bus_;
   bool tried_ = false;  // whether connecting was tried
   Listener* listener_ = nullptr;
+  bool endSignalTaken_ = false;
 };
 
 }  // namespace platform::host

@@ -44,6 +44,9 @@ class Device {
   // The same, only counting the calls at which a fault can be made.
   std::size_t countCalls(const std::string& program, faults::Strings arguments) const;
 
+  // What tells a program of this root and that bus.
+  faults::Strings environment(const std::string& bus) const;
+
   // Copies the other device's root over this one.
   void become(const Device& other);
 
@@ -77,7 +80,6 @@ class Device {
 
  private:
   Lines rows(std::int32_t first, std::int32_t last) const;
-  faults::Strings environment(const std::string& bus) const;
 
   std::unique_ptr<support::TemporaryFolder> root_;
   std::int32_t today_;

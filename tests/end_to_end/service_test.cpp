@@ -1,8 +1,13 @@
 // morvend as a service of a real message bus.
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <chrono>
+#include <csignal>
+#include <cstring>
 #include <filesystem>
 #include <thread>
 
@@ -14,22 +19,47 @@ namespace {
 
 using support::BusClient;
 
-// morvend in service mode, in the background.
+// morvend in the background, in service mode or with an option.
 class Service {
  public:
-  Service(const Device& device, const std::string& bus)
-      : thread_([this, &device, bus] { outcome_ = device.run("morvend", {}, {}, bus); }) {}
-
-  // Waits for its end.
-  const faults::Outcome& outcome() {
-    if (thread_.joinable()) thread_.join();
-    return outcome_;
+  Service(const Device& device, const std::string& bus, const char* option = nullptr) {
+    process_ = ::fork();
+    if (process_ != 0) return;
+    for (const std::string& variable : device.environment(bus))
+      ::putenv(::strdup(variable.c_str()));
+    ::dup2(::open((folder_ / "log").c_str(), O_WRONLY | O_CREAT | O_APPEND, 0600), STDERR_FILENO);
+    ::execl(PROGRAMS "/morvend", "morvend", option, nullptr);
+    ::_exit(127);
   }
   ~Service() { outcome(); }
 
+  void send(int signal) const { ::kill(process_, signal); }
+
+  // Waits until it says so.
+  void waitFor(const std::string& text) const {
+    for (int i = 0; i < 4000; ++i) {
+      if (folder_.read("log").find(text) != std::string::npos) return;
+      std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    ADD_FAILURE() << "never said " << text;
+  }
+
+  // Waits for its end.
+  const faults::Outcome& outcome() {
+    int status = 0;
+    if (process_ > 0 && ::waitpid(process_, &status, 0) == process_) {
+      process_ = -1;
+      outcome_.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+      outcome_.signal = WIFSIGNALED(status) ? WTERMSIG(status) : 0;
+      outcome_.standardError = folder_.read("log");
+    }
+    return outcome_;
+  }
+
  private:
-  faults::Outcome outcome_;
-  std::thread thread_;
+  support::TemporaryFolder folder_;
+  pid_t process_ = -1;
+  faults::Outcome outcome_{};
 };
 
 void waitForService(BusClient& client) {
@@ -100,12 +130,53 @@ TEST(Service, MovesOnWithoutInfoThatNeverComes) {
   BusClient client(bus.address());
   waitForService(client);
   client.send({{"operation", 0}});
-  const auto& outcome = service.outcome();
-  EXPECT_EQ(outcome.status, 0);
-  EXPECT_NE(outcome.standardError.find("never received requested AAI, so moving along without it"),
-            std::string::npos);
+  service.waitFor("never received requested AAI, so moving along without it");
+  service.send(SIGTERM);  // as a supervisor does that saw the name go
+  EXPECT_TRUE(ended(service.outcome()));
   ASSERT_EQ(device.dailyLogs().size(), 1u);
   EXPECT_EQ(device.dailyLogs()[0].find("PLActivatedAppInfo"), nullptr);
+}
+
+// A wait that goes on, work that is cut short, and work that is begun nevertheless.
+TEST(Service, ToldToEndFinishesWhatHasBegunAndOnlyThat) {
+  const Dictionary announcement{{"operation", 0}};
+  const Dictionary delivery{{"operation", 2}, {"app_data", Array{application("com.x")}}};
+  const struct {
+    const char* option;
+    std::vector<Dictionary> messages;
+    const char* said;
+    int signal;
+    bool done;
+  } rows[] = {
+      {nullptr, {}, "morvend started", SIGTERM, false},
+      {nullptr, {announcement}, "waiting for activate app info", SIGINT, false},
+      {nullptr, {announcement, delivery, delivery}, "daily tasks for day", SIGTERM, true},
+      {"-d", {}, "daily tasks for day", SIGTERM, true},
+      {"-d", {}, "daily tasks for day", SIGINT, true},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(&row - rows);
+    Device device;
+    device.fill();
+    device.writePropertyList("device/network-usage.plist", Dictionary{{"ReplyDelay", 0.5}});
+    const support::PrivateBus bus;
+    BusClient client(bus.address());
+    Service service(device, bus.address(), row.option);
+    if (row.option == nullptr) waitForService(client);
+    for (const Dictionary& message : row.messages) client.send(message);
+    client.settle();
+    service.waitFor(row.said);
+    const auto start = std::chrono::steady_clock::now();
+    service.send(row.signal);
+    const auto& outcome = service.outcome();
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
+    EXPECT_TRUE(ended(outcome)) << outcome.signal << outcome.standardError;
+    const auto record = device.record("LastCrashLogSerializationDateInDaysSince1970");
+    EXPECT_EQ(record, row.done ? std::optional<Value>(device.today() - 1) : std::nullopt);
+    EXPECT_EQ(device.dailyLogs().size(), row.done ? 1u : 0u);
+    EXPECT_EQ(outcome.standardError.find("unsolicited"), std::string::npos);
+    EXPECT_EQ(outcome.standardError.find("never received"), std::string::npos);
+  }
 }
 
 // Nobody asks: nothing is read or written. With and without a bus, and with one that hangs.
