@@ -4,15 +4,19 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
+#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <regex>
 #include <set>
 #include <sstream>
+#include <thread>
 #include <vector>
 
 #include "end_to_end/Device.h"
+#include "support/PrivateBus.h"
 
 namespace end_to_end {
 namespace {
@@ -176,7 +180,8 @@ constexpr Otherwise kOtherwise[] = {
     {"./dev ", "it builds the tree, or runs this test"},
     {"busctl ", "it listens on the system's bus"},
     {"journalctl ", "it reads the machine's journal"},
-    {"message", "it sends over the system's bus; the service's own test does that"},
+    {"name=", "for the messages"},
+    {"message", "it sends over a bus; see the next test"},
     {"<", "a whitelist"},
     {"{\"set\"|", "the form of a line, not a line"},
     {"pelloran sample --every 60 ", "it goes on for an hour", "timeout 2 ", 124},
@@ -234,6 +239,35 @@ TEST(Documents, TheirCommandsDoWhatTheySay) {
   EXPECT_GT(ran, 15);
   for (const Otherwise& row : kOtherwise) {
     EXPECT_TRUE(used.contains(&row)) << "no document has it any more: " << row.beginning;
+  }
+}
+
+// A message that starts the service, by a sender that doesn't stay, and is lost: the manual page's,
+// with nothing running each time.
+TEST(Documents, TheirMessagesStartTheService) {
+  std::string script = "set -e\n";
+  for (const std::string& command : commandsOf("packaging/man/morvend.8")) {
+    if (command.starts_with("name=") || command.starts_with("message")) script += command + "\n";
+  }
+  for (int start = 0; start < 3; ++start) {
+    Device device;
+    device.fill();
+    const support::PrivateBus bus("MORVEND_ROOT=" + device.root().path().string() +
+                                  " " PROGRAMS "/morvend");
+    const auto sent =
+        faults::run({"/bin/bash", "-c", script}, {"DBUS_SYSTEM_BUS_ADDRESS=" + bus.address()});
+    EXPECT_EQ(sent.status, 0) << script << sent.standardError;
+    for (int i = 0; i < 4000 && device.dailyLogs().empty(); ++i) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    const pid_t service = support::BusClient(bus.address()).serviceProcess();
+    for (int signal = SIGTERM; ::kill(service, signal) == 0; signal = 0) {
+      std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    ASSERT_EQ(device.dailyLogs().size(), 1u);
+    const auto* applications = device.dailyLogs()[0].array("PLActivatedAppInfo");
+    ASSERT_NE(applications, nullptr);
+    EXPECT_EQ(applications->size(), 1u);
   }
 }
 

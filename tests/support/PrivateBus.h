@@ -22,10 +22,19 @@ namespace support {
 // A dbus-daemon on a socket in a folder of its own; it ends with the object, or with the test.
 class PrivateBus {
  public:
-  PrivateBus() {
-    folder_.write("bus.conf", "<busconfig><type>session</type><listen>unix:path=" +
-                                  (folder_ / "socket").string() +
-                                  "</listen><auth>EXTERNAL</auth><policy context=\"default\">"
+  // The service, if there is one, is started by the first call to its name: a command line with
+  // variables in front, to which the bus's own is added.
+  explicit PrivateBus(const std::string& service = "") {
+    const std::string socket = "unix:path=" + (folder_ / "socket").string();
+    if (!service.empty()) {
+      folder_.write("services/com.norba.pellorand.morvend.service",
+                    "[D-BUS Service]\nName=com.norba.pellorand.morvend\nExec=/usr/bin/env "
+                    "DBUS_SYSTEM_BUS_ADDRESS=" +
+                        socket + " " + service + "\n");
+    }
+    folder_.write("bus.conf", "<busconfig><type>session</type><listen>" + socket +
+                                  "</listen><servicedir>" + (folder_ / "services").string() +
+                                  "</servicedir><auth>EXTERNAL</auth><policy context=\"default\">"
                                   "<allow send_destination=\"*\"/><allow receive_sender=\"*\"/>"
                                   "<allow own=\"*\"/></policy>"
                                   "</busconfig>");
@@ -135,6 +144,16 @@ class BusClient {
     check(sd_bus_message_read(answer, "b", &owned));
     sd_bus_message_unref(answer);
     return owned != 0;
+  }
+
+  // The process that owns the service's name.
+  pid_t serviceProcess() {
+    sd_bus_creds* owner = nullptr;
+    check(sd_bus_get_name_creds(bus(), kService, SD_BUS_CREDS_PID, &owner));
+    pid_t process = 0;
+    check(sd_bus_creds_get_pid(owner, &process));
+    sd_bus_creds_unref(owner);
+    return process;
   }
 
   static void append(sd_bus_message* call, const platform::Dictionary& dictionary) {
