@@ -4,6 +4,7 @@
 #include "NANDInfo/StructuredLogs.h"
 
 #include <gtest/gtest.h>
+#include <malloc.h>
 
 #include <cmath>
 #include <functional>
@@ -322,6 +323,17 @@ TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
     EXPECT_EQ(fakes.submission.logs.size(), row.logged ? 1u : 0u);
     EXPECT_EQ(structured.size(), 8u);
   }
+}
+
+// A list isn't to hold what was in the memory before it: such bytes would go into logs.
+TEST_F(StructuredLogsTest, WhatTheDriverLeavesOutIsZero) {
+  const Bytes list = support::defectsList(1, {{9, 9, 9, 9, 9, 9, 9, 0}});
+  registry.alwaysTunnels(9, 15, 0, list);
+  registry.standing["9 data 15/0"].output.resize(list.size() - 32);
+  ::mallopt(M_PERTURB, 0xA5);
+  EXPECT_TRUE(DumpStorageStructuredLog(platform, false));
+  ::mallopt(M_PERTURB, 0);
+  EXPECT_EQ(structured.back().second, defectLog({}));
 }
 
 // A call or a list that fails, what is said of it, and what is logged all the same.
