@@ -9,6 +9,7 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/ProcessState.h"
+#include "platform/Text.h"
 #include "support/FreshErrors.h"
 #include "support/TestPlatform.h"
 
@@ -43,44 +44,29 @@ class ControllerTest : public ::testing::Test {
   FakeDeviceRegistry& registry = fakes.registry;
 };
 
-TEST_F(ControllerTest, TheTableHasEachDriversRow) {
-  const struct {
-    const char *className, *propertyKey;
-    std::uint32_t deletion, tunnel;
-    bool hasMSPs;
-  } rows[kExporters] = {{kQRT3, "Controller Characteristics", 0xFFFFFFFF, 9, true},
-                        {kEmbedded, "Controller Characteristics", 0xFFFFFFFF, 9, false},
-                        {kStorage, platform::kRegistryPropertyMatchKey, 5, 8, false}};
+// What no exchange below asks for.
+TEST_F(ControllerTest, EachDriverHasItsSelectors) {
+  std::string text;
   for (std::size_t i = 0; i < kExporters; ++i) {
     const auto& row = nand_exporters_tunnel[i];
-    EXPECT_STREQ(row.className, rows[i].className);
-    EXPECT_STREQ(row.propertyKey, rows[i].propertyKey);
-    EXPECT_EQ(row.recommendDeletionSelector, rows[i].deletion);
-    EXPECT_EQ(row.sizeSelector, rows[i].tunnel);
-    EXPECT_EQ(row.dataSelector, rows[i].tunnel);
-    EXPECT_EQ(row.getMSPStatsSelectors != nullptr, rows[i].hasMSPs);
-    EXPECT_EQ(row.parseMSP, rows[i].hasMSPs ? ZMCMSPParseBufferToCxt : nullptr);
-    EXPECT_EQ(row.parseLegacy, ZMCParseBufferToCxt);
-    EXPECT_EQ(row.releaseLegacy, ZMCReleaseContext);
-    EXPECT_EQ(row.parseFTL, ZMCFTLParseBufferToCxt);
-    EXPECT_EQ(row.parseFTLStatKey, ZMCFTLParseStatKeyBufferToCxt);
-    EXPECT_EQ(row.releaseGeneric, ReleaseGenericParserCxt);
-    const std::pair<SelectorGetter, std::uint32_t> getters[] = {
-        {row.getStatsSelectors, 13},
-        {row.getReadStatsSelectors, 10},
-        {rows[i].hasMSPs ? row.getMSPStatsSelectors : getMSPStatsSelectors, 221},
-        {row.getDefectsListSelectors, 15},
-        {row.getTelemetryListSelectors, 17},
-        {row.getTaskSchedulerSelectors, 39},
-        {row.getSnapshotSelectors, 22},
-        {row.getSnapshotHeaderSelectors, 145},
-        {row.getBandStatsSelectors, 11}};
-    for (const auto& [getter, opType] : getters) {
-      EXPECT_EQ(getter()->sizeOpType, opType);
-      EXPECT_EQ(getter()->dataOpType, opType);
+    text += platform::format("%s %s %d %u %u", row.className, row.propertyKey,
+                             static_cast<int>(row.recommendDeletionSelector), row.sizeSelector,
+                             row.dataSelector);
+    for (const SelectorGetter getter :
+         {row.getStatsSelectors, row.getReadStatsSelectors, row.getMSPStatsSelectors,
+          row.getDefectsListSelectors, row.getTelemetryListSelectors, row.getTaskSchedulerSelectors,
+          row.getSnapshotSelectors, row.getSnapshotHeaderSelectors, row.getBandStatsSelectors}) {
+      const SelectorPair pair = getter != nullptr ? *getter() : SelectorPair{};
+      text += platform::format(" %u/%u", pair.sizeOpType, pair.dataOpType);
     }
+    text += "\n";
   }
-  EXPECT_EQ(nand_exporters_tunnel[kExporters].className, nullptr);
+  const std::string lists = "15/15 17/17 39/39 22/22 145/145 11/11\n";
+  EXPECT_EQ(text,
+            "NorbaQRT3NVMeController Controller Characteristics -1 9 9 13/13 10/10 221/221 " +
+                lists +
+                "NorbaEmbeddedNVMeController Controller Characteristics -1 9 9 13/13 10/10 0/0 " +
+                lists + "ZMCStorage PropertyMatch 5 8 8 13/13 10/10 0/0 " + lists);
 }
 
 // The service plane, and what each of the three ways of looking makes of it.
@@ -256,6 +242,10 @@ TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
     bytes[0] = std::byte{1};
     return bytes;
   }();
+  const Bytes threeBytes(3, std::byte{1});
+  const std::string unmatched = "Can't get ZMC Connection, no matching service!\n";
+  const std::string unconnected = "Can't get ZMC Connection!\n";
+  const std::string refused = "DrvServiceOpen failed for class 'ZMCStorage', result 0xe00002bc\n";
   const std::vector<FakeDeviceRegistry::Step> tunnel = {{"8 size 13/0", announce(8)},
                                                         {"8 data 13/0", {.output = statistics}}};
   const Entry storage{.className = kStorage};
@@ -280,31 +270,15 @@ TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
       {"deletion", recommends, storage, {{"5", announce(0x01000000)}}, true, {}},
       {"deletion, no", recommends, storage, {{"5", announce(0)}}, false, {}},
       {"deletion, failing", recommends, storage, {{"5", {kError, announce(1).output}}}, false, {}},
-      {"deletion, short",
-       recommends,
-       storage,
-       {{"5", {.output = Bytes(3, std::byte{1})}}},
-       false,
-       {}},
+      {"deletion, short", recommends, storage, {{"5", {.output = threeBytes}}}, false, {}},
       {"deletion, not closed", recommends, failing, {{"5", announce(1)}}, true, {notClosed}},
       {"deletion, refused", recommends, refusing, {}, false, {notOpened}},
       {"deletion, none", recommends, {}, {}, false, {noService, "_load_nand_info" + missing}},
       {"deletion, not asked", recommends, Entry{.className = kQRT3}, {}, false, {}},
       {"connection", connect, storage, {}, true, {}},
-      {"connection, none",
-       connect,
-       {},
-       {},
-       false,
-       {noService, "Can't get ZMC Connection, no matching service!\n"}},
-      {"connection, refused",
-       connect,
-       refusing,
-       {},
-       false,
-       {"DrvServiceOpen failed for class 'ZMCStorage', result 0xe00002bc\n",
-        "Can't get ZMC Connection!\n"}},
-      {"connection, no handle", connect, handleless, {}, false, {"Can't get ZMC Connection!\n"}},
+      {"connection, none", connect, {}, {}, false, {noService, unmatched}},
+      {"connection, refused", connect, refusing, {}, false, {refused, unconnected}},
+      {"connection, no handle", connect, handleless, {}, false, {unconnected}},
   };
   for (const auto& row : cases) {
     SCOPED_TRACE(row.name);

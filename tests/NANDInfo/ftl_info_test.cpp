@@ -39,6 +39,11 @@ TEST(FTLInfo, GatheringByItsFailures) {
     nand_exporters_tunnel[0].getStatsSelectors = nullptr;
     nand_exporters_tunnel[0].getReadStatsSelectors = nullptr;
   };
+  constexpr FTLParser byName = FTLParser::named;
+  constexpr char noMagazine[] = "Stat Magazine not supported";
+  constexpr char noGetter[] = "No getStatsSelectors exist";
+  constexpr char noReadGetter[] = "No getReadStatsSelectors exist";
+  const std::string failed = "gatherZMCFTLData: ";
   for (const bool statistics : {true, false}) {
     const struct {
       const char* controller;
@@ -48,31 +53,14 @@ TEST(FTLInfo, GatheringByItsFailures) {
       std::optional<Dictionary> counters;
       std::string message;
     } rows[] = {
-        {kQRT3, nothing, FTLParser::named, buffer, flags(named, 0, 1), "NA"},
-        {kEmbedded, nothing, FTLParser::named, buffer, flags(named, 0, 1), "NA"},
-        {kZMCStorage, nothing, FTLParser::named, buffer, flags(named, 1, 1), "NA"},
-        {kQRT3, nothing, FTLParser::statKey, buffer, flags(keys, 0, 0),
-         "Stat Magazine not supported"},
-        {kQRT3,
-         nothing,
-         FTLParser::named,
-         support::Bytes(),
-         {},
-         "gatherZMCFTLData: parseFTL failed"},
-        {nullptr,
-         nothing,
-         FTLParser::named,
-         {},
-         {},
-         "gatherZMCFTLData: Could not get nand_exporter_t"},
-        {kQRT3, loseHandle, FTLParser::named, {}, {}, "gatherZMCFTLData: No io_connection exist"},
-        {kQRT3,
-         loseGetters,
-         FTLParser::named,
-         {},
-         {},
-         statistics ? "gatherZMCFTLData: No getStatsSelectors exist"
-                    : "gatherZMCFTLData: No getReadStatsSelectors exist"},
+        {kQRT3, nothing, byName, buffer, flags(named, 0, 1), "NA"},
+        {kEmbedded, nothing, byName, buffer, flags(named, 0, 1), "NA"},
+        {kZMCStorage, nothing, byName, buffer, flags(named, 1, 1), "NA"},
+        {kQRT3, nothing, FTLParser::statKey, buffer, flags(keys, 0, 0), noMagazine},
+        {kQRT3, nothing, byName, support::Bytes(), {}, failed + "parseFTL failed"},
+        {nullptr, nothing, byName, {}, {}, failed + "Could not get nand_exporter_t"},
+        {kQRT3, loseHandle, byName, {}, {}, failed + "No io_connection exist"},
+        {kQRT3, loseGetters, byName, {}, {}, failed + (statistics ? noGetter : noReadGetter)},
     };
     for (const auto& row : rows) {
       StorageDevice device(row.controller);

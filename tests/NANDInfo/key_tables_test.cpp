@@ -2,8 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <map>
-#include <set>
 #include <string>
 
 #include "support/Fingerprint.h"
@@ -14,10 +12,8 @@ namespace {
 // One wrong letter, key or number of elements changes the fingerprint.
 TEST(FTLKeyTable, HasEveryKeyOnceAndFindsIt) {
   std::string text;
-  std::set<std::string> names;
   for (const auto& [key, elements, name] : FTLKeyTable()) {
     text += std::to_string(key) + " " + name + " " + std::to_string(elements) + "\n";
-    EXPECT_TRUE(names.insert(name).second) << name;
   }
   EXPECT_EQ(support::fingerprint(text), 0x74ec7726eb57a8eeu);
   auto row = FTLKeyTable().begin();
@@ -30,21 +26,11 @@ TEST(FTLKeyTable, HasEveryKeyOnceAndFindsIt) {
 
 TEST(MSPTagTable, HasEveryTagOnceAndFindsIt) {
   std::string text;
-  std::map<std::string, int> tagsOfName;
   for (const auto& [tag, width, elements, name] : MSPTagTable()) {
     text += std::to_string(tag) + " " + name + " " + std::to_string(width) + " " +
             std::to_string(elements) + "\n";
-    ++tagsOfName[name];
   }
   EXPECT_EQ(support::fingerprint(text), 0xc5f9033f38f37a47u);
-  std::set<std::string> shared;
-  for (const auto& [name, tags] : tagsOfName) {
-    EXPECT_LE(tags, 2);
-    if (tags == 2) shared.insert(name);
-  }
-  EXPECT_EQ(shared, (std::set<std::string>{"active_time_hist", "higher_die_temperature",
-                                           "lower_die_temperature", "open_blocks_hist",
-                                           "random_read_hit_ratio_hist"}));
   auto row = MSPTagTable().begin();
   for (std::uint32_t tag = 0; tag <= 70000; ++tag) {
     const bool listed = row != MSPTagTable().end() && row->tag == tag;
