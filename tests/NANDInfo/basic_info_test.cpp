@@ -87,42 +87,26 @@ TEST(BasicInfo, EveryFieldHasItsKeyAndType) {
 }
 
 TEST(BasicInfo, SeveralFieldsMakeOne) {
+  const std::string user = "userPartitionStart", middle = "intermediatePartitionStart",
+                    success = "numBootBlockRefreshSuccess", failure = "numBootBlockRefreshFail",
+                    read = "mspBootBlockReadFail", program = "mspBootBlockProgFail";
+  constexpr char size[] = "IntermediatePartitionSize";
   const struct {
     support::Fields fields;
     const char* key;
     std::optional<std::int64_t> value;
   } rows[] = {
-      {{{"userPartitionStart", 50}, {"intermediatePartitionStart", 8}},
-       "IntermediatePartitionSize",
-       42},
-      {{{"intermediatePartitionStart", 8}, {"userPartitionStart", 1}},
-       "IntermediatePartitionSize",
-       -7},
-      {{{"userPartitionStart", 50}}, "IntermediatePartitionSize", std::nullopt},
-      {{{"userPartitionStart", 50}, {"intermediatePartitionStart", 0xFFFFFFFF}},
-       "IntermediatePartitionSize",
-       std::nullopt},
-      {{{"numBootBlockRefreshSuccess0", 3},
-        {"numBootBlockRefreshFail0", 4},
-        {"numBootBlockRefreshFail1", 9}},
-       "NumMaintenanceRequests",
-       7},
-      {{{"numBootBlockRefreshSuccess0", kMany}, {"numBootBlockRefreshFail0", 3}},
-       "NumMaintenanceRequests",
-       2},
-      {{{"mspBootBlockReadFail0", 9},
-        {"mspBootBlockReadFail1", 0},
-        {"mspBootBlockReadFail2", 1},
-        {"mspBootBlockReadFail3", 1},
-        {"mspBootBlockReadFail20", 1}},
+      {{{user, 50}, {middle, 8}}, size, 42},
+      {{{middle, 8}, {user, 1}}, size, -7},
+      {{{user, 50}}, size, std::nullopt},
+      {{{user, 50}, {middle, 0xFFFFFFFF}}, size, std::nullopt},
+      {{{success + "0", 3}, {failure + "0", 4}, {failure + "1", 9}}, "NumMaintenanceRequests", 7},
+      {{{success + "0", kMany}, {failure + "0", 3}}, "NumMaintenanceRequests", 2},
+      {{{read + "0", 9}, {read + "1", 0}, {read + "2", 1}, {read + "3", 1}, {read + "20", 1}},
        "MaintenanceRequestsFailedRead",
        2},
-      {{{"mspBootBlockProgFail1", 9}, {"mspBootBlockReadFail0", 0}},
-       "MaintenanceRequestsFailedProg",
-       1},
-      {{{"mspBootBlockEraseFail2", 9}, {"mspBootBlockProgFail1", 1}},
-       "MaintenanceRequestsFailedErase",
-       1},
+      {{{program + "1", 9}, {read + "0", 0}}, "MaintenanceRequestsFailedProg", 1},
+      {{{"mspBootBlockEraseFail2", 9}, {program + "1", 1}}, "MaintenanceRequestsFailedErase", 1},
       {{{"maxMemLowDuration", 123456}}, "maxMemExtremeDuration", 123000},
       {{{"maxMemLowDuration", 0x100000000 + 99950}}, "maxMemExtremeDuration", 100000},
       {{{"maxMemChokeDuration", 123456}}, "maxMemChokeDuration", 123000},

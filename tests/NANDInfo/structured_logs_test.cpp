@@ -350,6 +350,7 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
   const std::string failed = "DrvCallStructMethod failed with status 0x2bc on selector index ";
   const std::string notFetched = "Could not retrieve data from driver for selector 17\n";
   const std::string beyond = "ERROR: Attempting to parse beyond the bounds of the buffer\n";
+  const std::string tooLarge = "Could not malloc ";
   const std::string unparsable = "data cannot be parsed";
   const std::string validity = "Validity list retrieval is not supported\n";
   const std::string telemetry = "Telemetry list retrieval is not supported\n";
@@ -357,6 +358,9 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
   const auto noValidity = [&] { driver.getBandStatsSelectors = nullptr; };
   const auto noTelemetry = [&] { driver.getTelemetryListSelectors = nullptr; };
   const auto noPair = [&] { driver.getTelemetryListSelectors = [] { return kNoPair; }; };
+  const auto noChip = [&] {
+    controller->properties = {{kCharacteristics, Dictionary{{"num-bus", 1}}}};
+  };
   const auto noDefects = [&] { driver.getDefectsListSelectors = nullptr; };
   const Answer oneByte{.output = Bytes(1, std::byte{12})};
   const Answer overlong{.output = Bytes(44), .claimedSize = ~0u};
@@ -376,24 +380,14 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
       {{say("9 data 15/0", overlong)}, {}, true, 1, 7},
       {{say("9 data 11/0", {})}, {unparsable}, false, 0, 8},
       {{say("9 size 17/0", announce(1 << 24))}, {}, true, 1, 8},
-      {{say("9 size 17/0", announce(1 << 24 | 1))},
-       {"Could not malloc 16777217 bytes"},
-       false,
-       1,
-       6},
-      {{say("9 size 15/0", announce(~0u))}, {"Could not malloc 4294967295 bytes"}, false, 1, 6},
+      {{say("9 size 17/0", announce(1 << 24 | 1))}, {tooLarge + "16777217 bytes"}, false, 1, 6},
+      {{say("9 size 15/0", announce(~0u))}, {tooLarge + "4294967295 bytes"}, false, 1, 6},
       {{list(17, 8255)}, {beyond}, false, 1, 6},
       {{list(11, 40), list(15, 11)}, {unparsable, unparsable}, false, 0, 6},
       {{noTelemetry}, {telemetry}, true, 1, 2},
       {{noPair}, {}, false, 1, 2},
       {{noValidity, noTelemetry, noDefects}, {validity, telemetry, defects}, true, 0, 0},
-      {{[&] {
-         controller->properties = {{kCharacteristics, Dictionary{{"num-bus", 1}}}};
-       }},
-       Lines(3, "ERROR: Could not determine the chip-id\n"),
-       false,
-       1,
-       2},
+      {{noChip}, Lines(3, "ERROR: Could not determine the chip-id\n"), false, 1, 2},
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(&row - rows);

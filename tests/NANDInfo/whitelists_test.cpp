@@ -23,23 +23,18 @@ std::uint64_t digestOf(const std::vector<std::string>& lines) {
   return support::fingerprint(text);
 }
 
-struct SignificantDigits {
-  const NameTable& table;
-  std::size_t names;
-  std::uint64_t digest;  // of the lines "name digits" in bytewise order
-};
-
-std::vector<SignificantDigits> allTables() {
-  return {{WhitelistedRawNANDFTLCounters_SigDigDict(), 1445, 0x9f9155d605ed4a74},
-          {WhitelistedRawNANDMSPCounters_SigDigDict(), 825, 0x886f8d86b2526163},
-          {WhitelistedStorageStats_SigDigDict(), 20, 0x6836ac9c52a42c16},
-          {PrivacyApprovedSMagNANDFTLCounters_Accum(), 731, 0x938e689259d19ed3},
-          {PrivacyApprovedSMagNANDFTLCounters_Dynamic(), 41, 0xf757393dfba3ec47},
-          {PrivacyApprovedSMagNANDFTLCounters_SigDigDict(), 805, 0x224e9f65799d6ecb}};
-}
-
 TEST(Whitelists, HoldTheirNamesAndDigitsOnceEach) {
-  for (const auto& [table, names, digest] : allTables()) {
+  const struct {
+    const NameTable& table;
+    std::size_t names;
+    std::uint64_t digest;  // of the lines "name digits" in bytewise order
+  } tables[] = {{WhitelistedRawNANDFTLCounters_SigDigDict(), 1445, 0x9f9155d605ed4a74},
+                {WhitelistedRawNANDMSPCounters_SigDigDict(), 825, 0x886f8d86b2526163},
+                {WhitelistedStorageStats_SigDigDict(), 20, 0x6836ac9c52a42c16},
+                {PrivacyApprovedSMagNANDFTLCounters_Accum(), 731, 0x938e689259d19ed3},
+                {PrivacyApprovedSMagNANDFTLCounters_Dynamic(), 41, 0xf757393dfba3ec47},
+                {PrivacyApprovedSMagNANDFTLCounters_SigDigDict(), 805, 0x224e9f65799d6ecb}};
+  for (const auto& [table, names, digest] : tables) {
     std::vector<std::string> lines;
     for (const NameTable::Entry& entry : table) {
       lines.push_back(std::string(entry.name) + " " + std::to_string(entry.number));
