@@ -1,5 +1,5 @@
-// Writes binary property lists for tests: whole values, or objects given byte by byte, which makes
-// lists that no honest writer would.
+// Writes binary property lists for tests: values (a truth value as a number), or objects given byte
+// by byte, which makes lists that no honest writer would.
 #pragma once
 
 #include <bit>
@@ -49,23 +49,11 @@ class BinaryPropertyList {
   }
 
   std::size_t add(const platform::Value& value) {
-    using platform::Number;
-    if (const auto* number = value.as<Number>()) {
-      switch (number->type()) {
-        case Number::Type::boolean:
-          return object(number->boolValue() ? "\x09" : "\x08");
-        case Number::Type::float32:
-          return object("\x22" + bigEndian(std::bit_cast<std::uint32_t>(
-                                               static_cast<float>(number->doubleValue())),
-                                           4));
-        case Number::Type::float64:
-          return object("\x23" + bigEndian(std::bit_cast<std::uint64_t>(number->doubleValue()), 8));
-        case Number::Type::uint64:
-          return object("\x14" + bigEndian(0, 8) + bigEndian(number->uint64Value(), 8));
-        case Number::Type::int32:
-        case Number::Type::int64:
-          return object("\x13" + bigEndian(number->uint64Value(), 8));
-      }
+    if (const auto* number = value.as<platform::Number>()) {
+      return number->isReal()
+                 ? object("\x23" +
+                          bigEndian(std::bit_cast<std::uint64_t>(number->doubleValue()), 8))
+                 : object("\x13" + bigEndian(number->uint64Value(), 8));
     }
     if (const auto* text = value.as<std::string>()) return counted(0x7, text->size(), *text);
     if (const auto* data = value.as<platform::Data>()) {

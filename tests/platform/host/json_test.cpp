@@ -5,8 +5,6 @@
 #include <limits>
 #include <nlohmann/json.hpp>
 
-#include "support/RandomValue.h"
-
 namespace platform::host {
 namespace {
 
@@ -37,30 +35,23 @@ TEST(JSON, Form) {
   EXPECT_EQ(json(twice), "{\"\xEF\xBF\xBD\": 2}") << "a key stands once";
 }
 
-TEST(JSON, IsValidWhateverTheBytes) {
-  support::RandomValue random(3);
-  for (int i = 0; i < 1000; ++i) {
-    const std::string text =
-        json(Array{random.value(), Dictionary{{random.bytes(), random.bytes()}}});
-    ASSERT_TRUE(nlohmann::json::accept(text)) << text;
-    ASSERT_EQ(text.find('\n'), std::string::npos);
+TEST(JSON, IsOneValidLineWhateverTheBytes) {
+  for (int first = 0; first < 256; ++first) {
+    for (const char* rest : {"", "\x80", "\xBF\xBF", "\xBF\xBF\xBF", "\"", "\\"}) {
+      const std::string bytes = static_cast<char>(first) + std::string(rest);
+      const std::string text = json(Dictionary{{bytes, bytes}});
+      ASSERT_TRUE(nlohmann::json::accept(text)) << text;
+      ASSERT_EQ(text.find('\n'), std::string::npos);
+    }
   }
 }
 
-TEST(JSON, IndentedHoldsTheSame) {
+TEST(JSON, IndentsContainers) {
   std::string text;
   appendIndentedJSON(
       text, Dictionary{{"d", Dictionary{{"e", Dictionary{}}}}, {"a", Array{1, Array{}, "x"}}});
   EXPECT_EQ(text,
             "{\n  \"d\": {\n    \"e\": {}\n  },\n  \"a\": [\n    1,\n    [],\n    \"x\"\n  ]\n}");
-  support::RandomValue random(4);
-  for (int i = 0; i < 300; ++i) {
-    const Value value = random.value();
-    text.clear();
-    appendIndentedJSON(text, value);
-    ASSERT_EQ(nlohmann::ordered_json::parse(text).dump(),
-              nlohmann::ordered_json::parse(json(value)).dump());
-  }
 }
 
 }  // namespace

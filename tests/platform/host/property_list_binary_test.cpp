@@ -5,7 +5,6 @@
 #include "platform/host/HostPropertyListCodec.h"
 #include "platform/host/PropertyListBinaryReader.h"
 #include "support/BinaryPropertyList.h"
-#include "support/RandomValue.h"
 
 namespace platform::host {
 namespace {
@@ -192,16 +191,6 @@ TEST(PropertyListBinary, SurvivesCutsAndAlterations) {
       const Result<Value> result = codec.read(altered);
       EXPECT_TRUE(!result || codec.read(*codec.writeXML(*result))) << i;
     }
-  }
-}
-
-TEST(PropertyListBinary, RandomValuesComeBackEqual) {
-  support::RandomValue random(2);
-  for (int i = 0; i < 300; ++i) {
-    const Value value = random.value();
-    const Result<Value> again = readBinaryPropertyList(BinaryPropertyList::of(value));
-    ASSERT_TRUE(again) << again.error;
-    ASSERT_TRUE(*again == value) << description(value);
   }
 }
 
