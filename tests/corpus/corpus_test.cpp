@@ -6,38 +6,19 @@
 #include <fstream>
 #include <iterator>
 #include <string>
+#include <utility>
 
-// The fuzz targets as they are, each entry renamed after its file (see tests/CMakeLists.txt).
-extern "C" {
+// The fuzz targets as they are, each entry renamed after its file: the build names them all, as
+// FUZZ_TARGETS (see tests/CMakeLists.txt).
 using FuzzTarget = int(const std::uint8_t* bytes, std::size_t size);
-FuzzTarget binary_property_list_fuzz, bus_message_fuzz, decoded_buffer_fuzz, defects_list_fuzz,
-    ftl_statistics_fuzz, import_lines_fuzz, kernel_snapshot_fuzz, legacy_statistics_fuzz,
-    msp_statistics_fuzz, registry_fuzz, telemetry_list_fuzz, validity_list_fuzz,
-    xml_property_list_fuzz;
-}
+#define TARGET(name) extern "C" FuzzTarget name;
+FUZZ_TARGETS
+#undef TARGET
 
 namespace {
 
-struct Row {
-  const char* name;
-  FuzzTarget* function;
-};
-
-constexpr Row kTargets[] = {
-    {"binary_property_list_fuzz", binary_property_list_fuzz},
-    {"bus_message_fuzz", bus_message_fuzz},
-    {"decoded_buffer_fuzz", decoded_buffer_fuzz},
-    {"defects_list_fuzz", defects_list_fuzz},
-    {"ftl_statistics_fuzz", ftl_statistics_fuzz},
-    {"import_lines_fuzz", import_lines_fuzz},
-    {"kernel_snapshot_fuzz", kernel_snapshot_fuzz},
-    {"legacy_statistics_fuzz", legacy_statistics_fuzz},
-    {"msp_statistics_fuzz", msp_statistics_fuzz},
-    {"registry_fuzz", registry_fuzz},
-    {"telemetry_list_fuzz", telemetry_list_fuzz},
-    {"validity_list_fuzz", validity_list_fuzz},
-    {"xml_property_list_fuzz", xml_property_list_fuzz},
-};
+#define TARGET(name) {#name, name},
+constexpr std::pair<const char*, FuzzTarget*> kTargets[] = {FUZZ_TARGETS};
 
 TEST(Corpus, EveryInputIsSurvived) {
   for (const auto& [name, function] : kTargets) {
