@@ -114,7 +114,7 @@ TEST(Faults, CompletesTheDayAfterAFaultAtAnyCallOfARun) {
   Device device, clean;
   clean.become(filled);
   const std::size_t calls = clean.countCalls("morvend", {"-d"});
-  ASSERT_GT(calls, 50u);
+  ASSERT_GT(calls, 120u) << "is the shim not seeing those of the database library?";
   for (const char* kind : faults::kKinds) {
     for (std::size_t at = 1; at <= calls; ++at) {
       device.become(filled);

@@ -14,13 +14,13 @@ using faults::Outcome;
 constexpr std::size_t kCalls = 9;
 
 Outcome runCalls(const support::TemporaryFolder& root, const faults::Fault& fault) {
-  return faults::run({FAULT_SUBJECT, "calls", root.path().string()}, {}, fault);
+  return faults::run({FAULT_SUBJECT, root.path().string()}, {}, fault);
 }
 
 TEST(FaultShim, CountsWhatChangesFilesAndNothingElse) {
   if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
   const support::TemporaryFolder root;
-  EXPECT_EQ(faults::count({FAULT_SUBJECT, "calls", root.path().string()}, {}), kCalls);
+  EXPECT_EQ(faults::count({FAULT_SUBJECT, root.path().string()}, {}), kCalls);
 }
 
 TEST(FaultShim, KillsAndFailsAtTheCallThatIsNamed) {
@@ -55,22 +55,6 @@ TEST(FaultShim, WritesHalfOfTheBytesOnceOrFromThereOn) {
   const support::TemporaryFolder root;
   runCalls(root, {3, "EIO", true});
   EXPECT_EQ(root.read("file"), "");
-}
-
-TEST(FaultShim, SeesTheCallsOfTheDatabaseLibrary) {
-  if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
-  const support::TemporaryFolder counted;
-  const std::size_t calls = faults::count({FAULT_SUBJECT, "database", counted.path().string()}, {});
-  // Making the two files, log frames, pages, two synchronisations at least, two removals.
-  EXPECT_GE(calls, 10u);
-  for (std::size_t at = 1; at <= calls; ++at) {
-    const support::TemporaryFolder killed;
-    EXPECT_EQ(
-        faults::run({FAULT_SUBJECT, "database", killed.path().string()}, {}, {at, "kill-before"})
-            .signal,
-        SIGKILL)
-        << at;
-  }
 }
 
 }  // namespace
