@@ -280,19 +280,5 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
   }
 }
 
-TEST(Pelloran, WritesAndReadsWhatMorvendReports) {
-  Device device;
-  device.fill();
-  EXPECT_EQ(device.run("pelloran", {"set", "exact", "41", "--day", "yesterday"}).status, 0);
-  EXPECT_EQ(device.run("pelloran", {"add", "exact", "1", "--day", "yesterday"}).status, 0);
-  EXPECT_EQ(device.run("pelloran", {"push", "samples", "1000", "--day", "yesterday"}).status, 0);
-  EXPECT_EQ(device.run("pelloran", {"set", "exact", "x"}).status, 2);
-  EXPECT_EQ(device.run("pelloran", {"import", "/nonexistent"}).status, 1);
-  device.run("morvend", {"-f"});
-  const auto log = device.dailyLogs().at(0);
-  EXPECT_EQ(*log.dictionary("PLScalars")->find("exact"), Value(42));
-  EXPECT_EQ(log.dictionary("PLDistributions")->array("samples")->at(1), Value(1000.0));
-}
-
 }  // namespace
 }  // namespace end_to_end

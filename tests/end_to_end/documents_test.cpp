@@ -271,29 +271,5 @@ TEST(Documents, TheirMessagesStartTheService) {
   }
 }
 
-// A macro that is misspelt, a list that isn't closed, a reference to no page.
-TEST(Documents, ManualPagesAreWellFormed) {
-  const support::TemporaryFolder folder;
-  const std::string mandoc =
-      "command -v mandoc && cd " + kSource.string() + " && mandoc -Tlint packaging/man/*.[1-8]";
-  const auto outcome = faults::run(
-      {"/bin/sh", "-c", "(" + mandoc + ") > " + (folder / "complaints").string()}, {"LC_ALL=C"});
-  const std::string complaints = folder.read("complaints");
-  if (complaints.empty()) GTEST_SKIP() << "mandoc is not installed: " << outcome.standardError;
-  std::istringstream lines(complaints);
-  const std::regex reference(": referenced manual not found: Xr (\\S+) (\\d)");
-  for (std::string line; std::getline(lines, line);) {
-    std::smatch page;
-    if (!line.starts_with("mandoc: packaging/")) continue;
-    // Ours are found where they are installed; others may not be.
-    const bool known =
-        std::regex_search(line, page, reference) &&
-        (std::filesystem::exists(kSource /
-                                 ("packaging/man/" + page[1].str() + "." + page[2].str())) ||
-         std::regex_match(page[1].str(), std::regex("(busctl|journalctl|systemctl|systemd.*)")));
-    EXPECT_TRUE(known) << line;
-  }
-}
-
 }  // namespace
 }  // namespace end_to_end
