@@ -1,5 +1,8 @@
 // The user data volume: its size, and how full it is.
 
+#include <algorithm>
+#include <optional>
+
 #include "NANDInfo/NANDInfo.h"
 #include "platform/Platform.h"
 
@@ -14,6 +17,11 @@ std::uint64_t usedShare(std::uint64_t total, std::uint64_t available) {
   if (available >= total) return 0;
   const std::uint64_t used = total - available;
   return used <= UINT64_MAX / 10000 ? used * 10000 / total : used / (total / 10000);
+}
+
+// What isn't known, and what is below 0, is nothing.
+std::uint64_t mebibytes(std::optional<std::int64_t> bytes) {
+  return static_cast<std::uint64_t>(std::max<std::int64_t>(bytes.value_or(0), 0)) >> 20;
 }
 
 struct Figures {
@@ -34,11 +42,11 @@ Figures ofFileSystem(platform::Platform& platform) {
 Figures ofDeviceProperties(platform::Platform& platform) {
   const auto usage = platform.deviceProperties.diskUsage();
   if (!usage) return {};
-  const std::uint64_t total = usage->totalDiskCapacity.value_or(0) >> 20;
+  const std::uint64_t total = mebibytes(usage->totalDiskCapacity);
   return {.capacityGB = GetUserCapacityInGB(static_cast<std::uint32_t>(total)),
           .userMB = total,
-          .availableMB = usage->amountDataAvailable.value_or(0) >> 20,
-          .fullness = usedShare(total, usage->totalDataAvailable.value_or(0) >> 20)};
+          .availableMB = mebibytes(usage->amountDataAvailable),
+          .fullness = usedShare(total, mebibytes(usage->totalDataAvailable))};
 }
 
 }  // namespace

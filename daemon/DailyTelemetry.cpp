@@ -20,9 +20,7 @@ namespace {
 
 constexpr std::uint64_t kReportedCategory = 0x100;
 
-std::int64_t mebibytes(std::optional<std::uint64_t> bytes) {
-  return bytes ? static_cast<std::int64_t>(*bytes) >> 20 : -1;
-}
+std::int64_t mebibytes(std::optional<std::int64_t> bytes) { return bytes ? *bytes >> 20 : -1; }
 
 void CollectDiskUsage(Platform& platform) {
   const auto usage =

@@ -26,7 +26,7 @@ class DeviceProperties {
   // The device's disk usage in bytes; none when it has no answer, and for each figure that it
   // doesn't know.
   struct DiskUsage {
-    std::optional<std::uint64_t> totalDiskCapacity, totalDataAvailable, amountDataAvailable;
+    std::optional<std::int64_t> totalDiskCapacity, totalDataAvailable, amountDataAvailable;
   };
   virtual std::optional<DiskUsage> diskUsage() = 0;
 

@@ -5,6 +5,24 @@
 
 namespace platform::host {
 
+namespace {
+
+std::optional<std::uint64_t> amount(const Dictionary& figures, const char* key) {
+  const Number* number = figures.number(key);
+  if (number == nullptr || number->int64Value() < 0) return std::nullopt;
+  return number->uint64Value();
+}
+
+}  // namespace
+
+std::optional<FileSystem::Statistics> fileSystemHolding(const DeviceRoot& root,
+                                                        std::string_view path) {
+  const FileDescriptor file = root.openForStatus(path);
+  struct statvfs status;
+  if (!file || ::fstatvfs(file.get(), &status) != 0) return std::nullopt;
+  return FileSystem::Statistics{status.f_frsize, status.f_blocks, status.f_bavail};
+}
+
 std::optional<std::uint64_t> DeviceFileSystem::fileStatus(std::string_view path) {
   const FileDescriptor file = root_.openForStatus(path);
   struct stat status;
@@ -13,10 +31,14 @@ std::optional<std::uint64_t> DeviceFileSystem::fileStatus(std::string_view path)
 }
 
 std::optional<FileSystem::Statistics> DeviceFileSystem::statfs(std::string_view path) {
-  const FileDescriptor file = root_.openForStatus(path);
-  struct statvfs status;
-  if (!file || ::fstatvfs(file.get(), &status) != 0) return std::nullopt;
-  return Statistics{status.f_frsize, status.f_blocks, status.f_bavail};
+  if (!root_.isRecorded()) return fileSystemHolding(root_, path);
+  const Dictionary* properties = properties_.dictionary();
+  const Dictionary* recorded = properties ? properties->dictionary("FileSystem") : nullptr;
+  if (recorded == nullptr) return std::nullopt;
+  const auto blockSize = amount(*recorded, "BlockSize"), blocks = amount(*recorded, "Blocks"),
+             available = amount(*recorded, "BlocksAvailable");
+  if (!blockSize || !blocks || !available) return std::nullopt;
+  return Statistics{*blockSize, *blocks, *available};
 }
 
 std::optional<std::string> DeviceFileSystem::readFile(std::string_view path, std::size_t maximum) {

@@ -30,6 +30,12 @@ std::string DeviceRoot::problem(const char* what) const {
   return error_ == 0 ? "" : std::string(what) + " " + path_ + ": " + std::strerror(error_);
 }
 
+bool DeviceRoot::isRecorded() const {
+  // A folder that is there and can't be looked at is one all the same.
+  return open("device", O_PATH | O_DIRECTORY, Links::followed) ||
+         (errno != ENOENT && errno != ENOTDIR);
+}
+
 std::string DeviceRoot::hostPath(std::string_view path) const {
   std::string hostPath = path_;
   if (!hostPath.ends_with('/')) hostPath += '/';

@@ -27,6 +27,10 @@ class DeviceRoot {
   // is a folder.
   std::string problem(const char* what = "the device root") const;
 
+  // Whether this is a recorded device: a root with a folder device/, which alone answers for all
+  // that is not a file of the device. Any other root is this machine. Looked up at each call.
+  bool isRecorded() const;
+
   // A device path as a path of the host, for who is to find the file.
   std::string hostPath(std::string_view path) const;
 

@@ -61,9 +61,9 @@ struct Host::Services {
   Clock& clock = *ownClock;
   MD5Digest digest;
   HostPropertyListCodec codec;
-  DeviceFileSystem files{root};
-  PreferenceFiles preferences{root, codec, log};
   DeviceFile propertiesFile{root, codec, log, "device/properties.plist"};
+  DeviceFileSystem files{root, propertiesFile};
+  PreferenceFiles preferences{root, codec, log};
   HostDeviceProperties deviceProperties{root, propertiesFile};
   HostLibraryLoader libraries{root, preferences};
   morvend::DeviceContext context{deviceProperties, files, libraries, log};

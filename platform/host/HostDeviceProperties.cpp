@@ -1,10 +1,11 @@
 #include "platform/host/HostDeviceProperties.h"
 
-#include <fcntl.h>
 #include <sys/utsname.h>
+#include <systemd/sd-id128.h>
+
+#include <array>
 
 #include "platform/host/DeviceFileSystem.h"
-#include "platform/host/Files.h"
 
 namespace platform::host {
 
@@ -17,14 +18,14 @@ bool isPlainName(std::string_view name) {
          name.find_first_of(std::string_view("/\0", 2)) == name.npos;
 }
 
-// Of a short file of the host; none when it is empty or can't be read.
-std::optional<std::string> firstLine(const std::string& path) {
-  constexpr std::size_t kLongest = 256;
-  const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
-  const Result<std::string> text = readRegularFile(file.get(), kLongest);
-  if (!text) return std::nullopt;
-  std::string line = text->substr(0, text->find('\n'));
-  return line.empty() ? std::nullopt : std::optional(std::move(line));
+// The same on every boot of this machine, and no other program's.
+std::optional<std::string> identifierOfOurs() {
+  constexpr sd_id128_t kApplication =
+      SD_ID128_MAKE(60, 4e, 83, 89, 41, 9e, 13, a3, 42, 9b, c1, ab, fd, 4f, b5, 62);
+  sd_id128_t id;
+  if (::sd_id128_get_machine_app_specific(kApplication, &id) < 0) return std::nullopt;
+  std::array<char, SD_ID128_STRING_MAX> text;
+  return ::sd_id128_to_string(id, text.data());
 }
 
 std::optional<std::string> machineName() {
@@ -32,12 +33,9 @@ std::optional<std::string> machineName() {
   return ::uname(&host) == 0 ? std::optional<std::string>(host.machine) : std::nullopt;
 }
 
-// A size in bytes; what is negative is 0.
-std::optional<std::uint64_t> bytes(const Dictionary& usage, const char* key) {
+std::optional<std::int64_t> bytes(const Dictionary& usage, const char* key) {
   const Number* size = usage.number(key);
-  if (size == nullptr) return std::nullopt;
-  const bool negative = size->type() != Number::Type::uint64 && size->int64Value() < 0;
-  return negative ? 0 : size->uint64Value();
+  return size != nullptr ? std::optional(size->int64Value()) : std::nullopt;
 }
 
 }  // namespace
@@ -53,14 +51,13 @@ bool HostDeviceProperties::booleanProperty(std::string_view name) {
 }
 
 std::optional<std::string> HostDeviceProperties::textProperty(std::string_view name) {
-  const Dictionary* properties = properties_.dictionary();
-  if (const Value* value = properties != nullptr ? properties->find(name) : nullptr) {
-    const auto* text = value->as<std::string>();
-    return text != nullptr ? std::optional(*text) : std::nullopt;
+  if (!root_.isRecorded()) {
+    if (name == "SystemIdentifier") return identifierOfOurs();
+    return name == "HardwareModel" ? machineName() : std::nullopt;
   }
-  if (name == "SystemIdentifier") return firstLine(machineId_);
-  if (name == "HardwareModel") return machineName();
-  return std::nullopt;
+  const Dictionary* properties = properties_.dictionary();
+  const std::string* text = properties != nullptr ? properties->text(name) : nullptr;
+  return text != nullptr ? std::optional(*text) : std::nullopt;
 }
 
 std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {
@@ -70,15 +67,17 @@ std::optional<std::uint32_t> HostDeviceProperties::multiUserIndicator() {
 }
 
 std::optional<DeviceProperties::DiskUsage> HostDeviceProperties::diskUsage() {
-  const Dictionary* properties = properties_.dictionary();
-  const Value* given = properties != nullptr ? properties->find("DiskUsage") : nullptr;
-  if (given == nullptr) {
-    const auto host = DeviceFileSystem(root_).statfs("/");
-    if (!host) return std::nullopt;
-    const std::uint64_t available = host->blocksAvailable * host->blockSize;
-    return DiskUsage{host->blocks * host->blockSize, available, available};
+  if (!root_.isRecorded()) {
+    const auto holding = fileSystemHolding(root_, "/");
+    if (!holding) return std::nullopt;
+    const auto inBytes = [&](std::uint64_t blocks) {
+      return static_cast<std::int64_t>(blocks * holding->blockSize);
+    };
+    const std::int64_t available = inBytes(holding->blocksAvailable);
+    return DiskUsage{inBytes(holding->blocks), available, available};
   }
-  const auto* usage = given->as<Dictionary>();
+  const Dictionary* properties = properties_.dictionary();
+  const Dictionary* usage = properties != nullptr ? properties->dictionary("DiskUsage") : nullptr;
   if (usage == nullptr) return std::nullopt;
   return DiskUsage{bytes(*usage, "TotalDiskCapacity"), bytes(*usage, "TotalDataAvailable"),
                    bytes(*usage, "AmountDataAvailable")};

@@ -8,22 +8,20 @@ namespace platform::host {
 
 class HostDeviceProperties : public DeviceProperties {
  public:
-  // `properties` is device/properties.plist, which other services read too; `machineId` is a path
-  // of the host.
-  HostDeviceProperties(const DeviceRoot& root, DeviceFile& properties,
-                       std::string machineId = "/etc/machine-id")
-      : root_(root), properties_(properties), machineId_(std::move(machineId)) {}
+  // `properties` is device/properties.plist, which other services read too.
+  HostDeviceProperties(const DeviceRoot& root, DeviceFile& properties)
+      : root_(root), properties_(properties) {}
 
   bool booleanProperty(std::string_view name) override;
 
-  // Without the entry, "SystemIdentifier" is the host's machine-id and "HardwareModel" the name of
-  // its machine.
+  // A recorded device has what its properties hold. This machine has a "SystemIdentifier" of this
+  // program's own, from which nobody learns the machine's, and a "HardwareModel".
   std::optional<std::string> textProperty(std::string_view name) override;
 
   std::optional<std::uint32_t> multiUserIndicator() override;
 
-  // Without the entry, the figures of the file system that holds the root; with one of another type
-  // than a dictionary, no answer. A negative size counts as 0.
+  // A recorded device's entry, which is no answer when it has another type than a dictionary; this
+  // machine's file system that holds the root.
   std::optional<DiskUsage> diskUsage() override;
 
   // /var/containers/systemgroup/<identifier>, a path of the device, where that folder exists; else
@@ -36,7 +34,6 @@ class HostDeviceProperties : public DeviceProperties {
 
   const DeviceRoot& root_;
   DeviceFile& properties_;
-  std::string machineId_;
 };
 
 }  // namespace platform::host

@@ -91,6 +91,7 @@ Kernel::ReadResult HostKernel::sysctlbyname(std::string_view name, std::span<std
     if (const auto event = nextEvent(buffer)) return *event;
   }
   if (const Value* value = deviceValue(name)) return deliverValue(*value, buffer);
+  if (root_.isRecorded()) return failure(ENOENT);
   if (name == "kern.bootsessionuuid") return bootSession(buffer);
   if (name == "vm.swapusage") return swapUsage(buffer);
   return failure(ENOENT);

@@ -1,5 +1,5 @@
-// Kernel values: device/kernel.plist and device/ecc-events/, then what the host has a true
-// equivalent of.
+// Kernel values: a recorded device's device/kernel.plist and device/ecc-events/, or what this
+// machine has a true equivalent of.
 #pragma once
 
 #include "platform/Kernel.h"
@@ -17,7 +17,7 @@ class HostKernel : public Kernel {
   // that nothing is known of fails with ENOENT.
   //
   // "kern.next_ecc_event" delivers the next file of device/ecc-events/ and removes it; one that
-  // doesn't fit fails with ENOMEM and stays.
+  // doesn't fit is said and moved to the folder rejected/ there.
   ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override;
 
   std::uint64_t pageSize() override;

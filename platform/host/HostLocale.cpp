@@ -45,7 +45,7 @@ std::vector<std::string> HostLocale::texts(std::string_view key) {
 }
 
 std::vector<std::string> HostLocale::preferredLanguages() {
-  if (file_.value() != nullptr) return texts("PreferredLanguages");
+  if (root_.isRecorded()) return texts("PreferredLanguages");
   std::string_view list = environment("LANGUAGE");
   if (list.empty()) list = environment("LANG");
   std::vector<std::string> languages;
@@ -59,11 +59,11 @@ std::vector<std::string> HostLocale::preferredLanguages() {
 }
 
 std::vector<std::string> HostLocale::systemLocalizations() {
-  return file_.value() != nullptr ? texts("Localizations") : std::vector<std::string>{"en"};
+  return root_.isRecorded() ? texts("Localizations") : std::vector<std::string>{"en"};
 }
 
 std::optional<std::string> HostLocale::countryCode() {
-  if (file_.value() != nullptr) {
+  if (root_.isRecorded()) {
     const Dictionary* locale = file_.dictionary();
     const std::string* code = locale != nullptr ? locale->text("CountryCode") : nullptr;
     return code != nullptr ? std::optional(*code) : std::nullopt;

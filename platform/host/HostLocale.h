@@ -1,4 +1,5 @@
-// The user's languages and region: device/locale.plist, else LANGUAGE and LANG of the environment.
+// The user's languages and region: a recorded device's device/locale.plist, or LANGUAGE and LANG of
+// this machine's environment.
 #pragma once
 
 #include "platform/LocaleService.h"
@@ -9,10 +10,10 @@ namespace platform::host {
 class HostLocale : public LocaleService {
  public:
   HostLocale(const DeviceRoot& root, PropertyListCodec& codec, SystemLog& log)
-      : file_(root, codec, log, "device/locale.plist") {}
+      : root_(root), file_(root, codec, log, "device/locale.plist") {}
 
-  // What a device's file doesn't hold is not known: empty, or none. Without a file the localization
-  // is "en"; "C" and "POSIX" are no languages.
+  // What a recorded device's file doesn't hold is not known: empty, or none. This machine's
+  // localization is "en"; "C" and "POSIX" are no languages.
   std::vector<std::string> preferredLanguages() override;
   std::vector<std::string> systemLocalizations() override;
   std::optional<std::string> countryCode() override;
@@ -26,6 +27,7 @@ class HostLocale : public LocaleService {
  private:
   std::vector<std::string> texts(std::string_view key);
 
+  const DeviceRoot& root_;
   DeviceFile file_;
 };
 

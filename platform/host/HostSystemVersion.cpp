@@ -40,7 +40,7 @@ std::string assigned(std::string_view lines, std::string_view name) {
   return value;
 }
 
-std::optional<Dictionary> hostVersion(const std::string& osRelease) {
+std::optional<Dictionary> machineVersion(const std::string& osRelease) {
   const FileDescriptor file(::open(osRelease.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
   const Result<std::string> lines = readRegularFile(file.get(), kMaximumOsRelease);
   if (!lines) return std::nullopt;
@@ -57,7 +57,7 @@ std::optional<Dictionary> hostVersion(const std::string& osRelease) {
 }  // namespace
 
 std::optional<Dictionary> HostSystemVersion::systemVersionDictionary() {
-  if (file_.value() == nullptr) return hostVersion(osRelease_);
+  if (!root_.isRecorded()) return machineVersion(osRelease_);
   const Dictionary* dictionary = file_.dictionary();
   return dictionary != nullptr ? std::optional(*dictionary) : std::nullopt;
 }

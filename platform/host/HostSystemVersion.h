@@ -1,4 +1,5 @@
-// The version of the operating system: device/system-version.plist, else the host's os-release.
+// The version of the operating system: a recorded device's
+// device/system-version.plist, or this machine's os-release.
 #pragma once
 
 #include "platform/DeviceProperties.h"
@@ -8,10 +9,12 @@ namespace platform::host {
 
 class HostSystemVersion : public SystemVersion {
  public:
-  // `osRelease` is a path of the host.
+  // `osRelease` is a path of this machine.
   HostSystemVersion(const DeviceRoot& root, PropertyListCodec& codec, SystemLog& log,
                     std::string osRelease = "/etc/os-release")
-      : file_(root, codec, log, "device/system-version.plist"), osRelease_(std::move(osRelease)) {}
+      : root_(root),
+        file_(root, codec, log, "device/system-version.plist"),
+        osRelease_(std::move(osRelease)) {}
 
   std::optional<Dictionary> systemVersionDictionary() override;
 
@@ -19,6 +22,7 @@ class HostSystemVersion : public SystemVersion {
   std::string operatingSystemVersion() override;
 
  private:
+  const DeviceRoot& root_;
   DeviceFile file_;
   std::string osRelease_;
 };

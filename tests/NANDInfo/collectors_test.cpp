@@ -139,7 +139,7 @@ TEST(StorageStats, DerivedFieldsAndImages) {
 }
 
 TEST(DiskInfo, FromTheFileSystemOrElseFromTheDevice) {
-  constexpr std::uint64_t kMB = 1 << 20;
+  constexpr std::int64_t kMB = 1 << 20;
   using Statistics = platform::FileSystem::Statistics;
   using Usage = platform::DeviceProperties::DiskUsage;
   const Usage usage{250000 * kMB + 5, 50000 * kMB, 40000 * kMB + kMB - 1};
@@ -157,6 +157,7 @@ TEST(DiskInfo, FromTheFileSystemOrElseFromTheDevice) {
       {std::nullopt, usage, 250000, 40000, 8000, 256},
       {std::nullopt, Usage{kMB - 1, 0, 3 * kMB}, 0, 3, 0, 0},
       {std::nullopt, Usage{5 * kMB, 6 * kMB, 0}, 5, 0, 0, 0},
+      {std::nullopt, Usage{-kMB, -kMB, -kMB}, 0, 0, 0, 0},
       {std::nullopt, std::nullopt, 0, 0, 0, 0},
   };
   for (const auto& row : rows) {

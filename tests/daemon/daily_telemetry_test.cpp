@@ -50,7 +50,7 @@ struct DailyTelemetryTest : ::testing::Test {
 
 TEST_F(DailyTelemetryTest, DiskUsageIsInWholeMebibytesOrMinusOne) {
   using Usage = platform::DeviceProperties::DiskUsage;
-  constexpr std::uint64_t k64GiB = std::uint64_t{64} << 30;
+  constexpr std::int64_t k64GiB = std::int64_t{64} << 30;
   const struct {
     std::optional<Usage> usage;
     const char *total, *free;
@@ -58,7 +58,8 @@ TEST_F(DailyTelemetryTest, DiskUsageIsInWholeMebibytesOrMinusOne) {
               {Usage{}, "-1", "-1"},
               {Usage{k64GiB, 0, 1}, "65536", "0"},
               {Usage{k64GiB - 1, {}, 1}, "65535", "-1"},
-              {Usage{{}, UINT64_MAX, {}}, "-1", "-1"}};
+              {Usage{-1, -(1 << 20) - 1, {}}, "-1", "-2"},
+              {Usage{INT64_MAX, {}, {}}, "8796093022207", "-1"}};
   for (const auto& row : rows) {
     platform.device.usage = row.usage;
     EXPECT_EQ(

@@ -17,7 +17,7 @@ using platform::Dictionary;
 namespace {
 
 constexpr std::int64_t kGiB = std::int64_t{1} << 30;
-constexpr std::int64_t kPageSize = 16384;
+constexpr std::int64_t kPageSize = 16384, kBlockSize = 4096;
 
 Dictionary properties(const Sample& sample) {
   Random random(sample.seed, "properties"), ofDay(sample.seed, "disk", sample.today);
@@ -28,7 +28,10 @@ Dictionary properties(const Sample& sample) {
           {"InverseDeviceID", random.hexadecimal(32)},
           {"DiskUsage", Dictionary{{"TotalDiskCapacity", 119 * kGiB},
                                    {"TotalDataAvailable", free + 4 * kGiB},
-                                   {"AmountDataAvailable", free}}}};
+                                   {"AmountDataAvailable", free}}},
+          {"FileSystem", Dictionary{{"BlockSize", kBlockSize},
+                                    {"Blocks", 119 * kGiB / kBlockSize},
+                                    {"BlocksAvailable", free / kBlockSize}}}};
 }
 
 std::string bootSession(const Wear& wear) {

@@ -1,8 +1,10 @@
-// The services that answer from files below device/, and from the host where those are missing.
+// The services of a recorded device, which answer from files below device/, and of this machine.
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <systemd/sd-id128.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -13,6 +15,7 @@
 
 #include "platform/FaultwatchSupport.h"
 #include "platform/host/DeviceFile.h"
+#include "platform/host/DeviceFileSystem.h"
 #include "platform/host/HostApplications.h"
 #include "platform/host/HostDeviceProperties.h"
 #include "platform/host/HostKernel.h"
@@ -111,7 +114,7 @@ TEST_F(DeviceFiles, KernelValuesComeInTheirForms) {
   EXPECT_EQ(kernel.pageSize(), 16384u);
 }
 
-TEST_F(DeviceFiles, TheHostAnswersForTheKernelWhereItCan) {
+TEST_F(DeviceFiles, ThisMachineAnswersForTheKernelWhereItCan) {
   HostKernel kernel(root, codec, log);
   std::string text(64, '#');
   EXPECT_EQ(
@@ -185,25 +188,68 @@ TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
   }
 }
 
-TEST_F(DeviceFiles, TextPropertiesAreTheDevicesElseTheHosts) {
-  folder.write("machine-id", "0123abcd\nmore\n");
-  folder.write("empty", "\n");
-  const auto of = [&](const Dictionary& device, const char* machineId, const char* name) {
-    writePlist("device/properties.plist", device);
+// Whatever a service has no file for, or a broken one, the device hasn't got.
+TEST_F(DeviceFiles, ARecordedDeviceAnswersAlone) {
+  ::setenv("LANGUAGE", "fr", 1);
+  ::setenv("LANG", "de_AT.UTF-8", 1);
+  const auto known = [this] {
     DeviceFile file(root, codec, log, "device/properties.plist");
-    return HostDeviceProperties(root, file, (folder / machineId).string()).textProperty(name);
+    HostDeviceProperties properties(root, file);
+    HostSystemVersion version(root, codec, log);
+    HostLocale locale(root, codec, log);
+    HostKernel kernel(root, codec, log);
+    std::array<std::byte, 64> buffer;
+    std::string names;
+    const auto note = [&names](const char* name, bool isKnown) {
+      if (isKnown) names += std::string(name) + " ";
+    };
+    for (const char* name : {"SystemIdentifier", "HardwareModel", "InverseDeviceID"}) {
+      note(name, properties.textProperty(name).has_value());
+    }
+    note("usage", properties.diskUsage().has_value());
+    note("statfs", DeviceFileSystem(root, file).statfs("/").has_value());
+    note("version", version.systemVersionDictionary().has_value());
+    note("version text", !version.operatingSystemVersion().empty());
+    note("languages", !locale.preferredLanguages().empty());
+    note("localizations", !locale.systemLocalizations().empty());
+    note("country", locale.countryCode().has_value());
+    for (const char* name : {"kern.bootsessionuuid", "vm.swapusage"}) {
+      note(name, kernel.sysctlbyname(name, buffer).error == 0);
+    }
+    return names;
   };
-  constexpr char kId[] = "SystemIdentifier", kModel[] = "HardwareModel", kKey[] = "InverseDeviceID";
-  const Dictionary device{{kId, "id"}, {kModel, "m1"}, {kKey, "k"}};
-  for (const auto& [name, value] : device) {
-    EXPECT_EQ(of(device, "machine-id", name.c_str()), *value.as<std::string>());
-    EXPECT_EQ(of({{name, 1}}, "machine-id", name.c_str()), std::nullopt);
+  const std::string machine = known();
+  for (const char* name : {"HardwareModel", "usage", "statfs", "languages", "localizations",
+                           "country", "kern.bootsessionuuid", "vm.swapusage"}) {
+    EXPECT_NE(machine.find(name), machine.npos) << name << " of " << machine;
   }
-  EXPECT_EQ(of({}, "machine-id", kId), "0123abcd");
-  EXPECT_EQ(of({}, "empty", kId), std::nullopt);
-  EXPECT_EQ(of({}, "missing", kId), std::nullopt);
-  EXPECT_NE(of({}, "machine-id", kModel).value_or(""), "");
-  EXPECT_EQ(of({}, "machine-id", kKey), std::nullopt);
+  folder.write("device", "no folder");
+  EXPECT_EQ(known(), machine);
+  std::filesystem::remove(folder / "device");
+  std::filesystem::create_directories(folder / "device");
+  EXPECT_EQ(known(), "");
+  for (const char* file : {"properties", "system-version", "locale", "kernel"}) {
+    folder.write("device/" + std::string(file) + ".plist", "broken");
+  }
+  EXPECT_EQ(known(), "");
+  const Dictionary numbers{{"SystemIdentifier", 1}, {"HardwareModel", 1}, {"InverseDeviceID", 1}};
+  writePlist("device/properties.plist", numbers);
+  EXPECT_EQ(known(), "");
+  writePlist(
+      "device/properties.plist",
+      Dictionary{{"SystemIdentifier", "a"}, {"HardwareModel", "b"}, {"InverseDeviceID", "c"}});
+  EXPECT_EQ(known(), "SystemIdentifier HardwareModel InverseDeviceID ");
+}
+
+TEST_F(DeviceFiles, NobodyLearnsTheMachinesOwnIdentifier) {
+  DeviceFile file(root, codec, log, "device/properties.plist");
+  const auto identifier = HostDeviceProperties(root, file).textProperty("SystemIdentifier");
+  sd_id128_t machine;
+  ASSERT_EQ(identifier.has_value(), ::sd_id128_get_machine(&machine) == 0);
+  if (!identifier) GTEST_SKIP() << "this machine has no identifier";
+  EXPECT_TRUE(std::regex_match(*identifier, std::regex("[0-9a-f]{32}"))) << *identifier;
+  EXPECT_FALSE(::sd_id128_string_equal(identifier->c_str(), machine));
+  EXPECT_EQ(HostDeviceProperties(root, file).textProperty("SystemIdentifier"), identifier);
 }
 
 TEST_F(DeviceFiles, TheZoneIsTheHosts) {
@@ -232,7 +278,7 @@ TEST_F(DeviceFiles, IncidentIdentifiersAreRandomUUIDs) {
   EXPECT_EQ(seen.size(), 100u);
 }
 
-TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesElseTheHosts) {
+TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesOrThisMachines) {
   const struct {
     const char *release, *text;
   } rows[] = {

@@ -22,7 +22,10 @@ TEST(DeviceRoot, NoPathLeadsOutside) {
   std::filesystem::create_symlink("/inside", outer / "root/within");
   std::filesystem::create_symlink("..", outer / "root/up");
   const DeviceRoot root((outer / "root").string());
-  DeviceFileSystem files(root);
+  HostPropertyListCodec codec;
+  fakes::RecordingLog log;
+  DeviceFile properties(root, codec, log, "device/properties.plist");
+  DeviceFileSystem files(root, properties);
   for (const char* path :
        {"/absolute", "/relative", "../secret", "/x/../../secret", "/up/secret"}) {
     EXPECT_FALSE(files.readFile(path, 100)) << path;

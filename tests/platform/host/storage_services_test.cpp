@@ -49,64 +49,80 @@ TEST_F(StorageServices, PurgeableSpaceIsPresentWithItsFileAndAnswersWithADiction
   }
 }
 
-TEST_F(StorageServices, DiskUsageIsTheDevicesElseTheRootsFileSystem) {
-  using Usage = std::array<std::optional<std::uint64_t>, 3>;
-  struct statvfs host;
-  ASSERT_EQ(::statvfs(folder.path().c_str(), &host), 0);
-  const std::uint64_t total = host.f_blocks * host.f_frsize;
+// A byte count is a signed number; a figure that is too large is the largest.
+TEST_F(StorageServices, DiskFiguresOfARecordedDeviceAreThoseOfItsProperties) {
+  using Figures = std::array<std::optional<std::int64_t>, 3>;
+  const auto entry = [](const char* name, Array figures) {
+    const bool usage = std::string_view(name) == "DiskUsage";
+    const char* const keys[] = {usage ? "TotalDiskCapacity" : "BlockSize",
+                                usage ? "TotalDataAvailable" : "Blocks",
+                                usage ? "AmountDataAvailable" : "BlocksAvailable"};
+    Dictionary figuresOf;
+    for (std::size_t i = 0; i < figures.size(); ++i) figuresOf.set(keys[i], std::move(figures[i]));
+    return Dictionary{{name, std::move(figuresOf)}};
+  };
   const struct {
     Dictionary properties;
-    std::optional<Usage> usage;
+    std::optional<Figures> usage, fileSystem;
   } rows[] = {
-      {{{"DiskUsage", Dictionary{{"TotalDiskCapacity", std::int64_t{1} << 40},
-                                 {"TotalDataAvailable", 7.9},
-                                 {"AmountDataAvailable", UINT64_MAX}}}},
-       Usage{std::uint64_t{1} << 40, 7, UINT64_MAX}},
-      {{{"DiskUsage",
-         Dictionary{{"TotalDiskCapacity", std::int64_t{-1}}, {"TotalDataAvailable", -2.5}}}},
-       Usage{0, 0, std::nullopt}},
-      {{{"DiskUsage", Dictionary{{"TotalDiskCapacity", "text"}}}}, Usage{}},
-      {{{"DiskUsage", "plenty"}}, std::nullopt},
+      {entry("DiskUsage", {std::int64_t{1} << 40, 7.9, 1e300}),
+       Figures{std::int64_t{1} << 40, 7, INT64_MAX},
+       {}},
+      {entry("DiskUsage", {std::int64_t{-1}, -2.5}), Figures{-1, -2, std::nullopt}, {}},
+      {entry("DiskUsage", {"text"}), Figures{}, {}},
+      {{{"DiskUsage", "plenty"}, {"FileSystem", "ample"}}, {}, {}},
+      {entry("FileSystem", {4096, 0, 3}), {}, Figures{4096, 0, 3}},
+      {entry("FileSystem", {4096, 10}), {}, {}},
+      {entry("FileSystem", {4096, -10, 3}), {}, {}},
+      {{}, {}, {}},
   };
   for (const auto& row : rows) {
     folder.write("device/properties.plist", xml(row.properties));
     DeviceFile file(root, codec, log, "device/properties.plist");
     const auto usage = HostDeviceProperties(root, file).diskUsage();
-    ASSERT_EQ(usage.has_value(), row.usage.has_value());
+    const auto statistics = DeviceFileSystem(root, file).statfs("/private/var");
+    ASSERT_EQ(usage.has_value(), row.usage.has_value()) << xml(row.properties);
+    ASSERT_EQ(statistics.has_value(), row.fileSystem.has_value()) << xml(row.properties);
     if (usage) {
-      EXPECT_EQ(
-          (Usage{usage->totalDiskCapacity, usage->totalDataAvailable, usage->amountDataAvailable}),
-          *row.usage);
+      EXPECT_EQ((Figures{usage->totalDiskCapacity, usage->totalDataAvailable,
+                         usage->amountDataAvailable}),
+                *row.usage);
     }
-  }
-  for (const char* properties : {"<plist><dict/></plist>", "<plist><array/></plist>", "broken"}) {
-    folder.write("device/properties.plist", properties);
-    DeviceFile file(root, codec, log, "device/properties.plist");
-    const auto usage = HostDeviceProperties(root, file).diskUsage();
-    ASSERT_TRUE(usage) << properties;
-    EXPECT_EQ(usage->totalDiskCapacity, total);
-    EXPECT_EQ(usage->totalDataAvailable, usage->amountDataAvailable);
-    EXPECT_LE(usage->totalDataAvailable, total);
+    if (statistics) {
+      const auto signedFigure = [](std::uint64_t figure) {
+        return static_cast<std::int64_t>(figure);
+      };
+      EXPECT_EQ((Figures{signedFigure(statistics->blockSize), signedFigure(statistics->blocks),
+                         signedFigure(statistics->blocksAvailable)}),
+                *row.fileSystem);
+    }
   }
 }
 
-TEST_F(StorageServices, TheFileSystemIsThatOfAPathBelowTheRoot) {
+TEST_F(StorageServices, OnThisMachineTheFileSystemIsThatOfAPathBelowTheRoot) {
   std::filesystem::create_directories(folder / "private/var");
   std::filesystem::create_symlink("/private", folder / "inside");
   std::filesystem::create_symlink("../../../../proc", folder / "outside");
-  DeviceFileSystem files(root);
+  DeviceFile properties(root, codec, log, "device/properties.plist");
+  DeviceFileSystem files(root, properties);
   struct statvfs host;
   ASSERT_EQ(::statvfs(folder.path().c_str(), &host), 0);
+  const std::uint64_t total = host.f_blocks * host.f_frsize;
   for (const char* path : {"/", "/private/var", "/inside/var", "/.."}) {
     const auto found = files.statfs(path);
     ASSERT_TRUE(found) << path;
-    EXPECT_EQ(found->blocks * found->blockSize, host.f_blocks * host.f_frsize) << path;
+    EXPECT_EQ(found->blocks * found->blockSize, total) << path;
     EXPECT_LE(found->blocksAvailable, found->blocks) << path;
   }
   for (const char* path : {"/private/missing", "/proc", "/outside"}) {
     EXPECT_FALSE(files.statfs(path)) << path;
   }
-  EXPECT_FALSE(DeviceFileSystem(DeviceRoot("/nonexistent")).statfs("/"));
+  const auto usage = HostDeviceProperties(root, properties).diskUsage();
+  ASSERT_TRUE(usage);
+  EXPECT_EQ(usage->totalDiskCapacity, static_cast<std::int64_t>(total));
+  EXPECT_EQ(usage->totalDataAvailable, usage->amountDataAvailable);
+  EXPECT_LE(usage->totalDataAvailable, usage->totalDiskCapacity);
+  EXPECT_FALSE(DeviceFileSystem(DeviceRoot("/nonexistent"), properties).statfs("/"));
 }
 
 TEST(StandardStreams, ErrorsAreLinesAndOutputIsAsItIs) {
