@@ -82,10 +82,9 @@ void printSteps(const ReportDevice& device) {
     };
     {
       platform::host::Host host({.root = device.path(), .lowestLevel = platform::LogLevel::error});
-      morvend::DeviceContext context(host.platform());
       lap(kNumber);
       for (std::size_t step = 0; step < kNumber; ++step) {
-        kSteps[step].run({host.platform(), context, device.yesterday()});
+        kSteps[step].run({host.platform(), host.context(), device.yesterday()});
         lap(step);
       }
     }
