@@ -19,11 +19,11 @@ using support::Bytes, support::Fields, support::fieldsOf, support::header, suppo
 using GenericParser = std::uint32_t(GenericParserCxt*, std::span<const std::byte>);
 
 // Runs a parser over the bytes as they lie in memory of exactly their size.
-void expectParse(GenericParser parse, const Bytes& bytes, const Fields& fields, std::uint32_t total,
+void expectParse(GenericParser parse, const Bytes& bytes, const Fields& fields,
                  const std::string& message) {
   support::freshErrors();
   GenericParserCxt context;
-  EXPECT_EQ(parse(&context, Bytes(bytes)), total);
+  EXPECT_EQ(parse(&context, Bytes(bytes)), fields.size());
   EXPECT_EQ(fieldsOf(context), fields);
   EXPECT_EQ(GetAPIErrorMessage(), message);
 }
@@ -59,39 +59,28 @@ Fields counted(const std::string& name, std::uint32_t count, std::uint64_t first
 TEST(FTLParser, ReadsRecordsUpToTheEnd) {
   const struct {
     std::vector<std::uint64_t> buffer;
-    Fields named;
-    std::uint32_t total;
-    Fields byKey;
-    std::uint32_t byKeyTotal;
+    Fields named, byKey;
     const char* message = "NA";
   } rows[] = {
-      {{}, {}, 0, {}, 0},
+      {{}, {}, {}},
       {{header(4, 1), 100, header(0xFFFF, 1), 5, header(7, 1), 6},
        {{"hostWrites", 100}},
-       1,
-       {{"Stat_4", 100}},
-       1},
+       {{"Stat_4", 100}}},
       // A header without values is passed over, whatever its key.
       {{header(0xFFFF, 0), header(0x30000001, 0), header(4, 0), header(0, 1), 9},
        {{"Stat_0", 9}},
-       1,
-       {{"Stat_0", 9}},
-       1},
+       {{"Stat_0", 9}}},
       {{header(2000, 3), 1, 2, 3, header(0x30000000, 1), 4, header(0x30000001, 1), 5},
        {{"Stat_2000_0", 1}, {"Stat_2000_1", 2}, {"Stat_2000_2", 3}, {"Stat_805306368", 4}},
-       4,
-       {{"Stat_2000_0", 1}, {"Stat_2000_1", 2}, {"Stat_2000_2", 3}, {"Stat_805306368", 4}},
-       4},
+       {{"Stat_2000_0", 1}, {"Stat_2000_1", 2}, {"Stat_2000_2", 3}, {"Stat_805306368", 4}}},
       // All values of a single-value key are passed over; equal keys all stay.
       {{header(7, 3), 1, 2, 3, header(7, 1), 4},
        {{"hostReads", 1}, {"hostReads", 4}},
-       2,
-       {{"Stat_7_0", 1}, {"Stat_7_1", 2}, {"Stat_7_2", 3}, {"Stat_7", 4}},
-       4},
+       {{"Stat_7_0", 1}, {"Stat_7_1", 2}, {"Stat_7_2", 3}, {"Stat_7", 4}}},
       // Counts that the buffer can't hold.
-      {{header(7, 1), 1, header(4, 2), 2}, {{"hostReads", 1}}, 1, {{"Stat_7", 1}}, 1},
-      {{header(4, 0xFFFFFFFF), 2}, {}, 0, {}, 0},
-      {{header(2000, 0x20000001), 2}, {}, 0, {}, 0},
+      {{header(7, 1), 1, header(4, 2), 2}, {{"hostReads", 1}}, {{"Stat_7", 1}}},
+      {{header(4, 0xFFFFFFFF), 2}, {}, {}},
+      {{header(2000, 0x20000001), 2}, {}, {}},
       // An array of another length than configured.
       {{header(93, 2), 1, 2, header(124, 3), 3, 4, 5, header(93, 1), 6},
        {{"numBandsRefreshedForAgePerTier_0", 1},
@@ -99,24 +88,21 @@ TEST(FTLParser, ReadsRecordsUpToTheEnd) {
         {"coldestCycle_0", 3},
         {"coldestCycle_1", 4},
         {"numBandsRefreshedForAgePerTier_", 6}},
-       5,
        {{"Stat_93_0", 1},
         {"Stat_93_1", 2},
         {"Stat_124_0", 3},
         {"Stat_124_1", 4},
         {"Stat_124_2", 5},
         {"Stat_93", 6}},
-       6,
        "ZMCFTLParseBufferToCxt: numBandsRefreshedForAgePerTier(93): (#3) cfg elements != (2) "
-       "buffer "
-       "elements"},
+       "buffer elements"},
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(&row - rows);
     Bytes bytes = words(row.buffer);
     for (int trailing = 0; trailing < 8; ++trailing) {
-      expectParse(ZMCFTLParseBufferToCxt, bytes, row.named, row.total, row.message);
-      expectParse(ZMCFTLParseStatKeyBufferToCxt, bytes, row.byKey, row.byKeyTotal, "NA");
+      expectParse(ZMCFTLParseBufferToCxt, bytes, row.named, row.message);
+      expectParse(ZMCFTLParseStatKeyBufferToCxt, bytes, row.byKey, "NA");
       bytes.push_back(std::byte{1});
     }
   }
@@ -129,13 +115,13 @@ TEST(FTLParser, NamesEveryKeyOfTheTable) {
     const Bytes bytes = words(record(key, elements, 5)),
                 more = words(record(key, elements + 1u, 5));
     if (elements == 1) {
-      expectParse(ZMCFTLParseBufferToCxt, bytes, {{name, 5}}, 1, "NA");
+      expectParse(ZMCFTLParseBufferToCxt, bytes, {{name, 5}}, "NA");
       expectRefusal(ZMCFTLParseBufferToCxt, bytes, 1, prefix + " cannot add 1 element to context");
     } else {
       const Fields fields = counted(name + std::string("_"), elements, 5);
       const std::string number = std::to_string(elements);
-      expectParse(ZMCFTLParseBufferToCxt, bytes, fields, elements, "NA");
-      expectParse(ZMCFTLParseBufferToCxt, more, fields, elements,
+      expectParse(ZMCFTLParseBufferToCxt, bytes, fields, "NA");
+      expectParse(ZMCFTLParseBufferToCxt, more, fields,
                   prefix + ": (#" + number + ") cfg elements != (" + std::to_string(elements + 1) +
                       ") buffer elements");
       expectRefusal(ZMCFTLParseBufferToCxt, bytes, 0,
@@ -194,12 +180,11 @@ TEST(MSPParser, ReadsRecordsUpToTheEnd) {
     SCOPED_TRACE(&row - rows);
     Bytes bytes = records(row.buffer);
     for (int trailing = 0; trailing < 4; ++trailing) {
-      const auto total = static_cast<std::uint32_t>(row.fields.size());
-      expectParse(ZMCMSPParseBufferToCxt, bytes, row.fields, total, row.message);
+      expectParse(ZMCMSPParseBufferToCxt, bytes, row.fields, row.message);
       bytes.push_back(std::byte{1});
     }
   }
-  expectParse(ZMCMSPParseBufferToCxt, {}, {}, 0,
+  expectParse(ZMCMSPParseBufferToCxt, {}, {},
               "ZMCMSPParseBufferToCxt: Passed in invalid buffer or empty buffer");
 }
 
@@ -212,12 +197,12 @@ TEST(MSPParser, NamesEveryTagOfTheTable) {
     const auto prefix = "ZMCMSPParseBufferToCxt: " + (name + ("(" + std::to_string(tag))) + "): ";
     const std::string number = std::to_string(elements);
     const Fields fields = elements == 1 ? Fields{{name, 5}} : counted(name, elements, 5);
-    expectParse(ZMCMSPParseBufferToCxt, bytes, fields, elements, "NA");
+    expectParse(ZMCMSPParseBufferToCxt, bytes, fields, "NA");
     expectRefusal(ZMCMSPParseBufferToCxt, bytes, 0,
                   prefix + "Error adding " + number + " elements to context");
     values.push_back(1);
     const std::size_t length = values.size() * width;
-    expectParse(ZMCMSPParseBufferToCxt, records({{tag, width, values}}), fields, elements,
+    expectParse(ZMCMSPParseBufferToCxt, records({{tag, width, values}}), fields,
                 prefix + "cfg " + number + " elements; (" + number + "*" + std::to_string(width) +
                     ") cfg bytes != (" + std::to_string(length) + ") buffer bytes");
   }
