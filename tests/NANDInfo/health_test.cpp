@@ -23,20 +23,16 @@ const struct {
   const char* controller;
   support::FTLFields fields;
   Figures figures;
-  bool retirable;
+  bool retirable = false;
 } kRows[] = {
-    {kQRT3, {{"hostWrites", {1}}}, {0, 0, 0}, false},
+    {kQRT3, {{"hostWrites", {1}}}, {0, 0, 0}},
     {kQRT3,
      {{"fwUpdatesPercentUsed", {kNegative}}, {"slcPercentUsed", {12}}, {"percentUsed", {11}}},
-     {12, 0, 0},
-     false},
-    {kQRT3, {{"E2EDPErrorCounters", {1, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}, false},
-    {kQRT3,
-     {{"E2EDPErrorCounters", {kNegative64, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}},
-     {0, 3, 0},
-     false},
-    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 8}, false},
-    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative64}}}, {0, 0, 0}, false},
+     {12, 0, 0}},
+    {kQRT3, {{"E2EDPErrorCounters", {1, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}},
+    {kQRT3, {{"E2EDPErrorCounters", {kNegative64, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}}, {0, 3, 0}},
+    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 8}},
+    {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative64}}}, {0, 0, 0}},
     // All but these two are read as the 64-bit numbers that they are.
     {kQRT3,
      {{"percentUsed", {0x1'0000'0002}},
@@ -45,21 +41,19 @@ const struct {
       {"numGrownBad", {0x1'0000'0005}},
       {"spareAvailablePercent", {0x1'0000'0006}},
       {"numDieFailures", {0x1'0000'0007}}},
-     {2, 4294967299, 4294967295, 4294967301, 4294967302, 4294967303},
-     false},
-    {kZMCStorage, {{"ueccReads", {0x1'0000'0004}}}, {0, 0, 4}, false},
-    {kZMCStorage, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 7}, false},
-    {kZMCStorage, {{"ueccReads", {kNegative}}}, {0, 0, 0}, false},
+     {2, 4294967299, 4294967295, 4294967301, 4294967302, 4294967303}},
+    {kZMCStorage, {{"ueccReads", {0x1'0000'0004}}}, {0, 0, 4}},
+    {kZMCStorage, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 7}},
+    {kZMCStorage, {{"ueccReads", {kNegative}}}, {0, 0, 0}},
     {kQRT3,
      {{"numGrownBad", {3}},
       {"spareAvailablePercent", {100}},
       {"numDieFailures", {0}},
       {"percentUsed", {99}}},
-     {99, 0, 0, 3, 100, 0},
-     false},
+     {99, 0, 0, 3, 100, 0}},
     {kQRT3, {{"spareAvailablePercent", {99}}}, {0, 0, 0, -1, 99}, true},
     {kQRT3, {{"spareAvailablePercent", {100}}, {"percentUsed", {100}}}, {100, 0, 0, -1, 100}, true},
-    {kQRT3, {{"percentUsed", {100}}}, {100, 0, 0}, false},
+    {kQRT3, {{"percentUsed", {100}}}, {100, 0, 0}},
 };
 
 Dictionary prefixed(std::initializer_list<std::pair<const char*, std::int64_t>> entries) {

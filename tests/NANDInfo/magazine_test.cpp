@@ -113,6 +113,11 @@ TEST(Magazine, ReportsAWindowAsFarAsItsSnapshotsGo) {
   FTLFields noMeta = late;
   noMeta.push_back({"magazineFWVersion", {1, 2, 3}});
   const std::string values = "hostWrites=100 coldestCycle_0=5 coldestCycle_1=6 bandErases=10 ";
+  const std::string rest =
+      "magazineInstanceMeta=" + std::to_string(kDay << 24 | 0xABCDEF) +
+      " magazineFWVersion_0=1 magazineFWVersion_1=2 magazineFWVersion_2=3 IsQRT1Controller=1 "
+      "TLM_magazineTimeStamp=86400 averageTLCPECycles=0.8333333333333334 ";
+  const auto bare = snapshotAt(kDay / 2, late, false);
   const struct {
     std::optional<FTLFields> newer, older, statistics;
     std::uint32_t deltaFlag, mode;
@@ -129,25 +134,10 @@ TEST(Magazine, ReportsAWindowAsFarAsItsSnapshotsGo) {
       {newer, older, {}, 0, 2, "1 TLM_SM_deltaDays=1.5 " + values, "executeTunnelCommand"},
       {snapshotAt(kDay, late), older, statistics, 1, 2,
        "1 TLM_SM_deltaDays=0 " + values + "averageTLCPECycles=0.8333333333333334 "},
-      {snapshotAt(kDay / 2, late, false),
-       older,
-       {},
-       1,
-       2,
-       "0 TLM_SM_deltaDays=-0.5 " + values,
-       "Stat Magazine not supported"},
+      {bare, older, {}, 1, 2, "0 TLM_SM_deltaDays=-0.5 " + values, "Stat Magazine not supported"},
       {noMeta, older, statistics, 1, 2, "1 ",
        "CopyWhitelistedNANDFTLInfo: Unable to gather other stats magazine deltas"},
-      {{},
-       older,
-       statistics,
-       1,
-       0,
-       "1 " + values + "magazineInstanceMeta=" + std::to_string(kDay << 24 | 0xABCDEF) +
-           " magazineFWVersion_0=1 magazineFWVersion_1=2 magazineFWVersion_2=3 "
-           "IsQRT1Controller=1 TLM_magazineTimeStamp=86400 "
-           "averageTLCPECycles=0.8333333333333334 ",
-       "executeTunnelCommand"},
+      {{}, older, statistics, 1, 0, "1 " + values + rest, "executeTunnelCommand"},
       {newer, {}, statistics, 1, 2, "1 ", "executeTunnelCommand"},
       {{}, {}, statistics, 1, 2, "0 ", "executeTunnelCommand"}};
   for (const auto& row : rows) {
