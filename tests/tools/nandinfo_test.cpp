@@ -6,6 +6,7 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "support/CommandLine.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
 #include "support/FreshErrors.h"
@@ -20,6 +21,7 @@ namespace {
 using platform::Array;
 using platform::Dictionary;
 using platform::Value;
+using support::argumentsOf;
 using support::header;
 using Words = std::vector<std::string>;
 
@@ -51,52 +53,47 @@ class Nandinfo : public testing::Test {
 };
 
 TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
-  const Words commands[] = {
-      {},
-      {"helth"},
-      {"--json", "cookbook"},
-      {"info", "disk"},
-      {"info", "--round"},
-      {"ftl", "--round", "--all"},
-      {"ftl", "--stat-keys"},
-      {"health"},
-      {"health", "all"},
-      {"ean", "image-size"},
-      {"ean", "image-size", "dBI"},
-      {"ean", "image-size", "dBIC5"},
-      {"ean", "update-count", "d\nIC"},
-      {"decode"},
-      {"decode", "ftl"},
-      {"decode", "counters", "2y", "file"},
-      {"decode", "counters", "1y"},
-      {"magazine"},
-      {"magazine", "--hours", "4", "--history"},
-      {"magazine", "--history", "--no-delta"},
-      {"magazine", "--hours", "-1"},
-      {"magazine", "--hours", "0x10"},
-      {"magazine", "--hours", "4294967296"},
-      {"magazine", "--hours", "4", "--mode", "3"},
-      {"extract", "--from", "7"},
-      {"extract", "--from", "\x1b"},
-      {"capture"},
-      {"--unknown\x1b[2J", "info"},
-  };
+  const char* const commands[] = {"",
+                                  "helth",
+                                  "info disk",
+                                  "info --round",
+                                  "ftl --round --all",
+                                  "ftl --stat-keys",
+                                  "health",
+                                  "health all",
+                                  "ean image-size dBI",
+                                  "ean image-size dBIC5",
+                                  "ean update-count d\nIC",
+                                  "decode ftl",
+                                  "decode counters 2y file",
+                                  "decode counters 1y",
+                                  "magazine",
+                                  "magazine --hours 4 --history",
+                                  "magazine --history --no-delta",
+                                  "magazine --hours -1",
+                                  "magazine --hours 0x10",
+                                  "magazine --hours 4294967296",
+                                  "magazine --hours 4 --mode 3",
+                                  "extract --from 7",
+                                  "extract --from \x1b",
+                                  "--unknown\x1b[2J info"};
   for (const auto& command : commands) {
-    EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
+    EXPECT_EQ(run(argumentsOf(command)), 2) << command;
     EXPECT_TRUE(err.starts_with("nandinfo: ")) << err;
     EXPECT_TRUE(err.ends_with(" --help')\n")) << err;
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
     EXPECT_EQ(err.find('\x1b'), std::string::npos);
     EXPECT_EQ(out, "");
   }
-  const std::pair<Words, const char*> messages[] = {
-      {{"helth"}, "there is no command 'helth'; did you mean 'health'? (see 'nandinfo --help')"},
-      {{"--json", "zzz"}, "there is no command 'zzz' (see 'nandinfo --help')"},
-      {{"decode", "tfl", "x"}, "no command 'decode tfl'; did you mean 'ftl'? (see "},
-      {{"ean", "image-size"}, "(see 'nandinfo ean image-size --help')"},
+  EXPECT_EQ(run({}), 2);
+  const std::pair<const char*, const char*> messages[] = {
+      {"helth", "there is no command 'helth'; did you mean 'health'? (see 'nandinfo --help')"},
+      {"--json zzz", "there is no command 'zzz' (see 'nandinfo --help')"},
+      {"decode tfl x", "no command 'decode tfl'; did you mean 'ftl'? (see "},
+      {"ean image-size", "(see 'nandinfo ean image-size --help')"},
   };
   for (const auto& [command, message] : messages) {
-    run(command);
+    run(argumentsOf(command));
     EXPECT_NE(err.find(message), std::string::npos) << err;
   }
   for (const nandinfo::Command& command : nandinfo::commands()) {
@@ -313,20 +310,20 @@ TEST_F(Nandinfo, DecodesCounterBlocksThatHoldWhatTheLayoutReads) {
 
 // A verdict, a sum or an event that nobody has answered for.
 TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
-  const Words commands[] = {{"info"},
-                            {"daily"},
-                            {"ftl"},
-                            {"ftl", "--all"},
-                            {"msp", "--round"},
-                            {"storage"},
-                            {"health", "servita"},
-                            {"health", "lab"},
-                            {"health", "ota"},
-                            {"magazine", "--hours", "24"},
-                            {"magazine", "--history"},
-                            {"extract", "--monthly"},
-                            {"extract", "--from", "3"},
-                            {"dump"}};
+  const char* const commands[] = {"info",
+                                  "daily",
+                                  "ftl",
+                                  "ftl --all",
+                                  "msp --round",
+                                  "storage",
+                                  "health servita",
+                                  "health lab",
+                                  "health ota",
+                                  "magazine --hours 24",
+                                  "magazine --history",
+                                  "extract --monthly",
+                                  "extract --from 3",
+                                  "dump"};
   auto& registry = device.registry;
   registry.add({.className = "NvramDiagService", .properties = {{"CommonUsed", 5}}});
   const struct {
@@ -349,9 +346,9 @@ TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
                     .openStatus = state.openStatus});
     }
     registry.standing = {{state.standing, registry.announce(16)}};
-    for (const auto& command : commands) {
-      EXPECT_EQ(run(command), 1) << command[0] << state.err;
-      EXPECT_EQ(out, "") << command[0];
+    for (const char* command : commands) {
+      EXPECT_EQ(run(argumentsOf(command)), 1) << command << state.err;
+      EXPECT_EQ(out, "") << command;
       EXPECT_NE(err.find(state.err), std::string::npos) << err;
       EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
     }

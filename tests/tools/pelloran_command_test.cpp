@@ -3,10 +3,12 @@
 #include <sstream>
 
 #include "platform/host/counter_store_support.h"
+#include "support/CommandLine.h"
 #include "tools/pelloran/Pelloran.h"
 
 namespace {
 
+using support::argumentsOf;
 using Lines = std::vector<std::string>;
 
 class PelloranCommand : public testing::Test {
@@ -34,19 +36,17 @@ class PelloranCommand : public testing::Test {
 };
 
 TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
-  const Lines commands[] = {
-      {"set", "a", "5"},
-      {"add", "a", "-7"},
-      {"add", "b", "-3", "--day", "2024-02-29"},
-      {"set", "c", "9223372036854775807", "--day", "yesterday"},
-      {"add", "c", "1", "--day=19999"},
-      {"push", "d", "-1.5e3", "--day", "today"},
-      {"push", "d", "2", "--seconds", "86399"},
-      {"push", "d", "3", "--seconds", "0"},
-      {"set", "--", "-dash", "1"},
-  };
-  for (const auto& command : commands) {
-    EXPECT_EQ(run(command), 0) << err;
+  const char* const commands[] = {"set a 5",
+                                  "add a -7",
+                                  "add b -3 --day 2024-02-29",
+                                  "set c 9223372036854775807 --day yesterday",
+                                  "add c 1 --day=19999",
+                                  "push d -1.5e3 --day today",
+                                  "push d 2 --seconds 86399",
+                                  "push d 3 --seconds 0",
+                                  "set -- -dash 1"};
+  for (const char* command : commands) {
+    EXPECT_EQ(run(argumentsOf(command)), 0) << err;
     EXPECT_EQ(out + err, "");
   }
   EXPECT_EQ(here.rows(), (Lines{"19782 b -3", "19999 c 9223372036854775807", "20000 -dash 1",
@@ -54,45 +54,39 @@ TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
 }
 
 TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineWithAHintAndWritesNothing) {
-  const std::string longKey(1025, 'k');
-  const Lines commands[] = {
-      {},
-      {"take", "a", "1"},
-      {"set", "a"},
-      {"set", "a", "1", "2"},
-      {"set", "a", "5.5"},
-      {"set", "a", "5x"},
-      {"set", "a", ""},
-      {"set", "", "5"},
-      {"set", longKey, "5"},
-      {"set", "\xc0\x80", "5"},
-      {"set", "\xed\xa0\x80", "5"},
-      {"set", "cut \xe2\x82", "5"},
-      {"add", "a", "9223372036854775808"},
-      {"set", "a", "1", "--seconds", "1"},
-      {"set", "a", "1", "--day", ""},
-      {"set", "a", "1", "--day", "2147483648"},
-      {"set", "a", "1", "--day", "tomorrow"},
-      {"set", "a", "1", "--day", "-1"},
-      {"add", "a", "1", "--day=-1"},
-      {"push", "a", "1", "--day", "1969-12-31"},
-      {"push", "a", "1", "--day", "2026-02-29"},
-      {"push", "a", "1", "--day", "2026-11-22T00:00:00Z"},
-      {"show", "--day", "-1"},
-      {"push", "a", "nan"},
-      {"push", "a", "inf"},
-      {"push", "a", "1e999"},
-      {"push", "a", "1", "--seconds", "86400"},
-      {"push", "a", "1", "--seconds", "-1"},
-      {"show", "extra"},
-      {"show", "--day", "x"},
-      {"sample", "--every", "1"},
-      {"sample", "--for", "1"},
-      {"sample", "--every", "0", "--for", "1"},
-      {"sample", "--every", "1", "--for", "nan"},
-  };
-  for (const auto& command : commands) {
-    EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
+  std::vector<std::string> commands = {"",
+                                       "take a 1",
+                                       "set a",
+                                       "set a 1 2",
+                                       "set a 5.5",
+                                       "set a 5x",
+                                       "set a ",
+                                       "set  5",
+                                       "set \xc0\x80 5",
+                                       "set \xed\xa0\x80 5",
+                                       "set cut\xe2\x82 5",
+                                       "add a 9223372036854775808",
+                                       "set a 1 --seconds 1",
+                                       "show extra",
+                                       "push a nan",
+                                       "push a inf",
+                                       "push a 1e999",
+                                       "push a 1 --seconds 86400",
+                                       "push a 1 --seconds -1",
+                                       "sample --every 1",
+                                       "sample --for 1",
+                                       "sample --every 0 --for 1",
+                                       "sample --every 1 --for nan",
+                                       "add a 1 --day=-1",
+                                       "show --day -1"};
+  for (const char* day :
+       {"", "2147483648", "tomorrow", "-1", "1969-12-31", "2026-02-29", "2026-11-22T00:00:00Z"}) {
+    commands.push_back(std::string("set a 1 --day ") + day);
+  }
+  commands.push_back("set " + std::string(1025, 'k') + " 5");
+  EXPECT_EQ(run({}), 2);
+  for (const std::string& command : commands) {
+    EXPECT_EQ(run(argumentsOf(command)), 2) << command;
     EXPECT_TRUE(err.starts_with("pelloran: ")) << err;
     EXPECT_TRUE(err.ends_with(" --help')\n")) << err;
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
