@@ -1,11 +1,11 @@
 #include <gtest/gtest.h>
 
+#include "platform/host/Host.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
-#include "tools/demo/TelemetryRules.h"
 
 namespace {
 
@@ -42,34 +42,6 @@ TEST(DemoRules, TellsOwnEntriesFromPrefixesAndTheLongestOfThem) {
   EXPECT_FALSE(demo::Rules(nullptr).ofScalar("a.b"));
 }
 
-TEST(DemoRules, NameWhatLetTheTelemetryThrough) {
-  const struct {
-    const char *key, *step, *rule;
-  } kCounters[] = {
-      {"com.norba.tarvenn.DiskUsageUserBlocksFree", "disk usage", "fixed list of the step"},
-      {"com.norba.NANDInfo.NumLogicalReads", "storage health", "fixed list of the step"},
-      {"com.norba.NANDInfo.BandsPerInternalFlow3", "storage health", "key map"},
-      {"com.norba.NANDInfo.BandsPerInternalFlow4", "storage health", "fixed list of the step"},
-      {"TLM_VMFreezer_bytesWritten", "storage health", "fixed list of the step"},
-      {"datausage.wifiInKB.com.norba.mail", "data usage", "what the processes used"},
-      {"com.norba.velquist.frames", "report channels", "the simple channels"},
-  };
-  for (const auto& [key, step, rule] : kCounters) {
-    EXPECT_EQ(demo::counterRule(key), (demo::CounterRule{step, rule})) << key;
-  }
-  EXPECT_FALSE(demo::counterRule("com.norba.tarvenn.numAllInstalledApps"));
-  EXPECT_FALSE(demo::counterRule("host.loadavg.1m"));
-
-  const std::pair<const char*, const char*> kRules[] = {
-      {"ValidityList[0]", "nothing: a list as the controller has it"},
-      {"UserWamp", "fixed list of the step"},
-      {"com.norba.NANDInfo.NumGCWrites", "key map"}};
-  for (const auto& [key, rule] : kRules) EXPECT_EQ(demo::nandLogRule(key), rule);
-  EXPECT_EQ(demo::eventRule("com.norba.massStorage.NANDInfo.NORWrites"), "fixed list of the step");
-  EXPECT_EQ(demo::eventRule("com.norba.massStorage.NANDInfo.SM.Daily.FTLCounters_1"),
-            "magazine whitelist, list of 52");
-}
-
 TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
   support::TemporaryFolder root;
   const std::string spool = "var/spool/morvend/";
@@ -82,14 +54,22 @@ TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
   root.write(spool + "structured/2026-11-23.jsonl", "{\"type\": 176, \"data\": {\"PE\": 1}}\n");
   root.write(spool + "events.jsonl",
              "{\"event\": \"com.norba.a\", \"payload\": {\"b\": 1}}\n"
-             "{\"event\": \"com.norba.a\", \"payload\": {\"b\": 1, \"c\": 2}}\n");
+             "{\"event\": \"com.norba.a\", \"payload\": {\"b\": 1, \"c\": 2}}\n"
+             "{\"event\": \"com.norba.massStorage.NANDInfo.SM.Daily.FTLCounters_1\"}\n");
+  platform::host::Host host({.root = root.path()});
+  for (const char* key : {"com.norba.NANDInfo.BandsPerInternalFlow3", "datausage.wifiInKB.a",
+                          "com.norba.tarvenn.numAllInstalledApps", "host.loadavg.1m"}) {
+    host.counters().set(key, 1, host.platform().counters.PLDaysSince1970());
+  }
   demo::Device device(root.path().string());
   const std::string text = demo::showLeft(device, false);
   for (const char* line :
        {"1 entries        key map", "1 entries        nothing: a list as the controller has it",
         "2 records        nothing: raw, type 172", "log-pellorand.193.20261123T025646Z, 8 bytes",
-        "Counters that the telemetry set today: 0", "1 records        nothing: raw, type 176",
-        "~.a       2  1 to 2  fixed list of the step", "health servita"}) {
+        "Counters that the telemetry set today: 2", "data usage, by what the processes used",
+        "storage health, by key map", "magazine whitelist, list of 52",
+        "1 records        nothing: raw, type 176", " 2  1 to 2  fixed list of the step",
+        "health servita"}) {
     EXPECT_NE(text.find(line), std::string::npos) << line << "\nin\n" << text;
   }
 }

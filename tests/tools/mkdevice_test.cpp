@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <map>
-#include <set>
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
@@ -25,7 +24,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using namespace mkdevice;
-using platform::host::CounterChange;
 
 constexpr std::int32_t kToday = 20779;
 
@@ -50,32 +48,6 @@ std::map<std::string, std::string> filesOf(const fs::path& folder) {
     EXPECT_EQ(entry.status().permissions(), fs::perms::owner_read | fs::perms::owner_write) << path;
   }
   return files;
-}
-
-// Weekday rhythm may lower a day's values, but nothing may be lost or fall outside its day.
-TEST(MkdeviceCounters, ADayHoldsEveryCounterAndItsSamplesInOrder) {
-  for (const int scale : {1, 3}) {
-    const SampleCounters counters({.seed = 7, .scale = scale, .today = kToday});
-    std::set<std::string_view> scalars;
-    std::map<std::string_view, std::vector<std::int32_t>> seconds;
-    for (const CounterChange& change : counters.ofDay(kToday - 1)) {
-      EXPECT_EQ(change.day, kToday - 1);
-      if (change.kind == CounterChange::Kind::set) {
-        EXPECT_TRUE(scalars.insert(change.key).second) << change.key;
-        EXPECT_GE(change.amount, 0) << change.key;
-      } else {
-        seconds[change.key].push_back(change.seconds);
-      }
-    }
-    const auto times = static_cast<std::size_t>(scale);
-    EXPECT_EQ(scalars.size(), scalarTable().size() * times);
-    EXPECT_EQ(seconds.size(), distributionTable().size() * times);
-    for (const auto& [key, ofKey] : seconds) {
-      EXPECT_TRUE(ofKey.size() >= 40 && ofKey.size() <= 300) << key;
-      EXPECT_TRUE(std::is_sorted(ofKey.begin(), ofKey.end())) << key;
-      EXPECT_TRUE(ofKey.front() >= 0 && ofKey.back() < 86400) << key;
-    }
-  }
 }
 
 TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
@@ -201,33 +173,21 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
   EXPECT_EQ(recorded, expected);
 }
 
-// The fields that a decoder finds in a buffer.
-template <typename Parse>
-std::map<std::string, std::uint64_t> fieldsOf(const std::string& bytes, Parse parse,
-                                              std::size_t expected) {
+using Fields = std::map<std::string, std::uint64_t>;
+
+Fields statisticsOf(const Sample& sample, int hoursAgo) {
   support::freshErrors();
   NANDInfo::GenericParserCxt context;
-  EXPECT_EQ(parse(&context, std::as_bytes(std::span(bytes))), expected);
+  const std::string bytes = ftlStatistics(Wear(sample, hoursAgo));
+  std::size_t elements = 0;
+  for (const NANDInfo::FTLKey& row : NANDInfo::FTLKeyTable()) elements += row.elements;
+  EXPECT_EQ(NANDInfo::ZMCFTLParseBufferToCxt(&context, std::as_bytes(std::span(bytes))), elements);
   EXPECT_STREQ(NANDInfo::GetAPIErrorMessage(), "NA");
-  std::map<std::string, std::uint64_t> fields;
+  Fields fields;
   for (std::size_t i = 0; i < context.size(); ++i) {
     fields[std::string(context[i].name)] = context[i].value;
   }
   return fields;
-}
-
-template <typename Table>
-std::size_t elementsOf(const Table& table) {
-  std::size_t count = 0;
-  for (const auto& row : table) count += row.elements;
-  return count;
-}
-
-using Fields = std::map<std::string, std::uint64_t>;
-
-Fields statisticsOf(const Sample& sample, int hoursAgo) {
-  return fieldsOf(ftlStatistics(Wear(sample, hoursAgo)), NANDInfo::ZMCFTLParseBufferToCxt,
-                  elementsOf(NANDInfo::FTLKeyTable()));
 }
 
 // A family row that swallows a counter by mistake shows as a relation that doesn't hold.
