@@ -5,7 +5,6 @@
 #include <limits>
 
 #include "daemon/Entry.h"
-#include "platform/testing/FaultInjector.h"
 #include "support/TestPlatform.h"
 
 namespace morvend {
@@ -159,43 +158,6 @@ TEST_F(DailyRunTest, ServesInSlicesUntilOneTimesOut) {
   EXPECT_EQ(platform.journal, (Lines{"listen com.norba.pellorand.morvend", "run loop 10 1"}));
   EXPECT_EQ(platform.log.lines(), (Lines{"default: morvend started", "default: morvend ended",
                                          "default: morvend started", "default: morvend ended"}));
-}
-
-// Whatever single call fails, the rest of the sequence runs and the record is written.
-TEST_F(DailyRunTest, SurvivesTheFailureOfAnySingleCall) {
-  platform.whitelistScalars({"key", "com.norba.quenset.prnd.database.size",
-                             "com.norba.quenset.prnd.database.corruptions",
-                             "com.norba.usage.cur_boot_session_cpu_uptime",
-                             "com.norba.kernel.vmtc_total", "com.norba.kernel.swapusage"});
-  platform.kernel.integers = {{"vm.vmtc_total", 1}, {"vm.swapusage", 1}};
-  platform.device.version = Dictionary{{"ProductBuildVersion", "A"}};
-  platform.preferences.blocklist = {"110"};
-  platform.networkUsage.records.emplace();
-  platform.reportingChannels.samples = {{{1, 1, "channel"}, 2}};
-  platform.kernel.integers["kern.next_ecc_event"] = 1;  // again and again
-  const auto preferences = platform.preferences.values;
-  platform::fakes::FaultInjector faults(platform.platform);
-  const char* const arguments[] = {"morvend", "-d"};
-  int calls = 1;
-  for (int failing = 0; failing <= calls; ++failing) {
-    platform.preferences.values = preferences;
-    platform.journal.clear();
-    platform.log.clear();
-    faults.failAt(failing);
-    DeviceContext context(faults.platform());
-    RunProcess(faults.platform(), context, 2, arguments);
-    if (failing == 0) calls = faults.calls();
-    const auto& journal = platform.journal;
-    EXPECT_EQ(std::count(journal.begin(), journal.end(), "roll servita logs"), 1) << failing;
-    EXPECT_EQ(std::count(journal.begin(), journal.end(), "dump structured logs"), 1) << failing;
-    EXPECT_EQ(std::count(journal.begin(), journal.end(), "synchronize " + kDataUsage), 1);
-    EXPECT_TRUE(platform.registry.problems().empty()) << failing;
-    ASSERT_GE(journal.size(), 2u);
-    EXPECT_EQ(journal[journal.size() - 2], kWriteRecord) << failing;
-    EXPECT_EQ(journal.back(), kSynchronize) << failing;
-    EXPECT_EQ(platform.log.lines().back(), "default: morvend ended");
-  }
-  EXPECT_GT(calls, 30);
 }
 
 }  // namespace

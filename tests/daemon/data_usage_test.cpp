@@ -36,9 +36,14 @@ Dictionary bundle(double since, std::initializer_list<Value> counts) {
   return usage({{"bundleName", "b"}, {"procName", "p"}}, since, counts);
 }
 
+// The additions without the family that every key begins with.
 Lines texts(const std::vector<CounterAddition>& additions) {
+  const std::string family = "datausage.";
   Lines lines;
-  for (const auto& [key, value] : additions) lines.push_back(key + " " + std::to_string(value));
+  for (const auto& [key, value] : additions) {
+    EXPECT_TRUE(key.starts_with(family)) << key;
+    lines.push_back(key.substr(family.size()) + " " + std::to_string(value));
+  }
   return lines;
 }
 
@@ -57,63 +62,48 @@ TEST(DataUsageChanges, AreTheDifferencesToTheDayBefore) {
       {"first seen, today",
        kNone,
        bundle(kToday, {5000, 0, 1023, 1024}),
-       {"datausage.wifiInKB.b 4", "datausage.wwanOutKB.b 1"}},
-      {"the first instant of yesterday",
-       kNone,
-       bundle(kYesterday, {2048}),
-       {"datausage.wifiInKB.b 2"}},
-      {"the last one before it",
-       kNone,
-       bundle(kYesterday - 0.5, {9999, 9999}),
-       {"datausage.olddata.b 1"}},
-      {"the future", kNone, bundle(1e300, {2048}), {"datausage.wifiInKB.b 2"}},
-      {"no time at all", kNone, bundle(std::nan(""), {2048}), {"datausage.olddata.b 1"}},
+       {"wifiInKB.b 4", "wwanOutKB.b 1"}},
+      {"yesterday's first instant", kNone, bundle(kYesterday, {2048}), {"wifiInKB.b 2"}},
+      {"the last one before it", kNone, bundle(kYesterday - 0.5, {9999, 9999}), {"olddata.b 1"}},
+      {"the future", kNone, bundle(1e300, {2048}), {"wifiInKB.b 2"}},
+      {"no time at all", kNone, bundle(std::nan(""), {2048}), {"olddata.b 1"}},
       {"grown, too little or unchanged",
        base,
        bundle(since, {7048, 6023, 6024, 5000}),
-       {"datausage.wifiInKB.b 2", "datausage.wwanInKB.b 1"}},
-      {"down",
+       {"wifiInKB.b 2", "wwanInKB.b 1"}},
+      {"down, to a missing count too",
        base,
-       bundle(since, {4999, 0, 5000, -1}),
-       {"datausage.baddata.b 1", "datausage.baddata.b 1", "datausage.baddata.b 1"}},
-      {"down to a missing count",
-       base,
-       bundle(since, {5000, 5000, "text"}),
-       {"datausage.baddata.b 1", "datausage.baddata.b 1"}},
-      {"a date with a fraction, stored without",
+       bundle(since, {4999, 5000, "text"}),
+       {"baddata.b 1", "baddata.b 1", "baddata.b 1"}},
+      {"a fraction of a second more",
        base,
        bundle(since + 0.75, {7048, 5000, 5000, 5000}),
-       {"datausage.wifiInKB.b 2"}},
-      {"another period, old", base, bundle(since + 1, {9999}), {"datausage.olddata.b 1"}},
+       {"wifiInKB.b 2"}},
+      {"another period, old", base, bundle(since + 1, {9999}), {"olddata.b 1"}},
       {"another period, of yesterday",
        base,
        bundle(kYesterday + 5, {9216, 0, 0, 2048.9}),
-       {"datausage.wifiInKB.b 9", "datausage.wwanOutKB.b 2"}},
+       {"wifiInKB.b 9", "wwanOutKB.b 2"}},
       {"a short entry",
        Array{long_ago, "text"},
        bundle(since, {old, old, old}),
-       {"datausage.wifiInKB.b 1", "datausage.wifiOutKB.b 1", "datausage.wwanInKB.b 1"}},
-      {"an entry without a date", Array{1, 2}, bundle(kToday, {old}), {"datausage.wifiInKB.b 1"}},
-      {"an empty entry", Array{}, bundle(kToday, {old}), {"datausage.wifiInKB.b 1"}},
-      {"no entry", "text", bundle(since, {old}), {"datausage.olddata.b 1"}},
+       {"wifiInKB.b 1", "wifiOutKB.b 1", "wwanInKB.b 1"}},
+      {"an entry without a date", Array{1, 2}, bundle(kToday, {old}), {"wifiInKB.b 1"}},
+      {"an empty entry", Array{}, bundle(kToday, {old}), {"wifiInKB.b 1"}},
+      {"no entry", "text", bundle(since, {old}), {"olddata.b 1"}},
       {"large",
        Array{long_ago, 0, kLeast, 1, -1},
        bundle(since, {big, kMost, kLeast, kMost}),
-       {"datausage.wifiInKB.b 1073741824", "datausage.baddata.b 1",
-        "datausage.wwanInKB.b 9007199254740991", "datausage.baddata.b 1"}},
+       {"wifiInKB.b 1073741824", "baddata.b 1", "wwanInKB.b 9007199254740991", "baddata.b 1"}},
       {"beyond 63 bits",
        kNone,
        bundle(kToday, {huge, 1e300}),
-       {"datausage.wifiInKB.b -9007199254740992", "datausage.wifiOutKB.b 9007199254740991"}},
-      {"without a bundle",
-       kNone,
-       usage({{"procName", "p"}}, kToday, {old}),
-       {"datausage.wifiInKB.com.norba.p 1"}},
+       {"wifiInKB.b -9007199254740992", "wifiOutKB.b 9007199254740991"}},
       {"a bundle that is no text",
        kNone,
        usage({{"bundleName", 7}, {"procName", "b"}}, since, {}),
-       {"datausage.olddata.com.norba.b 1"}},
-      {"an empty name", kNone, usage({{"bundleName", ""}}, since, {}), {"datausage.olddata. 1"}},
+       {"olddata.com.norba.b 1"}},
+      {"an empty name", kNone, usage({{"bundleName", ""}}, since, {}), {"olddata. 1"}},
   };
   for (const auto& row : rows) {
     const auto changes = dataUsageChanges({{"b", row.baseline}}, {row.record}, Date{kYesterday});
@@ -135,8 +125,7 @@ TEST(DataUsageChanges, SkipWhatIsNoRecordAndKeepTheLatestOfAName) {
   const Array records{"text", usage({}, kToday, {4096}), undated, bundle(kToday, {4096}),
                       usage({{"procName", "b"}}, kToday, {8192, 1, 2, std::uint64_t{3}})};
   const auto changes = dataUsageChanges({{"gone", Array{Date{kToday}}}}, records, Date{kYesterday});
-  EXPECT_EQ(texts(changes.additions),
-            (Lines{"datausage.wifiInKB.b 4", "datausage.wifiInKB.com.norba.b 8"}));
+  EXPECT_EQ(texts(changes.additions), (Lines{"wifiInKB.b 4", "wifiInKB.com.norba.b 8"}));
   EXPECT_EQ(changes.baseline, (Dictionary{{"b", Array{Date{kToday}, 8192, 1, 2, 3}}}));
 }
 

@@ -161,6 +161,10 @@ TEST_F(HostileDevice, EndsTheDayWhicheverCallFails) {
       run(faults.platform());
       if (failing == 0) calls = faults.calls();
     });
+    // The rest of the sequence has run too.
+    EXPECT_TRUE(device.readPropertyList("var/preferences/mobile/com.norba.quenset.morvend.plist"));
+    EXPECT_EQ(device.names(kSubmitted).back(), "structured-2020-01-01.jsonl");
+    EXPECT_EQ(device.names("var/log/servita"), (Lines{"a.log.1", "a.log.2"}));
     if (HasFailure()) FAIL() << "call " << failing << " of " << calls;
   }
   EXPECT_GT(calls, 70);
