@@ -62,45 +62,34 @@ TEST(PropertyListBinary, ReadsEveryObject) {
   EXPECT_EQ(readObject("\x10\x01"sv)->as<Number>()->type(), Number::Type::int64);
 }
 
-TEST(PropertyListBinary, RefusesOtherObjectsWithTheirOffset) {
-  for (const std::string_view object : {
-           "\0"sv,
-           "\x0F"sv,
-           "\x80\x01"sv,
-           "\xC0"sv,
-           "\xB0"sv,
-           "\x90"sv,
-           "\xE1\0"sv,
-           "\x15"sv,
-           "\x13\0\0"sv,
-           "\x1F"sv,
-           "\x14\0\0\0\0\0\0\0\x01\0\0\0\0\0\0\0\0"sv,
-           "\x14\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF\x70\0\0\0\0\0\0\0"sv,
-           "\x21\0\0"sv,
-           "\x24"sv,
-           "\x22\0\0\0"sv,
-           "\x32\0\0\0\0"sv,
-           "\x33\0\0\0\0"sv,
-           "\x33\x7F\xF0\0\0\0\0\0\0"sv,
-           "\x33\x7F\xF8\0\0\0\0\0\0"sv,
-           "\x43\0\0"sv,
-           "\x52h"sv,
-           "\x62\0a\0"sv,
-           "\x5F"sv,
-           "\x5F\x50"sv,
-           "\x5F\x10"sv,
-           "\x5F\x14\0\0\0\0\0\0\0\0\0\0\0\0\0\0\0\x01z"sv,
-           "\x4F\x13\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF"sv,
-           "\x6F\x13\x80\0\0\0\0\0\0\0"sv,
-           "\xAF\x13\x80\0\0\0\0\0\0\0"sv,
-           "\xDF\x13\x40\0\0\0\0\0\0\0"sv,
-           "\xAF\x12\x7F\xFF\xFF\xFF"sv,
-           "\xA1\0"sv,
-           "\xD1\0\0\0"sv,
-       }) {
-    const Result<Value> result = readObject(object);
-    EXPECT_FALSE(result) << description(*result.value);
-    EXPECT_TRUE(result.error.starts_with("binary property list, offset 8: ")) << result.error;
+TEST(PropertyListBinary, RefusesOtherObjectsAndSaysWhereAndWhy) {
+  const std::pair<const char*, std::vector<std::string_view>> refused[] = {
+      {"no property-list value (marker 0x",
+       {"\0"sv, "\x0F"sv, "\x80\x01"sv, "\x90"sv, "\xB0"sv, "\xC0"sv, "\xE1\0"sv}},
+      {"an integer of more than 16 bytes", {"\x15"sv, "\x1F"sv}},
+      {"the integer is cut off", {"\x13\0\0"sv}},
+      {"the integer is out of range",
+       {"\x14\0\0\0\0\0\0\0\x01\0\0\0\0\0\0\0\0"sv,
+        "\x14\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF\x70\0\0\0\0\0\0\0"sv}},
+      {"a real of neither 4 nor 8 bytes", {"\x21\0\0"sv, "\x24"sv}},
+      {"the real is cut off", {"\x22\0\0\0"sv}},
+      {"a date not of 8 bytes", {"\x32\0\0\0\0"sv}},
+      {"the date is cut off", {"\x33\0\0\0\0"sv}},
+      {"the date is no instant", {"\x33\x7F\xF0\0\0\0\0\0\0"sv, "\x33\x7F\xF8\0\0\0\0\0\0"sv}},
+      {"the count is cut off", {"\x5F"sv}},
+      {"the count is not an integer",
+       {"\x5F\x50"sv, "\x5F\x10"sv, "\x5F\x14\0\0\0\0\0\0\0\0\0\0\0\0\0\0\0\x01z"sv}},
+      {"the count is beyond the objects",
+       {"\x43\0\0"sv, "\x52h"sv, "\x62\0a\0"sv, "\x4F\x13\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF"sv,
+        "\x6F\x13\x80\0\0\0\0\0\0\0"sv, "\xAF\x13\x80\0\0\0\0\0\0\0"sv,
+        "\xDF\x13\x40\0\0\0\0\0\0\0"sv, "\xAF\x12\x7F\xFF\xFF\xFF"sv, "\xA1\0"sv, "\xD1\0\0\0"sv}}};
+  for (const auto& [why, objects] : refused) {
+    for (const std::string_view object : objects) {
+      const Result<Value> result = readObject(object);
+      EXPECT_FALSE(result) << description(*result.value);
+      EXPECT_TRUE(result.error.starts_with(std::string("binary property list, offset 8: ") + why))
+          << result.error << " " << why;
+    }
   }
   EXPECT_FALSE(readObject("\xA1\0\x01"sv)) << "a reference to no object";
   EXPECT_FALSE(readObject(""sv)) << "an object behind the last";

@@ -19,11 +19,7 @@ Result<std::string> write(const Value& value) { return HostPropertyListCodec().w
 
 Value nested(int depth) {
   Value value = Array();
-  for (int i = 1; i < depth; ++i) {
-    Array outer;
-    outer.push_back(std::move(value));
-    value = std::move(outer);
-  }
+  for (int i = 1; i < depth; ++i) value = Array{std::move(value)};
   return value;
 }
 
@@ -86,25 +82,18 @@ TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
         "2026-01-01T-1:00:00Z"}},
       {"data",
        {"A", "AA", "AA=", "AA===", "AAA", "AB==", "AAB=", "AA==AAAA", "====", "AAAA====", "A*AA"}},
-      {"string", {"&nbsp;", "&#0;", "&#1;", "&#xFFFE;", "\xEF\xBF\xBF", "\xFF"}}};
-  std::vector<std::string> all = {"",
-                                  "<true/><true/>",
-                                  "<plist><true/></plist>",
-                                  "<true>x</true>",
-                                  "x<true/>",
-                                  "<set/>",
-                                  "<arrays/>",
-                                  "<stringstring>a</stringstring>",
-                                  "<key>a</key>",
-                                  "<array><key>a</key></array>",
-                                  "<string><b/></string>",
-                                  "<array>x</array>",
-                                  "<dict><true/></dict>",
-                                  "<dict><key>a</key></dict>",
-                                  "<dict><key>a</key>1<true/></dict>",
-                                  "<dict><key>a</key><key>b</key><true/></dict>",
-                                  "<key>\x1F</key>",
-                                  "<string>a",
+      {"string", {"&nbsp;", "&#0;", "&#1;", "&#xFFFE;", "\xEF\xBF\xBF", "\xFF", "<b/>"}},
+      {"array", {"x", "<key>a</key>"}},
+      {"dict",
+       {"<true/>", "<key>a</key>", "<key>a</key>1<true/>", "<key>a</key><key>b</key><true/>",
+        "<key>\x1F</key><true/>"}},
+      {"true", {"x"}},
+      {"key", {"a"}},
+      {"plist", {"<true/>"}},
+      {"set", {""}},
+      {"arrays", {""}},
+      {"stringstring", {"a"}}};
+  std::vector<std::string> all = {"", "<true/><true/>", "x<true/>", "<string>a",
                                   "<array><true/></dict>"};
   for (const auto& [name, bad] : contents) {
     const std::string open = format("<%s>", name), close = format("</%s>", name);

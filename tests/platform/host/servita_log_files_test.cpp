@@ -13,34 +13,24 @@ constexpr char kFolder[] = "var/log/servita/";
 
 using Files = std::map<std::string, std::string>;
 
+// The logs of "a", each with the letter of its place as its bytes; a space is a gap.
+Files logs(std::string_view letters) {
+  Files files;
+  for (std::size_t i = 0; i < letters.size(); ++i) {
+    if (letters[i] == ' ') continue;
+    files["a.log" + (i == 0 ? "" : "." + std::to_string(i))] = letters[i];
+  }
+  return files;
+}
+
 TEST(ServitaLogFiles, OldLogsMoveUpToTheFirstFreeNumber) {
+  const Files others{{"a.log.1", "1"}, {".log", "x"}, {"alog", "y"}, {"a.log.old", "z"}};
   const std::pair<Files, Files> rows[] = {
-      {{{"a.log", "0"}}, {{"a.log.1", "0"}}},
-      {{{"a.log", "0"}, {"a.log.1", "1"}, {"b.log", "b"}},
-       {{"a.log.1", "0"}, {"a.log.2", "1"}, {"b.log.1", "b"}}},
-      // The gap that a killed roll-over left.
-      {{{"a.log", "0"}, {"a.log.1", "1"}, {"a.log.3", "3"}},
-       {{"a.log.1", "0"}, {"a.log.2", "1"}, {"a.log.3", "3"}}},
-      {{{"a.log", "0"},
-        {"a.log.1", "1"},
-        {"a.log.2", "2"},
-        {"a.log.3", "3"},
-        {"a.log.4", "4"},
-        {"a.log.5", "5"},
-        {"a.log.6", "6"},
-        {"a.log.7", "7"},
-        {"a.log.8", "8"}},
-       {{"a.log.1", "0"},
-        {"a.log.2", "1"},
-        {"a.log.3", "2"},
-        {"a.log.4", "3"},
-        {"a.log.5", "4"},
-        {"a.log.6", "5"},
-        {"a.log.7", "6"},
-        {"a.log.8", "8"}}},
-      // Without a current file nothing moves; other names aren't logs.
-      {{{"a.log.1", "1"}, {".log", "x"}, {"alog", "y"}, {"a.log.old", "z"}},
-       {{"a.log.1", "1"}, {".log", "x"}, {"alog", "y"}, {"a.log.old", "z"}}}};
+      {logs("a"), logs(" a")},
+      {logs("ab d"), logs(" abd")},  // the gap that a killed roll-over left
+      {logs("abcdefghi"), logs(" abcdefgi")},
+      {{{"a.log", "a"}, {"b.log", "b"}}, {{"a.log.1", "a"}, {"b.log.1", "b"}}},
+      {others, others}};  // without a current file nothing moves; other names aren't logs
   for (const auto& [before, after] : rows) {
     support::HostServices host;
     for (const auto& [name, bytes] : before) host.folder.write(kFolder + name, bytes);

@@ -126,30 +126,14 @@ TEST_F(StorageServices, OnThisMachineTheFileSystemIsThatOfAPathBelowTheRoot) {
 }
 
 TEST(StandardStreams, ErrorsAreLinesAndOutputIsAsItIs) {
-  const struct {
-    int stream;
-    void (StandardStreams::*write)(std::string_view);
-    const char *text, *written;
-  } rows[] = {
-      {STDERR_FILENO, &StandardStreams::writeError, "no end", "no end\n"},
-      {STDERR_FILENO, &StandardStreams::writeError, "two\nlines\n", "two\nlines\n"},
-      {STDOUT_FILENO, &StandardStreams::writeOutput, "no end", "no end"},
-  };
-  for (const auto& row : rows) {
-    int ends[2];
-    ASSERT_EQ(::pipe(ends), 0);
-    const int saved = ::dup(row.stream);
-    ::dup2(ends[1], row.stream);
-    HostStandardStreams streams;
-    (static_cast<StandardStreams&>(streams).*row.write)(row.text);
-    ::dup2(saved, row.stream);
-    for (const int file : {saved, ends[1]}) ::close(file);
-    char buffer[64];
-    const ssize_t length = ::read(ends[0], buffer, sizeof buffer);
-    EXPECT_EQ(std::string(buffer, static_cast<std::size_t>(std::max<ssize_t>(length, 0))),
-              row.written);
-    ::close(ends[0]);
-  }
+  HostStandardStreams streams;
+  ::testing::internal::CaptureStderr();
+  ::testing::internal::CaptureStdout();
+  streams.writeError("no end");
+  streams.writeError("two\nlines\n");
+  streams.writeOutput("no end");
+  EXPECT_EQ(::testing::internal::GetCapturedStderr(), "no end\ntwo\nlines\n");
+  EXPECT_EQ(::testing::internal::GetCapturedStdout(), "no end");
 }
 
 }  // namespace
