@@ -8,6 +8,7 @@
 #include <sstream>
 
 #include "end_to_end/Device.h"
+#include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
 
 namespace end_to_end {
@@ -164,29 +165,188 @@ TEST(NandinfoProgram, LeavesLogsAndEvents) {
   EXPECT_EQ(valuesOf("var/spool/morvend/events.jsonl", "event").size(), 9u);
 }
 
+// Every command's output, complaints and exit status, one after the other.
+std::string allAnswers(const support::TemporaryFolder& root) {
+  std::string commands;
+  for (const char* arguments : {"info",
+                                "daily",
+                                "ftl",
+                                "ftl --round",
+                                "ftl --all",
+                                "ftl --all --stat-keys",
+                                "msp",
+                                "msp --round",
+                                "storage",
+                                "storage --round",
+                                "disk",
+                                "freezer",
+                                "health servita",
+                                "health lab",
+                                "health ota",
+                                "magazine --hours 0",
+                                "magazine --hours 5",
+                                "magazine --hours 24 --no-delta",
+                                "magazine --hours 720",
+                                "magazine --hours 8784 --mode 0",
+                                "magazine --history",
+                                "nvram",
+                                "extract",
+                                "extract --monthly --from 4",
+                                "dump",
+                                "recommends-deletion",
+                                "ean image-size dBIC",
+                                "ean image-size ifw1",
+                                "ean update-count ifw1",
+                                "ean update-count LPEM"}) {
+    commands += std::string(" '") + arguments + "'";
+  }
+  return shell(root.path(),
+               "for c in" + commands +
+                   "; do echo \"== $c\"; $p/nandinfo --compact $c 2>&1; echo \"= $?\"; done")
+      .out;
+}
+
+Dictionary announcing(std::int64_t size, Dictionary more) {
+  more.set("Announce", size);
+  return more;
+}
+
+// Devices of all kinds, most of them odd, each as the files that it has beside those of the
+// controller's root.
+std::vector<std::pair<const char*, std::vector<std::pair<const char*, Value>>>> oddDevices() {
+  const auto kernel = [](Value session) {
+    return Dictionary{{"kern.bootsessionuuid", std::move(session)}};
+  };
+  const auto controller = [](const char* className, Dictionary driver, Dictionary more = {}) {
+    more.set("Class", className);
+    more.set("Driver", std::move(driver));
+    return more;
+  };
+  const auto registry = [](Array children) {
+    return Dictionary{{"Children", std::move(children)}};
+  };
+  const platform::Data statistics =
+      support::data(support::words({support::header(4, 1), 24, support::header(14, 1), 5}));
+  const platform::Data msp = support::data(support::everyMSPCounter(7));
+  const Dictionary characteristics{
+      {"Controller Characteristics", Dictionary{{"chip-id", "QM8"},
+                                                {"manufacturer-id", "2C64A1D40500"},
+                                                {"num-bus", 1},
+                                                {"serial-number", "SECRET-serial"}}}};
+  const Dictionary phases{
+      {"13", announcing(64, {{"Data", statistics}})},
+      {"10:0", Dictionary{{"Data", statistics}, {"FailSize", std::int64_t{0xE00002C7}}}},
+      {"10:5", announcing((16 << 20) + 1, {})},
+      {"10:24", announcing(48, {{"Data", statistics}, {"FailData", 9}})},
+      {"10:8784", statistics},
+      {"221:0", msp},
+      {"221:1", announcing(20, {{"Data", msp}})},
+      {"221:4", msp},
+      {"11", announcing(0, {{"FailData", 3}})},
+      {"15", Dictionary{{"FailSize", 7}}},
+      {"17:0", announcing(6000, {{"Data", platform::Data(100, 17)}})},
+      {"17:2", announcing(100, {{"Data", platform::Data(5000, 17)}, {"FailData", 4}})}};
+  const Dictionary unwilling{{"RefuseOpen", true}};
+  return {
+      {"whole",
+       {{"device/kernel.plist", kernel("B-SECRET-session")},
+        {"device/system-version.plist", Dictionary{{"ProductVersion", "1.0"}}},
+        {"device/purgeable-space.plist", Dictionary{{"SPACEREAP_TOTAL_AVAILABLE", 5000}}},
+        {"device/properties.plist",
+         Dictionary{{"SystemIdentifier", "SECRET-system"},
+                    {"InverseDeviceID", "SECRET-device"},
+                    {"FileSystem", Dictionary{{"BlockSize", 4096},
+                                              {"Blocks", std::int64_t{1} << 26},
+                                              {"BlocksAvailable", std::int64_t{1} << 20}}}}}}},
+      {"phases",
+       {{"device/registry.plist",
+         registry({controller("NorbaQRT3NVMeController", {{"Buffers", phases}, {"FailClose", true}},
+                              {{"Properties", characteristics}}),
+                   controller("NorbaNVMeEAN", unwilling)})},
+        {"device/kernel.plist", kernel(Dictionary{{"Error", 5}})},
+        {"device/purgeable-space.plist", "no answer"},
+        {"device/analytics.plist",
+         Dictionary{{"UsedEvents", Array{"com.norba.massStorage.NANDInfo.FTLCounters_1"}}}}}},
+      {"unregistered",
+       {{"device/registry.plist",
+         registry({Dictionary{
+             {"Class", "Bus"},
+             {"Properties", characteristics},
+             {"Children",
+              Array{controller("NorbaEmbeddedNVMeController",
+                               {{"Buffers", Dictionary{{"13", statistics}}}},
+                               {{"Registered", false}}),
+                    Dictionary{{"Class", "NvramDiagService"},
+                               {"Children", Array{Dictionary{{"Properties",
+                                                              Dictionary{{"Version", 2}}}}}}}}}}})},
+        {"device/analytics.plist", Dictionary{{"Available", false}}}}},
+      {"the second one",
+       {{"device/registry.plist",
+         registry({controller("ZMCStorage", {{"Buffers", Dictionary{{"13", statistics}}},
+                                             {"RecommendsDeletion", platform::Data{1, 0, 0}}}),
+                   controller("NorbaEmbeddedNVMeController", unwilling)})}}},
+      {"silent",
+       {{"device/registry.plist",
+         registry({controller("ZMCStorage",
+                              {{"Buffers", Dictionary{{"13", Dictionary{{"FailSize", 6}}}}},
+                               {"RecommendsDeletion", 1}},
+                              {{"Properties", Dictionary{{"PropertyMatch", "SECRET-match"}}}})})}}},
+  };
+}
+
 TEST(NandinfoProgram, ACaptureAnswersAsTheDeviceDid) {
-  const Device device = deviceWithController(), copy;
-  ASSERT_EQ(nandinfo(device, "capture " + (copy.root() / "device").string()).status, 0);
-  copy.root().write("device/properties.plist", device.root().read("device/properties.plist"));
-  for (const char* arguments :
-       {"info", "ftl", "ftl --round", "ftl --all", "ftl --all --stat-keys", "msp", "msp --round",
-        "storage --round", "health servita", "health lab", "health ota", "recommends-deletion",
-        "ean image-size dBIC", "ean image-size dLTH", "ean update-count ifw1"}) {
-    const Output original = nandinfo(device, arguments), again = nandinfo(copy, arguments);
-    EXPECT_EQ(original.out, again.out) << arguments;
-    EXPECT_EQ(original.err, again.err) << arguments;
-    EXPECT_EQ(original.status, again.status);
+  for (const auto& [name, files] : oddDevices()) {
+    SCOPED_TRACE(name);
+    Device device = deviceWithController();
+    const auto snapshot = support::data(support::kernelSnapshot(4096));
+    device.root().write("device/kernel-snapshot.bin",
+                        std::string(snapshot.begin(), snapshot.end()));
+    for (const auto& [path, content] : files) device.writePropertyList(path, content);
+    const Device copy, redacted;
+    ASSERT_EQ(nandinfo(device, "capture " + (copy.root() / "device").string()).status, 0);
+    ASSERT_EQ(nandinfo(device, "capture --redact " + (redacted.root() / "device").string()).status,
+              0);
+    const std::string answers = allAnswers(device.root());
+    EXPECT_EQ(allAnswers(copy.root()), answers);
+    EXPECT_EQ(allAnswers(redacted.root()), answers);
+    for (const std::string& file : redacted.names("device")) {
+      EXPECT_EQ(redacted.root().read("device/" + file).find("SECRET"), std::string::npos) << file;
+    }
+
+    // A capture of the capture is the same, and says neither when nor where it was made.
+    ASSERT_EQ(nandinfo(copy, "capture " + (copy.root() / "second").string()).status, 0);
+    ASSERT_EQ(copy.names("second"), copy.names("device"));
+    for (const std::string& file : copy.names("second")) {
+      if (file == "manifest.json") continue;
+      EXPECT_EQ(copy.root().read("second/" + file), copy.root().read("device/" + file)) << file;
+    }
+    auto first = nlohmann::json::parse(copy.root().read("device/manifest.json"));
+    auto second = nlohmann::json::parse(copy.root().read("second/manifest.json"));
+    EXPECT_FALSE(first.contains("host"));
+    first["time"] = second["time"];
+    EXPECT_EQ(first, second);
   }
-  ASSERT_EQ(nandinfo(copy, "capture " + (copy.root() / "second").string()).status, 0);
-  ASSERT_EQ(copy.names("second").size(), 9u);
-  for (const std::string& name : copy.names("second")) {
-    if (name == "manifest.json") continue;
-    EXPECT_EQ(copy.root().read("second/" + name), copy.root().read("device/" + name)) << name;
+}
+
+TEST(NandinfoProgram, WithoutAControllerThereIsNoCapture) {
+  const struct {
+    Array children;
+    const char* error;
+  } rows[] = {
+      {{}, "nandinfo: capture: no storage controller found\n"},
+      {{Dictionary{{"Class", "ZMCStorage"}}, Dictionary{{"Class", "NorbaQRT3NVMeController"}}},
+       "nandinfo: capture: no storage controller can be opened\n"},
+      {{Dictionary{{"Class", "ZMCStorage"}, {"Registered", false}}},
+       "nandinfo: capture: no storage controller can be opened\n"},
+  };
+  for (const auto& row : rows) {
+    const Device device;
+    device.writePropertyList("device/registry.plist", Dictionary{{"Children", row.children}});
+    const Output output = nandinfo(device, "capture " + (device.root() / "made").string());
+    EXPECT_EQ(output.status, 1);
+    EXPECT_EQ(output.err, row.error);
+    EXPECT_FALSE(std::filesystem::exists(device.root() / "made"));
   }
-  auto first = nlohmann::json::parse(copy.root().read("device/manifest.json"));
-  auto second = nlohmann::json::parse(copy.root().read("second/manifest.json"));
-  first["time"] = second["time"];
-  EXPECT_EQ(first, second);
 }
 
 // A full disk at any call: the capture is whole, or nothing of it is there.

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <cstring>
 #include <nlohmann/json.hpp>
 #include <sstream>
@@ -72,7 +73,7 @@ TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
                                   "magazine --history --no-delta",
                                   "magazine --hours -1",
                                   "magazine --hours 0x10",
-                                  "magazine --hours 4294967296",
+                                  "magazine --hours 8785",
                                   "magazine --hours 4 --mode 3",
                                   "extract --from 7",
                                   "extract --from \x1b",
@@ -514,10 +515,14 @@ TEST_F(Nandinfo, CapturesWhatIsAnsweredAndListsWhatIsNot) {
   std::string leftOut;
   for (const auto& entry : manifest["leftOut"]) leftOut += entry["what"].get<std::string>() + ";";
   EXPECT_EQ(leftOut,
-            "read-statistics 0;read-statistics 4;read-statistics 8;read-statistics 12;"
-            "read-statistics 16;read-statistics 20;read-statistics 24;read-statistics 168;msp;"
-            "defects 0;telemetry 0;telemetry 1;telemetry 2;task-scheduler 0;snapshot 0;"
-            "snapshot-header 0;band-statistics 0;EAN service;");
+            "read-statistics 0 to 719;read-statistics 721 to 8784;msp;defects 0;telemetry 0 to 2;"
+            "task-scheduler 0;snapshot 0;snapshot-header 0;band-statistics 0;NorbaNVMeEAN;"
+            "NvramDiagService;");
+  // A list is asked for as a dump asks: its number is in the flags.
+  support::Bytes list(24);
+  list[0] = std::byte{17};
+  list[4] = std::byte{1 | 2 << 2};
+  EXPECT_EQ(std::ranges::count(registry.inputs, list), 1);
   EXPECT_EQ(folder.read("c/statistics-0.bin"), std::string("\1\0\0\0\0\0\0\0", 8));
   const Dictionary driver{
       {"Buffers", Dictionary{{"13:0", "statistics-0.bin"}, {"10:720", "read-statistics-720.bin"}}},
@@ -528,7 +533,9 @@ TEST_F(Nandinfo, CapturesWhatIsAnsweredAndListsWhatIsNot) {
                   {"Children",
                    Array{Dictionary{{"Class", "ZMCStorage"},
                                     {"Properties", Dictionary{{"PropertyMatch", Array{"x", 5}}}},
-                                    {"Driver", driver}}}}}));
+                                    {"Driver", driver}},
+                         Dictionary{{"Class", "NorbaNVMeEAN"},
+                                    {"Driver", Dictionary{{"RefuseOpen", true}}}}}}}));
 
   const auto mode = [this](const char* name) {
     struct stat status {};

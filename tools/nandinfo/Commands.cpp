@@ -112,7 +112,7 @@ constexpr Command kCommands[] = {
      nullptr, extract},
     {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, Needs::answer,
      nullptr, dump},
-    {nullptr, "capture", "Save all that the controller answers, as a device folder", kFolder,
+    {nullptr, "capture", "Save all that the commands read, as a device folder", kFolder,
      Needs::controller, nullptr, capture},
     {"decode", "ftl", "A buffer's FTL statistics under their names", kFile, Needs::nothing, nullptr,
      decodeFTL},

@@ -194,7 +194,7 @@ CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& nu
 
 void addWindow(CLI::App& app, Arguments& arguments) {
   CLI::App* which = app.add_option_group("Window", "What is shown")->require_option(1);
-  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, UINT32_MAX,
+  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, kMostHours,
                                  "from so many hours ago until now, as differences");
   which->add_flag("--history", arguments.history,
                   "the write amplification of the last six windows of four hours");
@@ -265,6 +265,7 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
   if (takes(kFolder)) {
     app.add_option("DIR", arguments.folder, "an empty folder, or one that is to be made")
         ->required();
+    app.add_flag("--redact", arguments.redact, "leave out what identifies the device");
   }
   if (takes(kCapture)) {
     app.add_option("DIR", arguments.folder, "what 'nandinfo capture' has made, or a folder device/")

@@ -1,0 +1,298 @@
+#include "tools/nandinfo/ControllerCapture.h"
+
+#include <sha2.h>
+
+#include <algorithm>
+#include <array>
+#include <set>
+
+#include "NANDInfo/DriverHandles.h"
+#include "NANDInfo/NANDInfo.h"
+#include "platform/Text.h"
+#include "platform/host/SimulatedDriver.h"
+
+namespace nandinfo {
+
+using NANDInfo::nand_exporter_t;
+using platform::Array;
+using platform::Dictionary;
+using platform::DriverStatus;
+using platform::Value;
+
+// The buffers of one kind: a command for each argument from 0 on.
+struct ControllerCapture::BufferKind {
+  const char* name;  // also the beginning of its files' names
+  NANDInfo::SelectorGetter nand_exporter_t::*selectors;
+  ArgumentIn argumentIn;
+  std::uint32_t arguments;
+};
+
+const ControllerCapture::BufferKind ControllerCapture::kKinds[] = {
+    {"statistics", &nand_exporter_t::getStatsSelectors, ArgumentIn::word, 1},
+    {"read-statistics", &nand_exporter_t::getReadStatsSelectors, ArgumentIn::word, kMostHours + 1},
+    {"msp", &nand_exporter_t::getMSPStatsSelectors, ArgumentIn::word, 10},
+    {"defects", &nand_exporter_t::getDefectsListSelectors, ArgumentIn::flags, 1},
+    {"telemetry", &nand_exporter_t::getTelemetryListSelectors, ArgumentIn::flags, 3},
+    {"task-scheduler", &nand_exporter_t::getTaskSchedulerSelectors, ArgumentIn::flags, 1},
+    {"snapshot", &nand_exporter_t::getSnapshotSelectors, ArgumentIn::flags, 1},
+    {"snapshot-header", &nand_exporter_t::getSnapshotHeaderSelectors, ArgumentIn::flags, 1},
+    {"band-statistics", &nand_exporter_t::getBandStatsSelectors, ArgumentIn::flags, 1},
+};
+
+namespace {
+
+std::string sha256(std::string_view bytes) {
+  std::array<char, SHA256_DIGEST_STRING_LENGTH> text{};
+  SHA256Data(reinterpret_cast<const std::uint8_t*>(bytes.data()), bytes.size(), text.data());
+  return text.data();
+}
+
+std::string statusText(DriverStatus status) {
+  return platform::format("the driver answers with status 0x%x", status);
+}
+
+}  // namespace
+
+std::string ControllerCapture::run() {
+  // The library takes the first controller that can be opened, and at some places the first one.
+  for (const auto* row = NANDInfo::nand_exporters_tunnel;
+       row->className != nullptr && exporter_ == nullptr; ++row) {
+    const NANDInfo::RegistryHandle service(
+        platform_, platform_.registry.DrvGetMatchingService(row->className));
+    if (service.get() == 0) continue;
+    if (std::string error = captureController(*row, service.get(), true); !error.empty()) {
+      return error;
+    }
+  }
+  // Where none is registered, it takes the first one of a walk.
+  for (const auto* row = NANDInfo::nand_exporters_tunnel;
+       row->className != nullptr && entries.empty(); ++row) {
+    const NANDInfo::RegistryHandle service(
+        platform_, NANDInfo::FindServiceUsingIterator(platform_, row->className));
+    if (service.get() == 0) continue;
+    if (std::string error = captureController(*row, service.get(), false); !error.empty()) {
+      return error;
+    }
+  }
+  if (entries.empty()) return "no storage controller found";
+  if (exporter_ == nullptr) return "no storage controller can be opened";
+  captureEAN();
+  captureNVRAM();
+  return {};
+}
+
+std::string ControllerCapture::captureController(const nand_exporter_t& exporter,
+                                                 platform::RegistryObject service,
+                                                 bool registered) {
+  Dictionary entry{{"Class", exporter.className}}, driver;
+  if (!registered) entry.set("Registered", false);
+  NANDInfo::DriverHandle connection(platform_, service);
+  if (connection.status() != 0 || connection.get() == 0) {
+    leaveOut(exporter.className, "it can't be opened");
+    driver.set("RefuseOpen", true);
+  } else {
+    exporter_ = &exporter;
+    className = exporter.className;
+    connection_ = connection.get();
+    for (const BufferKind& kind : kKinds) {
+      if (std::string error = captureBuffers(kind); !error.empty()) return error;
+    }
+    driver.set("Buffers", std::move(answers_));
+    captureRecommendation(driver);
+    captureCharacteristics(service, entry);
+    if (connection.close() != 0) driver.set("FailClose", true);
+  }
+  entry.set("Driver", std::move(driver));
+  entries.push_back(std::move(entry));
+  return {};
+}
+
+std::string ControllerCapture::captureBuffers(const BufferKind& kind) {
+  const NANDInfo::SelectorGetter getter = exporter_->*kind.selectors;
+  const NANDInfo::SelectorPair* selectors = getter != nullptr ? getter() : nullptr;
+  if (selectors == nullptr) {
+    leaveOut(kind.name, "the driver has no such command");
+    return {};
+  }
+  for (std::uint32_t argument = 0; argument < kind.arguments; ++argument) {
+    invocation_.progress(platform::format("%s %u", kind.name, argument));
+    if (std::string error = captureBuffer(kind, *selectors, argument); !error.empty()) return error;
+  }
+  return {};
+}
+
+std::string ControllerCapture::captureBuffer(const BufferKind& kind,
+                                             const NANDInfo::SelectorPair& selectors,
+                                             std::uint32_t argument) {
+  const std::string key = platform::format("%u:%u", selectors.dataOpType, argument);
+  std::array<std::byte, 4> announced{};
+  const auto asked = tunnel(exporter_->sizeSelector, selectors.sizeOpType, true, kind.argumentIn,
+                            argument, announced);
+  if (asked.status != 0) {
+    leaveOut(kind, argument, statusText(asked.status));
+    // What nothing is known of fails like that.
+    if (asked.status != platform::host::kNotSupported) {
+      answers_.set(key, Dictionary{{"FailSize", std::uint64_t{asked.status}}});
+    }
+    return {};
+  }
+  std::uint64_t size = 0;
+  for (std::size_t i = announced.size(); i > 0; --i) {
+    size = size << 8 | std::to_integer<std::uint64_t>(announced[i - 1]);
+  }
+  Dictionary answer{{"Announce", size}};
+  if (size > NANDInfo::kLargestBuffer) {
+    leaveOut(kind, argument, "the driver announces more than a buffer may have");
+    answers_.set(key, std::move(answer));
+    return {};
+  }
+  NANDInfo::Buffer buffer(size);
+  const auto fetched = tunnel(exporter_->dataSelector, selectors.dataOpType, false, kind.argumentIn,
+                              argument, buffer);
+  if (fetched.status != 0) {
+    leaveOut(kind, argument, statusText(fetched.status));
+    answer.set("FailData", std::uint64_t{fetched.status});
+    answers_.set(key, std::move(answer));
+    return {};
+  }
+  const std::string_view bytes(reinterpret_cast<const char*>(buffer.data()),
+                               std::min(fetched.outputSize, buffer.size()));
+  const std::string digest = sha256(bytes);
+  std::string& file = files_[digest];
+  if (file.empty()) {
+    file = platform::format("%s-%u.bin", kind.name, argument);
+    if (std::string error = folder_.write(file, bytes); !error.empty()) return error;
+  }
+  buffers.push_back(Dictionary{{"name", kind.name},
+                               {"opType", std::uint64_t{selectors.dataOpType}},
+                               {"argument", std::uint64_t{argument}},
+                               {"size", std::uint64_t{bytes.size()}},
+                               {"file", file},
+                               {"sha256", digest}});
+  answer.set("File", file);
+  answers_.set(key, bytes.size() == size ? Value(file) : Value(std::move(answer)));
+  return {};
+}
+
+platform::DriverConnections::CallResult ControllerCapture::tunnel(std::uint32_t method,
+                                                                  std::uint32_t opType,
+                                                                  bool sizeQuery, ArgumentIn place,
+                                                                  std::uint32_t argument,
+                                                                  std::span<std::byte> output) {
+  constexpr int kFlagsShift = 2;
+  const bool inFlags = place == ArgumentIn::flags;
+  const std::uint32_t words[] = {opType,
+                                 (sizeQuery ? 1U : 0U) | (inFlags ? argument << kFlagsShift : 0),
+                                 inFlags ? 0 : argument};
+  std::array<std::byte, 24> block{};
+  for (std::size_t i = 0; i < sizeof words; ++i) {
+    block[i] = static_cast<std::byte>(words[i / 4] >> (i % 4 * 8) & 0xFF);
+  }
+  return platform_.drivers.DrvCallStructMethod(connection_, method, block, output);
+}
+
+void ControllerCapture::captureRecommendation(Dictionary& driver) {
+  if (exporter_->recommendDeletionSelector == NANDInfo::kNoSelector) return;
+  std::array<std::byte, 4> output{};
+  const auto answer = platform_.drivers.DrvCallStructMethod(
+      connection_, exporter_->recommendDeletionSelector, {}, output);
+  if (answer.status != 0) return leaveOut("deletion recommendation", statusText(answer.status));
+  platform::Data bytes;
+  for (std::size_t i = 0; i < std::min(output.size(), answer.outputSize); ++i) {
+    bytes.push_back(std::to_integer<std::uint8_t>(output[i]));
+  }
+  driver.set("RecommendsDeletion", std::move(bytes));
+}
+
+void ControllerCapture::captureCharacteristics(platform::RegistryObject service,
+                                               Dictionary& entry) {
+  // Those that a command reads. What else an entry tells of itself may identify it.
+  constexpr std::string_view kRead[] = {"chip-id", "manufacturer-id", "num-bus",
+                                        "nand-device-desc"};
+  auto found = platform_.registry.searchProperty(service, exporter_->propertyKey,
+                                                 platform::DeviceRegistry::Direction::parents);
+  if (!found) return leaveOut(exporter_->propertyKey, "the registry has no such property");
+  if (invocation_.arguments.redact) {
+    Dictionary kept;
+    const auto* all = found->as<Dictionary>();
+    for (const std::string_view key : kRead) {
+      if (const Value* value = all != nullptr ? all->find(key) : nullptr) kept.set(key, *value);
+    }
+    // One that isn't a dictionary stays none.
+    found = all != nullptr ? Value(std::move(kept)) : Value("");
+  }
+  entry.set("Properties", Dictionary{{exporter_->propertyKey, *std::move(found)}});
+}
+
+void ControllerCapture::captureEAN() {
+  constexpr std::uint32_t kMethods[] = {3, 7};  // an image's size, and the number of its updates
+  const NANDInfo::RegistryHandle service(
+      platform_, platform_.registry.DrvGetMatchingService(NANDInfo::kEANClassName));
+  if (service.get() == 0) return leaveOut(NANDInfo::kEANClassName, "the registry has none");
+  Dictionary driver;
+  const NANDInfo::DriverHandle connection(platform_, service.get());
+  if (connection.status() != 0) {
+    leaveOut(NANDInfo::kEANClassName, statusText(connection.status()));
+    driver.set("RefuseOpen", true);
+  } else {
+    std::set<std::uint32_t> codes;
+    for (const NANDInfo::EANQuery& query : NANDInfo::EANQueries()) codes.insert(query.code);
+    Dictionary scalars;
+    for (const std::uint32_t method : kMethods) {
+      for (const std::uint32_t code : codes) {
+        std::string key = platform::format("%u:", method);
+        for (int shift = 24; shift >= 0; shift -= 8) key += static_cast<char>(code >> shift & 0xFF);
+        const std::uint64_t input[] = {code};
+        std::uint64_t output[] = {0};
+        const auto status =
+            platform_.drivers.DrvCallMethod(connection.get(), method, input, output);
+        if (status == 0) {
+          scalars.set(key, output[0]);
+        } else {
+          leaveOut(NANDInfo::kEANClassName + (" " + key), statusText(status));
+        }
+      }
+    }
+    driver.set("Scalars", std::move(scalars));
+  }
+  entries.push_back(Dictionary{{"Class", NANDInfo::kEANClassName}, {"Driver", std::move(driver)}});
+}
+
+void ControllerCapture::captureNVRAM() {
+  constexpr char kClass[] = "NvramDiagService";
+  const NANDInfo::RegistryHandle service(platform_,
+                                         platform_.registry.DrvGetMatchingService(kClass));
+  if (service.get() == 0) return leaveOut(kClass, "the registry has none");
+  Dictionary properties;
+  for (const char* const key : {"CommonUsed", "SystemUsed", "Generation", "Version"}) {
+    if (auto value = platform_.registry.searchProperty(
+            service.get(), key, platform::DeviceRegistry::Direction::children)) {
+      properties.set(key, *std::move(value));
+    }
+  }
+  entries.push_back(Dictionary{{"Class", kClass}, {"Properties", std::move(properties)}});
+}
+
+void ControllerCapture::leaveOut(std::string what, std::string reason) {
+  kindLeftOut_ = nullptr;
+  leftOut.push_back(Dictionary{{"what", std::move(what)}, {"reason", std::move(reason)}});
+}
+
+// Arguments that follow each other and fail alike are one entry.
+void ControllerCapture::leaveOut(const BufferKind& kind, std::uint32_t argument,
+                                 std::string reason) {
+  if (kindLeftOut_ == &kind && lastLeftOut_ + 1 == argument &&
+      *leftOut.back().as<Dictionary>()->text("reason") == reason) {
+    leftOut.pop_back();
+  } else {
+    firstLeftOut_ = argument;
+  }
+  lastLeftOut_ = argument;
+  leaveOut(firstLeftOut_ == argument
+               ? platform::format("%s %u", kind.name, argument)
+               : platform::format("%s %u to %u", kind.name, firstLeftOut_, argument),
+           std::move(reason));
+  kindLeftOut_ = &kind;
+}
+
+}  // namespace nandinfo

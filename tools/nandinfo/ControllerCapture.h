@@ -1,0 +1,65 @@
+// What the storage controller and its neighbours answer to the commands, as entries of a device
+// registry that answers the same.
+#pragma once
+
+#include <map>
+#include <string>
+#include <string_view>
+
+#include "NANDInfo/Controller.h"
+#include "tools/nandinfo/CaptureFolder.h"
+#include "tools/nandinfo/Commands.h"
+
+namespace nandinfo {
+
+// Files of the captured folder are written as the answers come. The functions return the empty
+// text, or what went wrong.
+class ControllerCapture {
+ public:
+  ControllerCapture(const Invocation& invocation, CaptureFolder& folder)
+      : invocation_(invocation), platform_(invocation.platform), folder_(folder) {}
+
+  // Asks all that a command can ask. There must be a controller that can be opened.
+  std::string run();
+
+  // What came of it: the registry's entries, the class of the controller that was asked; what was
+  // captured and what was not, for the manifest.
+  platform::Array entries, buffers, leftOut;
+  std::string className;
+
+ private:
+  struct BufferKind;
+  static const BufferKind kKinds[];
+
+  // How a command's argument is given to the driver.
+  enum class ArgumentIn { word, flags };
+
+  std::string captureController(const NANDInfo::nand_exporter_t& exporter,
+                                platform::RegistryObject service, bool registered);
+  std::string captureBuffers(const BufferKind& kind);
+  std::string captureBuffer(const BufferKind& kind, const NANDInfo::SelectorPair& selectors,
+                            std::uint32_t argument);
+  void captureRecommendation(platform::Dictionary& driver);
+  void captureCharacteristics(platform::RegistryObject service, platform::Dictionary& entry);
+  void captureEAN();
+  void captureNVRAM();
+
+  platform::DriverConnections::CallResult tunnel(std::uint32_t method, std::uint32_t opType,
+                                                 bool sizeQuery, ArgumentIn place,
+                                                 std::uint32_t argument,
+                                                 std::span<std::byte> output);
+  void leaveOut(std::string what, std::string reason);
+  void leaveOut(const BufferKind& kind, std::uint32_t argument, std::string reason);
+
+  const Invocation& invocation_;
+  platform::Platform& platform_;
+  CaptureFolder& folder_;
+  const NANDInfo::nand_exporter_t* exporter_ = nullptr;  // the one that is asked
+  platform::DriverConnection connection_ = 0;
+  platform::Dictionary answers_;              // the driver's, by op type and argument
+  std::map<std::string, std::string> files_;  // by their digests: what is equal is written once
+  std::uint32_t firstLeftOut_ = 0, lastLeftOut_ = 0;  // arguments of the last entry of leftOut
+  const BufferKind* kindLeftOut_ = nullptr;
+};
+
+}  // namespace nandinfo
