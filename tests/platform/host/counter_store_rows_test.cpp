@@ -1,11 +1,11 @@
 #include <gtest/gtest.h>
 #include <sqlite3.h>
-#include <sys/stat.h>
 #include <sys/wait.h>
 
 #include <cmath>
 #include <limits>
 
+#include "HostServices.h"
 #include "counter_store_support.h"
 
 namespace {
@@ -13,6 +13,7 @@ namespace {
 using platform::host::CounterChange;
 using support::StoreFixture;
 using Lines = std::vector<std::string>;
+using std::filesystem::perms;
 
 constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
 constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
@@ -161,15 +162,11 @@ TEST_F(CounterStoreRows, ReadsAndCheckpointsOfNothingCreateNothing) {
 
 TEST_F(CounterStoreRows, FilesAreForTheirOwnerOnly) {
   here.store.set("k", 1, 1);
-  const auto modeOf = [&](const std::string& path) {
-    struct stat status {};
-    ::lstat((folder / path).c_str(), &status);
-    return status.st_mode & 07777;
-  };
   for (const char* suffix : {"", "-wal", "-shm"}) {
-    EXPECT_EQ(modeOf(std::string(support::kDatabase) + suffix), 0600u) << suffix;
+    const auto file = folder / (std::string(support::kDatabase) + suffix);
+    EXPECT_EQ(std::filesystem::status(file).permissions(), perms{0600}) << suffix;
+    EXPECT_EQ(std::filesystem::status(file.parent_path()).permissions(), perms{0700});
   }
-  EXPECT_EQ(modeOf("var/mobile/Library/Pelloran"), 0700u);
 }
 
 TEST_F(CounterStoreRows, AChangeThatCannotBeRecordedTakesTheOthersWithIt) {
@@ -181,27 +178,20 @@ TEST_F(CounterStoreRows, AChangeThatCannotBeRecordedTakesTheOthersWithIt) {
 }
 
 TEST_F(CounterStoreRows, AnythingButARegularFileInAPlaceOfTheDatabaseIsRefused) {
-  const support::TemporaryFolder outside;
-  outside.write("victim", "untouched");
   for (const char* suffix : {"", "-wal", "-shm", "-journal"}) {
-    for (const bool link : {true, false}) {
-      const support::TemporaryFolder device;
+    for (const support::Kind kind : support::kOtherKinds) {
+      const support::TemporaryFolder device, outside;
       const auto path = device / (std::string(support::kDatabase) + suffix);
       StoreFixture there(device.path());
       if (*suffix != '\0') there.store.set("k", 1, 1);
-      std::filesystem::create_directories(path.parent_path());
       std::filesystem::remove(path);
-      if (link) {
-        std::filesystem::create_symlink(outside / "victim", path);
-      } else {
-        ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
-      }
+      support::put(kind, path, outside / "target");
       StoreFixture fresh(device.path());
       EXPECT_NE(fresh.store.set("k", 1, 1), "") << path;
       EXPECT_EQ(fresh.rows(), Lines{}) << path;
       EXPECT_EQ(fresh.log.count("not a regular file"), 1) << path;
       EXPECT_EQ(fresh.damaged, 0);
-      EXPECT_EQ(outside.read("victim"), "untouched");
+      EXPECT_TRUE(support::untouched(kind, path, outside / "target")) << path;
     }
   }
 }
@@ -266,19 +256,19 @@ TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
 
 // As another user where the tests run as root, whom no mode stops.
 TEST_F(CounterStoreRows, ADeviceThatCannotBeWrittenIsStillRead) {
-  for (const char* left : {"", "-wal", "-shm"}) {
+  const auto allow = [this](perms ofFolders, perms ofFiles) {
+    std::filesystem::permissions(folder.path(), ofFolders);
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
+      std::filesystem::permissions(entry.path(), entry.is_directory() ? ofFolders : ofFiles);
+    }
+  };
+  for (const Lines& gone : {Lines{"-wal", "-shm"}, Lines{"-shm"}, Lines{}}) {
     here.store.set("k", 1, 1);
     here.store.PLClientCheckpoint();
-    const std::string database = support::kDatabase;
-    if (*left == '\0') std::filesystem::remove(folder / (database + "-wal"));
-    if (*left == '\0') std::filesystem::remove(folder / (database + "-shm"));
-    if (std::string_view(left) == "-wal") std::filesystem::remove(folder / (database + "-shm"));
-    std::filesystem::path path = folder.path();
-    std::filesystem::permissions(path, std::filesystem::perms(0555));
-    for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
-      std::filesystem::permissions(entry.path(),
-                                   std::filesystem::perms(entry.is_directory() ? 0555 : 0444));
+    for (const std::string& suffix : gone) {
+      std::filesystem::remove(folder / (support::kDatabase + suffix));
     }
+    allow(perms{0555}, perms{0444});
     const pid_t child = ::fork();
     if (child == 0) {
       if (::geteuid() == 0 && ::setresuid(65534, 65534, 65534) != 0) ::_exit(9);
@@ -289,12 +279,8 @@ TEST_F(CounterStoreRows, ADeviceThatCannotBeWrittenIsStillRead) {
     }
     int status = 0;
     ASSERT_EQ(::waitpid(child, &status, 0), child);
-    EXPECT_EQ(status, 0) << left;
-    for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
-      std::filesystem::permissions(entry.path(),
-                                   std::filesystem::perms(entry.is_directory() ? 0700 : 0600));
-    }
-    std::filesystem::permissions(path, std::filesystem::perms(0700));
+    EXPECT_EQ(status, 0) << gone.size() << " files gone";
+    allow(perms{0700}, perms{0600});
   }
 }
 
