@@ -26,13 +26,13 @@ constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
 constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
 constexpr double kDay = 86400, kToday = 20000 * kDay, kYesterday = kToday - kDay;
 
-Dictionary usage(Dictionary named, double since, std::initializer_list<Value> counts) {
+Dictionary usage(Dictionary named, double since, const std::vector<Value>& counts) {
   const char* const names[] = {"wifiInBytes", "wifiOutBytes", "wwanInBytes", "wwanOutBytes"};
   named.set("since", Date{since});
-  for (std::size_t i = 0; i < counts.size(); ++i) named.set(names[i], counts.begin()[i]);
+  for (std::size_t i = 0; i < counts.size(); ++i) named.set(names[i], counts[i]);
   return named;
 }
-Dictionary bundle(double since, std::initializer_list<Value> counts) {
+Dictionary bundle(double since, const std::vector<Value>& counts) {
   return usage({{"bundleName", "b"}, {"procName", "p"}}, since, counts);
 }
 
@@ -56,65 +56,46 @@ TEST(DataUsageChanges, AreTheDifferencesToTheDayBefore) {
   const struct {
     const char* what;
     Value baseline;  // of "b"
-    Dictionary record;
+    double since;
+    std::vector<Value> counts;
     Lines additions;
   } rows[] = {
-      {"first seen, today",
-       kNone,
-       bundle(kToday, {5000, 0, 1023, 1024}),
-       {"wifiInKB.b 4", "wwanOutKB.b 1"}},
-      {"yesterday's first instant", kNone, bundle(kYesterday, {2048}), {"wifiInKB.b 2"}},
-      {"the last one before it", kNone, bundle(kYesterday - 0.5, {9999, 9999}), {"olddata.b 1"}},
-      {"the future", kNone, bundle(1e300, {2048}), {"wifiInKB.b 2"}},
-      {"no time at all", kNone, bundle(std::nan(""), {2048}), {"olddata.b 1"}},
-      {"grown, too little or unchanged",
-       base,
-       bundle(since, {7048, 6023, 6024, 5000}),
-       {"wifiInKB.b 2", "wwanInKB.b 1"}},
-      {"down, to a missing count too",
-       base,
-       bundle(since, {4999, 5000, "text"}),
-       {"baddata.b 1", "baddata.b 1", "baddata.b 1"}},
-      {"a fraction of a second more",
-       base,
-       bundle(since + 0.75, {7048, 5000, 5000, 5000}),
-       {"wifiInKB.b 2"}},
-      {"another period, old", base, bundle(since + 1, {9999}), {"olddata.b 1"}},
-      {"another period, of yesterday",
-       base,
-       bundle(kYesterday + 5, {9216, 0, 0, 2048.9}),
-       {"wifiInKB.b 9", "wwanOutKB.b 2"}},
-      {"a short entry",
-       Array{long_ago, "text"},
-       bundle(since, {old, old, old}),
-       {"wifiInKB.b 1", "wifiOutKB.b 1", "wwanInKB.b 1"}},
-      {"an entry without a date", Array{1, 2}, bundle(kToday, {old}), {"wifiInKB.b 1"}},
-      {"an empty entry", Array{}, bundle(kToday, {old}), {"wifiInKB.b 1"}},
-      {"no entry", "text", bundle(since, {old}), {"olddata.b 1"}},
+      {"new today", kNone, kToday, {5000, 0, 1023, 1024}, {"wifiInKB.b 4", "wwanOutKB.b 1"}},
+      {"yesterday's first instant", kNone, kYesterday, {2048}, {"wifiInKB.b 2"}},
+      {"the last one before it", kNone, kYesterday - 0.5, {9999, 9999}, {"olddata.b 1"}},
+      {"the future", kNone, 1e300, {2048}, {"wifiInKB.b 2"}},
+      {"no time at all", kNone, std::nan(""), {2048}, {"olddata.b 1"}},
+      {"grown", base, since, {7048, 6023, 6024, 5000}, {"wifiInKB.b 2", "wwanInKB.b 1"}},
+      {"down", base, since, {4999, 5000, "text"}, Lines(3, "baddata.b 1")},
+      {"a fraction more", base, since + 0.75, {7048, 5000, 5000, 5000}, {"wifiInKB.b 2"}},
+      {"another period, old", base, since + 1, {9999}, {"olddata.b 1"}},
+      {"another period, of yesterday", base, kYesterday + 5, {9216, 1023.9}, {"wifiInKB.b 9"}},
+      {"a short entry", Array{long_ago, "text"}, since, {0, old}, {"wifiOutKB.b 1"}},
+      {"an entry without a date", Array{1, 2}, kToday, {old}, {"wifiInKB.b 1"}},
+      {"an empty entry", Array{}, kToday, {old}, {"wifiInKB.b 1"}},
+      {"no entry", "text", since, {old}, {"olddata.b 1"}},
       {"large",
        Array{long_ago, 0, kLeast, 1, -1},
-       bundle(since, {big, kMost, kLeast, kMost}),
+       since,
+       {big, kMost, kLeast, kMost},
        {"wifiInKB.b 1073741824", "baddata.b 1", "wwanInKB.b 9007199254740991", "baddata.b 1"}},
       {"beyond 63 bits",
        kNone,
-       bundle(kToday, {huge, 1e300}),
+       kToday,
+       {huge, 1e300},
        {"wifiInKB.b -9007199254740992", "wifiOutKB.b 9007199254740991"}},
-      {"a bundle that is no text",
-       kNone,
-       usage({{"bundleName", 7}, {"procName", "b"}}, since, {}),
-       {"olddata.com.norba.b 1"}},
-      {"an empty name", kNone, usage({{"bundleName", ""}}, since, {}), {"olddata. 1"}},
   };
   for (const auto& row : rows) {
-    const auto changes = dataUsageChanges({{"b", row.baseline}}, {row.record}, Date{kYesterday});
+    const Array records{bundle(row.since, row.counts)};
+    const auto changes = dataUsageChanges({{"b", row.baseline}}, records, Date{kYesterday});
     EXPECT_EQ(texts(changes.additions), row.additions) << row.what;
     ASSERT_EQ(changes.baseline.size(), 1u) << row.what;
     const Array& entry = *changes.baseline.begin()->value.as<Array>();
     ASSERT_EQ(entry.size(), 5u) << row.what;
     const double stored = entry[0].as<Date>()->secondsSince1970;
-    EXPECT_TRUE(stored == row.record.date("since")->secondsSince1970 || std::isnan(stored));
+    EXPECT_TRUE(stored == row.since || std::isnan(stored)) << row.what;
     // Kept as they came, so that the same records the next day add nothing but old data.
-    const auto next = dataUsageChanges(changes.baseline, {row.record}, Date{kToday});
+    const auto next = dataUsageChanges(changes.baseline, records, Date{kToday});
     EXPECT_LE(next.additions.size(), std::isnan(stored) ? 1u : 0u) << row.what;
   }
 }
@@ -122,11 +103,17 @@ TEST(DataUsageChanges, AreTheDifferencesToTheDayBefore) {
 TEST(DataUsageChanges, SkipWhatIsNoRecordAndKeepTheLatestOfAName) {
   Dictionary undated = bundle(kToday, {4096});
   undated.set("since", "2026-11-22");
-  const Array records{"text", usage({}, kToday, {4096}), undated, bundle(kToday, {4096}),
-                      usage({{"procName", "b"}}, kToday, {8192, 1, 2, std::uint64_t{3}})};
+  const Array records{"text",
+                      usage({}, kToday, {4096}),
+                      undated,
+                      usage({{"bundleName", ""}}, 0, {}),
+                      bundle(kToday, {4096}),
+                      usage({{"bundleName", 7}, {"procName", "b"}}, kToday, {8192, 1, 2, 3})};
   const auto changes = dataUsageChanges({{"gone", Array{Date{kToday}}}}, records, Date{kYesterday});
-  EXPECT_EQ(texts(changes.additions), (Lines{"wifiInKB.b 4", "wifiInKB.com.norba.b 8"}));
-  EXPECT_EQ(changes.baseline, (Dictionary{{"b", Array{Date{kToday}, 8192, 1, 2, 3}}}));
+  EXPECT_EQ(texts(changes.additions),
+            (Lines{"olddata. 1", "wifiInKB.b 4", "wifiInKB.com.norba.b 8"}));
+  EXPECT_EQ(changes.baseline, (Dictionary{{"", Array{Date{0}, 0, 0, 0, 0}},
+                                          {"b", Array{Date{kToday}, 8192, 1, 2, 3}}}));
 }
 
 TEST(DataUsageStep, ReplacesTheBaselineWhateverTheReply) {
@@ -178,6 +165,15 @@ TEST(DataUsageStep, GoesOnWithoutAReplyAndDealsWithALateOne) {
 // On the host, where the reply is another thread's.
 class DataUsageThreads : public ::testing::Test {
  protected:
+  // This many processes, each with four KiB.
+  static Array processes(int count) {
+    Array records;
+    for (int i = 0; i < count; ++i) {
+      records.push_back(usage({{"procName", std::to_string(i)}}, 1e11, {4096}));
+    }
+    return records;
+  }
+
   void answer(const Array& records, double delay) {
     support::RealCodecs codecs;
     folder.write("device/network-usage.plist",
@@ -199,11 +195,7 @@ class DataUsageThreads : public ::testing::Test {
 
 TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   constexpr int kProcesses = 100, kOthers = 100;
-  Array records;
-  for (int i = 0; i < kProcesses; ++i) {
-    records.push_back(usage({{"procName", std::to_string(i)}}, 1e11, {4096}));
-  }
-  answer(records, 0);
+  answer(processes(kProcesses), 0);
   {
     platform::host::Host host({.root = folder.path()});
     platform::Platform& platform = host.platform();
@@ -227,11 +219,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
 // about.
 TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
   EXPECT_EQ(kUsageServicePatience, std::chrono::seconds(10));
-  Array records;
-  for (int i = 0; i < 2000; ++i) {
-    records.push_back(usage({{"procName", std::to_string(i)}}, 1e11, {4096}));
-  }
-  answer(records, 0);
+  answer(processes(2000), 0);
   platform::host::Host host({.root = folder.path()});
   CollectDataUsage(host.platform());
   const std::string file = folder.read("var/preferences/mobile/" + std::string(kDomain) + ".plist");
@@ -239,7 +227,7 @@ TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
 }
 
 TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
-  answer({bundle(1e11, {4096})}, std::numeric_limits<double>::infinity());
+  answer(processes(1), std::numeric_limits<double>::infinity());
   for (int i = 0; i < 3; ++i) {
     platform::host::Host host({.root = folder.path()});
     CollectDataUsage(host.platform(), std::chrono::milliseconds(i));
@@ -249,7 +237,7 @@ TEST_F(DataUsageThreads, AReplyThatIsTooLateIsDroppedAtTheEnd) {
 
 // The end of the process may meet the reply at any moment.
 TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
-  answer({bundle(1e11, {4096}), bundle(1e11, {4096})}, 0);
+  answer(processes(2), 0);
   for (int i = 0; i < 20; ++i) {
     platform::host::Host host({.root = folder.path()});
     CollectDataUsage(host.platform(),

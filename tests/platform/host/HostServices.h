@@ -43,23 +43,17 @@ inline void put(Kind kind, const std::filesystem::path& at, const std::filesyste
   if (kind == Kind::folder) std::filesystem::create_directory(at);
 }
 
-// Whether nothing was written through what put() left.
+// Whether what put() left is there still, and nothing was written through it.
 inline bool untouched(Kind kind, const std::filesystem::path& at,
                       const std::filesystem::path& target) {
-  const auto type = std::filesystem::symlink_status(at).type();
-  switch (kind) {
-    case Kind::link: {
-      std::ifstream file(target);
-      return std::string(std::istreambuf_iterator<char>(file), {}) == "precious";
-    }
-    case Kind::danglingLink:
-      return !std::filesystem::exists(target);
-    case Kind::fifo:
-      return type == std::filesystem::file_type::fifo;
-    case Kind::folder:
-      break;
-  }
-  return type == std::filesystem::file_type::directory;
+  using std::filesystem::file_type;
+  const file_type types[] = {file_type::symlink, file_type::symlink, file_type::fifo,
+                             file_type::directory};
+  std::ifstream file(target);
+  const std::string text(std::istreambuf_iterator<char>(file), {});
+  return std::filesystem::symlink_status(at).type() == types[static_cast<int>(kind)] &&
+         std::filesystem::exists(target) == (kind == Kind::link) &&
+         text == (kind == Kind::link ? "precious" : "");
 }
 
 }  // namespace support

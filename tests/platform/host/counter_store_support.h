@@ -5,20 +5,13 @@
 #include <string>
 #include <vector>
 
+#include "HostServices.h"
 #include "platform/Text.h"
 #include "platform/host/CounterStore.h"
-#include "platform/testing/RecordingLog.h"
-#include "support/TemporaryFolder.h"
 
 namespace support {
 
 inline constexpr char kDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
-
-struct FixedClock : platform::Clock {
-  double seconds = 20000 * 86400.0 + 3600;
-  platform::Date now() override { return {seconds}; }
-  std::int32_t secondsFromUTC(platform::Date) override { return 0; }
-};
 
 // The rows of a history, one line each: "day key value", "day key second:value second:value".
 inline std::vector<std::string> rows(platform::PLHistory& history, std::string_view prefix = "",
@@ -52,7 +45,7 @@ struct StoreFixture {
   std::vector<std::string> rows() { return support::rows(*store.initWithDefaultPath()); }
 
   platform::host::DeviceRoot root;
-  FixedClock clock;
+  SetClock clock;
   platform::fakes::RecordingLog log;
   std::optional<std::string> home = "/var/mobile";
   int damaged = 0;

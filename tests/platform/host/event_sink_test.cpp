@@ -16,6 +16,10 @@ struct EventSinkTest : testing::Test, support::HostServices {
   EventSink sink{root, codec, clock, log};
 
   static Dictionary nothing() { return {}; }
+  void send(const char* event = "event") {
+    EXPECT_TRUE(sink.EventraSendEventLazy(event, nothing));
+    sink.drain();
+  }
   std::ptrdiff_t lines() const {
     const std::string text = folder.read(kEvents);
     return std::count(text.begin(), text.end(), '\n');
@@ -37,16 +41,11 @@ TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
       "{\"event\": \"first\", \"time\": \"2026-11-22T04:00:00Z\", \"payload\": {\"a\": 1}}\n"
       "{\"event\": \"second\", \"time\": \"2026-11-22T04:00:01Z\", \"payload\": {}}\n";
   EXPECT_EQ(folder.read(kEvents), expected);
-  EXPECT_TRUE(sink.EventraSendEventLazy("third", nothing));
-  sink.drain();
+  send();
   EXPECT_EQ(lines(), 3);
 }
 
 TEST_F(EventSinkTest, AFullFileMakesRoomAndTheOldestOfFourIsDropped) {
-  const auto send = [this] {
-    sink.EventraSendEventLazy("event", nothing);
-    sink.drain();
-  };
   const std::string name = kEvents;
   for (int round = 0; round < 6; ++round) {
     folder.write(kEvents, std::string(EventSink::kMaximumFile - 1, 'x') + '\n');
@@ -71,8 +70,7 @@ TEST_F(EventSinkTest, OnlyUsedEventsAreProduced) {
   EXPECT_FALSE(sink.EventraIsEventUsed("unused"));
   EXPECT_FALSE(sink.EventraSendEventLazy("unused", never));
   EXPECT_TRUE(sink.offersLazySend());
-  EXPECT_TRUE(sink.EventraSendEventLazy("used", nothing));
-  sink.drain();
+  send("used");
   EXPECT_EQ(lines(), 1);
   folder.write("device/analytics.plist", xml({{"Available", false}}));
   EventSink absent(root, codec, clock, log);
@@ -128,8 +126,7 @@ TEST_F(EventSinkTest, NoEventIsLostBetweenSendersProducersAndDrains) {
 TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
   std::filesystem::create_directories(folder / kEvents);
   for (int n = 0; n < 3; ++n) {
-    EXPECT_TRUE(sink.EventraSendEventLazy("event", nothing));
-    sink.drain();
+    send();
   }
   EXPECT_EQ(log.count("error: Could not write /var/spool/morvend/events.jsonl: "), 1);
 }
