@@ -24,13 +24,31 @@ bool DeviceContext::PLIsInternalDevice() {
 }
 
 // The property is read directly here, not through the flag that PLIsInternalDevice keeps.
+bool DeviceContext::isForcedToMultiUserMode() {
+  return properties_.booleanProperty(kInternalBuild) && files_.fileStatus(kForceMultiUserMode);
+}
+
+bool DeviceContext::isMultiUserDevice() {
+  return properties_.multiUserIndicator().value_or(0) != 0;
+}
+
 bool DeviceContext::determineMultiUserMode() {
-  if (properties_.booleanProperty(kInternalBuild) && files_.fileStatus(kForceMultiUserMode)) {
+  if (isForcedToMultiUserMode()) {
     log_.log(LogLevel::standard, "Forcing Multi User Mode behavior due to the presence of %s",
              kForceMultiUserMode);
     return true;
   }
-  return properties_.multiUserIndicator().value_or(0) != 0;
+  return isMultiUserDevice();
+}
+
+std::optional<std::string> DeviceContext::homeOfCounters() {
+  const std::scoped_lock lock(homeMutex_);
+  if (home_) return home_;
+  if (!multiUser_.value_or(isForcedToMultiUserMode() || isMultiUserDevice())) {
+    return kSingleUserHome;
+  }
+  std::uint64_t error = 1;
+  return properties_.systemGroupContainerPath(kSystemGroupContainer, error);
 }
 
 const std::string* DeviceContext::GetHomeDirectoryPath() {

@@ -1,7 +1,7 @@
 // Probes that tell what kind of device this is and where its counters data lie.
 //
 // What doesn't change during the life of the process is asked once and kept here.
-// PLIsInternalDevice and GetHomeDirectoryPath may be called from several threads; the others belong
+// PLIsInternalDevice and homeOfCounters may be called from several threads; the others belong
 // to the main thread.
 #pragma once
 
@@ -33,6 +33,10 @@ class DeviceContext {
   // had; it is then asked for again at the next call. The text is borrowed and stays valid.
   const std::string* GetHomeDirectoryPath();
 
+  // The same directory for the counters service itself, which needs it at any time: nothing is
+  // said, and nothing kept.
+  std::optional<std::string> homeOfCounters();
+
   // The size of the counters database in whole MiB, or -1 when it can't be examined.
   std::int64_t GetCountersDatabaseSizeMB();
 
@@ -42,6 +46,8 @@ class DeviceContext {
   std::int64_t ReadAndResetDatabaseCorruptionCount();
 
  private:
+  bool isForcedToMultiUserMode();
+  bool isMultiUserDevice();
   bool determineMultiUserMode();
   void LoadPreferenceFunctions();
 

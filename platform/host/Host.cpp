@@ -67,11 +67,7 @@ struct Host::Services {
   HostDeviceProperties deviceProperties{root, propertiesFile};
   HostLibraryLoader libraries{root, preferences};
   morvend::DeviceContext context{deviceProperties, files, libraries, log};
-  CounterStore counters{root, clock, log,
-                        [this]() -> std::optional<std::string> {
-                          const std::string* home = context.GetHomeDirectoryPath();
-                          return home ? std::optional(*home) : std::nullopt;
-                        },
+  CounterStore counters{root, clock, log, [this] { return context.homeOfCounters(); },
                         [this] { countDamagedDatabase(); }};
   SubmissionSpool submission{root, codec, preferences, clock, log};
   const std::unique_ptr<StructuredLogFiles> structuredLogs =

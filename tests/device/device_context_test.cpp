@@ -48,6 +48,8 @@ TEST_F(DeviceContextTest, ForcesMultiUserModeOnInternalBuildsOnly) {
     device.device.container = "/container";
     if (row.marker) device.files.contents["/var/db/forceMultiUserMode"] = "";
     DeviceContext probes(device.platform);
+    EXPECT_EQ(probes.homeOfCounters(), row.home);
+    EXPECT_EQ(device.log.count("Forcing"), 0);
     for (int call = 0; call < 2; ++call) {
       ASSERT_NE(probes.GetHomeDirectoryPath(), nullptr);
       EXPECT_EQ(*probes.GetHomeDirectoryPath(), row.home);
@@ -58,6 +60,9 @@ TEST_F(DeviceContextTest, ForcesMultiUserModeOnInternalBuildsOnly) {
 
 TEST_F(DeviceContextTest, AsksForTheContainerUntilThereIsOne) {
   platform.device.multiUser = 1;
+  // The counters service asks without a word; the probe alone says what is missing.
+  EXPECT_EQ(context.homeOfCounters(), std::nullopt);
+  EXPECT_TRUE(platform.log.lines().empty());
   EXPECT_EQ(context.GetCountersDatabaseSizeMB(), -1);
   EXPECT_EQ(context.GetHomeDirectoryPath(), nullptr);
   EXPECT_EQ(platform.log.lines(),
@@ -66,7 +71,7 @@ TEST_F(DeviceContextTest, AsksForTheContainerUntilThereIsOne) {
   platform.device.container = "/c";
   EXPECT_EQ(*context.GetHomeDirectoryPath(), "/c");
   EXPECT_EQ(*context.GetHomeDirectoryPath(), "/c");
-  EXPECT_EQ(platform.device.containerQueries, 3);
+  EXPECT_EQ(platform.device.containerQueries, 4);
 }
 
 TEST_F(DeviceContextTest, KnowsTheDatabaseSizeInWholeMebibytes) {
