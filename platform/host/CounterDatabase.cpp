@@ -101,7 +101,7 @@ std::string CounterDatabase::write(Missing missing, const Work& work) {
 }
 
 std::string CounterDatabase::settle() {
-  const std::string error = write(Missing::skip, [](Connection& connection) {
+  std::string error = write(Missing::skip, [](Connection& connection) {
     connection.checkpoint(Connection::Checkpoint::truncate);
     connection.leaveNothingBeside();
   });

@@ -151,7 +151,7 @@ int rollOver(int folder, const std::string& name, int oldest, std::string& at) {
       if (errno != ENOENT) return errno;
       break;
     }
-      if (!S_ISREG(status.st_mode)) return EINVAL;
+    if (!S_ISREG(status.st_mode)) return EINVAL;
   }
   for (int number = std::min(free, oldest) - 1; number >= 0; --number) {
     at = numbered(number);

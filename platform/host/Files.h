@@ -15,8 +15,8 @@
 
 namespace platform::host {
 
-// What an error number of these functions says: "not a regular file" for EINVAL, for ELOOP that links
-// are in the way, else the system's text.
+// What an error number of these functions says: "not a regular file" for EINVAL, for ELOOP that
+// links are in the way, else the system's text.
 const char* errorText(int error);
 
 // The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
