@@ -73,7 +73,7 @@ TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
                                   "magazine --history --no-delta",
                                   "magazine --hours -1",
                                   "magazine --hours 0x10",
-                                  "magazine --hours 8785",
+                                  "magazine --hours 4294967296",
                                   "magazine --hours 4 --mode 3",
                                   "extract --from 7",
                                   "extract --from \x1b",

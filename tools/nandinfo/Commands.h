@@ -12,9 +12,6 @@
 
 namespace nandinfo {
 
-// How far back the stats magazine can be asked for: a year, of which a capture asks every hour.
-inline constexpr std::uint32_t kMostHours = 366 * 24;
-
 // What the command line says; each command looks at its own part.
 struct Arguments {
   bool round = false, all = false, statKeys = false, noDelta = false, history = false,

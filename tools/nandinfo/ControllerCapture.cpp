@@ -27,9 +27,12 @@ struct ControllerCapture::BufferKind {
   std::uint32_t arguments;
 };
 
+// A year of the magazine: no controller keeps more, and each hour that is asked for is a command.
+constexpr std::uint32_t kHours = 366 * 24 + 1;
+
 const ControllerCapture::BufferKind ControllerCapture::kKinds[] = {
     {"statistics", &nand_exporter_t::getStatsSelectors, ArgumentIn::word, 1},
-    {"read-statistics", &nand_exporter_t::getReadStatsSelectors, ArgumentIn::word, kMostHours + 1},
+    {"read-statistics", &nand_exporter_t::getReadStatsSelectors, ArgumentIn::word, kHours},
     {"msp", &nand_exporter_t::getMSPStatsSelectors, ArgumentIn::word, 10},
     {"defects", &nand_exporter_t::getDefectsListSelectors, ArgumentIn::flags, 1},
     {"telemetry", &nand_exporter_t::getTelemetryListSelectors, ArgumentIn::flags, 3},

@@ -194,7 +194,7 @@ CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& nu
 
 void addWindow(CLI::App& app, Arguments& arguments) {
   CLI::App* which = app.add_option_group("Window", "What is shown")->require_option(1);
-  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, kMostHours,
+  CLI::Option* hours = addNumber(*which, "--hours", arguments.hours, UINT32_MAX,
                                  "from so many hours ago until now, as differences");
   which->add_flag("--history", arguments.history,
                   "the write amplification of the last six windows of four hours");
