@@ -1,5 +1,4 @@
-// Kernel snapshots. What is found is the payload of one of the snapshot's statistics items, and the
-// same again for the same bytes.
+// Kernel snapshots. What is found is the payload of one of the snapshot's statistics items.
 #include <cstdint>
 #include <cstdlib>
 
@@ -10,18 +9,14 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   const auto snapshot = std::as_bytes(std::span(bytes, size));
   const auto find = [&](std::string_view name) {
     const auto found = NANDInfo::getIOStatsWithThreadnameFromKCData(snapshot, name);
-    if (!found || found->empty()) return found;
+    if (!found || found->empty()) return;
     const auto offset = static_cast<std::size_t>(found->data() - snapshot.data());
     if (offset < 16 || offset > size || found->size() > size - offset) std::abort();
     NANDInfo::ByteReader header(snapshot.subspan(offset - 16));
     if (header.read<std::uint32_t>() != 0x901u) std::abort();
     if (header.read<std::uint32_t>() != found->size()) std::abort();
-    return found;
   };
-  const auto first = find("VM_swapout");
-  const auto second = find("VM_swapout");
-  if (first.has_value() != second.has_value()) std::abort();
-  if (first && (first->data() != second->data() || first->size() != second->size())) std::abort();
+  find("VM_swapout");
   find("");
   return 0;
 }
