@@ -102,8 +102,8 @@ class BusClient {
 
   sd_bus* bus() const { return bus_.get(); }
 
-  // Sends a message to the service: integers as x, booleans, doubles and texts as themselves, data
-  // as ay, arrays as aa{sv} when they hold dictionaries alone, else as av.
+  // Sends a message to the service: integers as x, texts as s, data as ay, arrays, which hold
+  // dictionaries, as aa{sv}.
   void send(const platform::Dictionary& message) {
     sendCall([&](sd_bus_message* call) { append(call, message); });
   }
@@ -177,42 +177,20 @@ class BusClient {
     if (const auto* text = value.as<std::string>()) {
       check(sd_bus_message_append(call, "v", "s", text->c_str()));
     } else if (const auto* number = value.as<platform::Number>()) {
-      if (number->isReal()) {
-        check(sd_bus_message_append(call, "v", "d", number->doubleValue()));
-      } else if (number->type() == platform::Number::Type::boolean) {
-        check(sd_bus_message_append(call, "v", "b", static_cast<int>(number->boolValue())));
-      } else {
-        check(sd_bus_message_append(call, "v", "x", number->int64Value()));
-      }
+      check(sd_bus_message_append(call, "v", "x", number->int64Value()));
     } else if (const auto* data = value.as<platform::Data>()) {
       check(sd_bus_message_open_container(call, 'v', "ay"));
       check(sd_bus_message_append_array(call, 'y', data->data(), data->size()));
       check(sd_bus_message_close_container(call));
-    } else if (const auto* dictionary = value.as<platform::Dictionary>()) {
-      check(sd_bus_message_open_container(call, 'v', "a{sv}"));
-      append(call, *dictionary);
-      check(sd_bus_message_close_container(call));
-    } else if (const auto* array = value.as<platform::Array>()) {
-      appendArray(call, *array);
-    }
-  }
-
-  static void appendArray(sd_bus_message* call, const platform::Array& array) {
-    bool dictionaries = true;
-    for (const auto& element : array) {
-      dictionaries = dictionaries && element.as<platform::Dictionary>() != nullptr;
-    }
-    check(sd_bus_message_open_container(call, 'v', dictionaries ? "aa{sv}" : "av"));
-    check(sd_bus_message_open_container(call, 'a', dictionaries ? "a{sv}" : "v"));
-    for (const auto& element : array) {
-      if (dictionaries) {
+    } else {
+      check(sd_bus_message_open_container(call, 'v', "aa{sv}"));
+      check(sd_bus_message_open_container(call, 'a', "a{sv}"));
+      for (const auto& element : *value.as<platform::Array>()) {
         append(call, *element.as<platform::Dictionary>());
-      } else {
-        append(call, element);
       }
+      check(sd_bus_message_close_container(call));
+      check(sd_bus_message_close_container(call));
     }
-    check(sd_bus_message_close_container(call));
-    check(sd_bus_message_close_container(call));
   }
 
   std::unique_ptr<sd_bus, decltype(&sd_bus_flush_close_unref)> bus_{nullptr,
