@@ -78,14 +78,6 @@ TEST(DemoScreen, KeepsToItsColumns) {
   EXPECT_EQ(demo::elided("abcdefghij", 10), "abcdefghij");
   EXPECT_EQ(demo::elided("abcdefghij", 7), "ab…ghij");
   EXPECT_EQ(demo::elided("äöüäöüäöüä", 4), "ä…üä");
-  const std::pair<double, const char*> bars[] = {{-1, ""},     {0, ""},   {1e-9, "▏"}, {0.5, "█"},
-                                                 {0.75, "█▌"}, {1, "██"}, {2, "██"}};
-  for (const auto& [share, text] : bars) EXPECT_EQ(demo::bar(share, 2), text) << share;
-  EXPECT_EQ(demo::skyline(std::vector<std::uint64_t>{0, 4, 8}), "▁▅█");
-  EXPECT_EQ(demo::skyline({}), "");
-  EXPECT_EQ(demo::evenlySpread(5, 2), (std::vector<std::size_t>{0, 2}));
-  EXPECT_EQ(demo::evenlySpread(2, SIZE_MAX), (std::vector<std::size_t>{0, 1}));
-
   demo::Table table({{"KEY", demo::Table::Align::left}, {"N", demo::Table::Align::right}});
   table.addRow({std::string(200, 'k'), "12345"});
   table.addRow({"short", "1"});

@@ -42,45 +42,24 @@ TEST(PelloranImportLine, NumbersKeepTheirValueAndMissingFieldsMeanNow) {
 }
 
 TEST(PelloranImportLine, AnythingElseIsRefusedWithAReason) {
-  const std::string deep(100000, '[');
-  const std::string lines[] = {
-      "",
-      "1",
-      "null",
-      "[]",
-      "{}",
-      "{",
-      deep,
-      "{\"set\": " + deep,
-      R"({"set": "k"})",
-      R"({"set": "k", "value": 1} x)",
-      R"({"set": "k", "value": 1, "push": "k"})",
-      R"({"set": "k", "set": "k", "value": 1})",
-      R"({"set": "k", "value": 1, "value": 2})",
-      R"({"set": "k", "value": 1, "more": 2})",
-      R"({"set": "k", "value": {"value": 1}})",
-      R"({"set": "k", "value": true})",
-      R"({"set": "k", "value": "1"})",
-      R"({"set": "k", "value": 1.5})",
-      R"({"set": "k", "value": 9223372036854775808})",
-      R"({"set": "k", "value": -1e19})",
-      R"({"push": "k", "value": 1e999})",
-      R"({"push": "k", "value": NaN})",
-      R"({"push": 5, "value": 1})",
-      R"({"push": "", "value": 1})",
-      R"({"push": "\u0000", "value": 1})",
-      R"({"push": "\ud800", "value": 1})",
-      "{\"push\": \"\xff\", \"value\": 1}",
-      R"({"push": "k", "value": 1, "day": 2147483648})",
-      R"({"push": "k", "value": 1, "day": 0.5})",
-      R"({"push": "k", "value": 1, "day": -1})",
-      R"({"push": "k", "value": 1, "day": "-1"})",
-      R"({"push": "k", "value": 1, "day": "soon"})",
-      R"({"push": "k", "value": 1, "seconds": 86400})",
-      R"({"push": "k", "value": 1, "seconds": -1})",
-      R"({"push": "k", "value": 1, "seconds": "1"})",
-      "{\"push\": \"" + std::string(1025, 'k') + "\", \"value\": 1}",
-  };
+  const std::string deep(100000, '['), longest(1025, 'k');
+  std::vector<std::string> lines = {"", "1", "null", "[]", "{", deep, "{\"set\": " + deep};
+  // Beginnings, and contents that can't follow.
+  const std::pair<const char*, std::vector<std::string>> contents[] = {
+      {"{", {""}},
+      {R"({"set": "k")",
+       {"", R"(, "value": 1} x)", R"(, "value": 1, "push": "k")", R"(, "set": "k", "value": 1)",
+        R"(, "value": 1, "value": 2)", R"(, "value": 1, "more": 2)"}},
+      {R"({"set": "k", "value": )",
+       {R"({"value": 1})", "true", R"("1")", "1.5", "9223372036854775808", "-1e19"}},
+      {R"({"push": "k", "value": )", {"1e999", "NaN"}},
+      {R"({"value": 1, "push": )",
+       {"5", R"("")", R"("\u0000")", R"("\ud800")", "\"\xff\"", '"' + longest + '"'}},
+      {R"({"push": "k", "value": 1, "day": )", {"2147483648", "0.5", "-1", R"("-1")", R"("soon")"}},
+      {R"({"push": "k", "value": 1, "seconds": )", {"86400", "-1", R"("1")"}}};
+  for (const auto& [beginning, refused] : contents) {
+    for (const std::string& content : refused) lines.push_back(beginning + content + "}");
+  }
   for (const auto& line : lines) {
     const auto parsed = pelloran::parseImportLine(line, kNow);
     EXPECT_FALSE(parsed) << line.substr(0, 80);
