@@ -15,11 +15,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   std::memcpy(&claimed, bytes + 8, sizeof claimed);
   if (list->size() != std::min<std::size_t>(claimed, (size - 12) / 32)) std::abort();
   for (std::size_t i = 0; i < list->size(); ++i) {
-    const auto defect = (*list)[i];
-    const auto offset = NANDInfo::reasonOffset(defect.mode);
-    if (offset.has_value() != (defect.mode < 3)) std::abort();
-    const auto log = NANDInfo::defectLog(defect);
-    if (log.size() != 8 || log.number("CE")->int64Value() != defect.CE) std::abort();
+    if (NANDInfo::defectLog((*list)[i]).size() != 8) std::abort();
   }
   return 0;
 }

@@ -39,16 +39,15 @@ struct StorageDevice : TestPlatform {
   }
 
   // What the controller answers whenever it is asked for its statistics.
-  void setStatistics(const FTLFields& fields) {
-    for (const std::uint32_t method : {8, 9}) {
-      registry.alwaysTunnels(method, 13, 0, ftlBuffer(fields));
-    }
-  }
+  void setStatistics(const FTLFields& fields) { setBuffer(13, 0, fields); }
 
   // The snapshot of its magazine so many hours back.
-  void setSnapshot(std::uint32_t hours, const FTLFields& fields) {
+  void setSnapshot(std::uint32_t hours, const FTLFields& fields) { setBuffer(10, hours, fields); }
+
+ private:
+  void setBuffer(std::uint32_t opType, std::uint32_t argument, const FTLFields& fields) {
     for (const std::uint32_t method : {8, 9}) {
-      registry.alwaysTunnels(method, 10, hours, ftlBuffer(fields));
+      registry.alwaysTunnels(method, opType, argument, ftlBuffer(fields));
     }
   }
 };
