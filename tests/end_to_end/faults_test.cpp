@@ -18,6 +18,10 @@ constexpr char kGateRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
 // `clean` has had a run without any.
 void checkDevice(const Device& before, const Device& clean, const Device& device,
                  const faults::Outcome& faulty, const std::string& what) {
+  const auto said = [&faulty](const char* text) {
+    return faulty.standardError.find(text) != std::string::npos;
+  };
+  const bool killed = faulty.signal != 0;
   EXPECT_EQ(device.history(), before.history()) << what;
   EXPECT_EQ(device.record(kGateRecord), Value(device.today() - 1)) << what;
   EXPECT_EQ(device.record("TaskingID"), Value("T1")) << what;
@@ -25,9 +29,8 @@ void checkDevice(const Device& before, const Device& clean, const Device& device
   // Submitted whole, once; twice when the run was killed after that; not at all only when the run
   // said so.
   const auto logs = device.dailyLogs();
-  const bool lost = faulty.standardError.find("Failed to write pellorand log") != std::string::npos;
-  EXPECT_TRUE(logs.size() == 1 || (lost && logs.empty()) ||
-              (faulty.signal != 0 && logs.size() == 2))
+  EXPECT_TRUE(logs.size() == 1 || (logs.empty() && said("Failed to write pellorand log")) ||
+              (logs.size() == 2 && killed))
       << what << ": " << logs.size() << " logs\n"
       << faulty.standardError;
   const Dictionary expected = device.expectedSections();
@@ -38,11 +41,6 @@ void checkDevice(const Device& before, const Device& clean, const Device& device
       EXPECT_EQ(*found, section.value) << what << ": " << section.key;
     }
   }
-
-  const auto said = [&faulty](const char* text) {
-    return faulty.standardError.find(text) != std::string::npos;
-  };
-  const bool killed = faulty.signal != 0;
 
   // The storage log is whole; it is missing only when the run said so, and there twice only when
   // the run was killed before the time of the first was kept.

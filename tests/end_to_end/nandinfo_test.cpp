@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <nlohmann/json.hpp>
 #include <set>
-#include <sstream>
 
 #include "end_to_end/Device.h"
 #include "support/ControllerLists.h"
@@ -48,7 +47,6 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
     const char *out, *err;
   } rows[] = {
       {"ftl", 0, "\"nandReads\": 19000,\n", ""},
-      {"ftl --all", 0, "\"hostWriteLogHisto_9\": 14009,\n", ""},
       {"ftl --all --stat-keys --compact", 0, "\"Stat_14_9\": 14009, ", ""},
       {"info", 0, "\"com.norba.NANDInfo.NumLogicalWrites\": 4000", ""},
       {"msp --round", 0, "\n  \"2\": {\n", ""},
@@ -60,14 +58,12 @@ TEST(NandinfoProgram, PrintsOneJSONObject) {
       {"magazine --hours 24", 0, "\"hostWrites\": 24,\n", ""},
       {"nvram", 0, "{}", ""},
       {"decode msp -", 1, "\"ok\": false", "nandinfo: decode msp: "},
-      {"ftl --unknown", 2, "",
-       "nandinfo: The following argument was not expected: --unknown (see "},
   };
   for (const auto& row : rows) {
     const Output output = nandinfo(device, row.arguments);
     EXPECT_EQ(output.status, row.status) << row.arguments;
     EXPECT_NE(output.out.find(row.out), std::string::npos) << output.out.substr(0, 500);
-    EXPECT_EQ(nlohmann::json::accept(output.out), row.status != 2) << row.arguments;
+    EXPECT_TRUE(nlohmann::json::accept(output.out)) << row.arguments;
     EXPECT_TRUE(output.err.starts_with(row.err)) << output.err;
     EXPECT_EQ(output.err.empty(), row.status == 0) << output.err;
   }
@@ -106,7 +102,7 @@ TEST(Programs, ARootThatIsNoneIsAnError) {
   for (const std::string name : {"none", "file"}) {
     const std::string root = device.root() / name.c_str();
     const std::string problem = "the device root " + root + ": ";
-    for (const char* line : {"$p/nandinfo disk", "$p/nandinfo decode ftl -", "$p/pelloran show",
+    for (const char* line : {"$p/nandinfo extract", "$p/nandinfo decode ftl -", "$p/pelloran show",
                              "$p/pelloran set key 1"}) {
       const Output output = shell(root, line);
       EXPECT_EQ(output.status, 1) << line;
@@ -145,24 +141,19 @@ TEST(NandinfoProgram, LeavesLogsAndEvents) {
   std::filesystem::remove_all(device.root() / "var/spool");
 
   EXPECT_EQ(nandinfo(device, "dump").out, "true\n");
-  ASSERT_EQ(device.names(kSubmitted).size(), 1u);
-  const std::string log = device.root().read(kSubmitted + ("/" + device.names(kSubmitted)[0]));
-  EXPECT_NE(log.find(";UserWamp:"), std::string::npos) << log;
-  const auto valuesOf = [&device](const std::string& path, const char* key) {
-    std::set<nlohmann::json> values;
-    std::istringstream lines(device.root().read(path));
-    for (std::string line; std::getline(lines, line);) {
-      values.insert(nlohmann::json::parse(line)[key]);
-    }
-    return values;
+  const auto textOf = [&device](const std::string& folder) {
+    const Lines names = device.names(folder);
+    EXPECT_EQ(names.size(), 1u) << folder;
+    return names.empty() ? "" : device.root().read(folder + "/" + names[0]);
   };
-  const std::string structured = "var/spool/morvend/structured";
-  ASSERT_EQ(device.names(structured).size(), 1u);
-  EXPECT_TRUE(valuesOf(structured + "/" + device.names(structured)[0], "type").contains(176));
-
-  const auto summary = nlohmann::json::parse(nandinfo(device, "extract --monthly").out);
-  EXPECT_TRUE(summary.contains("msp_index"));
-  EXPECT_EQ(valuesOf("var/spool/morvend/events.jsonl", "event").size(), 9u);
+  EXPECT_NE(textOf(kSubmitted).find(";UserWamp:"), std::string::npos);
+  EXPECT_NE(textOf("var/spool/morvend/structured").find("\"type\": 176,"), std::string::npos);
+  EXPECT_NE(nandinfo(device, "extract --monthly").out.find("\"msp_index\""), std::string::npos);
+  std::set<std::string> events;
+  for (const std::string& line : linesOf(device.root().read("var/spool/morvend/events.jsonl"))) {
+    events.insert(nlohmann::json::parse(line)["event"]);
+  }
+  EXPECT_EQ(events.size(), 9u);
 }
 
 // Every command's output, complaints and exit status, one after the other.

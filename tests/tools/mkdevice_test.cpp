@@ -11,6 +11,7 @@
 #include "platform/Text.h"
 #include "platform/host/Host.h"
 #include "platform/host/JSON.h"
+#include "support/ControllerBuffers.h"
 #include "support/FreshErrors.h"
 #include "support/TemporaryFolder.h"
 #include "tools/demo/Device.h"
@@ -183,11 +184,8 @@ Fields statisticsOf(const Sample& sample, int hoursAgo) {
   for (const NANDInfo::FTLKey& row : NANDInfo::FTLKeyTable()) elements += row.elements;
   EXPECT_EQ(NANDInfo::ZMCFTLParseBufferToCxt(&context, std::as_bytes(std::span(bytes))), elements);
   EXPECT_STREQ(NANDInfo::GetAPIErrorMessage(), "NA");
-  Fields fields;
-  for (std::size_t i = 0; i < context.size(); ++i) {
-    fields[std::string(context[i].name)] = context[i].value;
-  }
-  return fields;
+  const auto fields = support::fieldsOf(context);
+  return {fields.begin(), fields.end()};
 }
 
 // A family row that swallows a counter by mistake shows as a relation that doesn't hold.
