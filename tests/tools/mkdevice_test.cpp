@@ -66,6 +66,11 @@ TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
     EXPECT_NE(files.at(support::kCountersDatabase), others.at(support::kCountersDatabase));
     EXPECT_FALSE(files.contains(support::kCountersDatabase + std::string("-shm")));
 
+    const auto yesterday = demo::Device(folder / "a").recorded(kToday - 1, kToday - 1);
+    const auto times = static_cast<std::size_t>(scale);
+    EXPECT_TRUE(days > 0 || yesterday.scalars.size() == scalarTable().size() * times);
+    EXPECT_EQ(yesterday.distributions.size(), distributionTable().size() * times);
+
     platform::host::Host host({.root = folder / "a"});
     std::vector<std::int32_t> recorded;
     host.counters().history()->scalarsForKeyPrefix(
