@@ -13,6 +13,8 @@ using Lines = std::vector<std::string>;
 
 class PelloranCommand : public testing::Test {
  protected:
+  PelloranCommand() { here.clock.secondsSince1970 = 20000 * 86400.0 + 3600; }
+
   int run(std::vector<std::string> arguments, const std::string& input = "") {
     std::vector<const char*> argv = {"pelloran"};
     for (const auto& argument : arguments) argv.push_back(argument.c_str());
