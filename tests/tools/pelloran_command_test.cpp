@@ -13,7 +13,7 @@ using Lines = std::vector<std::string>;
 
 class PelloranCommand : public testing::Test {
  protected:
-  PelloranCommand() { here.clock.secondsSince1970 = 20000 * 86400.0 + 3600; }
+  PelloranCommand() { here.clock.seconds = 20000 * 86400.0 + 3600; }
 
   int run(std::vector<std::string> arguments, const std::string& input = "") {
     std::vector<const char*> argv = {"pelloran"};
