@@ -45,6 +45,11 @@ struct DailyTelemetryTest : ::testing::Test {
     return platform.journal;
   }
 
+  void addController() {
+    platform.registry.add({.className = "NorbaEmbeddedNVMeController",
+                           .properties = {{"Controller Characteristics", Dictionary()}}});
+  }
+
   support::TestPlatform platform;
 };
 
@@ -77,8 +82,7 @@ TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReports
   EXPECT_EQ(recorded("").size(), kDiskUsage);
   EXPECT_EQ(platform.log.count(kFailure), 1);
 
-  platform.registry.add({.className = "NorbaEmbeddedNVMeController",
-                         .properties = {{"Controller Characteristics", Dictionary()}}});
+  addController();
   for (const std::uint32_t method : {8, 9}) {
     platform.registry.alwaysTunnels(method, 13, 0, support::words({support::header(1, 1), 7}));
   }
@@ -104,8 +108,7 @@ TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReports
 
 // The beginnings of what each leaves, where lines of one follow each other only the first.
 TEST_F(DailyTelemetryTest, RunsItsCollectorsInOrder) {
-  platform.registry.add({.className = "NorbaEmbeddedNVMeController",
-                         .properties = {{"Controller Characteristics", Dictionary()}}});
+  addController();
   platform.registry.alwaysTunnels(9, 13, 0, support::words({support::header(1, 1), 7}));
   platform.registry.alwaysTunnels(9, 15, 0, support::defectsList(2, {{0, 0, 0, 0, 0, 0, 0, 0}}));
   platform.kernel.deliveries[kNextEvent] = {{0, event(1, 0)}};

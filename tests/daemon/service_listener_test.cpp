@@ -20,14 +20,6 @@ Dictionary run(std::int64_t day) { return {{"operation", 1}, {"value", day}}; }
 
 Dictionary deliver(Array apps) { return {{"operation", 2}, {"app_data", std::move(apps)}}; }
 
-Dictionary application(const char* bundle) {
-  return {{"bundle_id", bundle},
-          {"version", "1.0"},
-          {"orlo_id", std::int64_t{7}},
-          {"arch", std::uint64_t{2}},
-          {"uuid", Data{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 255}}};
-}
-
 class ServiceTest : public ::testing::Test {
  protected:
   ServiceTest() {
@@ -111,28 +103,22 @@ TEST_F(ServiceTest, ActsOnMessagesAsTheHandshakeSays) {
 }
 
 TEST_F(ServiceTest, HandsTheDeliveredApplicationsToTheReport) {
-  const auto lines = serve(
-      {operation(0),
-       deliver({application("com.b"), Value("not a dictionary"),
-                Dictionary{{"version", 5}, {"uuid", Data{1, 2}}, {"orlo_id", true}, {"arch", 9.0}},
-                application("com.a")})});
-  const std::string uuid = "00010203-0405-0607-0809-0a0b0c0d0eff";
-  auto entry = [&](const char* bundle) {
-    return Dictionary{{"bundle", bundle},
-                      {"version", "1.0"},
-                      {"orloID", std::int64_t{7}},
-                      {"arch", std::int64_t{2}},
-                      {"uuid", uuid}};
-  };
+  const Dictionary sent{{"bundle_id", "com.b"},
+                        {"version", "1.0"},
+                        {"orlo_id", std::int64_t{7}},
+                        {"arch", std::uint64_t{2}},
+                        {"uuid", Data{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 255}}};
+  const Dictionary wrong{{"version", 5}, {"uuid", Data{1, 2}}, {"orlo_id", true}, {"arch", 9.0}};
+  const auto lines = serve({operation(0), deliver({sent, "not a dictionary", wrong, sent})});
+  const Dictionary taken{{"bundle", "com.b"},
+                         {"version", "1.0"},
+                         {"orloID", 7},
+                         {"arch", 2},
+                         {"uuid", "00010203-0405-0607-0809-0a0b0c0d0eff"}};
+  const Dictionary empty{{"bundle", ""}, {"version", ""}, {"orloID", 0}, {"arch", 0}, {"uuid", ""}};
+  const Array expected{taken, empty, taken};
   ASSERT_EQ(platform.submission.logs.size(), 1u);
   const auto log = platform.parse(platform.submission.logs[0].contents);
-  const Array expected{entry("com.b"),
-                       Dictionary{{"bundle", ""},
-                                  {"version", ""},
-                                  {"orloID", std::int64_t{0}},
-                                  {"arch", std::int64_t{0}},
-                                  {"uuid", ""}},
-                       entry("com.a")};
   ASSERT_NE(log.array("PLActivatedAppInfo"), nullptr);
   EXPECT_EQ(*log.array("PLActivatedAppInfo"), expected);
   EXPECT_EQ(lines.at(1), "morvend got requestedAAI:\n" + description(Value(expected)));

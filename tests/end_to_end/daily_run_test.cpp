@@ -100,7 +100,9 @@ TEST(DailyRun, SubmitsTheDayOnceAndLeavesTheRecordsBehind) {
   device.run("morvend", {"-f"});
   const auto logs = device.dailyLogs();
   ASSERT_EQ(logs.size(), 2u);
-  EXPECT_EQ(logs[1].text("PLTaskID") != nullptr ? *logs[1].text("PLTaskID") : "", "T1");
+  EXPECT_EQ(*logs[1].find("PLTaskID"), Value("T1"));
+  EXPECT_EQ(*logs[1].find("PLTaskDigest"), Value("D1"));
+  EXPECT_EQ(logs[1].array("PLTasking")->size(), 3u);
   EXPECT_EQ(device.names(kSubmitted).size(), 5u)
       << "the same version carries no options, and the storage log is weekly";
 }

@@ -55,11 +55,7 @@ TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
   }
 }
 
-TEST(Number, ConvertsBetweenItsTypes) {
-  EXPECT_EQ(Number(std::int32_t{-1}).uint64Value(), UINT64_MAX);
-  EXPECT_EQ(Number(UINT64_MAX).int64Value(), -1);
-  EXPECT_EQ(Number(UINT64_MAX).doubleValue(), 0x1p64);
-  EXPECT_EQ(Number(true).doubleValue(), 1.0);
+TEST(Number, IsTrueUnlessItIsZero) {
   EXPECT_TRUE(Number(0.25).boolValue());
   EXPECT_FALSE(Number(-0.0).boolValue());
   EXPECT_TRUE(Number(std::int64_t{1} << 40).boolValue());

@@ -51,7 +51,7 @@ class Mutator {
           bytes.resize(below(8) == 0 ? below(bytes.size()) : page);
           break;
         case 1:
-          zeroPage(bytes, page);
+          bytes.replace(page, 4096, std::min<std::size_t>(4096, bytes.size() - page), '\0');
           break;
         case 2:
           bytes.replace(page, 4096, bytes, below(bytes.size()) / 4096 * 4096, 4096);
@@ -66,11 +66,6 @@ class Mutator {
   }
 
  private:
-  static void zeroPage(std::string& bytes, std::size_t page) {
-    const std::size_t length = std::min<std::size_t>(4096, bytes.size() - page);
-    bytes.replace(page, length, length, '\0');
-  }
-
   std::mt19937 random_;
 };
 
