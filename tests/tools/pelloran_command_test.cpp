@@ -38,16 +38,10 @@ class PelloranCommand : public testing::Test {
 };
 
 TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
-  const char* const commands[] = {"set a 5",
-                                  "add a -7",
-                                  "add b -3 --day 2024-02-29",
-                                  "set c 9223372036854775807 --day yesterday",
-                                  "add c 1 --day=19999",
-                                  "push d -1.5e3 --day today",
-                                  "push d 2 --seconds 86399",
-                                  "push d 3 --seconds 0",
-                                  "set -- -dash 1"};
-  for (const char* command : commands) {
+  for (const char* command : {"set a 5", "add a -7", "add b -3 --day 2024-02-29",
+                              "set c 9223372036854775807 --day yesterday", "add c 1 --day=19999",
+                              "push d -1.5e3 --day today", "push d 2 --seconds 86399",
+                              "push d 3 --seconds 0", "set -- -dash 1"}) {
     EXPECT_EQ(run(argumentsOf(command)), 0) << err;
     EXPECT_EQ(out + err, "");
   }
@@ -56,39 +50,20 @@ TEST_F(PelloranCommand, ChangesAreRecordedUnderTheDayAndSecondThatWereMeant) {
 }
 
 TEST_F(PelloranCommand, WrongUsageIsSaidInOneLineWithAHintAndWritesNothing) {
-  std::vector<std::string> commands = {"",
-                                       "take a 1",
-                                       "set a",
-                                       "set a 1 2",
-                                       "set a 5.5",
-                                       "set a 5x",
-                                       "set a ",
-                                       "set  5",
-                                       "set \xc0\x80 5",
-                                       "set \xed\xa0\x80 5",
-                                       "set cut\xe2\x82 5",
-                                       "add a 9223372036854775808",
-                                       "set a 1 --seconds 1",
-                                       "show extra",
-                                       "push a nan",
-                                       "push a inf",
-                                       "push a 1e999",
-                                       "push a 1 --seconds 86400",
-                                       "push a 1 --seconds -1",
-                                       "sample --every 1",
-                                       "sample --for 1",
-                                       "sample --every 0 --for 1",
-                                       "sample --every 1 --for nan",
-                                       "add a 1 --day=-1",
-                                       "show --day -1"};
-  for (const char* day :
-       {"", "2147483648", "tomorrow", "-1", "1969-12-31", "2026-02-29", "2026-11-22T00:00:00Z"}) {
-    commands.push_back(std::string("set a 1 --day ") + day);
-  }
-  commands.push_back("set " + std::string(1025, 'k') + " 5");
-  EXPECT_EQ(run({}), 2);
-  for (const std::string& command : commands) {
-    EXPECT_EQ(run(argumentsOf(command)), 2) << command;
+  const std::string longKey(1025, 'k');
+  auto commands = argumentsOf(
+      {{"", {"", "take a 1", "add a 9223372036854775808", "add a 1 --day=-1"}},
+       {"set ",
+        {"a", "a 1 2", "a 5.5", "a 5x", "a ", " 5", "\xc0\x80 5", "\xed\xa0\x80 5", "cut\xe2\x82 5",
+         longKey + " 5", "a 1 --seconds 1"}},
+       {"set a 1 --day ",
+        {"", "2147483648", "tomorrow", "-1", "1969-12-31", "2026-02-29", "2026-11-22T00:00:00Z"}},
+       {"push a ", {"nan", "inf", "1e999", "1 --seconds 86400", "1 --seconds -1"}},
+       {"show ", {"extra", "--day -1"}},
+       {"sample ", {"--every 1", "--for 1", "--every 0 --for 1", "--every 1 --for nan"}}});
+  commands.emplace_back();
+  for (const auto& command : commands) {
+    EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
     EXPECT_TRUE(err.starts_with("pelloran: ")) << err;
     EXPECT_TRUE(err.ends_with(" --help')\n")) << err;
     EXPECT_EQ(std::count(err.begin(), err.end(), '\n'), 1) << err;
