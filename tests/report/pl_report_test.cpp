@@ -47,9 +47,12 @@ class PLReportTest : public ::testing::Test {
                                   Dictionary{{"intervals", Array{Value(10), Value(100)}}}}}}}}});
   }
 
-  void write(const ActivatedAppInfo* appInfo = nullptr) {
+  // What the last log holds then.
+  Dictionary write(const ActivatedAppInfo* appInfo = nullptr) {
     morvend::DeviceContext context(platform.platform);
     PLReport(platform.platform, context).writeLogForYesterday(kDay, appInfo);
+    const auto& logs = platform.submission.logs;
+    return logs.empty() ? Dictionary() : platform.parse(logs.back().contents);
   }
 
   std::string digestOfWhitelist() {
@@ -144,9 +147,7 @@ TEST_F(PLReportTest, SaysHowManyKeysAnInternalBuildAddsToTheWhitelist) {
   write();
   EXPECT_EQ(platform.log.count("internal build"), 0);
   platform.device.internalBuild = true;
-  write();
-  const auto log = platform.parse(platform.submission.logs.back().contents);
-  const std::size_t own = log.dictionary("PLScalars")->size() - 3;
+  const std::size_t own = write().dictionary("PLScalars")->size() - 3;
   EXPECT_GT(own, 5u);
   EXPECT_EQ(platform.log.count("default: reporting " + std::to_string(own + 2) +
                                " keys that no whitelist entry names: this is an internal build"),
@@ -182,12 +183,11 @@ TEST_F(PLReportTest, RecordsTheVersionOnlyWithALog) {
 TEST_F(PLReportTest, GoesOnWithoutAHistogramWhenMemoryIsShort) {
   platform.history.distributions = {{{kDay, "counted"}, {1, 2}}};
   allocationsFail = true;
-  write();
+  const Dictionary log = write();
   allocationsFail = false;
   EXPECT_EQ(platform.log.count("default: Couldn't allocate histCounts for key counted. Will not "
                                "calculate histogram values"),
             1);
-  const auto log = platform.parse(platform.submission.logs.at(0).contents);
   EXPECT_EQ(log.dictionary("PLDistributions")->size(), 1u);
   EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
 }
@@ -195,8 +195,7 @@ TEST_F(PLReportTest, GoesOnWithoutAHistogramWhenMemoryIsShort) {
 // A later row without samples takes the histogram of an earlier day's row away.
 TEST_F(PLReportTest, ReplacesEarlierRowsWhole) {
   platform.history.distributions = {{{kDay - 1, "counted"}, {1, 2}}, {{kDay, "counted"}, {}}};
-  write();
-  const auto log = platform.parse(platform.submission.logs.at(0).contents);
+  const Dictionary log = write();
   EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
   EXPECT_EQ(log.dictionary("PLDistributions")->array("counted")->at(4), Value(0));
 }
@@ -316,8 +315,7 @@ TEST_F(PLReportTest, AddsEachOfItsOwnValuesFromItsSource) {
       {{"Group", Dictionary{{"ScalarKeys", Dictionary{{"exact", Dictionary()}}},
                             {"ScalarKeyPrefixes", Dictionary{{"com.norba.", Dictionary()}}}}}});
   platform.history.scalars = {{{kDay, "exact"}, 1}};
-  write();
-  const auto log = platform.parse(platform.submission.logs.at(0).contents);
+  const Dictionary log = write();
   for (const auto& [key, value] : *log.dictionary("PLScalars")) {
     reported.push_back(key + " " + description(value));
   }
@@ -378,10 +376,7 @@ TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
 
 TEST_F(PLReportTest, ReadsGatesAlwaysAndValuesOnlyWhenWhitelisted) {
   for (const KernelCounter& row : kTagCheckCounters) platform.kernel.integers[row.name] = 1;
-  platform.whitelistScalars({"com.norba.kernel.vmtc_1_byte"});
-  morvend::DeviceContext context(platform.platform);
-  PLReport report(platform.platform, context);
-  report.reportVMStats();
+  collect({"com.norba.kernel.vmtc_1_byte"}, &PLReport::reportVMStats);
   EXPECT_EQ(platform.kernel.reads,
             (std::vector<std::string>{"vm.vmtc_total", "vm.vmtc_1_byte",
                                       "kern.memorystatus_freeze_pageouts",

@@ -63,7 +63,6 @@ TEST(BusMessage, EachTypeBecomesItsCounterpartAndOthersAreLeftOut) {
       {"ay", variant("ay", 2, 1, 2), Value(Data{1, 2})},
       {"empty ay", variant("ay", 0), Value(Data{})},
       {"as", variant("as", 2, "a", "b"), Value(Array{"a", "b"})},
-      {"ai", variant("ai", 1, 5), Value(Array{std::int64_t{5}})},
       {"aai", variant("aai", 1, 1, 5), Value(Array{Array{std::int64_t{5}}})},
       {"av with a struct", variant("av", 2, "(is)", 1, "x", "s", "y"), Value(Array{"y"})},
       {"v in v", variant("v", "v", "i", 5), Value(std::int64_t{5})},

