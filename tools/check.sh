@@ -8,10 +8,8 @@ failed=0
 echo "== formatting"
 sources | xargs clang-format --dry-run --Werror || failed=1
 
-# Each other's pages are found where they are installed.
 echo "== manual pages"
-complaints=$(mandoc -Tlint packaging/man/*.[1-8] | grep -v 'referenced manual not found' || true)
-[ -z "$complaints" ] || { echo "$complaints"; failed=1; }
+tools/check_pages.sh || failed=1
 
 # Which room may include what: the room's folder, then the folders that it must not name. The build
 # enforces the same with its include folders; this also sees the system's headers.
