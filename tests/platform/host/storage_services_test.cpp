@@ -34,22 +34,17 @@ TEST_F(StorageServices, ASnapshotIsTheFileOrAFailure) {
 }
 
 TEST_F(StorageServices, PurgeableSpaceIsPresentWithItsFileAndAnswersWithADictionary) {
-  const Dictionary amounts{{"SPACEREAP_TOTAL_AVAILABLE", std::int64_t{5}}};
-  const struct {
-    std::optional<Value> file;
-    bool present, answers;
-  } rows[] = {
-      {std::nullopt, false, false}, {Value(amounts), true, true}, {Value(Array{}), true, false}};
-  for (const auto& row : rows) {
-    if (row.file) folder.write("device/purgeable-space.plist", *codec.writeXML(*row.file));
+  const Value amounts(Dictionary{{"SPACEREAP_TOTAL_AVAILABLE", std::int64_t{5}}});
+  EXPECT_FALSE(HostPurgeableSpace(root, codec, log).isPresent());
+  for (const Value& file : {amounts, Value(Array{})}) {
+    folder.write("device/purgeable-space.plist", *codec.writeXML(file));
     HostPurgeableSpace service(root, codec, log);
-    EXPECT_EQ(service.isPresent(), row.present);
-    EXPECT_EQ(service.SpacereapCopyItemizedPurgeableSpaceWithInfo({}),
-              row.answers ? std::optional(amounts) : std::nullopt);
+    EXPECT_TRUE(service.isPresent());
+    const auto answer = service.SpacereapCopyItemizedPurgeableSpaceWithInfo({});
+    EXPECT_EQ(answer ? *answer : Value(Array{}), file);
   }
 }
 
-// A byte count is a signed number; a figure that is too large is the largest.
 TEST_F(StorageServices, DiskFiguresOfARecordedDeviceAreThoseOfItsProperties) {
   using Figures = std::array<std::optional<std::int64_t>, 3>;
   const auto entry = [](const char* name, Array figures) {
