@@ -13,6 +13,7 @@
 #include <memory>
 #include <vector>
 
+#include "platform/Text.h"
 #include "platform/host/Files.h"
 
 namespace platform::host {
@@ -21,6 +22,7 @@ namespace {
 
 constexpr char kEventsFolder[] = "device/ecc-events";
 constexpr char kRejected[] = "rejected";
+constexpr std::size_t kEventSize = 72;  // at most
 constexpr std::size_t kSwapUsageSize = 32;
 
 Kernel::ReadResult failure(int error) { return {error, 0}; }
@@ -105,9 +107,11 @@ const Value* HostKernel::deviceValue(std::string_view name) {
 std::optional<Kernel::ReadResult> HostKernel::nextEvent(std::span<std::byte> buffer) {
   // Events are taken away, so the folder is one that is written to.
   const FileDescriptor folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
+  // The events are asked for until there is none: what is in the way is said once.
   const auto say = [this](const std::string& name, const std::string& what) {
-    log_.log(LogLevel::error, "%s%s%s: %s", kEventsFolder, name.empty() ? "" : "/",
-             shownText(name).c_str(), what.c_str());
+    if (!saidEvents_.insert(name).second) return;
+    const std::string path = root_.hostPath(kEventsFolder) + (name.empty() ? "" : "/" + name);
+    log_.log(LogLevel::error, "%s: %s", shownText(path).c_str(), what.c_str());
   };
   if (!folder) {
     if (errno != ENOENT) say("", errorText(errno));
@@ -118,17 +122,21 @@ std::optional<Kernel::ReadResult> HostKernel::nextEvent(std::span<std::byte> buf
   for (const std::string& name : names) {
     if (name == kRejected) continue;
     const FileDescriptor file = root_.openForReading(kEventsFolder + ("/" + name));
-    const auto bytes = file ? readRegularFile(file.get(), buffer.size() + 1)
+    const auto bytes = file ? readRegularFile(file.get(), kEventSize + 1)
                             : Result<std::string>::failure(errorText(errno));
     if (!bytes) {
       say(name, bytes.error);
       continue;
     }
-    if (bytes->size() > buffer.size()) {
-      say(name, "longer than an event; moved to rejected/");
-      if (const int error = reject(folder.get(), name)) say(name, errorText(error));
+    if (bytes->size() > kEventSize) {
+      const int error = reject(folder.get(), name);
+      say(name, error == 0 ? "longer than an event; moved to rejected/"
+                           : format("longer than an event, and can't be moved to rejected/: %s",
+                                    errorText(error)));
       continue;
     }
+    // It stays for a caller with room for it.
+    if (bytes->size() > buffer.size()) return failure(ENOMEM);
     // Removed first: an event that stays would be delivered again and again.
     if (::unlinkat(folder.get(), name.c_str(), 0) != 0) {
       const int error = errno;

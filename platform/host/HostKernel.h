@@ -2,6 +2,9 @@
 // machine has a true equivalent of.
 #pragma once
 
+#include <set>
+#include <string>
+
 #include "platform/Kernel.h"
 #include "platform/host/DeviceFile.h"
 
@@ -17,7 +20,8 @@ class HostKernel : public Kernel {
   // that nothing is known of fails with ENOENT.
   //
   // "kern.next_ecc_event" delivers the next file of device/ecc-events/ and removes it; one that
-  // doesn't fit is said and moved to the folder rejected/ there.
+  // doesn't fit stays. One that is longer than an event is said and moved to the folder rejected/
+  // there.
   ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override;
 
   std::uint64_t pageSize() override;
@@ -32,6 +36,7 @@ class HostKernel : public Kernel {
   const DeviceRoot& root_;
   SystemLog& log_;
   DeviceFile values_;
+  std::set<std::string> saidEvents_;  // the files of events that were complained of
 };
 
 }  // namespace platform::host

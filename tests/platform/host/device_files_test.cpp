@@ -154,12 +154,24 @@ TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
   EXPECT_EQ(read().error, EBUSY);
   EXPECT_EQ(folder.read("linked"), "linked");
   EXPECT_EQ(folder.read("device/ecc-events/rejected/1-long-2").size(), 73u);
-  EXPECT_EQ(log.count("error: device/ecc-events/1-long: longer than an event"), 1);
-  EXPECT_EQ(log.count("error: device/ecc-events/1-out: No such file"), 4);
+  const std::string events = "error: " + (folder / "device/ecc-events").string();
+  EXPECT_EQ(log.count(events + "/1-long: longer than an event; moved"), 1);
+  EXPECT_EQ(log.count(events + "/1-out: No such file"), 1);
+  // One that the caller has no room for stays, and one that can't be moved.
+  buffer.resize(40);
+  folder.write("device/ecc-events/3", std::string(72, '3'));
+  EXPECT_EQ(read().error, ENOMEM);
+  std::filesystem::remove_all(folder / "device/ecc-events/rejected");
+  folder.write("device/ecc-events/rejected", "in the way");
+  folder.write("device/ecc-events/0", std::string(73, '0'));
+  buffer.resize(72);
+  EXPECT_EQ(read().length, 72u);
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(log.count(events + "/0: longer than an event, and can't be moved to rejected/"), 1);
   std::filesystem::rename(folder / "device/ecc-events", folder / "device/elsewhere");
   std::filesystem::create_symlink("elsewhere", folder / "device/ecc-events");
   EXPECT_EQ(read().error, EBUSY);
-  EXPECT_EQ(log.count("error: device/ecc-events: too many links"), 1);
+  EXPECT_EQ(log.count(events + ": too many links"), 1);
 }
 
 TEST_F(DeviceFiles, DevicePropertiesAndContainers) {

@@ -68,13 +68,27 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
   folder.write(kStructured + std::string("2026-11-20.jsonl"), lines);
   logs.dumpAllOldStructuredDataLogs();
   std::string whole;
-  for (const char* part : {"", "-4", "-3", "-2"}) {
+  for (const char* part : {"", "-2", "-3", "-4"}) {
     const std::string text = submitted("structured-2026-11-20" + std::string(part) + ".jsonl");
     EXPECT_LE(text.size(), std::size_t{16} << 20);
-    whole.insert(0, text);
+    whole += text;
   }
+  EXPECT_TRUE(whole == lines);
   EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-20.jsonl has"), 1);
   EXPECT_EQ(log.lines().size(), 1u);
+  EXPECT_EQ(submitted("kept"), "kept");
+  // More than the spool holds: its newest end, beside the logs that are there.
+  std::filesystem::remove_all(folder / kSubmitted);
+  folder.write(kSubmitted + std::string("kept"), "kept");
+  folder.write(kStructured + std::string("2026-11-19.jsonl"), "");
+  std::filesystem::resize_file(folder / kStructured / "2026-11-19.jsonl", std::uintmax_t{1} << 36);
+  folder.write(kStructured + std::string("2026-11-20.jsonl"), lines);
+  logs.dumpAllOldStructuredDataLogs();
+  EXPECT_EQ(submitted("structured-2026-11-19.jsonl").size(),
+            (std::size_t{48} << 20) - lines.size());
+  EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-19.jsonl has 68719476736 "
+                      "bytes: the first 686"),
+            1);
   EXPECT_EQ(submitted("kept"), "kept");
 }
 
