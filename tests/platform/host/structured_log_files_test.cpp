@@ -87,7 +87,7 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
   EXPECT_EQ(submitted("structured-2026-11-19.jsonl").size(),
             (std::size_t{48} << 20) - lines.size());
   EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-19.jsonl has 68719476736 "
-                      "bytes: the first 686"),
+                      "bytes: the first 6871318"),
             1);
   EXPECT_EQ(submitted("kept"), "kept");
 }
