@@ -22,8 +22,6 @@ using Lines = std::vector<std::string>;
 constexpr char kDomain[] = "com.norba.quenset.morvend";
 constexpr char kBaseline[] = "netUsageBaseline";
 
-constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
-constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
 constexpr double kDay = 86400, kToday = 20000 * kDay, kYesterday = kToday - kDay;
 
 Dictionary usage(Dictionary named, double since, const std::vector<Value>& counts) {
@@ -75,9 +73,9 @@ TEST(DataUsageChanges, AreTheDifferencesToTheDayBefore) {
       {"an empty entry", Array{}, kToday, {old}, {"wifiInKB.b 1"}},
       {"no entry", "text", since, {old}, {"olddata.b 1"}},
       {"large",
-       Array{long_ago, 0, kLeast, 1, -1},
+       Array{long_ago, 0, INT64_MIN, 1, -1},
        since,
-       {big, kMost, kLeast, kMost},
+       {big, INT64_MAX, INT64_MIN, INT64_MAX},
        {"wifiInKB.b 1073741824", "baddata.b 1", "wwanInKB.b 9007199254740991", "baddata.b 1"}},
       {"beyond 63 bits",
        kNone,

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <limits>
 #include <new>
 
 #include "report/KernelCounters.h"
@@ -321,7 +320,6 @@ TEST_F(PLReportTest, AddsEachOfItsOwnValuesFromItsSource) {
 
 // Every gate of the memory statistics, with the kernel values that make it what it is.
 TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
-  constexpr auto kMax = std::numeric_limits<std::int64_t>::max();
   using Integers = std::map<std::string, std::uint64_t, std::less<>>;
   const std::string frozen = "kern.memorystatus_freeze_pageouts",
                     thaws = "kern.memorystatus_thaw_count_since_boot",
@@ -343,15 +341,15 @@ TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
       {"kernel.memorystatus_freeze_pageouts", {}, {}},
       {"memorystatus_freezer_thaws_per_gb", {{frozen, 262143}, {thaws, 9}}, {}},
       {"memorystatus_freezer_thaws_per_gb", {{frozen, 262144 * 2}, {thaws, 9}}, 4},
-      {"memorystatus_freezer_thaws_per_gb", {{frozen, 262144}}, kMax},
+      {"memorystatus_freezer_thaws_per_gb", {{frozen, 262144}}, INT64_MAX},
       {"kernel.memorystatus_freeze_budget_pages_remaining", {}, -1},
       {"kernel.memorystatus_thaw_count", {}, 4294967295},
       {"kernel.swapusage", {}, -1},
       {"memorystatus_freezer_error_other_count", {{other, 5}}, {}},
       {"memorystatus_freezer_error_other_count", {{considered, 3}, {other, 2}}, 66},
-      {"memorystatus_freezer_error_other_count", {{considered, 0}, {other, 2}}, kMax},
+      {"memorystatus_freezer_error_other_count", {{considered, 0}, {other, 2}}, INT64_MAX},
       {"memorystatus_freezer_error_other_count", {{considered, 0}, {other, 0}}, 0},
-      {"memorystatus_freezer_error_other_count", {{considered, 100}}, kMax},
+      {"memorystatus_freezer_error_other_count", {{considered, 100}}, INT64_MAX},
       {"memorystatus_freezer_process_considered_count", {{considered, ~0ull}}, -1},
       {"memorystatus_freezer_skipped_full_count", {{skipped, 2}}, {}},
       {"memorystatus_freezer_thaw_percentage", {}, -1},

@@ -4,8 +4,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <limits>
-
 #include "HostServices.h"
 
 namespace platform::host {
@@ -114,14 +112,12 @@ TEST_F(PreferenceFilesTest, TwoProcessesLoseNoneOfEachOthersKeysAndAdditions) {
 }
 
 TEST_F(PreferenceFilesTest, AdditionsSaturateAndBeginAtZero) {
-  folder.write(kFile, xml({{"full", std::numeric_limits<std::int64_t>::max()}, {"text", "7"}}));
+  folder.write(kFile, xml({{"full", INT64_MAX}, {"text", "7"}}));
   PreferenceFiles files(root, codec, log);
   set(files, "pending", 40);
   for (const char* key : {"full", "text", "pending", "new"}) files.addToInteger(key, kDomain, 2);
-  EXPECT_EQ(folder.read(kFile), xml({{"full", std::numeric_limits<std::int64_t>::max()},
-                                     {"text", 2},
-                                     {"pending", 42},
-                                     {"new", 2}}));
+  EXPECT_EQ(folder.read(kFile),
+            xml({{"full", INT64_MAX}, {"text", 2}, {"pending", 42}, {"new", 2}}));
 }
 
 TEST_F(PreferenceFilesTest, AFileCutAnywhereReadsAsEmptyIsKeptAndSaidOnce) {
