@@ -50,14 +50,20 @@ class FakeCounters : public CountersService {
 
   // What was recorded, in order: "set <key> <value>", "add <key> <value>".
   std::vector<std::string> records;
+  bool areInJournal = false;  // there, too
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override {
-    records.push_back("set " + std::string(key) + " " + std::to_string(value));
+    record("set " + std::string(key) + " " + std::to_string(value));
   }
   void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override {
-    records.push_back("add " + std::string(key) + " " + std::to_string(value));
+    record("add " + std::string(key) + " " + std::to_string(value));
   }
 
  private:
+  void record(std::string text) {
+    if (areInJournal) journal_.push_back(text);
+    records.push_back(std::move(text));
+  }
+
   Journal& journal_;
 };
 

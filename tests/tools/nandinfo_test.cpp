@@ -305,7 +305,7 @@ TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
     platform::DriverStatus openStatus;
     const char* standing;  // the only command that is answered
   } states[] = {
-      {"no storage controller found: the device registry names none of Norba", false, 0, "x"},
+      {"no storage controller found: the device registry offers none of Norba", false, 0, "x"},
       {"the storage controller NorbaQRT3NVMeController can't be opened (status 0xd)", true, 13,
        "x"},
       {"the storage controller NorbaQRT3NVMeController answers no command (status 0x2d)", true, 0,
@@ -346,6 +346,10 @@ TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
   registry.add({.className = support::kQRT3});
   EXPECT_EQ(run({"recommends-deletion"}), 0);
   EXPECT_EQ(out + err, "false\n");
+  registry.root->children.back().openStatus = 13;
+  EXPECT_EQ(run({"recommends-deletion"}), 1);
+  EXPECT_NE(err.find("can't be opened (status 0xd)"), std::string::npos) << err;
+  registry.root->children.back().openStatus = 0;
   registry.alwaysTunnels(9, 13, 0, support::words({1}));
   for (const char* whom : {"lab", "ota"}) {
     EXPECT_EQ(run({"health", whom}), 1);

@@ -106,14 +106,14 @@ TEST_F(PelloranCommand, AnImportIsRecordedWholeOrNamesTheLineThatStoppedIt) {
 
 TEST_F(PelloranCommand, ShowOrdersScalarsAndDistributionsTogether) {
   here.store.set("b", 2, 1);
-  here.store.set("a\n\x7f\"", 1, 1);
+  here.store.set("a\n\xc2\x9b\"", 1, 1);
   here.store.set("c", 3, 0);
   here.store.push("b", 4, 1, 9);
   here.store.push("b", 1e22, 1, 8);
   EXPECT_EQ(run({"show", "--json"}), 0);
   EXPECT_EQ(out,
             "{\"day\": 0, \"key\": \"c\", \"value\": 3}\n"
-            "{\"day\": 1, \"key\": \"a\\n\x7f\\\"\", \"value\": 1}\n"
+            "{\"day\": 1, \"key\": \"a\\n\\u009b\\\"\", \"value\": 1}\n"
             "{\"day\": 1, \"key\": \"b\", \"value\": 2}\n"
             "{\"day\": 1, \"key\": \"b\", \"samples\": [[9, 4.0], [8, 1e+22]]}\n");
   EXPECT_EQ(run({"show", "--day", "1"}), 0);

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <iterator>
 
+#include "platform/Text.h"
 #include "platform/host/UTF8.h"
 
 namespace tools {
@@ -100,6 +101,15 @@ std::string cutToColumns(std::string text, std::size_t most) {
     if (columns < most) kept = at;
   }
   return text;
+}
+
+std::string printableJSON(std::string json) {
+  for (std::size_t i = 0; (i = json.find_first_of("\x7f\xC2", i)) != std::string::npos; ++i) {
+    const bool ascii = json[i] == '\x7f';
+    const auto code = static_cast<unsigned char>(json[ascii ? i : i + 1]);
+    if (ascii || code < 0xA0) json.replace(i, ascii ? 1 : 2, platform::format("\\u%04x", code));
+  }
+  return json;
 }
 
 }  // namespace tools

@@ -12,6 +12,10 @@ namespace tools {
 // those that turn the direction of writing; U+FFFD for what isn't UTF-8.
 std::string printable(std::string_view text);
 
+// JSON in which the control characters that it may hold as they are, are escaped: those beyond
+// ASCII, which some terminals obey, and the one at its end.
+std::string printableJSON(std::string json);
+
 // The columns that a printable text takes: two for a wide character, none for one that combines
 // with the one before.
 std::size_t columnsOf(std::string_view text);

@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <CLI/CLI.hpp>
+#include <charconv>
 #include <filesystem>
 #include <iostream>
 #include <span>
@@ -42,7 +43,15 @@ int main(int argc, char** argv) {
   app.set_version_flag("--version", "mkdevice " MORVEND_VERSION);
   app.add_option("DIR", options.folder, "the root's folder: empty, or not there yet")->required();
   app.add_option("--seed", options.sample.seed,
-                 "the same number on the same day makes the same device; default: 1");
+                 "the same number on the same day makes the same device; default: 1")
+      ->check([](const std::string& text) {
+        std::uint64_t seed = 0;
+        const char* const end = text.data() + text.size();
+        const auto [stop, error] = std::from_chars(text.data(), end, seed);
+        return error == std::errc() && stop == end
+                   ? ""
+                   : "'" + text + "' is no number from 0 to 2^64 - 1";
+      });
   app.add_option("--scale", options.sample.scale, "so many times the usual counters; default: 1")
       ->check(CLI::Range(1, mkdevice::kLargestScale));
   app.add_option("--days", options.days,

@@ -85,9 +85,15 @@ std::string ControllerWatch::problem() {
     }
   }
   if (found_.empty()) {
-    return "no storage controller found: the device registry names none of " + controllerNames();
+    return "no storage controller found: the device registry offers none of " + controllerNames();
   }
-  if (answered_ || stage_ == Stage::nothing || stage_ == Stage::opened) return {};
+  if (stage_ == Stage::nothing) {
+    // The library knew that it needn't ask. Whether it could have, is seen by opening.
+    const NANDInfo::RegistryHandle service(
+        platform_, NANDInfo::FindServiceUsingIterator(platform_, found_.c_str()));
+    const NANDInfo::DriverHandle connection(platform_, service.get());
+  }
+  if (answered_ || stage_ == Stage::opened) return {};
   const std::string status =
       lastFailure_ != 0 ? platform::format(" (status 0x%x)", lastFailure_) : std::string();
   return "the storage controller " + found_ +

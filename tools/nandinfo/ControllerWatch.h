@@ -26,7 +26,7 @@ class ControllerWatch : private platform::DeviceRegistry,
 
   // Why nothing that the library said can come from a controller: none is there, none can be
   // opened, or it answered no command. The empty text when one was asked and answered something, or
-  // when one is there and was asked nothing.
+  // when one that can be opened was asked nothing.
   std::string problem();
 
   // Events wait until a controller has answered; this sends those that still wait.

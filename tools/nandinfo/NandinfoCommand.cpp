@@ -91,17 +91,6 @@ bool isEmpty(const Value& value) {
   return dictionary != nullptr && dictionary->empty();
 }
 
-// JSON in which the control characters that it may hold as they are, are escaped: those beyond
-// ASCII, which some terminals obey, and the one at its end.
-std::string escaped(std::string json) {
-  for (std::size_t i = 0; (i = json.find_first_of("\x7f\xC2", i)) != std::string::npos; ++i) {
-    const bool ascii = json[i] == '\x7f';
-    const auto code = static_cast<unsigned char>(json[ascii ? i : i + 1]);
-    if (ascii || code < 0xA0) json.replace(i, ascii ? 1 : 2, platform::format("\\u%04x", code));
-  }
-  return json;
-}
-
 std::string shown(const CommandServices& services, const Command& command, Form form,
                   const CommandResult& result) {
   if (services.outIsTerminal && !form.json && !form.compact) {
@@ -117,7 +106,7 @@ std::string shown(const CommandServices& services, const Command& command, Form 
   } else {
     platform::host::appendIndentedJSON(json, *result);
   }
-  return escaped(std::move(json)) + '\n';
+  return tools::printableJSON(std::move(json)) + '\n';
 }
 
 std::string nameOf(const Command& command) {

@@ -45,7 +45,8 @@ std::vector<Row> rowsOf(platform::PLHistory& history, const Shown& shown, Scalar
 }
 
 std::string jsonText(std::string_view text) {
-  return nlohmann::json(text).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+  return tools::printableJSON(
+      nlohmann::json(text).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace));
 }
 
 // Always with a fraction or an exponent; what JSON has no number for is null.
