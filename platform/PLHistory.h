@@ -45,14 +45,17 @@ class PLHistory {
   virtual void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
                                          std::int32_t maxDaysSince1970,
                                          const DistributionRowHandler& rowHandler) = 0;
+
+  // Whether a query failed so far: what it delivered is not all that there is.
+  virtual bool failed() const = 0;
 };
 
 class HistoryStore {
  public:
   virtual ~HistoryStore() = default;
 
-  // Opens the history on the store's default database. Never null: a database that is not there, or
-  // can't be opened, reads as an empty history.
+  // Opens the history on the store's default database. Never null: a database that is not there
+  // reads as an empty history, one that can't be opened as one whose queries fail.
   virtual std::unique_ptr<PLHistory> initWithDefaultPath() = 0;
 };
 

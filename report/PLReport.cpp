@@ -30,6 +30,7 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
   const auto refuse = [&](std::string_view key) {
     if (isEmpty()) refused.emplace(key);
   };
+  bool unread = false;
   if (config_ != nullptr) {
     const auto history = platform_.history.initWithDefaultPath();
     const std::int32_t first = platform::dayBefore(day);
@@ -49,10 +50,12 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
             refuse(key);
           }
         });
+    unread = history->failed();
   }
   if (isEmpty()) {
     const std::string why =
         config_ == nullptr ? "the whitelist couldn't be read"
+        : unread           ? "the counters can't be read"
         : refused.empty()
             ? "no counter was recorded on that day or the day before"
             : platform::format("the whitelist names none of the %zu counters", refused.size());

@@ -20,8 +20,7 @@ using sqlite::Failure;
 namespace {
 
 constexpr char kName[] = "PLDataStore.sqlitedb";
-constexpr std::array<const char*, 3> kBeside = {
-    "PLDataStore.sqlitedb-wal", "PLDataStore.sqlitedb-shm", "PLDataStore.sqlitedb-journal"};
+constexpr std::array<const char*, 3> kBeside = {"-wal", "-shm", "-journal"};
 constexpr char kAside[] = "PLDataStore.sqlitedb.corrupt";
 constexpr char kLogAside[] = "PLDataStore.sqlitedb.corrupt-wal";
 
@@ -40,9 +39,22 @@ constexpr char kSchema[] =
     "CREATE INDEX packed_by_day ON packed(day, key);";
 constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
 
+constexpr char kNotRegular[] = "it, or a file beside it, is not a regular file";
+constexpr char kShared[] = "it, or a file beside it, is a file with several names";
+constexpr char kNoPath[] = "its path can't be read from /proc: ";
+
+// Where an open file or folder lies on the host; empty, with errno set, when nobody can say.
+std::string pathOfOpen(int file) {
+  std::array<char, PATH_MAX> path;
+  const ssize_t length =
+      ::readlink(format("/proc/self/fd/%d", file).c_str(), path.data(), path.size());
+  return length <= 0 ? "" : std::string(path.data(), static_cast<std::size_t>(length));
+}
+
 }  // namespace
 
-CounterDatabase::CounterDatabase(const CounterPlace& place) : place_(place) {}
+CounterDatabase::CounterDatabase(const CounterPlace& place, DeviceRoot::Links links)
+    : place_(place), links_(links), name_(kName) {}
 CounterDatabase::~CounterDatabase() = default;
 
 bool CounterDatabase::read(const Work& work) {
@@ -61,7 +73,7 @@ bool CounterDatabase::read(const Work& work) {
     failure = connection_->failure();
   }
   if (!failure) return true;
-  if (failure.kind == Failure::Kind::damaged) {
+  if (failure.kind == Failure::Kind::damaged && !linked_) {
     const FileLock lock(folder_.get());
     setAside(failure.text);
   } else {
@@ -112,18 +124,24 @@ std::string CounterDatabase::settle() {
   return error;
 }
 
-// False with an empty error: there is no home, or no folder, and none is to be made.
+// False with an empty error: there is nothing to be opened, and nothing is to be made.
 bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error) {
   if (folder_) return true;
   const bool creates = missing == DeviceRoot::Missing::create;
   const auto home = place_.home();
+  const bool reads = links_ == DeviceRoot::Links::followed;
   if (!home) {
-    if (creates) error = "there is no home folder for the counters database";
+    if (creates || reads) error = "there is no home folder for the counters database";
     return false;
   }
   const std::string folder = *home + "/Library/Pelloran";
   folderPath_ = place_.root.hostPath(folder);
   folder_ = place_.root.openFolder(folder, missing);
+  if (reads && (folder_ ? isLink(folder_.get(), kName) : errno == ELOOP)) {
+    error = follow(folder);
+    if (!error.empty()) folder_ = {};
+    return error.empty();
+  }
   if (folder_) return true;
   // EBADF: there is no device root.
   if (!creates && (errno == ENOENT || errno == EBADF)) return false;
@@ -131,10 +149,36 @@ bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error
   return false;
 }
 
+// Finds the file that links lead to, in its own folder and under its own name, beside which its log
+// lies. Returns the empty text or what went wrong.
+std::string CounterDatabase::follow(const std::string& folder) {
+  const FileDescriptor file = place_.root.openForStatus(folder + "/" + kName);
+  if (!file) {
+    return located(errno == ENOENT ? "a link to it leads nowhere within the device root"
+                                   : errorText(errno));
+  }
+  const std::string path = pathOfOpen(file.get());
+  const std::size_t slash = path.rfind('/');
+  struct stat status;
+  if (slash == path.npos || ::fstat(file.get(), &status) != 0) {
+    return located(kNoPath + std::string(errorText(errno)));
+  }
+  name_ = path.substr(slash + 1);
+  folder_ = FileDescriptor(
+      ::open(path.substr(0, slash + 1).c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!folder_) return located(errorText(errno));
+  linked_ = true;
+  const auto found = identity();
+  if (!found) return located(kNotRegular);
+  // The path was the machine's; the file is the one that was found below the root.
+  const bool same = found->device == status.st_dev && found->inode == status.st_ino;
+  return same ? std::string() : located("moved while it was looked for");
+}
+
 // The file that bears the database's name now; none, with errno set, when it isn't a regular file.
 std::optional<CounterDatabase::Identity> CounterDatabase::identity() const {
   struct stat status;
-  if (::fstatat(folder_.get(), kName, &status, AT_SYMLINK_NOFOLLOW) != 0) {
+  if (::fstatat(folder_.get(), name_.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
     if (errno == ENOENT) return Identity{};
     return std::nullopt;
   }
@@ -142,20 +186,12 @@ std::optional<CounterDatabase::Identity> CounterDatabase::identity() const {
     errno = EINVAL;
     return std::nullopt;
   }
-  return Identity{status.st_dev, status.st_ino};
-}
-
-std::string CounterDatabase::pathOnHost() const {
-  std::array<char, PATH_MAX> path;
-  const std::string link = format("/proc/self/fd/%d", folder_.get());
-  const ssize_t length = ::readlink(link.c_str(), path.data(), path.size());
-  if (length <= 0) return {};
-  return std::string(path.data(), static_cast<std::size_t>(length)) + "/" + kName;
+  return Identity{status.st_dev, status.st_ino, status.st_nlink};
 }
 
 std::string CounterDatabase::create() {
   // A new database must not meet what is left of another one.
-  for (const char* name : kBeside) ::unlinkat(folder_.get(), name, 0);
+  for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
   const FileDescriptor file(
       ::openat(folder_.get(), kName, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
   return file ? std::string() : std::strerror(errno);
@@ -164,43 +200,53 @@ std::string CounterDatabase::create() {
 // With the lock held: sees to it that the connection is one to the file that is there. Without a
 // failure and without a connection there is no database, and none is to be created.
 Failure CounterDatabase::connect(Use use) {
-  constexpr char notRegular[] = "it, or a file beside it, is not a regular file";
   auto now = identity();
   if (now && connection_ && *now == opened_) return {};
   connection_.reset();
-  if (!now) return {Failure::Kind::other, notRegular};
-  for (const char* name : kBeside) {
+  if (!now) return {Failure::Kind::other, kNotRegular};
+  bool sharedBeside = false;
+  for (const char* suffix : kBeside) {
     struct stat status;
-    if (::fstatat(folder_.get(), name, &status, AT_SYMLINK_NOFOLLOW) == 0 &&
-        !S_ISREG(status.st_mode)) {
-      return {Failure::Kind::other, notRegular};
+    if (::fstatat(folder_.get(), (name_ + suffix).c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
+      continue;
     }
+    if (!S_ISREG(status.st_mode)) return {Failure::Kind::other, kNotRegular};
+    sharedBeside = sharedBeside || status.st_nlink > 1;
   }
+  const bool shared = now->names > 1;
+  if (use != Use::read && (shared || sharedBeside)) return {Failure::Kind::other, kShared};
   if (now->inode == 0) {
     if (use != Use::create) return {};
     if (const std::string error = create(); !error.empty()) return {Failure::Kind::other, error};
     now = identity();
-    if (!now) return {Failure::Kind::other, notRegular};
+    if (!now) return {Failure::Kind::other, kNotRegular};
   }
   opened_ = *now;
-  const std::string path = pathOnHost();
+  const std::string path = pathOfOpen(folder_.get());
   // SQLite takes a missing path for a temporary database.
   if (path.empty()) {
-    return {Failure::Kind::other,
-            format("its path can't be read from /proc: %s", errorText(errno))};
+    return {Failure::Kind::other, kNoPath + std::string(errorText(errno))};
   }
-  connection_ = std::make_unique<Connection>(path, Connection::Access::readWrite);
-  verify(use);
-  if (use == Use::read && connection_ && connection_->failure().kind == Failure::Kind::unwritable) {
-    struct stat log;
-    if (::fstatat(folder_.get(), kBeside[0], &log, AT_SYMLINK_NOFOLLOW) == 0 && log.st_size > 0) {
-      place_.log.log(
-          LogLevel::error, "%s",
-          located("it is read without its write-ahead log: " + connection_->failure().text)
-              .c_str());
-    }
-    connection_ = std::make_unique<Connection>(path, Connection::Access::immutable);
+  const auto open = [&](Connection::Access access) {
+    connection_ = std::make_unique<Connection>(path + "/" + name_, access);
     verify(use);
+  };
+  std::string aloneBecause = sharedBeside ? kShared : "";
+  if (!sharedBeside) {
+    open(linked_ || shared ? Connection::Access::readOnly : Connection::Access::readWrite);
+    if (use == Use::read && connection_ &&
+        connection_->failure().kind == Failure::Kind::unwritable) {
+      aloneBecause = connection_->failure().text;
+    }
+  }
+  if (!aloneBecause.empty()) {
+    struct stat log;
+    if (::fstatat(folder_.get(), (name_ + kBeside[0]).c_str(), &log, AT_SYMLINK_NOFOLLOW) == 0 &&
+        log.st_size > 0) {
+      place_.log.log(LogLevel::error, "%s",
+                     located("it is read without its write-ahead log: " + aloneBecause).c_str());
+    }
+    open(Connection::Access::immutable);
   }
   return connection_ ? connection_->failure() : Failure{};
 }
@@ -250,10 +296,10 @@ void CounterDatabase::setAside(const std::string& why) {
                    located(why + "; it can't be set aside: " + std::strerror(errno)).c_str());
     return;
   }
-  if (::renameat(folder_.get(), kBeside[0], folder_.get(), kLogAside) != 0) {
+  if (::renameat(folder_.get(), (name_ + kBeside[0]).c_str(), folder_.get(), kLogAside) != 0) {
     ::unlinkat(folder_.get(), kLogAside, 0);
   }
-  for (const char* name : kBeside) ::unlinkat(folder_.get(), name, 0);
+  for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
   place_.log.log(LogLevel::error, "%s", located(why + "; it is set aside as " + kAside).c_str());
   place_.foundDamaged();
 }

@@ -35,12 +35,14 @@ struct CounterPlace {
 
 class CounterDatabase {
  public:
-  // Nothing is opened before it is needed. The place is borrowed.
-  explicit CounterDatabase(const CounterPlace& place);
+  // Nothing is opened before it is needed. The place is borrowed. Links to the database are
+  // followed, within the device root, only for who does nothing but read; what is found through
+  // them is left as it is, damage included.
+  CounterDatabase(const CounterPlace& place, DeviceRoot::Links links);
   ~CounterDatabase();
 
   // Runs the work on a connection for reading. True when it could be done; with no database there
-  // is nothing to be done, and the work isn't run. A failure is logged.
+  // is nothing to be done, and the work isn't run. A failure is logged; no home folder is one.
   using Work = std::function<void(sqlite::Connection&)>;
   bool read(const Work& work);
 
@@ -58,13 +60,14 @@ class CounterDatabase {
   struct Identity {
     dev_t device = 0;
     ino_t inode = 0;  // 0: there is no file
+    nlink_t names = 0;
     bool operator==(const Identity&) const = default;
   };
   enum class Use { read, write, create };
 
   bool openFolder(DeviceRoot::Missing missing, std::string& error);
+  std::string follow(const std::string& folder);
   std::optional<Identity> identity() const;
-  std::string pathOnHost() const;
   std::string create();
   sqlite::Failure connect(Use use);
   void verify(Use use);
@@ -72,8 +75,11 @@ class CounterDatabase {
   std::string located(const std::string& text) const;
 
   const CounterPlace& place_;
+  const DeviceRoot::Links links_;
   std::string folderPath_;  // of the host, for messages
   FileDescriptor folder_;
+  std::string name_;  // in the folder; not the usual one when a link led there
+  bool linked_ = false;
   Identity opened_;
   std::unique_ptr<sqlite::Connection> connection_;
 };

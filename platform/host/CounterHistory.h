@@ -13,7 +13,8 @@ inline constexpr std::size_t kPackedSampleSize = 12;
 class CounterHistory : public PLHistory {
  public:
   // The place is borrowed.
-  explicit CounterHistory(const CounterPlace& place) : database_(place) {}
+  explicit CounterHistory(const CounterPlace& place)
+      : database_(place, DeviceRoot::Links::followed) {}
 
   // Each query sees the database as it was when the query began. After a failure, which the log
   // tells, this history is empty. A handler may query this history and write to the store.
@@ -27,8 +28,7 @@ class CounterHistory : public PLHistory {
                                  std::int32_t maxDaysSince1970,
                                  const DistributionRowHandler& rowHandler) override;
 
-  // Whether a query failed so far.
-  bool failed() const { return failed_; }
+  bool failed() const override { return failed_; }
 
  private:
   CounterDatabase database_;

@@ -107,7 +107,7 @@ CounterStore::CounterStore(const DeviceRoot& root, Clock& clock, SystemLog& log,
                            std::function<void()> foundDamaged)
     : place_{root, log, std::move(home), std::move(foundDamaged)},
       clock_(clock),
-      database_(place_) {}
+      database_(place_, DeviceRoot::Links::refused) {}
 
 std::int32_t CounterStore::PLDaysSince1970() { return dayNumber(clock_.now().secondsSince1970); }
 

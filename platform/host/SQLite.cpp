@@ -49,7 +49,10 @@ Connection::Connection(const std::string& path, Access access) {
   check(access == Access::immutable
             ? sqlite3_open_v2(immutableUri(path).c_str(), &database_,
                               common | SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr)
-            : sqlite3_open_v2(path.c_str(), &database_, common | SQLITE_OPEN_READWRITE, nullptr));
+            : sqlite3_open_v2(path.c_str(), &database_,
+                              common | (access == Access::readOnly ? SQLITE_OPEN_READONLY
+                                                                   : SQLITE_OPEN_READWRITE),
+                              nullptr));
   if (failure_) return;
   openedReadOnly_ = readOnly();
   sqlite3_busy_timeout(database_, kBusyMilliseconds);

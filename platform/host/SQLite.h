@@ -30,8 +30,9 @@ struct Failure {
 
 class Connection {
  public:
-  // immutable: reads the file alone, as it stands, and needs nothing beside it.
-  enum class Access { readWrite, immutable };
+  // readOnly: leaves the file and its log as they are. immutable: reads the file alone, as it
+  // stands, and needs nothing beside it.
+  enum class Access { readWrite, readOnly, immutable };
   enum class Checkpoint { passive, truncate };
 
   // Opens an existing file; a link anywhere in its path is refused. The connection distrusts the

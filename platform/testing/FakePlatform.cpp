@@ -70,6 +70,8 @@ class OpenHistory : public PLHistory {
     }
   }
 
+  bool failed() const override { return store_.failed; }
+
  private:
   static bool covers(const FakeHistory::RowKey& row, std::string_view keyPrefix,
                      std::int32_t minDay, std::int32_t maxDay) {

@@ -74,6 +74,7 @@ class FakeHistory : public HistoryStore {
   std::map<RowKey, std::int64_t> scalars;
   std::map<RowKey, std::vector<double>> distributions;
   std::size_t blockSize = 3;  // samples handed over at a time
+  bool failed = false;
 
   std::unique_ptr<PLHistory> initWithDefaultPath() override;
 };

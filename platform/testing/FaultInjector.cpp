@@ -38,11 +38,12 @@ struct PropertyLists : PropertyListCodec {
   }
 };
 
-struct EmptyHistory : PLHistory {
+struct FailedHistory : PLHistory {
   void scalarsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
                            const ScalarRowHandler&) override {}
   void distributionsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
                                  const DistributionRowHandler&) override {}
+  bool failed() const override { return true; }
 };
 
 struct Histories : HistoryStore {
@@ -50,7 +51,7 @@ struct Histories : HistoryStore {
   HistoryStore& inner;
   Plan& plan;
   std::unique_ptr<PLHistory> initWithDefaultPath() override {
-    if (plan.fails()) return std::make_unique<EmptyHistory>();
+    if (plan.fails()) return std::make_unique<FailedHistory>();
     return inner.initWithDefaultPath();
   }
 };

@@ -113,7 +113,9 @@ TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
     std::map<platform::fakes::FakeHistory::RowKey, std::int64_t> scalars;
     std::map<platform::fakes::FakeHistory::RowKey, std::vector<double>> distributions;
     const char* why;
+    bool failed = false;
   } rows[] = {
+      {{}, {}, "the counters can't be read", true},
       {{{{kDay - 2, "exact"}, 1}, {{kDay + 1, "exact"}, 1}},
        {},
        "no counter was recorded on that day or the day before"},
@@ -124,6 +126,7 @@ TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
   for (const auto& row : rows) {
     platform.history.scalars = row.scalars;
     platform.history.distributions = row.distributions;
+    platform.history.failed = row.failed;
     platform.log.clear();
     write();
     EXPECT_EQ(

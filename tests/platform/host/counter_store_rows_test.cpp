@@ -143,12 +143,13 @@ TEST_F(CounterStoreRows, ReadsAndCheckpointsOfNothingCreateNothing) {
                            std::optional<std::string>("/var/mobile")}) {
     here.home = home;
     EXPECT_EQ(here.rows(), Lines{});
+    EXPECT_EQ(here.log.count("error: there is no home folder"), home ? 0 : 1);
     here.store.PLClientCheckpoint();
+    here.log.clear();
   }
   EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
   here.home.reset();
   EXPECT_NE(here.store.set("k", 1, 1), "");
-  EXPECT_EQ(here.log.lines(), Lines{});
 }
 
 TEST_F(CounterStoreRows, FilesAreForTheirOwnerOnly) {
@@ -178,13 +179,60 @@ TEST_F(CounterStoreRows, AnythingButARegularFileInAPlaceOfTheDatabaseIsRefused) 
       std::filesystem::remove(path);
       support::put(kind, path, outside / "target");
       StoreFixture fresh(device.path());
-      EXPECT_NE(fresh.store.set("k", 1, 1), "") << path;
+      EXPECT_NE(fresh.store.set("k", 1, 1).find("not a regular file"), std::string::npos) << path;
       EXPECT_EQ(fresh.rows(), Lines{}) << path;
-      EXPECT_EQ(fresh.log.count("not a regular file"), 1) << path;
+      EXPECT_EQ(fresh.log.lines().size(), 1u) << path;
       EXPECT_EQ(fresh.damaged, 0);
       EXPECT_TRUE(support::untouched(kind, path, outside / "target")) << path;
     }
   }
+}
+
+// A reader follows links that stay below the root; nobody writes through one, or to a file that
+// has another name.
+TEST_F(CounterStoreRows, WhatIsNotTheStoresOwnIsReadAndLeftAsItIs) {
+  const std::string folderPath = "var/mobile/Library/Pelloran", database = support::kDatabase;
+  const struct {
+    std::string from, to;
+    const char* target;  // of the link; null: a second name
+    const char* refusal;
+  } rows[] = {{"var/mobile", "m2", "../m2", "none is followed"},
+              {folderPath, "elsewhere", "/elsewhere", "none is followed"},
+              {database, "db", "/db", "not a regular file"},
+              {database, "db", nullptr, "several names"},
+              {database + "-wal", "wal", nullptr, "several names"}};
+  for (const auto& row : rows) {
+    for (const bool damaged : {false, true}) {
+      SCOPED_TRACE(row.from + (damaged ? " damaged" : ""));
+      const support::TemporaryFolder device;
+      const bool log = row.from.ends_with("-wal");
+      {
+        StoreFixture original(device.path());
+        original.store.set("k", 1, 1);
+        original.store.settle();
+        if (row.to != "db" && !log) original.store.set("k", 2, 1);  // in the write-ahead log
+      }
+      if (damaged) device.write(support::kDatabase, std::string(5000, 'x'));
+      if (log) device.write(row.from, "");
+      if (row.target == nullptr) {
+        std::filesystem::create_hard_link(device / row.from, device / row.to);
+      } else {
+        std::filesystem::rename(device / row.from, device / row.to);
+        std::filesystem::create_symlink(row.target, device / row.from);
+      }
+      const std::string before = device.read(support::kDatabase);
+      StoreFixture linked(device.path());
+      EXPECT_NE(linked.store.set("k", 9, 1).find(row.refusal), std::string::npos);
+      EXPECT_EQ(device.read(support::kDatabase), before);
+      const char* value = row.to == "db" || log ? "1 k 1" : "1 k 2";
+      EXPECT_EQ(linked.rows(), damaged ? Lines{} : Lines{value});
+      EXPECT_EQ(linked.log.lines().size(), damaged ? 1u : 0u);
+      EXPECT_EQ(linked.damaged, damaged && row.target == nullptr ? 1 : 0);
+    }
+  }
+  std::filesystem::create_directory_symlink("/nowhere", folder / "var");
+  EXPECT_EQ(here.rows(), Lines{});
+  EXPECT_EQ(here.log.count("leads nowhere"), 1);
 }
 
 TEST_F(CounterStoreRows, RowsOfWrongTypesAndHalfRecordsAreSkipped) {
