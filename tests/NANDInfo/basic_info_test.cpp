@@ -166,7 +166,6 @@ TEST(BasicInfo, TheExchange) {
   EXPECT_EQ(device.purgeableSpace.lastQuery, (Dictionary{{"SPACEREAP_VOLUME", "/private/var"}}));
   device.registry.willTunnel(8, 13, 0, {});
   EXPECT_EQ(CopyNANDInfo(device.platform), error);
-  EXPECT_EQ(device.registry.problems(), Lines());
 }
 
 // A boot session's identifier and the day; half the days belong to the analytics sink.

@@ -8,12 +8,10 @@
 #include <algorithm>
 #include <cstring>
 #include <functional>
-#include <set>
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/ExtractionSteps.h"
 #include "platform/testing/FaultInjector.h"
-#include "support/Fingerprint.h"
 #include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 
@@ -26,34 +24,6 @@ using support::StorageDevice;
 using u64 = std::uint64_t;
 
 constexpr std::string_view kPrefix = "com.norba.massStorage.NANDInfo.";
-
-// One wrong letter changes the fingerprint (of the names, a line each, in bytewise order).
-TEST(EventraConfig, AllowsEachEventItsFields) {
-  const struct {
-    std::string_view event;
-    std::size_t fields;
-    u64 fingerprint;
-  } rows[] = {{"FTLCounters_1", 438, 0x231e1a5d8507c36f},
-              {"FTLHistograms_1", 990, 0x10056450f6a33a76},
-              {"FTLHistograms_2", 104, 0x7571d6ec4383806c},
-              {"MSPCounters_1", 822, 0xf514c360659e121c},
-              {"SM.Daily.FTLCounters_1", 52, 0x3ffbaf6b9d50242c},
-              {"SM.WeeklyMA.FTLCounters_1", 33, 0x8dac102a300c64f7},
-              {"SM.Monthly.FTLCounters_1", 33, 0x8dac102a300c64f7},
-              {"StorageStats_1", 17, 0x7ee0331be108bbaa}};
-  for (const auto& [event, fields, fingerprint] : rows) {
-    SCOPED_TRACE(event);
-    const NameTable* const table = EventraConfigDetails(std::string(kPrefix).append(event));
-    ASSERT_NE(table, nullptr);
-    std::set<std::string> names;
-    for (const auto& entry : *table) names.emplace(entry.name);
-    std::string text;
-    for (const std::string& name : names) text += name + "\n";
-    EXPECT_EQ(table->size(), fields);
-    EXPECT_EQ(support::fingerprint(text), fingerprint);
-  }
-  EXPECT_EQ(EventraConfigDetails(kEventName_massStorage_NANDInfo_NORWrites), nullptr);
-}
 
 // A device with two MSPs, a magazine of 720 hours and NVRAM statistics.
 struct FullDevice : StorageDevice {
@@ -170,7 +140,6 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
     }
     expected.set(kNANDInfoErrorMessageKey, GetAPIErrorMessage());
     EXPECT_EQ(summary, expected);
-    EXPECT_EQ(device.registry.problems(), std::vector<std::string>());
   }
 }
 
@@ -292,7 +261,6 @@ TEST(Extraction, GoesOnAfterAnyFailedCall) {
     ASSERT_TRUE(NandInfoExtractToEV_runAllSteps(faults.platform(), nullptr, 0, true, 3));
     if (failing == 0) calls = faults.calls();
     EXPECT_EQ(device.log.count("successfully logged"), 3);
-    EXPECT_EQ(device.registry.problems(), std::vector<std::string>());
     EXPECT_GE(device.eventra.events.size(), 2u);
     for (const auto& [event, payload] : device.eventra.events) {
       EXPECT_FALSE(payload.empty()) << event;
@@ -342,7 +310,6 @@ TEST(NVRAMStats, AreSentWhenThereAreAny) {
   without.registry.root->children[1] = {.className = "NvramDiagService"};
   EXPECT_EQ(gatherNVRAMStats(without.platform), Dictionary());
   EXPECT_EQ(without.sent(), "");
-  EXPECT_EQ(without.registry.problems(), std::vector<std::string>());
 }
 
 }  // namespace

@@ -1,72 +1,19 @@
+// The small tools of the whitelists: name tables, filters, rounding.
+
 #include "NANDInfo/Whitelists.h"
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <cstdint>
 #include <limits>
-#include <set>
 #include <string>
-#include <vector>
 
 #include "NANDInfo/NameRows.h"
-#include "support/Fingerprint.h"
 
 namespace NANDInfo {
 namespace {
 
 using platform::Dictionary;
-
-std::uint64_t digestOf(const std::vector<std::string>& lines) {
-  std::string text;
-  for (const std::string& line : lines) text += line + "\n";
-  return support::fingerprint(text);
-}
-
-TEST(Whitelists, HoldTheirNamesAndDigitsOnceEach) {
-  const struct {
-    const NameTable& table;
-    std::size_t names;
-    std::uint64_t digest;  // of the lines "name digits" in bytewise order
-  } tables[] = {{WhitelistedRawNANDFTLCounters_SigDigDict(), 1445, 0x9f9155d605ed4a74},
-                {WhitelistedRawNANDMSPCounters_SigDigDict(), 825, 0x886f8d86b2526163},
-                {WhitelistedStorageStats_SigDigDict(), 20, 0x6836ac9c52a42c16},
-                {PrivacyApprovedSMagNANDFTLCounters_Accum(), 731, 0x938e689259d19ed3},
-                {PrivacyApprovedSMagNANDFTLCounters_Dynamic(), 41, 0xf757393dfba3ec47},
-                {PrivacyApprovedSMagNANDFTLCounters_SigDigDict(), 805, 0x224e9f65799d6ecb}};
-  for (const auto& [table, names, digest] : tables) {
-    std::vector<std::string> lines;
-    for (const NameTable::Entry& entry : table) {
-      lines.push_back(std::string(entry.name) + " " + std::to_string(entry.number));
-      ASSERT_EQ(table.find(entry.name), &entry);
-      ASSERT_FALSE(table.contains(std::string(entry.name) + "x"));
-    }
-    std::ranges::sort(lines);
-    EXPECT_EQ(lines.size(), names);
-    EXPECT_EQ(digestOf(lines), digest) << names;
-  }
-  const auto derived = FTLStats4MSPStats();
-  EXPECT_EQ(digestOf({derived.begin(), derived.end()}), 0x0e69bd3a0b74e822);
-}
-
-TEST(KeyMap, HoldsEveryCounterUnderItsKey) {
-  std::vector<std::string> lines;
-  std::set<std::string> keys;
-  for (const KeyMapRow& row : keyMapRows()) {
-    for (const std::string& counter : expandFamily(row.counters)) {
-      const auto key = keyMapKey(counter);
-      ASSERT_TRUE(key) << counter;
-      lines.push_back(counter + " " + std::string(*key));
-      keys.emplace(*key);
-    }
-  }
-  std::ranges::sort(lines);
-  EXPECT_EQ(digestOf(lines), 0x0cb03a7af4f32c85);
-  EXPECT_EQ(keys.size(), 709u);
-  for (const char* counter : {"", "boots", "padSizes", "padSizes4", "padSizes_0", "PadSize1"}) {
-    EXPECT_FALSE(keyMapKey(counter)) << counter;
-  }
-}
 
 constexpr NameRow kRows[] = {{"n{1, 3..4, 10}", 2}, {"all", 20}, {"n{4, 5}", 3}, {"zero", 0}};
 static_assert(countNames(kRows) == 8);

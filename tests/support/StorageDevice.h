@@ -1,6 +1,8 @@
 // A device in memory with a storage controller whose buffers a test names field by field.
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <string>
 #include <string_view>
@@ -37,6 +39,9 @@ struct StorageDevice : TestPlatform {
     support::freshErrors();
     if (controller != nullptr) registry.add({.className = controller});
   }
+
+  // No handle is left open by any exchange, and no call was one that the test doesn't know of.
+  ~StorageDevice() { EXPECT_EQ(registry.problems(), std::vector<std::string>()); }
 
   // What the controller answers whenever it is asked for its statistics.
   void setStatistics(const FTLFields& fields) { setBuffer(13, 0, fields); }
