@@ -7,41 +7,28 @@
 
 #include <functional>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/ProcessState.h"
 #include "platform/Text.h"
-#include "support/FreshErrors.h"
-#include "support/TestPlatform.h"
+#include "support/StorageDevice.h"
 
 namespace NANDInfo {
 namespace {
 
 using platform::fakes::FakeDeviceRegistry;
-using Bytes = FakeDeviceRegistry::Bytes;
+using support::Bytes, support::kEmbedded, support::kQRT3, support::kZMCStorage;
 using Entry = FakeDeviceRegistry::Entry;
 using Lines = std::vector<std::string>;
 
-constexpr char kQRT3[] = "NorbaQRT3NVMeController";
-constexpr char kEmbedded[] = "NorbaEmbeddedNVMeController";
-constexpr char kStorage[] = "ZMCStorage";
 constexpr std::uint32_t kError = 0x2BC;
 
-class ControllerTest : public ::testing::Test {
- protected:
-  ControllerTest() { restart(); }
-  ~ControllerTest() override { EXPECT_EQ(registry.problems(), Lines()); }
-
+struct ControllerTest : testing::Test, support::StorageDevice {
   void restart() {
+    EXPECT_EQ(registry.problems(), Lines());
     ResetExporters();
     support::freshErrors();
     registry = FakeDeviceRegistry();
-    fakes.streams.errors.clear();
-    fakes.log.clear();
+    streams.errors.clear();
+    log.clear();
   }
-
-  support::TestPlatform fakes;
-  platform::Platform& platform = fakes.platform;
-  FakeDeviceRegistry& registry = fakes.registry;
 };
 
 // What no exchange below asks for.
@@ -72,7 +59,7 @@ TEST_F(ControllerTest, EachDriverHasItsSelectors) {
 // The service plane, and what each of the three ways of looking makes of it.
 TEST_F(ControllerTest, DriversAreFoundInTheOrderOfTheTable) {
   const Entry none{"Other"};
-  const Entry nested{.className = "Bus", .children = {{.className = kStorage}}};
+  const Entry nested{.className = "Bus", .children = {{.className = kZMCStorage}}};
   const Entry conforming{.className = "Derived", .conforms = {kEmbedded}};
   const Entry unregistered{.className = "Bus",
                            .registered = false,
@@ -95,13 +82,13 @@ TEST_F(ControllerTest, DriversAreFoundInTheOrderOfTheTable) {
     restart();
     registry.root->children = row.plane;
     nand_exporter_t* exporter = nullptr;
-    const auto service = findNandExporter(platform, exporter);
+    const auto found = findNandExporter(platform, exporter);
     EXPECT_EQ(exporter - nand_exporters_tunnel, row.found == 3 ? row.walked : row.found);
-    EXPECT_EQ(service != 0, row.walked != 3 || row.found != 3);
-    if (service != 0) registry.release(service);
+    EXPECT_EQ(found != 0, row.walked != 3 || row.found != 3);
+    if (found != 0) registry.release(found);
 
     const char* const walked = nand_exporters_tunnel[row.walked].className;
-    const auto entry = FindServiceUsingIterator(platform, walked != nullptr ? walked : kStorage);
+    const auto entry = FindServiceUsingIterator(platform, walked != nullptr ? walked : kZMCStorage);
     EXPECT_EQ(entry != 0, walked != nullptr);
     if (entry != 0) registry.release(entry);
 
@@ -112,19 +99,18 @@ TEST_F(ControllerTest, DriversAreFoundInTheOrderOfTheTable) {
     EXPECT_NE(exporter->service, 0u);
     ReleaseIOInterfaces(platform, exporter);
     EXPECT_EQ(exporter->io_connection + exporter->service, 0u);
-    EXPECT_EQ(registry.problems(), Lines());
   }
 }
 
 TEST_F(ControllerTest, FindingSaysWhatItFound) {
   nand_exporter_t* exporter;
-  registry.add({.className = kStorage});
+  registry.add({.className = kZMCStorage});
   registry.release(findNandExporter(platform, exporter));
   findNandExporterNew(platform, exporter);
   ReleaseIOInterfaces(platform, exporter);
   registry.root->children[0].registered = false;
   registry.release(findNandExporter(platform, exporter));
-  EXPECT_EQ(fakes.log.lines(),
+  EXPECT_EQ(log.lines(),
             (Lines{"default: NANDInfo: findNandExporter: Controller found: ZMCStorage\n",
                    "default: NANDInfo: findNandExporterNew: Controller found: ZMCStorage\n",
                    "default: Find service for class ZMCStorage\n"}));
@@ -132,7 +118,7 @@ TEST_F(ControllerTest, FindingSaysWhatItFound) {
   EXPECT_EQ(findNandExporter(platform, exporter), 0u);
   registry.root.reset();
   EXPECT_EQ(findNandExporter(platform, exporter), 0u);
-  EXPECT_EQ(fakes.streams.errors,
+  EXPECT_EQ(streams.errors,
             Lines(3,
                   "Failed to find matching service with DrvGetMatchingService, trying "
                   "iterator...\n"));
@@ -181,7 +167,6 @@ TEST_F(ControllerTest, TunnelCommandsByTheirFailures) {
     EXPECT_EQ(buffer, row.left);
     EXPECT_EQ(block.argument, 7u);
     ReleaseIOInterfaces(platform, exporter);
-    EXPECT_EQ(registry.problems(), Lines());
   }
 }
 
@@ -207,21 +192,15 @@ TEST_F(ControllerTest, TunnelCommandsThatCannotBeSent) {
 }
 
 // One controller; what opening, the calls and closing come to; what is said and answered.
-TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
+TEST_F(ControllerTest, DeletionAndConnectionsByTheirFailures) {
   const std::string noService =
       "Failed to find matching service with DrvGetMatchingService, "
       "trying iterator...\n";
-  const std::string missing = "Could not get matching Regmora service for exporting classes\n";
+  const std::string missing =
+      "_load_nand_infoCould not get matching Regmora service for exporting classes\n";
   const std::string notOpened = "Could not get connection to service\n";
   const std::string notClosed = "Could not close connection to service\n";
   const auto announce = FakeDeviceRegistry::announce;
-  const auto load = [&] {
-    LegacyNandInfoCxt context;
-    nand_exporter_t* exporter = nullptr;
-    const bool loaded = load_nand_info(platform, exporter, &context);
-    EXPECT_NE(exporter, nullptr);
-    return loaded;
-  };
   const auto recommends = [&] {
     const auto value = NandRecommendsContentDeletion(platform);
     EXPECT_EQ(value.as<platform::Number>()->type(), platform::Number::Type::boolean);
@@ -236,22 +215,14 @@ TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
     EXPECT_EQ(connection.exporter->io_connection + connection.connection + connection.service, 0u);
     return open;
   };
-  // A buffer's header alone: the smallest that the legacy decoder takes.
-  const Bytes statistics = [] {
-    Bytes bytes(8);
-    bytes[0] = std::byte{1};
-    return bytes;
-  }();
   const Bytes threeBytes(3, std::byte{1});
   const std::string unmatched = "Can't get ZMC Connection, no matching service!\n";
   const std::string unconnected = "Can't get ZMC Connection!\n";
   const std::string refused = "DrvServiceOpen failed for class 'ZMCStorage', result 0xe00002bc\n";
-  const std::vector<FakeDeviceRegistry::Step> tunnel = {{"8 size 13/0", announce(8)},
-                                                        {"8 data 13/0", {.output = statistics}}};
-  const Entry storage{.className = kStorage};
-  const Entry refusing{.className = kStorage, .openStatus = 0xE00002BC};
-  const Entry failing{.className = kStorage, .closeStatus = kError};
-  const Entry handleless{.className = kStorage, .oddHandle = true};
+  const Entry storage{.className = kZMCStorage};
+  const Entry refusing{.className = kZMCStorage, .openStatus = 0xE00002BC};
+  const Entry failing{.className = kZMCStorage, .closeStatus = kError};
+  const Entry handleless{.className = kZMCStorage, .oddHandle = true};
   const struct {
     const char* name;
     std::function<bool()> act;
@@ -260,20 +231,13 @@ TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
     bool result;
     Lines errors;
   } cases[] = {
-      {"load", load, storage, tunnel, true, {}},
-      {"load, none", load, {}, {}, false, {noService, missing}},
-      {"load, refused", load, refusing, {}, false, {notOpened}},
-      {"load, no handle", load, handleless, {}, false, {}},
-      {"load, failing", load, storage, {{"8 size 13/0", {kError}}}, false, {}},
-      {"load, empty", load, storage, {{"8 size 13/0", {}}, {"8 data 13/0", {}}}, false, {}},
-      {"load, not closed", load, failing, tunnel, false, {notClosed}},
       {"deletion", recommends, storage, {{"5", announce(0x01000000)}}, true, {}},
       {"deletion, no", recommends, storage, {{"5", announce(0)}}, false, {}},
       {"deletion, failing", recommends, storage, {{"5", {kError, announce(1).output}}}, false, {}},
       {"deletion, short", recommends, storage, {{"5", {.output = threeBytes}}}, false, {}},
       {"deletion, not closed", recommends, failing, {{"5", announce(1)}}, true, {notClosed}},
       {"deletion, refused", recommends, refusing, {}, false, {notOpened}},
-      {"deletion, none", recommends, {}, {}, false, {noService, "_load_nand_info" + missing}},
+      {"deletion, none", recommends, {}, {}, false, {noService, missing}},
       {"deletion, not asked", recommends, Entry{.className = kQRT3}, {}, false, {}},
       {"connection", connect, storage, {}, true, {}},
       {"connection, none", connect, {}, {}, false, {noService, unmatched}},
@@ -286,8 +250,7 @@ TEST_F(ControllerTest, LegacyStatisticsDeletionAndConnectionsByTheirFailures) {
     if (row.entry) registry.add(*row.entry);
     registry.script.assign(row.script.begin(), row.script.end());
     EXPECT_EQ(row.act(), row.result);
-    EXPECT_EQ(fakes.streams.errors, row.errors);
-    EXPECT_EQ(registry.problems(), Lines());
+    EXPECT_EQ(streams.errors, row.errors);
   }
 }
 
@@ -311,7 +274,7 @@ TEST_F(ControllerTest, EANQueriesAskInOrderAndAnswerZeroOnFailure) {
     EXPECT_STREQ(query.key, rows[i].key);
     EXPECT_EQ(query.query(platform, query.code), ~i);
   }
-  EXPECT_EQ(fakes.log.lines(), Lines());
+  EXPECT_EQ(log.lines(), Lines());
 
   auto& entry = registry.root->children[0];
   const auto size = [&] { return GetEANImageSize(platform, 0x64424943); };
@@ -329,9 +292,11 @@ TEST_F(ControllerTest, EANQueriesAskInOrderAndAnswerZeroOnFailure) {
   const std::string noSize =
       "default: GetEANImageSize: Unable to get EAN Io service connection "
       "for key (1682065731): dBIC\n";
+  const std::string missing =
+      "_load_nand_infoCould not get matching Regmora service for exporting classes\n";
   const std::string notOpened =
       "default: getEANConnection: DrvServiceOpen on NorbaNVMeEAN failed kernResult:2bc\n";
-  EXPECT_EQ(fakes.log.lines(),
+  EXPECT_EQ(log.lines(),
             (Lines{"default: GetImageSize: DrvCallMethod failed (key (1682065731): dBIC) "
                    "kernResult:2bc\n",
                    "default: GetUpdateCount: DrvCallMethod failed (key (1768322865): ifw1) "

@@ -94,7 +94,6 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
       {"from the magazine on", [](FullDevice&) {}, false, 4,
        "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 ", 2, 0},
       {"the month alone", [](FullDevice&) {}, true, 6, "SM.Monthly.FTLCounters_1 ", 1, 0},
-      {"not even that", [](FullDevice&) {}, false, 6, "", 0, 0},
       {"beyond the last", [](FullDevice&) {}, true, 7, "", 0, 0},
       {"some are unused",
        [](FullDevice& device) {
@@ -113,6 +112,11 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
          device.setCounters({"boots", {1}});
        },
        true, 0, kFirstSteps, 6, 0},
+      {"no NVRAM statistics",
+       [](FullDevice& device) {
+         device.registry.root->children[1] = {.className = "NvramDiagService"};
+       },
+       true, 3, "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 SM.Monthly.FTLCounters_1 ", 3, 0},
       {"no controller and no NVRAM",
        [](FullDevice& device) { device.registry.root = std::nullopt; }, true, 0,
        "FTLCounters_1 FTLHistograms_1 FTLHistograms_2 StorageStats_1 ", 4, 0}};
@@ -297,19 +301,6 @@ TEST(ExtractionStep, SaysWhatItCouldNotGatherOrSend) {
   EXPECT_EQ(createAndLogSMagFTLFieldsToEventraForEvent(device.platform, 0), Dictionary());
   EXPECT_STREQ(GetAPIErrorMessage(),
                "createAndLogMSPFieldsToEventraForEvent: EventraSendEventLazy failed to log to EV");
-}
-
-TEST(NVRAMStats, AreSentWhenThereAreAny) {
-  FullDevice device;
-  EXPECT_EQ(gatherNVRAMStats(device.platform), nvramStatistics());
-  EXPECT_EQ(device.sent(), "NORWrites ");
-  device.eventra.queuesEvents = false;
-  EXPECT_EQ(gatherNVRAMStats(device.platform), nvramStatistics());
-
-  FullDevice without;
-  without.registry.root->children[1] = {.className = "NvramDiagService"};
-  EXPECT_EQ(gatherNVRAMStats(without.platform), Dictionary());
-  EXPECT_EQ(without.sent(), "");
 }
 
 }  // namespace

@@ -11,17 +11,14 @@
 #include <limits>
 #include <string>
 
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/DefectsList.h"
-#include "NANDInfo/Keys.h"
 #include "NANDInfo/ListHandlers.h"
-#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/StructuredLogState.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
 #include "NANDInfo/WriteAmplification.h"
 #include "support/ControllerLists.h"
-#include "support/TestPlatform.h"
+#include "support/StorageDevice.h"
 
 namespace NANDInfo {
 namespace {
@@ -30,14 +27,11 @@ using platform::Array;
 using platform::Dictionary;
 using platform::Value;
 using platform::fakes::FakeDeviceRegistry;
-using support::Bytes;
+using support::Bytes, support::kEmbedded, support::kQRT3, support::kZMCStorage;
 using Entry = FakeDeviceRegistry::Entry;
 using Answer = FakeDeviceRegistry::Answer;
 using Lines = std::vector<std::string>;
 
-constexpr char kQRT3[] = "NorbaQRT3NVMeController";
-constexpr char kEmbedded[] = "NorbaEmbeddedNVMeController";
-constexpr char kStorage[] = "ZMCStorage";
 constexpr char kCharacteristics[] = "Controller Characteristics";
 constexpr const SelectorPair* kNoPair = nullptr;
 constexpr std::uint32_t kError = 0x2BC;
@@ -218,13 +212,12 @@ TEST(DefectsList, IsCutToTheRecordsThatFit) {
   }
 }
 
-class StructuredLogsTest : public ::testing::Test {
- protected:
+struct StructuredLogsTest : testing::Test, support::StorageDevice {
   StructuredLogsTest() { restart(); }
-  ~StructuredLogsTest() override { EXPECT_EQ(registry.problems(), Lines()); }
 
   // A controller that answers everything, with a write amplification of 3.
   void restart() {
+    EXPECT_EQ(registry.problems(), Lines());
     ResetExporters();
     ResetStructuredLogState();
     registry = FakeDeviceRegistry();
@@ -240,22 +233,18 @@ class StructuredLogsTest : public ::testing::Test {
       registry.alwaysTunnels(9, 17, i, support::telemetryList(2));
     }
     registry.alwaysTunnels(9, 15, 0, support::defectsList(2, {{0, 0, 0, 0, 0, 0, 0, 0}}));
-    fakes.streams.errors.clear();
-    fakes.housekeeping.structured.clear();
-    fakes.submission.logs.clear();
-    fakes.preferences.values.clear();
+    streams.errors.clear();
+    housekeeping.structured.clear();
+    submission.logs.clear();
+    preferences.values.clear();
   }
 
   Dictionary characteristics{{"chip-id", "QM7"},
                              {"manufacturer-id", "AD8252232142"},
                              {"num-bus", 2},
                              {"nand-device-desc", 99}};
-  support::TestPlatform fakes;
-  platform::Platform& platform = fakes.platform;
-  FakeDeviceRegistry& registry = fakes.registry;
-  const Lines& errors = fakes.streams.errors;
-  const std::vector<std::pair<std::int32_t, Dictionary>>& structured =
-      fakes.housekeeping.structured;
+  const Lines& errors = streams.errors;
+  const std::vector<std::pair<std::int32_t, Dictionary>>& structured = housekeeping.structured;
 };
 
 TEST_F(StructuredLogsTest, ADumpFetchesTheListsInOrderAndLogsThem) {
@@ -283,13 +272,13 @@ TEST_F(StructuredLogsTest, ADumpFetchesTheListsInOrderAndLogsThem) {
     EXPECT_EQ(registry.inputs[11], support::words32({17, bit | 2 << 2, 0, 0, 0, 0}));
 
     ASSERT_EQ(structured.size(), 3u * 2 + 2);
-    for (const auto& [type, log] : structured) EXPECT_EQ(type, 176);
+    for (const auto& entry : structured) EXPECT_EQ(entry.first, 176);
     EXPECT_EQ(structured[1].second.number("RD")->int64Value(), 100);
     EXPECT_EQ(structured[6].second,
               (Dictionary{{"Factory Count", 2}, {"com.norba.NANDInfo.nandDesc", 99}}));
-    ASSERT_EQ(fakes.submission.logs.size(), 1u);
-    EXPECT_EQ(fakes.submission.logs[0].type, "165");
-    const std::string& text = fakes.submission.logs[0].contents;
+    ASSERT_EQ(submission.logs.size(), 1u);
+    EXPECT_EQ(submission.logs[0].type, "165");
+    const std::string& text = submission.logs[0].contents;
     EXPECT_NE(text.find(": IntermediateWamp:0.00;UserWamp:3.00;"), text.npos) << text;
     EXPECT_NE(text.find(";ValidityList[3]:1,4;ValidityList[7]:2\n"), text.npos) << text;
     EXPECT_NE(text.find(std::string(kNANDInfoBytesPerPageKey) + ":4096;"), text.npos) << text;
@@ -313,14 +302,14 @@ TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
     gCurrentUserWamp = gCurrentSysWamp = 9;
     gNeedValidityList = !row.logged;
     if (row.preference) {
-      fakes.preferences.setMobile("com.norba.NANDInfo", "userWAmp", *row.preference);
+      preferences.setMobile("com.norba.NANDInfo", "userWAmp", *row.preference);
     }
     if (row.statisticsFail) registry.standing.erase("9 data 13/0");
     EXPECT_TRUE(DumpStorageStructuredLog(platform, false));
     EXPECT_EQ(gNeedValidityList, row.logged);
     EXPECT_EQ(gCurrentUserWamp, row.statisticsFail ? 0 : 3);
     EXPECT_EQ(gCurrentSysWamp, 0);
-    EXPECT_EQ(fakes.submission.logs.size(), row.logged ? 1u : 0u);
+    EXPECT_EQ(submission.logs.size(), row.logged ? 1u : 0u);
     EXPECT_EQ(structured.size(), 8u);
   }
 }
@@ -396,9 +385,8 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
     for (const auto& step : row.prepare) step();
     EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
     EXPECT_EQ(errors, row.errors);
-    EXPECT_EQ(fakes.submission.logs.size(), row.submitted);
+    EXPECT_EQ(submission.logs.size(), row.submitted);
     EXPECT_EQ(structured.size(), row.structured);
-    EXPECT_EQ(registry.problems(), Lines());
   }
 }
 
@@ -433,7 +421,6 @@ TEST_F(StructuredLogsTest, WithoutAServiceOrAConnectionThereIsNothing) {
     EXPECT_EQ(DumpStorageStructuredLog(platform, false), row.result);
     EXPECT_EQ(errors, row.errors);
     EXPECT_EQ(structured.size(), row.structured);
-    EXPECT_EQ(registry.problems(), Lines());
     Dictionary untouched{{"key", 1}};
     if (!row.result) DumpNANDInfo(platform, untouched);
     EXPECT_EQ(untouched, (Dictionary{{"key", 1}}));
@@ -484,36 +471,35 @@ TEST_F(StructuredLogsTest, TelemetryNeedsThreeCharacteristics) {
     EXPECT_EQ(structured.size(), row.logs);
   }
   // The vendor's lowest byte doesn't count, and only six are read.
-  const auto readStage = [&](const char* chip, const char* vendor) {
+  const auto readStage = [&](const char* vendor) {
     restart();
-    const Dictionary device{{"chip-id", chip}, {"manufacturer-id", vendor}, {"num-bus", 1}};
-    EXPECT_TRUE(DumpTelemetryList(platform, support::telemetryList(1), device, kQRT3));
+    const auto changed = with("manufacturer-id", vendor);
+    EXPECT_TRUE(DumpTelemetryList(platform, support::telemetryList(2), changed, kQRT3));
     return structured[0].second.number("readStage[4]")->int64Value();
   };
-  const auto hynix = readStage("", "AD8252232100"), other = readStage("", "AD8252232000");
-  EXPECT_NE(hynix, other);
-  EXPECT_EQ(readStage("", "ad82522321ff"), hynix);
-  EXPECT_EQ(readStage("", "AD82522321FF99"), hynix);
+  characteristics.set("chip-id", "");
+  EXPECT_EQ(readStage("ad82522321ff99"), readStage("AD8252232100"));
+  EXPECT_NE(readStage("AD8252232000"), readStage("AD8252232100"));
 }
 
 TEST_F(StructuredLogsTest, TheDefectModeCountsOnNewerDriversOnly) {
-  const auto reasons = [&](const char* className, const Value& device) {
+  const auto reasons = [&](const char* className, const Value& properties) {
     restart();
     std::vector<std::vector<std::uint32_t>> records;
     for (const std::uint32_t mode : {0u, 1u, 2u, 3u, 0xFFFFFFFFu}) {
       records.push_back({0, 0, 0, 0, 50, 0, 0, mode});
     }
-    EXPECT_TRUE(DumpDefectsList(platform, support::defectsList(0, records), device, className));
+    EXPECT_TRUE(DumpDefectsList(platform, support::defectsList(0, records), properties, className));
     std::vector<std::int64_t> all;
-    for (const auto& [type, log] : structured) {
-      if (const auto* reason = log.number("Reason")) all.push_back(reason->int64Value());
+    for (const auto& entry : structured) {
+      if (const auto* reason = entry.second.number("Reason")) all.push_back(reason->int64Value());
     }
     return all;
   };
   EXPECT_EQ(reasons(kEmbedded, characteristics), (std::vector<std::int64_t>{50, 250, 150, 50, 50}));
   EXPECT_EQ(errors, (Lines{"Encountered unexpected defectMode: 0x3",
                            "Encountered unexpected defectMode: 0xffffffff"}));
-  EXPECT_EQ(reasons(kStorage, "no dictionary"), std::vector<std::int64_t>(5, 50));
+  EXPECT_EQ(reasons(kZMCStorage, "no dictionary"), std::vector<std::int64_t>(5, 50));
   EXPECT_EQ(errors, Lines());
   EXPECT_EQ(structured[0].second, (Dictionary{{"Factory Count", 0}}));
 }
