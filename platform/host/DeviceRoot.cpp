@@ -42,6 +42,10 @@ std::string DeviceRoot::hostPath(std::string_view path) const {
   return hostPath + relative(path);
 }
 
+std::string DeviceRoot::hostPath(std::string_view folder, std::string_view name) const {
+  return hostPath(folder) + (name.empty() ? "" : "/" + shownText(name));
+}
+
 FileDescriptor DeviceRoot::open(const std::string& path, int flags, Links links) const {
   if (!root_ || path.find('\0') != std::string::npos) {
     errno = ENOENT;

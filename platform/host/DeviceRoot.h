@@ -34,6 +34,9 @@ class DeviceRoot {
   // A device path as a path of the host, for who is to find the file.
   std::string hostPath(std::string_view path) const;
 
+  // The same of a file in a folder, or of the folder if the name is empty, for a line of the log.
+  std::string hostPath(std::string_view folder, std::string_view name) const;
+
   // Opens a file for reading; links are followed, within the root. The file may be of any kind, and
   // opening never blocks. On failure the descriptor is empty and errno says why.
   FileDescriptor openForReading(std::string_view path) const;

@@ -32,7 +32,8 @@ const EventSink::Configuration& EventSink::configuration() {
                             : Result<std::string>::failure(errorText(errno));
     const auto value = bytes ? codec_.read(*bytes) : Result<Value>::failure(bytes.error);
     if (!value) {
-      log_.log(LogLevel::error, "Could not read %s: %s", kConfiguration, value.error.c_str());
+      log_.log(LogLevel::error, "Could not read %s: %s", root_.hostPath(kConfiguration).c_str(),
+               value.error.c_str());
       return;
     }
     const auto* entries = value->as<Dictionary>();
@@ -113,40 +114,44 @@ void EventSink::write(const std::vector<Event>& events) {
         Dictionary{{"event", event.name}, {"time", event.time}, {"payload", event.producer()}});
     lines += '\n';
     if (lines.size() < kBatch && &event != &events.back()) continue;
-    const int error = append(lines);
-    if (error != 0 && !failed_) {
-      log_.log(LogLevel::error, "Could not write %s/%s: %s; events are dropped", kFolder, kName,
-               errorText(error));
+    const std::string error = append(lines);
+    if (!error.empty() && !failed_) {
+      log_.log(LogLevel::error, "Could not write %s; events are dropped", error.c_str());
       failed_ = true;
     }
     lines.clear();
   }
 }
 
-// Both: 0 or an error number.
-int EventSink::append(const std::string& lines) {
+// Both return the empty text, or the path of the file that is in the way, and why.
+std::string EventSink::append(const std::string& lines) {
   const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
-  if (!folder) return errno;
-  const FileLock lock(folder.get());  // another process may roll the file over, too
-  const int error = makeRoom(folder.get(), lines.size());
-  return error == 0 ? appendLines(folder.get(), kName, lines) : error;
+  int error = errno;
+  if (folder) {
+    const FileLock lock(folder.get());  // another process may roll the file over, too
+    if (std::string why = makeRoom(folder.get(), lines.size()); !why.empty()) return why;
+    error = appendLines(folder.get(), kName, lines);
+  }
+  return error == 0 ? "" : root_.hostPath(kFolder, kName) + ": " + errorText(error);
 }
 
-int EventSink::makeRoom(int folder, std::uint64_t bytes) {
+std::string EventSink::makeRoom(int folder, std::uint64_t bytes) {
+  // What is not a file of ours, or can't be looked at, is the append's to refuse.
   struct stat status;
-  if (::fstatat(folder, kName, &status, AT_SYMLINK_NOFOLLOW) != 0) {
-    return errno == ENOENT ? 0 : errno;
-  }
-  // What is not a file of ours is refused by the append.
+  if (::fstatat(folder, kName, &status, AT_SYMLINK_NOFOLLOW) != 0) return {};
   const auto size = static_cast<std::uint64_t>(status.st_size);
-  if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaximumFile) return 0;
-  std::string gone;
-  const int error = rollOver(folder, kName, kKept, gone);
-  if (error == 0 && !gone.empty()) {
-    log_.log(LogLevel::standard, "Dropped the events of %s/%s: there are newer ones", kFolder,
-             gone.c_str());
+  if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaximumFile) return {};
+  const RolledOver rolled = rollOver(folder, kName, kKept);
+  const std::string at = root_.hostPath(kFolder, rolled.at);
+  if (rolled.error != 0) return at + ": " + errorText(rolled.error);
+  if (!rolled.at.empty()) {
+    log_.log(LogLevel::standard, "Dropped the events of %s: there are newer ones", at.c_str());
   }
-  return error;
+  for (const std::string& name : rolled.inTheWay) {
+    log_.log(LogLevel::error, "Passed over %s: %s", root_.hostPath(kFolder, name).c_str(),
+             errorText(EINVAL));
+  }
+  return {};
 }
 
 }  // namespace platform::host

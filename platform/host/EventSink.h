@@ -1,6 +1,7 @@
 // The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl. A file that
 // would grow beyond kMaximumFile becomes events.jsonl.1 first, that .2, and so on; of more than
-// kKept the oldest is removed, with a line in the log.
+// kKept the oldest is removed, with a line in the log. A number that is taken by anything but a
+// file is passed over, with a line too.
 //
 // device/analytics.plist says which events are used ("UsedEvents", an array of names; missing: all)
 // and whether the device has the lazy-send operation ("Available"; default true). It is read when
@@ -69,8 +70,8 @@ class EventSink final : public Eventra {
   bool isServing();
   void serve();
   void write(const std::vector<Event>& events);
-  int append(const std::string& lines);
-  int makeRoom(int folder, std::uint64_t bytes);
+  std::string append(const std::string& lines);
+  std::string makeRoom(int folder, std::uint64_t bytes);
 
   const DeviceRoot& root_;
   PropertyListCodec& codec_;

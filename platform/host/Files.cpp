@@ -45,6 +45,7 @@ off_t sizeOfWholeLines(int file, off_t size) {
 
 const char* errorText(int error) {
   if (error == ELOOP) return "too many links, or one where none is followed";
+  if (error == EMLINK) return "a file with several names";
   return error == EINVAL ? "not a regular file" : std::strerror(error);
 }
 
@@ -139,26 +140,41 @@ bool isLink(int folder, const std::string& name) {
          S_ISLNK(status.st_mode);
 }
 
-int rollOver(int folder, const std::string& name, int oldest, std::string& at) {
-  const auto numbered = [&name](int number) {
-    return number == 0 ? name : name + "." + std::to_string(number);
-  };
-  int free = 0;
-  for (; free <= oldest; ++free) {
-    at = numbered(free);
+RolledOver rollOver(int folder, const std::string& name, int oldest) {
+  RolledOver rolled;
+  std::vector<std::string> places;  // each moves to the next
+  bool free = false;
+  for (int number = 0; number <= oldest && !free; ++number) {
+    rolled.at = number == 0 ? name : name + "." + std::to_string(number);
     struct stat status;
-    if (::fstatat(folder, at.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
-      if (errno != ENOENT) return errno;
-      break;
+    free = ::fstatat(folder, rolled.at.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0;
+    if (free && errno != ENOENT) {
+      rolled.error = errno;
+      return rolled;
     }
-    if (!S_ISREG(status.st_mode)) return EINVAL;
+    if (free || S_ISREG(status.st_mode)) {
+      places.push_back(rolled.at);
+    } else if (number == 0) {
+      rolled.error = EINVAL;
+      return rolled;
+    } else {
+      rolled.inTheWay.push_back(rolled.at);
+    }
   }
-  for (int number = std::min(free, oldest) - 1; number >= 0; --number) {
-    at = numbered(number);
-    if (::renameat(folder, at.c_str(), folder, numbered(number + 1).c_str()) != 0) return errno;
+  if (places.size() == 1 && !free) {
+    rolled.error = EINVAL;
+    rolled.at = rolled.inTheWay.front();
+    return rolled;
   }
-  at = free > oldest ? numbered(oldest) : "";
-  return 0;
+  for (std::size_t place = places.size() - 1; place > 0; --place) {
+    rolled.at = places[place - 1];
+    if (::renameat(folder, rolled.at.c_str(), folder, places[place].c_str()) != 0) {
+      rolled.error = errno;
+      return rolled;
+    }
+  }
+  rolled.at = free ? "" : places.back();
+  return rolled;
 }
 
 int appendLines(int folder, const std::string& name, std::string_view lines) {
@@ -170,6 +186,7 @@ int appendLines(int folder, const std::string& name, std::string_view lines) {
   struct stat status;
   if (::fstat(file.get(), &status) != 0) return errno;
   if (!S_ISREG(status.st_mode)) return EINVAL;
+  if (status.st_nlink > 1) return EMLINK;
   const off_t whole = sizeOfWholeLines(file.get(), status.st_size);
   if (whole != status.st_size && ::ftruncate(file.get(), whole) != 0) return errno;
   const int error = writeAll(file.get(), lines);

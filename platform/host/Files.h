@@ -2,7 +2,8 @@
 // their names.
 //
 // Functions that write return 0 or an error number. A name that is taken by anything but a regular
-// file is refused with EINVAL; links are never followed. Files are made with mode 0600.
+// file is refused with EINVAL; links are never followed. A file that has other names is replaced or
+// renamed under this one, but not written to (EMLINK). Files are made with mode 0600.
 #pragma once
 
 #include <cstddef>
@@ -15,8 +16,8 @@
 
 namespace platform::host {
 
-// What an error number of these functions says: "not a regular file" for EINVAL, for ELOOP that
-// links are in the way, else the system's text.
+// What an error number of these functions says: "not a regular file" for EINVAL, "a file with
+// several names" for EMLINK, for ELOOP that links are in the way, else the system's text.
 const char* errorText(int error);
 
 // The bytes of an open regular file, at most `maximum` of them. Anything else than a regular file
@@ -51,11 +52,16 @@ int renameToFreeName(int fromFolder, const std::string& from, int toFolder, cons
 // Whether a name in an open folder is a link.
 bool isLink(int folder, const std::string& name);
 
+struct RolledOver {
+  int error = 0;
+  std::string at;                     // what the error is about, or whose content went; or neither
+  std::vector<std::string> inTheWay;  // numbers that were passed over: not regular files
+};
+
 // Renames a file to <name>.1, that to <name>.2, and so on up to the first number that is free;
-// where none is, the content of the one with the number `oldest` goes. A kill leaves at most a free
-// number. 0 or an error number; `at` then names the file that the error is about, or the one whose
-// content went, and is empty when nothing did.
-int rollOver(int folder, const std::string& name, int oldest, std::string& at);
+// where none is, the content of the last one goes. `oldest` is the last number. A kill leaves at
+// most a free number.
+RolledOver rollOver(int folder, const std::string& name, int oldest);
 
 // Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
 // file when it is missing. A line is in the file whole or not at all: what a failed write left is

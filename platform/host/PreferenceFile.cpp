@@ -58,7 +58,7 @@ void PreferenceFile::flush() {
 }
 
 std::string PreferenceFile::unwritten() const {
-  return writeError_.empty() ? "" : root_.hostPath(folder_) + "/" + name_ + ": " + writeError_;
+  return writeError_.empty() ? "" : path() + ": " + writeError_;
 }
 
 void PreferenceFile::add(std::string_view key, std::int64_t delta) {
@@ -104,8 +104,8 @@ void PreferenceFile::fail(State state, const std::string& why) {
   stored_ = {};
   if (why == readError_) return;
   readError_ = why;
-  log_.log(LogLevel::error, "Could not read %s/%s: %s; it reads as empty%s", folder_.c_str(),
-           name_.c_str(), why.c_str(),
+  log_.log(LogLevel::error, "Could not read %s: %s; it reads as empty%s", path().c_str(),
+           why.c_str(),
            state == State::broken ? " and is kept as .corrupt when it is replaced" : "");
 }
 
@@ -117,8 +117,7 @@ void PreferenceFile::write(const Edit& edit) {
     set_ = {};
     removed_.clear();
   } else if (error != writeError_) {
-    log_.log(LogLevel::error, "Could not write %s/%s: %s", folder_.c_str(), name_.c_str(),
-             error.c_str());
+    log_.log(LogLevel::error, "Could not write %s: %s", path().c_str(), error.c_str());
   }
   writeError_ = error;
 }

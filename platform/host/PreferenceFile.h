@@ -54,6 +54,7 @@ class PreferenceFile {
   void fail(State state, const std::string& why);
   void write(const Edit& edit);
   std::string merge(const Edit& edit);
+  std::string path() const { return root_.hostPath(folder_, name_); }
 
   const DeviceRoot& root_;
   PropertyListCodec& codec_;

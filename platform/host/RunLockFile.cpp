@@ -38,8 +38,8 @@ int openLocked(const DeviceRoot& root, FileDescriptor& file) {
 
 void RunLockFile::lock() {
   if (const int error = openLocked(root_, file_)) {
-    log_.log(LogLevel::error, "Could not lock %s/%s: %s; running without the lock", kFolder, kName,
-             errorText(error));
+    log_.log(LogLevel::error, "Could not lock %s: %s; running without the lock",
+             root_.hostPath(kFolder, kName).c_str(), errorText(error));
   }
 }
 

@@ -16,8 +16,7 @@ constexpr int kOldest = 7;
 
 void ServitaLogFiles::rollServitaLogs() {
   const auto report = [this](const std::string& name, const char* why) {
-    log_.log(LogLevel::error, "Could not roll %s%s%s: %s", kFolder, name.empty() ? "" : "/",
-             shownText(name).c_str(), why);
+    log_.log(LogLevel::error, "Could not roll %s: %s", root_.hostPath(kFolder, name).c_str(), why);
   };
   const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
   if (!folder) {
@@ -29,9 +28,10 @@ void ServitaLogFiles::rollServitaLogs() {
   if (const int error = namesInFolder(folder.get(), names)) report("", errorText(error));
   for (const std::string& log : names) {
     if (log.size() <= kSuffix.size() || !log.ends_with(kSuffix)) continue;
-    std::string name;
-    if (const int error = rollOver(folder.get(), log, kOldest, name))
-      report(name, errorText(error));
+    const RolledOver rolled = rollOver(folder.get(), log, kOldest);
+    if (rolled.error != 0) report(rolled.at, errorText(rolled.error));
+    if (rolled.error != 0) continue;
+    for (const std::string& name : rolled.inTheWay) report(name, errorText(EINVAL));
   }
 }
 

@@ -20,7 +20,8 @@ std::uint64_t counted(const struct stat& status) {
 }  // namespace
 
 SpoolFolder::SpoolFolder(const DeviceRoot& root, SystemLog& log)
-    : log_(log),
+    : root_(root),
+      log_(log),
       folder_(root.openFolder(kPath, DeviceRoot::Missing::create)),
       error_(folder_ ? 0 : errno),
       lock_(folder_.get()) {
@@ -83,16 +84,15 @@ void SpoolFolder::makeRoom(std::uint64_t bytes) {
     const Log oldest = std::move(logs_.back());
     logs_.pop_back();
     bytes_ -= oldest.bytes;
+    const std::string path = root_.hostPath(kPath, oldest.name);
     // The log goes first: its options alone are known for a remainder.
     if (::unlinkat(folder_.get(), oldest.name.c_str(), 0) != 0 && errno != ENOENT) {
-      log_.log(LogLevel::error, "Could not remove %s/%s: %s", kPath, shownText(oldest.name).c_str(),
-               errorText(errno));
+      log_.log(LogLevel::error, "Could not remove %s: %s", path.c_str(), errorText(errno));
       continue;
     }
     names_.erase(oldest.name);
     remove(oldest.name + kOptionsSuffix);
-    log_.log(LogLevel::standard, "Removed %s/%s, the oldest log: the spool is full", kPath,
-             shownText(oldest.name).c_str());
+    log_.log(LogLevel::standard, "Removed %s, the oldest log: the spool is full", path.c_str());
   }
 }
 

@@ -64,6 +64,7 @@ class SpoolFolder {
   void makeRoom(std::uint64_t bytes);
   bool isFree(const std::string& name) const;
 
+  const DeviceRoot& root_;
   SystemLog& log_;
   const FileDescriptor folder_;
   int error_;

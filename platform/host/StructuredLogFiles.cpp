@@ -117,19 +117,20 @@ off_t sizeOfAll(int folder, const std::vector<std::string>& names) {
   return all;
 }
 
-// Moves a file but for its first `dropped` bytes, of which it takes what it drops. 0 or an error
-// number.
-int moveToSpool(int folder, const std::string& name, off_t& dropped, SpoolFolder& spool,
-                SystemLog& log) {
+// Moves a file but for its first `dropped` bytes, of which it takes what it drops. `path` is the
+// file's for the log. 0 or an error number.
+int moveToSpool(int folder, const std::string& name, const std::string& path, off_t& dropped,
+                SpoolFolder& spool, SystemLog& log) {
   struct stat status;
   if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return errno;
   if (!S_ISREG(status.st_mode)) return EINVAL;
   if (spool.error() != 0) return spool.error();
   const std::string stem = "structured-" + name.substr(0, name.size() - kSuffix.size());
   if (dropped > 0 || status.st_size > kLargestPart) {
+    if (status.st_nlink > 1) return EMLINK;
     const off_t from = std::min<off_t>(dropped, status.st_size);
     dropped -= from;
-    log.log(LogLevel::standard, "%s/%s has %lld bytes: %s", kFolder, name.c_str(),
+    log.log(LogLevel::standard, "%s has %lld bytes: %s", path.c_str(),
             static_cast<long long>(status.st_size),
             from == 0 ? "it is cut into parts"
                       : format("the first %lld have no room in the spool and are dropped",
@@ -157,9 +158,9 @@ void StructuredLogFiles::logStructuredData(std::int32_t type, const Dictionary& 
   const std::string name = fileDay(now.secondsSince1970).append(kSuffix);
   const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
   const int error = folder ? appendLines(folder.get(), name, line) : errno;
-  if (error != 0) {
-    log_.log(LogLevel::error, "Could not write %s/%s: %s", kFolder, name.c_str(), errorText(error));
-  }
+  if (error == 0 || !said_.insert(error).second) return;
+  log_.log(LogLevel::error, "Could not write %s: %s; structured logs are dropped",
+           root_.hostPath(kFolder, name).c_str(), errorText(error));
 }
 
 void StructuredLogFiles::dumpAllOldStructuredDataLogs() {
@@ -167,7 +168,8 @@ void StructuredLogFiles::dumpAllOldStructuredDataLogs() {
   if (!folder && errno == ENOENT) return;
   std::vector<std::string> names;
   if (const int error = folder ? namesInFolder(folder.get(), names) : errno) {
-    log_.log(LogLevel::error, "Could not read %s: %s", kFolder, errorText(error));
+    log_.log(LogLevel::error, "Could not read %s: %s", root_.hostPath(kFolder).c_str(),
+             errorText(error));
   }
   const std::string today = fileDay(clock_.now().secondsSince1970);
   std::erase_if(names, [&today](const std::string& name) {
@@ -180,9 +182,10 @@ void StructuredLogFiles::dumpAllOldStructuredDataLogs() {
   // Of more than the spool has room for, the oldest goes.
   off_t dropped = std::max<off_t>(sizeOfAll(folder.get(), names) - kMostMoved, 0);
   for (const std::string& name : names) {
-    if (const int error = moveToSpool(folder.get(), name, dropped, spool, log_)) {
-      log_.log(LogLevel::error, "Could not move %s/%s to %s: %s", kFolder, name.c_str(),
-               SpoolFolder::kPath, errorText(error));
+    const std::string path = root_.hostPath(kFolder, name);
+    if (const int error = moveToSpool(folder.get(), name, path, dropped, spool, log_)) {
+      log_.log(LogLevel::error, "Could not move %s to %s: %s", path.c_str(),
+               root_.hostPath(SpoolFolder::kPath).c_str(), errorText(error));
     }
   }
 }

@@ -2,6 +2,8 @@
 // var/spool/morvend/structured/<day>.jsonl.
 #pragma once
 
+#include <set>
+
 #include "platform/Clock.h"
 #include "platform/FaultwatchSupport.h"
 #include "platform/SystemLog.h"
@@ -16,7 +18,7 @@ class StructuredLogFiles : public FaultwatchSupport {
   StructuredLogFiles(const DeviceRoot& root, Clock& clock, SystemLog& log)
       : root_(root), clock_(clock), log_(log) {}
 
-  // A log that can't be written is dropped, with an error line.
+  // A log that can't be written is dropped, with an error line for the first of each reason.
   void logStructuredData(std::int32_t type, const Dictionary& data) override;
 
   // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl; one
@@ -30,6 +32,7 @@ class StructuredLogFiles : public FaultwatchSupport {
   const DeviceRoot& root_;
   Clock& clock_;
   SystemLog& log_;
+  std::set<int> said_;  // error numbers of what couldn't be written
 };
 
 }  // namespace platform::host

@@ -84,11 +84,9 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
   const std::string stem = std::string(logName) + "." + std::string(logType) + "." +
                            fileTime(clock_.now().secondsSince1970);
   const auto fail = [&](const char* why) {
-    log_.log(LogLevel::error, "Could not submit %s/%s: %s", SpoolFolder::kPath,
-             shownText(stem).c_str(), why);
-    if (unsubmitted_.empty()) {
-      unsubmitted_ = root_.hostPath(SpoolFolder::kPath) + "/" + shownText(stem) + ": " + why;
-    }
+    const std::string what = root_.hostPath(SpoolFolder::kPath, stem) + ": " + why;
+    log_.log(LogLevel::error, "Could not submit %s", what.c_str());
+    if (unsubmitted_.empty()) unsubmitted_ = what;
     return false;
   };
   if (logType.empty() || logName.empty() || logName.starts_with('.') ||

@@ -57,7 +57,7 @@ TEST_F(EventSinkTest, AFullFileMakesRoomAndTheOldestOfFourIsDropped) {
                 number <= std::min(round + 1, EventSink::kKept));
     }
   }
-  EXPECT_EQ(log.count("default: Dropped the events of /var/spool/morvend/events.jsonl.4"), 2);
+  EXPECT_EQ(log.count("default: Dropped the events of " + root.hostPath(name + ".4")), 2);
   EXPECT_EQ(log.lines().size(), 2u);
 }
 
@@ -83,7 +83,7 @@ TEST_F(EventSinkTest, ABrokenConfigurationIsSaidOnceAndLeavesEveryEventUsed) {
   folder.write("device/analytics.plist", "garbage");
   EXPECT_TRUE(sink.EventraIsEventUsed("any"));
   EXPECT_TRUE(sink.offersLazySend());
-  EXPECT_EQ(log.count("error: Could not read /device/analytics.plist: "), 1);
+  EXPECT_EQ(log.count("error: Could not read " + root.hostPath("device/analytics.plist: ")), 1);
 }
 
 TEST_F(EventSinkTest, TheQueueIsBounded) {
@@ -124,11 +124,35 @@ TEST_F(EventSinkTest, NoEventIsLostBetweenSendersProducersAndDrains) {
 }
 
 TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
-  std::filesystem::create_directories(folder / kEvents);
-  for (int n = 0; n < 3; ++n) {
-    send();
+  const std::string name = kEvents, full(EventSink::kMaximumFile, '\n');
+  const struct {
+    std::vector<const char*> folders;
+    bool secondName;
+    std::string line;
+  } rows[] = {{{""}, false, name + ": not a regular file"},
+              {{}, true, name + ": a file with several names"},
+              {{".1", ".2", ".3", ".4"}, false, name + ".1: not a regular file"}};
+  for (const auto& row : rows) {
+    log.clear();
+    std::filesystem::remove_all(folder / "var");
+    if (row.folders.size() != 1) folder.write(name, row.secondName ? "one\n" : full);
+    for (const char* end : row.folders) std::filesystem::create_directories(folder / (name + end));
+    if (row.secondName) std::filesystem::create_hard_link(folder / name, folder / "other");
+    EventSink failing(root, codec, clock, log);
+    for (int n = 0; n < 3; ++n) {
+      EXPECT_TRUE(failing.EventraSendEventLazy("event", nothing));
+      failing.drain();
+    }
+    EXPECT_EQ(log.count("error: Could not write " + root.hostPath(row.line)), 1) << row.line;
+    EXPECT_EQ(log.lines().size(), 1u);
   }
-  EXPECT_EQ(log.count("error: Could not write /var/spool/morvend/events.jsonl: "), 1);
+  EXPECT_EQ(folder.read("other"), "one\n");
+  // What a number is taken by is passed over as long as another one is left.
+  std::filesystem::remove(folder / (name + ".3"));
+  send();
+  EXPECT_EQ(lines(), 1);
+  EXPECT_TRUE(folder.read(name + ".3") == full);
+  EXPECT_EQ(log.count("error: Passed over " + root.hostPath(name)), 2);
 }
 
 }  // namespace

@@ -19,7 +19,7 @@ struct PreferenceFilesTest : testing::Test, support::HostServices {
     return value ? std::optional(*value->as<Dictionary>()) : std::nullopt;
   }
   // Reads the file as empty with this one line, and puts it aside when it is written.
-  void expectPutAside(const char* line) {
+  void expectPutAside(const std::string& line) {
     log.clear();
     PreferenceFiles files(root, codec, log);
     EXPECT_EQ(files.QNSPreferencesGetValue("key", kDomain), std::nullopt);
@@ -126,7 +126,7 @@ TEST_F(PreferenceFilesTest, AFileCutAnywhereReadsAsEmptyIsKeptAndSaidOnce) {
   for (std::size_t size = 0; size <= end; ++size) {
     SCOPED_TRACE(size);
     folder.write(kFile, whole.substr(0, size));
-    expectPutAside("error: Could not read /var/preferences/mobile/com.example.plist: ");
+    expectPutAside("error: Could not read " + root.hostPath(kFile) + ": ");
     EXPECT_EQ(folder.read(kKept), whole.substr(0, size));
   }
 }
@@ -157,7 +157,7 @@ TEST_F(PreferenceFilesTest, LinksAreFollowedToWhatIsReadAndRefusedWhereItIsWritt
     set(files, "new", 1);
     files.QNSPreferencesSynchronize(kDomain);
     EXPECT_EQ(folder.read(kFile), xml({{"key", 1}})) << link;
-    EXPECT_EQ(log.count("error: Could not write /var/preferences/mobile/com.example.plist: "), 1);
+    EXPECT_EQ(log.count("error: Could not write " + root.hostPath(kFile) + ": "), 1);
     EXPECT_EQ(log.lines().size(), 1u);
     std::filesystem::remove(folder / link);
     std::filesystem::remove_all(folder / "elsewhere");
@@ -171,7 +171,7 @@ TEST_F(PreferenceFilesTest, AFailedWriteIsSaidOnceStaysVisibleAndIsTriedAgain) {
     set(files, "key", 1);
     files.QNSPreferencesSynchronize(kDomain);
     files.QNSPreferencesSynchronize(kDomain);
-    EXPECT_EQ(log.count("error: Could not write /var/preferences/mobile/com.example.plist: "), 1);
+    EXPECT_EQ(log.count("error: Could not write " + root.hostPath(kFile) + ": "), 1);
     EXPECT_EQ(files.QNSPreferencesGetIntegerValue("key", kDomain), 1);
     std::filesystem::remove(folder / "var/preferences/mobile");
   }

@@ -53,7 +53,7 @@ TEST(RunLockFile, WithoutTheFileTheRunGoesOn) {
     lock.lock();
     lock.unlock();
     EXPECT_TRUE(support::untouched(kind, at, target));
-    EXPECT_EQ(host.log.count("error: Could not lock /var/run/morvend.lock: "), 1);
+    EXPECT_EQ(host.log.count("error: Could not lock " + host.root.hostPath(kLock) + ": "), 1);
   }
 }
 

@@ -45,18 +45,19 @@ TEST(ServitaLogFiles, OldLogsMoveUpToTheFirstFreeNumber) {
   }
 }
 
-TEST(ServitaLogFiles, ALogWithAnythingElseInItsWayStays) {
+TEST(ServitaLogFiles, WhatIsNoLogStaysAndIsPassedOver) {
   for (const support::Kind kind : support::kOtherKinds) {
-    for (const char* place : {"a.log", "a.log.1"}) {
+    for (const std::string place : {"a.log", "a.log.1"}) {
       support::HostServices host;
       const auto at = host.folder.path() / kFolder / place, target = host.folder / "target";
       support::put(kind, at, target);
-      if (std::string_view(place) != "a.log") host.folder.write("var/log/servita/a.log", "0");
+      if (place != "a.log") host.folder.write("var/log/servita/a.log", "0");
       host.folder.write("var/log/servita/b.log", "b");
       ServitaLogFiles(host.root, host.log).rollServitaLogs();
       EXPECT_TRUE(support::untouched(kind, at, target));
       EXPECT_EQ(host.folder.read("var/log/servita/b.log.1"), "b");
-      EXPECT_EQ(host.log.count(std::string("error: Could not roll /var/log/servita/") + place +
+      EXPECT_EQ(host.folder.read("var/log/servita/a.log.2"), place == "a.log" ? "" : "0");
+      EXPECT_EQ(host.log.count("error: Could not roll " + host.root.hostPath(kFolder) + place +
                                ": not a regular file"),
                 1);
     }

@@ -50,12 +50,27 @@ TEST_F(StructuredLogFilesTest, EarlierDaysGoToTheSpoolAndNothingElseDoes) {
   EXPECT_TRUE(log.lines().empty());
 }
 
+TEST_F(StructuredLogFilesTest, WhatCannotBeWrittenIsSaidOnceForEachReason) {
+  const std::string today = kStructured + std::string("2026-11-22.jsonl");
+  folder.write("other", "other\n");
+  std::filesystem::create_directories(folder / kStructured);
+  std::filesystem::create_hard_link(folder / "other", folder / today);
+  for (const char* why : {"a file with several names", "not a regular file"}) {
+    for (int n = 0; n < 3; ++n) logs.logStructuredData(1, {});
+    EXPECT_EQ(log.count("error: Could not write " + root.hostPath(today) + ": " + why), 1);
+    std::filesystem::remove(folder / today);
+    std::filesystem::create_directory(folder / today);
+  }
+  EXPECT_EQ(log.lines().size(), 2u);
+  EXPECT_EQ(folder.read("other"), "other\n");
+}
+
 TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
   const auto at = folder.path() / kStructured / "2026-11-20.jsonl", target = folder / "target";
   for (const support::Kind kind : support::kOtherKinds) {
     support::put(kind, at, target);
     logs.dumpAllOldStructuredDataLogs();
-    EXPECT_EQ(log.count("error: Could not move /var/spool/morvend/structured/2026-11-20.jsonl"), 1);
+    EXPECT_EQ(log.count("error: Could not move " + at.string()), 1);
     EXPECT_TRUE(support::untouched(kind, at, target));
     std::filesystem::remove(at);
     std::filesystem::remove(target);
@@ -66,6 +81,11 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
                             '\n' + std::string((9 << 20), 'c') + '\n' + std::string(99, 'd');
   folder.write(kSubmitted + std::string("kept"), "kept");
   folder.write(kStructured + std::string("2026-11-20.jsonl"), lines);
+  std::filesystem::create_hard_link(at, target);
+  logs.dumpAllOldStructuredDataLogs();
+  EXPECT_EQ(log.count("several names"), 1);
+  std::filesystem::remove(target);
+  log.clear();
   logs.dumpAllOldStructuredDataLogs();
   std::string whole;
   for (const char* part : {"", "-2", "-3", "-4"}) {
@@ -74,7 +94,7 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
     whole += text;
   }
   EXPECT_TRUE(whole == lines);
-  EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-20.jsonl has"), 1);
+  EXPECT_EQ(log.count("default: " + at.string() + " has"), 1);
   EXPECT_EQ(log.lines().size(), 1u);
   EXPECT_EQ(submitted("kept"), "kept");
   // More than the spool holds: its newest end, beside the logs that are there.
@@ -86,9 +106,7 @@ TEST_F(StructuredLogFilesTest, WhatIsNoFileStaysAndWhatIsTooLargeIsCut) {
   logs.dumpAllOldStructuredDataLogs();
   EXPECT_EQ(submitted("structured-2026-11-19.jsonl").size(),
             (std::size_t{48} << 20) - lines.size());
-  EXPECT_EQ(log.count("default: /var/spool/morvend/structured/2026-11-19.jsonl has 68719476736 "
-                      "bytes: the first 6871318"),
-            1);
+  EXPECT_EQ(log.count("2026-11-19.jsonl has 68719476736 bytes: the first 6871318"), 1);
   EXPECT_EQ(submitted("kept"), "kept");
 }
 

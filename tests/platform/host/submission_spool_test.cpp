@@ -94,7 +94,7 @@ TEST_F(SubmissionSpoolTest, TheOldestLogsGoWithTheirOptionsAndALineEach) {
     EXPECT_FALSE(left.contains(gone)) << gone;
   }
   EXPECT_TRUE(left.contains("old-2") && left.contains(kLog));
-  EXPECT_EQ(log.count("default: Removed /var/spool/morvend/submitted/old-"), 2);
+  EXPECT_EQ(log.count("default: Removed " + root.hostPath("var/spool/morvend/submitted/old-")), 2);
 }
 
 TEST_F(SubmissionSpoolTest, TheBytesAreBounded) {
@@ -108,7 +108,8 @@ TEST_F(SubmissionSpoolTest, TheBytesAreBounded) {
   log.clear();
   EXPECT_FALSE(submit(std::string(64 * kMiB + 1, 'x')));
   EXPECT_EQ(names(), (std::set<std::string>{kLog}));
-  EXPECT_EQ(log.count("error: Could not submit /var/spool/morvend/submitted/log-pellorand.193."),
+  EXPECT_EQ(log.count("error: Could not submit " +
+                      root.hostPath("var/spool/morvend/submitted/log-pellorand.193.")),
             1);
   old("exact", 64 * kMiB - 10, 0);
   EXPECT_TRUE(submit());
