@@ -45,15 +45,12 @@ TEST(GenericParserContext, CutsLongNamesAndKeepsEqualOnes) {
   AddSingleValueToGenericContext(&context, longName, "suffix", 1);
   AddSingleValueToGenericContext(&context, name97, "12", kLargest);
   AddSingleValueToGenericContext(&context, "", "boots", 2);
-  AddSingleValueToGenericContext(&context, "", "", 3);
   AddSingleValueToGenericContext(&context, "bo", "ots", 4);
-  EXPECT_EQ(fieldsOf(context), (Fields{{longName.substr(0, 98), 1},
-                                       {name97 + "1", kLargest},
-                                       {"boots", 2},
-                                       {"", 3},
-                                       {"boots", 4}}));
+  EXPECT_EQ(
+      fieldsOf(context),
+      (Fields{{longName.substr(0, 98), 1}, {name97 + "1", kLargest}, {"boots", 2}, {"boots", 4}}));
   const auto dictionary = CreateDictFromCxt(context);
-  EXPECT_EQ(dictionary.size(), 4u);
+  EXPECT_EQ(dictionary.size(), 3u);
   EXPECT_EQ(dictionary.number("boots")->uint64Value(), 4u);
   EXPECT_EQ(dictionary.number("boots")->type(), platform::Number::Type::uint64);
   EXPECT_EQ(dictionary.number(name97 + "1")->uint64Value(), kLargest);
@@ -93,13 +90,9 @@ TEST(GenericParserContext, SurvivesARefusalAtEachAllocation) {
 TEST(APIErrorMessage, KeepsTheFirstOne) {
   support::freshErrors();
   EXPECT_STREQ(GetAPIErrorMessage(), "NA");
-  SetAPIErrorMessage("%s(%d)", std::string(2000, 'm').c_str(), 1);
+  SetAPIErrorMessage("%d%s", 7, std::string(2000, 'm').c_str());
   SetAPIErrorMessage("second");
-  EXPECT_EQ(GetAPIErrorMessage(), std::string(1023, 'm'));
-  support::freshErrors();
-  SetAPIErrorMessage("failed: %d", 7);
-  EXPECT_STREQ(GetAPIErrorMessage(), "failed: 7");
-  support::freshErrors();
+  EXPECT_EQ(GetAPIErrorMessage(), "7" + std::string(1022, 'm'));
 }
 
 }  // namespace

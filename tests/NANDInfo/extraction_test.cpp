@@ -18,8 +18,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
-using platform::Value;
+using platform::Dictionary, platform::Value;
 using support::StorageDevice;
 using u64 = std::uint64_t;
 

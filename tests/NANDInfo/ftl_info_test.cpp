@@ -9,13 +9,8 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
-using platform::Number;
-using support::kEmbedded;
-using support::kQRT3;
-using support::kZMCStorage;
-using support::StorageDevice;
-using Lines = std::vector<std::string>;
+using platform::Dictionary, platform::Number;
+using support::kQRT3, support::kZMCStorage, support::StorageDevice;
 
 constexpr std::uint64_t kMany = ~std::uint64_t{0};
 
@@ -54,7 +49,6 @@ TEST(FTLInfo, GatheringByItsFailures) {
       std::string message;
     } rows[] = {
         {kQRT3, nothing, byName, buffer, flags(named, 0, 1), "NA"},
-        {kEmbedded, nothing, byName, buffer, flags(named, 0, 1), "NA"},
         {kZMCStorage, nothing, byName, buffer, flags(named, 1, 1), "NA"},
         {kQRT3, nothing, FTLParser::statKey, buffer, flags(keys, 0, 0), noMagazine},
         {kQRT3, nothing, byName, support::Bytes(), {}, failed + "parseFTL failed"},
@@ -83,7 +77,6 @@ TEST(FTLInfo, DerivedFields) {
   const struct {
     Dictionary ftl, derived;
   } rows[] = {
-      {{}, {}},
       {{{"userPartitionStart", 9}}, {}},
       {{{"userPartitionStart", 9}, {"intermediatePartitionStart", 4}},
        {{"TLM_intermediatePartitionSize", 5}}},
@@ -193,12 +186,6 @@ TEST(FTLInfo, WhitelistedAndWhole) {
   EXPECT_EQ(whole->number("hostWrites")->uint64Value(), 123456789012u);
   EXPECT_EQ(*whole->text("TLM_APIErrorMessage"), "NA");
   EXPECT_NE(CopyNANDFTLInfo(device.platform, true, true)->find("Stat_4"), nullptr);
-
-  StorageDevice missing;
-  const auto none =
-      Dictionary{{"TLM_APIErrorMessage", "gatherZMCFTLData: Could not get nand_exporter_t"}};
-  EXPECT_EQ(CopyWhitelistedNANDFTLInfo(missing.platform, true), none);
-  EXPECT_EQ(CopyNANDFTLInfo(missing.platform, true, true), none);
 }
 
 }  // namespace

@@ -8,9 +8,7 @@ namespace NANDInfo {
 namespace {
 
 using platform::Dictionary;
-using support::kQRT3;
-using support::kZMCStorage;
-using support::StorageDevice;
+using support::kQRT3, support::kZMCStorage, support::StorageDevice;
 
 constexpr std::uint64_t kNegative = 0xFFFFFFFF;  // in 32 bits
 constexpr std::uint64_t kNegative64 = ~std::uint64_t{0};
@@ -29,8 +27,7 @@ const struct {
     {kQRT3,
      {{"fwUpdatesPercentUsed", {kNegative}}, {"slcPercentUsed", {12}}, {"percentUsed", {11}}},
      {12, 0, 0}},
-    {kQRT3, {{"E2EDPErrorCounters", {1, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}},
-    {kQRT3, {{"E2EDPErrorCounters", {kNegative64, 3, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}}}, {0, 3, 0}},
+    {kQRT3, {{"E2EDPErrorCounters", {kNegative64, 2, 3, 4, 9, 5, 6, 7, 8, 1, 1, 10}}}, {0, 10, 0}},
     {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {8}}}, {0, 0, 8}},
     {kQRT3, {{"ueccReads", {7}}, {"raidSmartErrors", {kNegative64}}}, {0, 0, 0}},
     // All but these two are read as the 64-bit numbers that they are.

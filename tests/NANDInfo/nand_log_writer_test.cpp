@@ -12,10 +12,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Array;
-using platform::Date;
-using platform::Dictionary;
-using platform::Value;
+using platform::Array, platform::Date, platform::Dictionary, platform::Value;
 using Lines = std::vector<std::string>;
 
 constexpr char kDomain[] = "com.norba.pellorand.morvend";

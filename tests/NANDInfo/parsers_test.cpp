@@ -161,7 +161,6 @@ TEST(MSPParser, ReadsRecordsUpToTheEnd) {
        {{"passWithTmodeHard", 6}}},
       {{{0x1000, 4, {7}}, {0x2FFF, 4, {1}}, {0x1000, 4, {8}}}, {{"passWithTmodeHard", 7}}},
       // A length beyond the end.
-      {{{0x1000, 4, {7}}, {0x2FFE, 4, {1}, 8}}, {{"passWithTmodeHard", 7}}},
       {{{0x1000, 4, {7}}, {0x1001, 4, {1}, 8}}, {{"passWithTmodeHard", 7}}},
       // Payloads longer and shorter than configured; what follows may be unaligned.
       {{{0x1000, 4, {1, 2}}, {0x1001, 4, {3}}},

@@ -10,8 +10,7 @@
 namespace NANDInfo {
 namespace {
 
-using support::Bytes;
-using support::put;
+using support::Bytes, support::put;
 
 Bytes item(std::uint32_t type, std::uint64_t flags, const Bytes& payload = {}) {
   Bytes bytes;

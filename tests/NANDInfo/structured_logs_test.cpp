@@ -23,9 +23,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using platform::Array, platform::Dictionary, platform::Value;
 using platform::fakes::FakeDeviceRegistry;
 using support::Bytes, support::kEmbedded, support::kQRT3, support::kZMCStorage;
 using Entry = FakeDeviceRegistry::Entry;
@@ -126,13 +124,12 @@ TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
     std::uint64_t vendor;
     CounterConverter* convert;
     std::size_t readStages, dspExceptions;
-    const char* last;
-  } rows[] = {{"QM7", hynix, parseCountersAlgoGeneric, 23, 12, "algoNANDAccessesBin[7]"},
-              {"QM8", sandisk, parseCountersAlgoGenericQ8, 33, 38, "retentionIndication[11]"},
-              {"QM9", sandisk, parseCounters1xSandisk, 23, 12, "readStage19NumOfErrorsBin[11]"},
-              {"", 0x458260DE5700, parseCounters1xSandisk, 23, 12, "readStage19NumOfErrorsBin[11]"},
-              {"qm7", hynix, parseCounters1xHynix, 23, 12, "readStage19NumOfErrorsBin[11]"},
-              {"QM7 ", 1, parseCounters1y, 23, 12, "readStage19NumOfErrorsBin[11]"}};
+  } rows[] = {{"QM7", hynix, parseCountersAlgoGeneric, 23, 12},
+              {"QM8", sandisk, parseCountersAlgoGenericQ8, 33, 38},
+              {"QM9", sandisk, parseCounters1xSandisk, 23, 12},
+              {"", 0x458260DE5700, parseCounters1xSandisk, 23, 12},
+              {"qm7", hynix, parseCounters1xHynix, 23, 12},
+              {"QM7 ", 1, parseCounters1y, 23, 12}};
   for (const auto& row : rows) {
     SCOPED_TRACE(row.chip);
     const ChipKind chip = chipKind(row.chip);
@@ -163,7 +160,6 @@ TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
     expect("algoNANDAccessesBin", 157, chip == ChipKind::QM7 ? 8 : 0);
     expect("retentionIndication", 165, chip == ChipKind::QM8 ? 12 : 0);
     EXPECT_EQ(description(log), description(expected));  // the order too
-    EXPECT_EQ((log.end() - 1)->key, row.last);
   }
 }
 
@@ -335,11 +331,9 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
     std::size_t submitted, structured;
   } rows[] = {
       {{say("9 size 11/0", {kError})}, {failed + "0\n"}, true, 0, 8},
-      {{say("9 size 15/0", {kError})}, {failed + "4\n"}, true, 1, 6},
       {{noValidity, say("9 size 15/0", {kError})}, {validity, failed + "3\n"}, true, 0, 6},
       {{say("9 data 17/1", {kError})}, {notFetched}, true, 1, 6},
       {{say("9 size 17/2", announce(0))}, {}, true, 1, 6},
-      {{say("9 size 17/2", {})}, {}, true, 1, 6},
       {{say("9 size 15/0", oneByte)}, {}, true, 1, 7},
       {{say("9 data 15/0", overlong)}, {}, true, 1, 7},
       {{say("9 data 11/0", {})}, {unparsable}, false, 0, 8},
@@ -348,7 +342,6 @@ TEST_F(StructuredLogsTest, AFailureEndsOneListOnly) {
       {{say("9 size 15/0", announce(~0u))}, {tooLarge + "4294967295 bytes"}, false, 1, 6},
       {{list(17, 8255)}, {beyond}, false, 1, 6},
       {{list(11, 40), list(15, 11)}, {unparsable, unparsable}, false, 0, 6},
-      {{noTelemetry}, {telemetry}, true, 1, 2},
       {{noPair}, {}, false, 1, 2},
       {{noValidity, noTelemetry, noDefects}, {validity, telemetry, defects}, true, 0, 0},
       {{noChip}, Lines(3, "ERROR: Could not determine the chip-id\n"), false, 1, 2},
@@ -427,11 +420,9 @@ TEST_F(StructuredLogsTest, TelemetryNeedsThreeCharacteristics) {
        0},
       {with("manufacturer-id", {}), missing + "manufacturer-id\n", 0},
       {with("manufacturer-id", 7), no + "manufacturer-id" + noText, 0},
-      {with("manufacturer-id", "AD"), "", 2},
       {with("manufacturer-id", ""), "", 2},
       {with("num-bus", {}), noCount, 0},
       {with("num-bus", "2"), noCount, 0},
-      {with("num-bus", 0), "", 0},
       {with("num-bus", -1), "", 0},
       {with("num-bus", 1), "", 1},
       {with("num-bus", 3), "ERROR: Attempting to parse beyond the bounds of the buffer\n", 0},

@@ -11,10 +11,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Number;
-using platform::Value;
+using platform::Array, platform::Dictionary, platform::Number, platform::Value;
 
 TEST(NumberValue, IsReadInItsKindFromAnyAddressAndItsAbsenceLogged) {
   support::TestPlatform fakes;
@@ -36,11 +33,10 @@ TEST(NumberValue, IsReadInItsKindFromAnyAddressAndItsAbsenceLogged) {
   for (const auto& [kind, number] : rows) {
     setNumberValueForType(platform, dictionary, "key", odd, kind);
     appendNumberValueForType(platform, array, odd, kind);
-    for (const Value* value :
-         {std::as_const(dictionary).find("key"), &std::as_const(array).back()}) {
-      ASSERT_NE(value->as<Number>(), nullptr);
-      EXPECT_EQ(*value->as<Number>(), number);
-      EXPECT_EQ(value->as<Number>()->type(), number.type());
+    for (const Number* value :
+         {dictionary.number("key"), std::as_const(array).back().as<Number>()}) {
+      EXPECT_EQ(*value, number);
+      EXPECT_EQ(value->type(), number.type());
     }
   }
   EXPECT_TRUE(fakes.log.lines().empty());

@@ -67,13 +67,10 @@ TEST(RoundSig, RoundsHalfUpAtTheDigitsOfTheLogarithm) {
   const struct {
     std::uint64_t value, digits, rounded;
   } rows[] = {{0, 0, 0},
-              {0, 8, 0},
-              {1, 0, 0},
               {4, 0, 0},
               {5, 0, 10},
               {123456, 0, 0},
               {999, 0, 1000},
-              {12345, 2, 12000},
               {12499, 2, 12000},
               {12500, 2, 13000},
               {99, 2, 99},
@@ -94,18 +91,14 @@ TEST(UserCapacity, IsThePowerOfTwoAboveOrTheOneBetween) {
   const struct {
     std::uint32_t megabytes, gigabytes;
   } rows[] = {{0, 0},
-              {1, 0},
               {511, 0},
               {512, 1},
-              {1024, 2},
               {119000, 128},
-              {250000, 256},
               {1376255, 2048},
               {1376256, 1536},
               {1770495, 1536},
               {1770496, 2048},
               {(1u << 30) - 1, 1u << 20},
-              {1u << 31, 1u << 22},
               {UINT32_MAX, 1u << 22}};
   for (const auto& [megabytes, gigabytes] : rows) {
     EXPECT_EQ(GetUserCapacityInGB(megabytes), gigabytes) << megabytes;
