@@ -78,6 +78,8 @@ constexpr char kFirstSteps[] =
     "NORWrites ";
 
 TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
+  const std::string windows =
+      "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 SM.Monthly.FTLCounters_1 ";
   const struct {
     const char* what;
     std::function<void(FullDevice&)> alter;
@@ -86,38 +88,30 @@ TEST(Extraction, RunsItsStepsAsFarAsTheDeviceAllows) {
     std::string events;
     int successes, failures;  // lines of events
   } rows[] = {
-      {"all", [](FullDevice&) {}, true, 0,
-       std::string(kFirstSteps) +
-           "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 SM.Monthly.FTLCounters_1 ",
-       9, 0},
-      {"from the magazine on", [](FullDevice&) {}, false, 4,
+      {"all", [](auto&) {}, true, 0, kFirstSteps + windows, 9, 0},
+      {"from the magazine on", [](auto&) {}, false, 4,
        "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 ", 2, 0},
-      {"the month alone", [](FullDevice&) {}, true, 6, "SM.Monthly.FTLCounters_1 ", 1, 0},
-      {"beyond the last", [](FullDevice&) {}, true, 7, "", 0, 0},
+      {"the month alone", [](auto&) {}, true, 6, "SM.Monthly.FTLCounters_1 ", 1, 0},
+      {"beyond the last", [](auto&) {}, true, 7, "", 0, 0},
       {"some are unused",
-       [](FullDevice& device) {
-         device.eventra.unused = {kEventName_massStorage_NANDInfo_FTLHistograms_1,
-                                  kEventName_massStorage_NANDInfo_MSPCounters_1,
-                                  kEventName_massStorage_NANDInfo_SM_Daily_FTLCounters_1};
+       [](auto& d) {
+         d.eventra.unused = {kEventName_massStorage_NANDInfo_FTLHistograms_1,
+                             kEventName_massStorage_NANDInfo_MSPCounters_1,
+                             kEventName_massStorage_NANDInfo_SM_Daily_FTLCounters_1};
        },
        false, 0,
        "FTLCounters_1 FTLHistograms_2 StorageStats_1 NORWrites SM.WeeklyMA.FTLCounters_1 ", 4, 4},
-      {"the queue is full", [](FullDevice& device) { device.eventra.queuesEvents = false; }, true,
-       0, "", 0, 9},
-      {"no sink", [](FullDevice& device) { device.eventra.hasLazySend = false; }, true, 0, "", 0,
-       0},
+      {"the queue is full", [](auto& d) { d.eventra.queuesEvents = false; }, true, 0, "", 0, 9},
+      {"no sink", [](auto& d) { d.eventra.hasLazySend = false; }, true, 0, "", 0, 0},
       {"no magazine",
-       [](FullDevice& device) {
-         device.setCounters({"boots", {1}});
+       [](auto& d) {
+         d.setCounters({"boots", {1}});
        },
        true, 0, kFirstSteps, 6, 0},
       {"no NVRAM statistics",
-       [](FullDevice& device) {
-         device.registry.root->children[1] = {.className = "NvramDiagService"};
-       },
-       true, 3, "SM.Daily.FTLCounters_1 SM.WeeklyMA.FTLCounters_1 SM.Monthly.FTLCounters_1 ", 3, 0},
-      {"no controller and no NVRAM",
-       [](FullDevice& device) { device.registry.root = std::nullopt; }, true, 0,
+       [](auto& d) { d.registry.root->children[1] = {.className = "NvramDiagService"}; }, true, 3,
+       windows, 3, 0},
+      {"no controller and no NVRAM", [](auto& d) { d.registry.root = std::nullopt; }, true, 0,
        "FTLCounters_1 FTLHistograms_1 FTLHistograms_2 StorageStats_1 ", 4, 0}};
   for (const auto& [what, alter, monthly, firstStep, events, successes, failures] : rows) {
     SCOPED_TRACE(what);
