@@ -201,6 +201,11 @@ TEST_F(ControllerTest, DeletionAndConnectionsByTheirFailures) {
     EXPECT_EQ(connection.exporter->io_connection, connection.connection);
     closeZMCConnection(platform, connection);
     EXPECT_EQ(connection.exporter->io_connection + connection.connection + connection.service, 0u);
+    // Another's connection, which the record got since, stays in it.
+    if (open) openZMCConnection(platform, connection);
+    connection.exporter->io_connection = 99;
+    closeZMCConnection(platform, connection);
+    EXPECT_EQ(std::exchange(connection.exporter->io_connection, 0), 99u);
     return open;
   };
   const Bytes threeBytes(3, std::byte{1});
