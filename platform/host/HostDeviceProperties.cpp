@@ -21,7 +21,7 @@ bool isPlainName(std::string_view name) {
 // The same on every boot of this machine, and no other program's.
 std::optional<std::string> identifierOfOurs() {
   constexpr sd_id128_t kApplication =
-      SD_ID128_MAKE(60, 4e, 83, 89, 41, 9e, 13, a3, 42, 9b, c1, ab, fd, 4f, b5, 62);
+      SD_ID128_ARRAY(60, 4e, 83, 89, 41, 9e, 13, a3, 42, 9b, c1, ab, fd, 4f, b5, 62);
   sd_id128_t id;
   if (::sd_id128_get_machine_app_specific(kApplication, &id) < 0) return std::nullopt;
   std::array<char, SD_ID128_STRING_MAX> text;
