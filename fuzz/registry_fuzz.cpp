@@ -44,7 +44,7 @@ class CountingLog : public SystemLog {
  private:
   void write(LogLevel, std::string_view message) override {
     ++lines;
-    handlesWereLost |= message.find("not released") != message.npos;
+    handlesWereLost |= message.ends_with(" driver handles were not released");
   }
 };
 

@@ -264,8 +264,9 @@ TEST(Documents, TheirMessagesStartTheService) {
     for (int signal = SIGTERM; ::kill(service, signal) == 0; signal = 0) {
       std::this_thread::sleep_for(std::chrono::milliseconds(5));
     }
-    ASSERT_EQ(device.dailyLogs().size(), 1u);
-    const auto* applications = device.dailyLogs()[0].array("PLActivatedAppInfo");
+    const auto logs = device.dailyLogs();
+    ASSERT_EQ(logs.size(), 1u);
+    const auto* applications = logs[0].array("PLActivatedAppInfo");
     ASSERT_NE(applications, nullptr);
     EXPECT_EQ(applications->size(), 1u);
   }
