@@ -28,9 +28,9 @@ using platform::Value;
 
 static_assert(kChannelSize == NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize);
 
-Dictionary whole(Dictionary content, bool ok, const std::string& error) {
+Dictionary whole(const Dictionary& content, bool ok, const std::string& error) {
   Dictionary decoded{{"ok", ok}};
-  for (auto& [key, value] : content) decoded.set(key, value);
+  for (const auto& [key, value] : content) decoded.set(key, value);
   decoded.set("error", error);
   return decoded;
 }
