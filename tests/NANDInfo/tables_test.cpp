@@ -17,12 +17,16 @@
 namespace NANDInfo {
 namespace {
 
-// Of the lines in bytewise order.
-std::uint64_t digestOf(std::vector<std::string> lines) {
-  std::ranges::sort(lines);
+std::uint64_t digestInOrder(const std::vector<std::string>& lines) {
   std::string text;
   for (const std::string& line : lines) text += line + "\n";
   return support::fingerprint(text);
+}
+
+// Of the lines in bytewise order.
+std::uint64_t digestOf(std::vector<std::string> lines) {
+  std::ranges::sort(lines);
+  return digestInOrder(lines);
 }
 
 std::string lineOf(std::string_view name, const std::vector<std::size_t>& numbers) {
@@ -64,7 +68,7 @@ TEST(Tables, HoldTheirNamesAndDigitsOnceEach) {
   }
   EXPECT_EQ(event("NORWrites"), nullptr);
   const auto derived = FTLStats4MSPStats();
-  EXPECT_EQ(digestOf({derived.begin(), derived.end()}), 0xfef0a2b9649575a4);
+  EXPECT_EQ(digestInOrder({derived.begin(), derived.end()}), 0x0e69bd3a0b74e822);
 }
 
 // That every one is found is the parsers' business.

@@ -17,6 +17,7 @@
 #include "tools/demo/Device.h"
 #include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/DeviceMaker.h"
+#include "tools/mkdevice/Sample.h"
 #include "tools/mkdevice/SampleController.h"
 #include "tools/mkdevice/SampleUsage.h"
 #include "tools/mkdevice/Vocabulary.h"
@@ -70,6 +71,10 @@ TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
     const auto times = static_cast<std::size_t>(scale);
     EXPECT_TRUE(days > 0 || yesterday.scalars.size() == scalarTable().size() * times);
     EXPECT_EQ(yesterday.distributions.size(), distributionTable().size() * times);
+    const SampleCounters counters({.seed = 1, .scale = scale, .today = kToday});
+    for (const auto& change : counters.ofDay(kToday - 1)) {
+      EXPECT_TRUE(change.seconds >= 0 && change.seconds < 86400) << change.key;
+    }
 
     platform::host::Host host({.root = folder / "a"});
     std::vector<std::int32_t> recorded;
