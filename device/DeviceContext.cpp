@@ -44,7 +44,7 @@ bool DeviceContext::determineMultiUserMode() {
 std::optional<std::string> DeviceContext::homeOfCounters() {
   const std::scoped_lock lock(homeMutex_);
   if (home_) return home_;
-  if (!multiUser_.value_or(isForcedToMultiUserMode() || isMultiUserDevice())) {
+  if (!(multiUser_ ? *multiUser_ : isForcedToMultiUserMode() || isMultiUserDevice())) {
     return kSingleUserHome;
   }
   std::uint64_t error = 1;
