@@ -5,14 +5,15 @@
 #include <random>
 #include <stdexcept>
 
-#include "platform/CivilDate.h"
+#include "base/CivilDate.h"
+#include "plist/PropertyList.h"
 #include "tools/mkdevice/SampleController.h"
 
 namespace bench {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 
@@ -64,7 +65,7 @@ void ReportDevice::addStorage(mkdevice::ControllerKind controller) {
   Array records;
   for (int i = 0; i < 40; ++i) {
     records.push_back(Dictionary{{"procName", "process" + std::to_string(i)},
-                                 {"since", platform::Date{today * 86400.0}},
+                                 {"since", plist::Date{today * 86400.0}},
                                  {"wifiInBytes", 1 << 20}});
   }
   writePropertyList("device/network-usage.plist", Dictionary{{"Records", std::move(records)}});
@@ -110,12 +111,12 @@ Arguments ReportDevice::pythonReport() const {
 }
 
 void ReportDevice::writePropertyList(const std::string& path, const Value& value) {
-  root_.write(path, *host_.platform().propertyLists.writeXML(value));
+  root_.write(path, *plist::writeXML(value));
 }
 
 void ReportDevice::fill(int scalars, int distributions, int samples) {
-  using platform::host::CounterChange;
-  yesterday_ = platform::dayBefore(host_.counters().PLDaysSince1970());
+  using host::CounterChange;
+  yesterday_ = base::dayBefore(host_.counters().PLDaysSince1970());
   std::vector<std::string> keys;
   for (int i = 0; i < scalars; ++i) keys.push_back(scalarKey(i));
   for (int i = 0; i < distributions; ++i) keys.push_back(distributionKey(i));

@@ -6,8 +6,8 @@
 #include <vector>
 
 #include "bench/Process.h"
-#include "platform/PropertyList.h"
-#include "platform/host/Host.h"
+#include "host/Host.h"
+#include "plist/Value.h"
 #include "support/TemporaryFolder.h"
 #include "tools/mkdevice/Sample.h"
 
@@ -38,11 +38,11 @@ class ReportDevice {
 
  private:
   std::string database() const { return root_ / support::kCountersDatabase; }
-  void writePropertyList(const std::string& path, const platform::Value& value);
+  void writePropertyList(const std::string& path, const plist::Value& value);
   void fill(int scalars, int distributions, int samples);
 
   support::TemporaryFolder root_;
-  platform::host::Host host_{{.root = root_.path()}};
+  host::Host host_{{.root = root_.path()}};
   std::string path_ = root_.path();
   std::int32_t yesterday_ = 0;
   Arguments buffers_;  // of the controller: the statistics, then the lists

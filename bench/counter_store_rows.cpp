@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "bench/Rows.h"
-#include "platform/host/Host.h"
+#include "host/Host.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
@@ -19,8 +19,8 @@ constexpr int kAppends = 2000;
 // A device root in a temporary folder, with a store.
 struct Device {
   support::TemporaryFolder root;
-  platform::host::Host host{{.root = root.path()}};
-  platform::host::CounterStore& store = host.counters();
+  host::Host host{{.root = root.path()}};
+  host::CounterStore& store = host.counters();
 };
 
 // Bare SQLite, on the store's file or on one of its own.
@@ -50,7 +50,7 @@ class Bare {
 };
 
 void fill(Device& device) {
-  using platform::host::CounterChange;
+  using host::CounterChange;
   std::vector<std::string> keys;
   for (int i = 0; i < kScalars; ++i) {
     keys.push_back("com.example.subsystem.counter." + std::to_string(i));

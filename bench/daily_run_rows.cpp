@@ -17,7 +17,7 @@
 #include "daemon/DailyTelemetry.h"
 #include "daemon/DataUsage.h"
 #include "daemon/Tasking.h"
-#include "platform/host/Host.h"
+#include "host/Host.h"
 #include "report/PLReport.h"
 
 namespace bench {
@@ -49,7 +49,7 @@ constexpr struct {
        std::vector<platform::ScalarValue> values;
        const auto info = NANDInfo::CopyNANDInfoWithOptions(day.platform);
        for (const auto& [key, value] : *info) {
-         if (const auto* number = value.as<platform::Number>()) {
+         if (const auto* number = value.as<plist::Number>()) {
            values.push_back({key, number->int64Value()});
          }
        }
@@ -81,7 +81,7 @@ void printSteps(const ReportDevice& device) {
       since = now;
     };
     {
-      platform::host::Host host({.root = device.path(), .lowestLevel = platform::LogLevel::error});
+      host::Host host({.root = device.path(), .lowestLevel = platform::LogLevel::error});
       lap(kNumber);
       for (std::size_t step = 0; step < kNumber; ++step) {
         kSteps[step].run({host.platform(), host.context(), device.yesterday()});

@@ -12,16 +12,16 @@
 #include <vector>
 
 #include "bench/Rows.h"
-#include "platform/PropertyList.h"
-#include "platform/host/HostPropertyListCodec.h"
+#include "plist/PropertyList.h"
+#include "plist/Value.h"
 
 namespace bench {
 
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 // A report's sections as plain rows.
 struct Report {
@@ -141,17 +141,16 @@ void parseBare(const std::string& document) {
 void addPropertyListRows(Table& table) {
   const Report report = sampleReport();
   const Value value = valueOf(report);
-  platform::host::HostPropertyListCodec codec;
   const std::string document = appended(report);
-  if (codec.writeXML(value).value != document) {
+  if (plist::writeXML(value).value != document) {
     std::fprintf(stderr, "the yardstick writes another property list\n");
     std::abort();
   }
   table.compare(
-      "property list: write", "appending to a string", 1.7, 1, [&] { keep(codec.writeXML(value)); },
-      [&] { keep(appended(report)); }, 51);
+      "property list: write", "appending to a string", 1.7, 1,
+      [&] { keep(plist::writeXML(value)); }, [&] { keep(appended(report)); }, 51);
   table.compare(
-      "property list: read", "bare expat", 1.5, 1, [&] { keep(codec.read(document)); },
+      "property list: read", "bare expat", 1.5, 1, [&] { keep(plist::read(document)); },
       [&] { parseBare(document); }, 51);
 }
 

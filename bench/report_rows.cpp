@@ -12,8 +12,8 @@
 
 namespace {
 
-using platform::Dictionary;
-using platform::Number;
+using plist::Dictionary;
+using plist::Number;
 
 constexpr int kKeys = 5000, kPrefixes = 1000, kSamples = 100000;
 

@@ -6,15 +6,15 @@
 #include <vector>
 
 #include "NANDInfo/KeyTables.h"
-#include "NANDInfo/NameRows.h"
 #include "NANDInfo/Whitelists.h"
+#include "NANDInfo/vocabulary/NameRows.h"
 #include "bench/Rows.h"
 
 namespace bench {
 
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 
 // The key map as a plain table.
 struct Record {

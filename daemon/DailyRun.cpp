@@ -2,9 +2,9 @@
 
 #include <mutex>
 
+#include "base/CivilDate.h"
 #include "daemon/DailyTelemetry.h"
 #include "daemon/Tasking.h"
-#include "platform/CivilDate.h"
 
 namespace morvend {
 
@@ -59,7 +59,7 @@ void runSequence(Platform& platform, DeviceContext& context, const Day& day) {
 void RunDailyTasksIfDue(Platform& platform, DeviceContext& context,
                         const ActivatedAppInfo* appInfo) {
   const std::scoped_lock lock(platform.runLock);
-  const std::int32_t yesterday = platform::dayBefore(platform.counters.PLDaysSince1970());
+  const std::int32_t yesterday = base::dayBefore(platform.counters.PLDaysSince1970());
   const std::int64_t last =
       platform.preferences.QNSPreferencesGetIntegerValue(kGateRecord, kDomain);
   if (last >= yesterday) {
@@ -67,7 +67,7 @@ void RunDailyTasksIfDue(Platform& platform, DeviceContext& context,
     return;
   }
   runSequence(platform, context, {yesterday, appInfo});
-  const platform::Value record(yesterday);
+  const plist::Value record(yesterday);
   platform.preferences.QNSPreferencesSetValue(kGateRecord, &record, kDomain);
   platform.preferences.QNSPreferencesSynchronize(kDomain);
 }

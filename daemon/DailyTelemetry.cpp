@@ -11,10 +11,10 @@
 namespace morvend {
 
 using platform::LogLevel;
-using platform::Number;
 using platform::Platform;
 using platform::ReportChannel;
 using platform::ScalarValue;
+using plist::Number;
 
 namespace {
 

@@ -4,15 +4,15 @@
 #include <semaphore>
 #include <vector>
 
+#include "base/CivilDate.h"
 #include "daemon/DataUsageChanges.h"
-#include "platform/CivilDate.h"
 
 namespace morvend {
 
-using platform::Array;
-using platform::Dictionary;
 using platform::LogLevel;
 using platform::Platform;
+using plist::Array;
+using plist::Dictionary;
 
 namespace {
 
@@ -25,11 +25,11 @@ void handleReply(const Platform& platform, const Array* records) {
   const auto* baseline = stored ? stored->as<Dictionary>() : nullptr;
   DataUsageChanges changes = dataUsageChanges(
       baseline != nullptr ? *baseline : Dictionary(), records != nullptr ? *records : Array(),
-      platform.counters.PLDateFromDaysSince1970(platform::dayBefore(today)));
+      platform.counters.PLDateFromDaysSince1970(base::dayBefore(today)));
   std::vector<platform::ScalarValue> additions;
   for (const auto& [key, value] : changes.additions) additions.push_back({key, value});
   platform.counters.PLClientAddValuesForScalarKeys(additions);
-  const platform::Value value(std::move(changes.baseline));
+  const plist::Value value(std::move(changes.baseline));
   platform.preferences.QNSPreferencesSetValue(kBaseline, &value, kDomain);
   platform.preferences.QNSPreferencesSynchronize(kDomain);
 }

@@ -6,11 +6,11 @@
 
 namespace morvend {
 
-using platform::Array;
-using platform::Date;
-using platform::Dictionary;
-using platform::Number;
-using platform::Value;
+using plist::Array;
+using plist::Date;
+using plist::Dictionary;
+using plist::Number;
+using plist::Value;
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include <string>
 #include <vector>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace morvend {
 
@@ -18,7 +18,7 @@ struct CounterAddition {
 
 struct DataUsageChanges {
   std::vector<CounterAddition> additions;  // in the order of the records
-  platform::Dictionary baseline;           // for the next day
+  plist::Dictionary baseline;              // for the next day
 };
 
 // `records` are the usage service's. The baseline holds, under each process's name, an array of the
@@ -32,7 +32,7 @@ struct DataUsageChanges {
 // nothing.
 //
 // A record without a name or a date is skipped; a count that is not a number is 0.
-DataUsageChanges dataUsageChanges(const platform::Dictionary& baseline,
-                                  const platform::Array& records, platform::Date yesterday);
+DataUsageChanges dataUsageChanges(const plist::Dictionary& baseline, const plist::Array& records,
+                                  plist::Date yesterday);
 
 }  // namespace morvend

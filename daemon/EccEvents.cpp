@@ -4,12 +4,12 @@
 #include <array>
 #include <cerrno>
 
-#include "NANDInfo/ByteReader.h"
+#include "base/ByteReader.h"
 
 namespace morvend {
 
-using platform::Dictionary;
 using platform::Platform;
+using plist::Dictionary;
 
 namespace {
 
@@ -29,7 +29,7 @@ Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> record) 
   const std::size_t entries = std::min(static_cast<std::size_t>(count), kMostEntries);
   for (std::size_t i = 0; i < entries; ++i) {
     const auto bytes = record.subspan(kDataOffset + i * kEntrySize).first<kEntrySize>();
-    const auto entry = NANDInfo::littleEndian<std::uint64_t>(bytes);
+    const auto entry = base::littleEndian<std::uint64_t>(bytes);
     data.set("reg" + std::to_string(i), static_cast<std::int64_t>(entry));
   }
   return data;

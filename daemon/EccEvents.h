@@ -12,7 +12,7 @@ inline constexpr std::size_t kEccEventRecordSize = 72;
 
 // What is logged of one event record, as the kernel delivers it: "id" and "count", and the data
 // entries that count ("reg0" to "reg7").
-platform::Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> record);
+plist::Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> record);
 
 // Logs the pending events, at most ten, as structured data of type 172. The rest stays for later
 // runs.

@@ -2,9 +2,9 @@
 
 #include <string_view>
 
+#include "base/CivilDate.h"
 #include "daemon/DailyRun.h"
 #include "daemon/ServiceListener.h"
-#include "platform/CivilDate.h"
 
 namespace morvend {
 
@@ -21,7 +21,7 @@ void serve(Platform& platform, DeviceContext& context) {
   ServiceState state;
   const auto listener = platform.namedServices.listen(kServiceName);
   if (listener != nullptr) {
-    listener->start([&](const platform::Dictionary* message) {
+    listener->start([&](const plist::Dictionary* message) {
       HandleServiceMessage(platform, context, state, message);
     });
   }
@@ -44,7 +44,7 @@ void runOption(Platform& platform, DeviceContext& context, const char* argument)
   if (option == "-d") {
     RunDailyTasksIfDue(platform, context, nullptr);
   } else if (option == "-f") {
-    RunDailyTasks(platform, context, platform::dayBefore(today), nullptr);
+    RunDailyTasks(platform, context, base::dayBefore(today), nullptr);
   } else if (option == "-t") {
     RunDailyTasks(platform, context, today, nullptr);
   } else {

@@ -2,16 +2,16 @@
 
 #include <string>
 
+#include "base/Text.h"
 #include "daemon/DailyRun.h"
-#include "platform/Text.h"
 
 namespace morvend {
 
-using platform::Dictionary;
 using platform::LogLevel;
-using platform::Number;
 using platform::Platform;
-using platform::Value;
+using plist::Dictionary;
+using plist::Number;
+using plist::Value;
 
 namespace {
 
@@ -42,7 +42,7 @@ std::string uuidText(const Dictionary& message, const char* key) {
   std::string canonical;
   for (std::size_t i = 0; i < bytes->size(); ++i) {
     if (i == 4 || i == 6 || i == 8 || i == 10) canonical += '-';
-    canonical += platform::format("%02x", (*bytes)[i]);
+    canonical += base::format("%02x", (*bytes)[i]);
   }
   return canonical;
 }
@@ -69,7 +69,7 @@ void handleDelivery(Platform& platform, DeviceContext& context, ServiceState& st
   if (platform.log.shows(LogLevel::standard)) {
     platform.log.log(LogLevel::standard, "morvend got %sAAI:\n%s",
                      state.AwaitingAppInfo ? "requested" : "(unsolicited -- so ignoring) ",
-                     platform::description(Value(apps)).c_str());
+                     plist::description(Value(apps)).c_str());
   }
   if (!state.AwaitingAppInfo) return;
   RunDailyTasksIfDue(platform, context, &apps);

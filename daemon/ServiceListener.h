@@ -17,6 +17,6 @@ struct ServiceState {
 // which starts the gate if it was announced. Of all messages that aren't deliveries only the first
 // has an effect. No message is answered.
 void HandleServiceMessage(platform::Platform& platform, DeviceContext& context, ServiceState& state,
-                          const platform::Dictionary* message);
+                          const plist::Dictionary* message);
 
 }  // namespace morvend

@@ -8,12 +8,12 @@
 
 namespace morvend {
 
-using platform::Array;
-using platform::description;
-using platform::Dictionary;
 using platform::LogLevel;
 using platform::Platform;
-using platform::Value;
+using plist::Array;
+using plist::description;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 

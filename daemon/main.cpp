@@ -3,17 +3,17 @@
 #include <string>
 
 #include "daemon/Entry.h"
-#include "platform/host/EndSignals.h"
-#include "platform/host/Host.h"
-#include "platform/host/StandardErrorLog.h"
+#include "host/Host.h"
+#include "host/process/EndSignals.h"
+#include "host/process/StandardErrorLog.h"
 
 namespace {
 
 using platform::LogLevel;
 
 // Returns what of the day couldn't be kept, or the empty text.
-std::string run(const platform::host::HostOptions& options, int argc, char** argv) {
-  platform::host::Host host(options);
+std::string run(const host::HostOptions& options, int argc, char** argv) {
+  host::Host host(options);
   if (const std::string problem = host.root().problem(); !problem.empty()) {
     // Said, and then a run like any other on a device that has nothing.
     host.platform().log.log(LogLevel::error, "%s", problem.c_str());
@@ -25,9 +25,9 @@ std::string run(const platform::host::HostOptions& options, int argc, char** arg
 }  // namespace
 
 int main(int argc, char** argv) {
-  platform::host::deferEndSignals();  // a day's work that has begun is finished
-  auto options = platform::host::HostOptions::fromEnvironment();
-  platform::host::StandardErrorLog log(options.lowestLevel);
+  host::deferEndSignals();  // a day's work that has begun is finished
+  auto options = host::HostOptions::fromEnvironment();
+  host::StandardErrorLog log(options.lowestLevel);
   options.log = &log;
   // The last line, after all that the host says at its end: the exit status doesn't tell.
   if (const std::string unkept = run(options, argc, argv); !unkept.empty()) {

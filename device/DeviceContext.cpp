@@ -99,7 +99,7 @@ std::int64_t DeviceContext::ReadAndResetDatabaseCorruptionCount() {
   if (readInteger_ == nullptr || writeValue_ == nullptr) LoadPreferenceFunctions();
   if (readInteger_ == nullptr || writeValue_ == nullptr) return 0;
   const std::int64_t count = readInteger_(kCorruptionCount, kCorruptionDomain, nullptr);
-  const platform::Value zero(0);
+  const plist::Value zero(0);
   writeValue_(kCorruptionCount, &zero, kCorruptionDomain);
   return count;
 }

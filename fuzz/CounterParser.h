@@ -13,7 +13,7 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/GenericParserContext.h"
-#include "NANDInfo/ProcessState.h"
+#include "NANDInfo/decode/ProcessState.h"
 
 namespace fuzz {
 

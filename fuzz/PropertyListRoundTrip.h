@@ -6,10 +6,10 @@
 #include <cstdlib>
 #include <string>
 
-#include "platform/PropertyList.h"
-#include "platform/host/JSON.h"
-#include "platform/host/PropertyListXMLReader.h"
-#include "platform/host/PropertyListXMLWriter.h"
+#include "plist/JSON.h"
+#include "plist/PropertyList.h"
+#include "plist/Value.h"
+#include "plist/XMLReader.h"
 
 namespace fuzz {
 
@@ -23,18 +23,17 @@ inline void require(bool holds, const char* what) {
 // of the forms that are written.
 template <typename Read>
 void checkRoundTrip(Read read, const std::uint8_t* bytes, std::size_t size) {
-  using namespace platform::host;
   const auto value = read({reinterpret_cast<const char*>(bytes), size});
   require(value.value.has_value() == value.error.empty(), "an error is a failure's, and only its");
   if (!value) return;
-  const auto text = writeXMLPropertyList(*value);
+  const auto text = plist::writeXML(*value);
   require(text.value.has_value(), "what was read can be written");
-  const auto again = readXMLPropertyList(*text);
+  const auto again = plist::readXML(*text);
   require(again.value.has_value(), "what was written can be read");
-  require(*writeXMLPropertyList(*again) == *text, "what was written reads as what writes the same");
+  require(*plist::writeXML(*again) == *text, "what was written reads as what writes the same");
   std::string before, after;
-  appendJSON(before, *value);
-  appendJSON(after, *again);
+  plist::appendJSON(before, *value);
+  plist::appendJSON(after, *again);
   require(before == after, "and as the same value in JSON");
 }
 

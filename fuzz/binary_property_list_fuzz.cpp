@@ -1,8 +1,8 @@
-#include "platform/host/PropertyListBinaryReader.h"
+#include "plist/BinaryReader.h"
 
 #include "PropertyListRoundTrip.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
-  fuzz::checkRoundTrip(platform::host::readBinaryPropertyList, bytes, size);
+  fuzz::checkRoundTrip(plist::readBinary, bytes, size);
   return 0;
 }

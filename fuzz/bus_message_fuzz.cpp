@@ -11,13 +11,12 @@
 #include <string>
 #include <string_view>
 
-#include "platform/host/BusMessage.h"
-#include "platform/host/Files.h"
+#include "host/bus/BusMessage.h"
+#include "host/files/Files.h"
 
 namespace {
 
-using namespace platform;
-using namespace platform::host;
+using namespace host;
 
 void require(bool condition) {
   if (!condition) std::abort();
@@ -87,21 +86,21 @@ std::string messageWithBody(std::string_view body) {
 struct Cost {
   std::size_t values = 0, bytes = 0;
 
-  void add(const Dictionary& dictionary, int depth) {
+  void add(const plist::Dictionary& dictionary, int depth) {
     require(dictionary.size() <= kMaximumElements && depth <= kMaximumNesting);
     for (const auto& entry : dictionary) {
       bytes += entry.key.size();
       add(entry.value, depth);
     }
   }
-  void add(const Value& value, int depth) {
+  void add(const plist::Value& value, int depth) {
     ++values;
     if (const auto* text = value.as<std::string>()) bytes += text->size();
-    if (const auto* data = value.as<Data>()) bytes += data->size();
-    if (const auto* dictionary = value.as<Dictionary>()) add(*dictionary, depth + 1);
-    if (const auto* array = value.as<Array>()) {
+    if (const auto* data = value.as<plist::Data>()) bytes += data->size();
+    if (const auto* dictionary = value.as<plist::Dictionary>()) add(*dictionary, depth + 1);
+    if (const auto* array = value.as<plist::Array>()) {
       require(array->size() <= kMaximumElements && depth < kMaximumNesting);
-      for (const Value& element : *array) add(element, depth + 1);
+      for (const plist::Value& element : *array) add(element, depth + 1);
     }
   }
 };

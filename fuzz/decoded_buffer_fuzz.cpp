@@ -14,10 +14,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
     const auto channels = buffer.empty() ? 0u : std::to_integer<std::uint32_t>(buffer.front());
     return decodedTelemetry(buffer, counterLayouts().front(), channels % 4);
   };
-  for (platform::Dictionary (*decode)(Bytes buffer) :
+  for (plist::Dictionary (*decode)(Bytes buffer) :
        {decodedFTL, decodedFTLStat, decodedLegacy, decodedMSP, decodedValidity, decodedDefects,
         decodedSnapshot, +telemetry}) {
-    const platform::Dictionary decoded = decode(std::as_bytes(std::span(bytes, size)));
+    const plist::Dictionary decoded = decode(std::as_bytes(std::span(bytes, size)));
     if (decoded.number("ok") == nullptr || decoded.text("error") == nullptr) std::abort();
     for (const char c : tableText(decoded, 80)) {
       if (static_cast<unsigned char>(c) < 0x20 && c != '\n') std::abort();

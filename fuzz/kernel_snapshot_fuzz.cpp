@@ -2,8 +2,8 @@
 #include <cstdint>
 #include <cstdlib>
 
-#include "NANDInfo/ByteReader.h"
 #include "NANDInfo/SnapshotReader.h"
+#include "base/ByteReader.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   const auto snapshot = std::as_bytes(std::span(bytes, size));
@@ -12,7 +12,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
     if (!found || found->empty()) return;
     const auto offset = static_cast<std::size_t>(found->data() - snapshot.data());
     if (offset < 16 || offset > size || found->size() > size - offset) std::abort();
-    NANDInfo::ByteReader header(snapshot.subspan(offset - 16));
+    base::ByteReader header(snapshot.subspan(offset - 16));
     if (header.read<std::uint32_t>() != 0x901u) std::abort();
     if (header.read<std::uint32_t>() != found->size()) std::abort();
   };

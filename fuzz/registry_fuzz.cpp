@@ -6,14 +6,15 @@
 #include <string>
 
 #include "PropertyListRoundTrip.h"
-#include "platform/host/HostDeviceRegistry.h"
-#include "platform/host/HostPropertyListCodec.h"
+#include "host/recorded/DeviceRegistry.h"
+#include "plist/PropertyList.h"
 
 namespace {
 
 using namespace platform;
+
 using fuzz::require;
-using host::HostDeviceRegistry;
+using host::recorded::DeviceRegistry;
 
 constexpr std::size_t kMostEntries = 200, kLargestOutput = 4096;
 
@@ -53,8 +54,8 @@ void put(std::span<std::byte> block, std::size_t offset, std::uint32_t word) {
 }
 
 // One struct call: nothing is written behind what the call says that it delivered.
-void callStruct(HostDeviceRegistry& registry, DriverConnection connection, std::uint32_t method,
-                std::span<const std::byte> block, std::size_t capacity) {
+void callStruct(host::recorded::DeviceRegistry& registry, DriverConnection connection,
+                std::uint32_t method, std::span<const std::byte> block, std::size_t capacity) {
   constexpr std::byte kUntouched{0xA5};
   std::vector<std::byte> output(capacity, kUntouched);
   const auto result = registry.DrvCallStructMethod(connection, method, block, output);
@@ -67,7 +68,7 @@ void callStruct(HostDeviceRegistry& registry, DriverConnection connection, std::
   require(text != "OUTSIDE", "no file outside device/ is read");
 }
 
-void askDriver(HostDeviceRegistry& registry, DriverConnection connection) {
+void askDriver(host::recorded::DeviceRegistry& registry, DriverConnection connection) {
   std::byte block[24]{};
   for (const std::uint32_t opType : {10u, 11u, 13u, 15u, 17u, 22u, 39u, 145u, 221u}) {
     for (const std::uint32_t argument : {0u, 1u, 24u, 1u << 31}) {
@@ -88,7 +89,7 @@ void askDriver(HostDeviceRegistry& registry, DriverConnection connection) {
 }
 
 // Every handle that was handed out is given back.
-void askEverything(HostDeviceRegistry& registry) {
+void askEverything(host::recorded::DeviceRegistry& registry) {
   const RegistryObject root = registry.rootEntry(), iterator = registry.createIterator();
   require((root == 0) == (iterator == 0), "a root and a walk, or neither");
   std::size_t entries = 0;
@@ -119,10 +120,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   static const Folder folder;
   static const host::DeviceRoot root(folder.path);
   folder.write("registry.plist", {reinterpret_cast<const char*>(bytes), size});
-  host::HostPropertyListCodec codec;
   CountingLog log;
   {
-    HostDeviceRegistry registry(root, codec, log);
+    host::recorded::DeviceRegistry registry(root, log);
     askEverything(registry);
     const int lines = log.lines;
     askEverything(registry);

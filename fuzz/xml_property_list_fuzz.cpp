@@ -1,8 +1,8 @@
-#include "platform/host/PropertyListXMLReader.h"
+#include "plist/XMLReader.h"
 
 #include "PropertyListRoundTrip.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
-  fuzz::checkRoundTrip(platform::host::readXMLPropertyList, bytes, size);
+  fuzz::checkRoundTrip(plist::readXML, bytes, size);
   return 0;
 }

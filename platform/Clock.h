@@ -3,7 +3,7 @@
 
 #include <cstdint>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -12,10 +12,10 @@ class Clock {
   virtual ~Clock() = default;
 
   // The current time; it may jump, either way.
-  virtual Date now() = 0;
+  virtual plist::Date now() = 0;
 
   // How far the device's clocks are ahead of UTC at an instant, in seconds.
-  virtual std::int32_t secondsFromUTC(Date instant) = 0;
+  virtual std::int32_t secondsFromUTC(plist::Date instant) = 0;
 };
 
 }  // namespace platform

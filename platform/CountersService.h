@@ -5,7 +5,7 @@
 #include <span>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -23,7 +23,7 @@ class CountersService {
   virtual std::int32_t PLDaysSince1970() = 0;
 
   // The instant at which a day begins: the inverse of PLDaysSince1970.
-  virtual Date PLDateFromDaysSince1970(std::int32_t day) = 0;
+  virtual plist::Date PLDateFromDaysSince1970(std::int32_t day) = 0;
 
   // Asks the service to bring everything recorded so far into its database.
   virtual void PLClientCheckpoint() = 0;

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -41,7 +41,7 @@ class SystemVersion {
   virtual ~SystemVersion() = default;
 
   // The system version dictionary ("ProductBuildVersion", "ProductVersion"), or none.
-  virtual std::optional<Dictionary> systemVersionDictionary() = 0;
+  virtual std::optional<plist::Dictionary> systemVersionDictionary() = 0;
 
   // The version as one text; empty when nothing is known.
   virtual std::string operatingSystemVersion() = 0;

@@ -10,7 +10,7 @@
 #include <span>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -48,8 +48,8 @@ class DeviceRegistry {
 
   // The value of a property on the entry or on what lies in the direction of the search: its
   // parents from the nearest up, or all below it in the order of a walk. None when it is nowhere.
-  virtual std::optional<Value> searchProperty(RegistryObject entry, std::string_view key,
-                                              Direction direction) = 0;
+  virtual std::optional<plist::Value> searchProperty(RegistryObject entry, std::string_view key,
+                                                     Direction direction) = 0;
 
   virtual void release(RegistryObject object) = 0;
 };

@@ -5,7 +5,7 @@
 #include <memory>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -27,7 +27,7 @@ class NamedServiceListener {
  public:
   // An event of the service: a dictionary for a message, null for anything else (an error, the end
   // of a connection).
-  using EventHandler = std::function<void(const Dictionary* message)>;
+  using EventHandler = std::function<void(const plist::Dictionary* message)>;
 
   virtual ~NamedServiceListener() = default;
 

@@ -4,13 +4,13 @@
 #include <functional>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
 class Eventra {
  public:
-  using PayloadProducer = std::function<Dictionary()>;
+  using PayloadProducer = std::function<plist::Dictionary()>;
 
   virtual ~Eventra() = default;
 

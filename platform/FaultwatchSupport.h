@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <string>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -14,7 +14,7 @@ class FaultwatchSupport {
   virtual ~FaultwatchSupport() = default;
 
   // Appends one structured-data log to today's.
-  virtual void logStructuredData(std::int32_t type, const Dictionary& data) = 0;
+  virtual void logStructuredData(std::int32_t type, const plist::Dictionary& data) = 0;
 
   // Hands the structured-data logs of earlier days over for submission.
   virtual void dumpAllOldStructuredDataLogs() = 0;
@@ -31,7 +31,7 @@ inline constexpr char kFaultwatchSupportPath[] =
 extern "C" {
 using QNSPreferencesGetIntegerValueFunction = std::int64_t(const char* key, const char* domain,
                                                            bool* found);
-using QNSPreferencesSetValueFunction = void(const char* key, const Value* value,
+using QNSPreferencesSetValueFunction = void(const char* key, const plist::Value* value,
                                             const char* domain);
 }
 

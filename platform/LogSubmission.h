@@ -4,7 +4,7 @@
 #include <functional>
 #include <string_view>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -29,7 +29,7 @@ class LogSubmission {
   // Opens a log, lets the writer write it whole, and submits it together with its options (null:
   // none). A log is submitted whole or not at all; true on success.
   virtual bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
-                                        const Dictionary* options, const Writer& writer) = 0;
+                                        const plist::Dictionary* options, const Writer& writer) = 0;
 };
 
 }  // namespace platform

@@ -3,7 +3,7 @@
 
 #include <functional>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -13,7 +13,7 @@ class NetworkUsage {
   // "bundleName" (missing for a process without a bundle) and "procName", texts; the date under
   // kUsageSinceKey; and the bytes since then, "wifiInBytes", "wifiOutBytes", "wwanInBytes" and
   // "wwanOutBytes".
-  using Reply = std::function<void(const Array* records)>;
+  using Reply = std::function<void(const plist::Array* records)>;
 
   virtual ~NetworkUsage() = default;
 

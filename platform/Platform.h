@@ -5,7 +5,6 @@
 #include "platform/CountersService.h"
 #include "platform/DeviceProperties.h"
 #include "platform/DeviceRegistry.h"
-#include "platform/Digest.h"
 #include "platform/EventLoop.h"
 #include "platform/Eventra.h"
 #include "platform/FaultwatchSupport.h"
@@ -19,7 +18,6 @@
 #include "platform/NetworkUsage.h"
 #include "platform/PLHistory.h"
 #include "platform/PreferenceStore.h"
-#include "platform/PropertyListCodec.h"
 #include "platform/PurgeableSpace.h"
 #include "platform/ReportingChannels.h"
 #include "platform/RunLock.h"
@@ -34,8 +32,6 @@ struct Platform {
   SystemLog& log;
   StandardStreams& streams;
   Clock& clock;
-  Digest& digest;
-  PropertyListCodec& propertyLists;
   FileSystem& files;
   CountersService& counters;
   HistoryStore& history;

@@ -4,8 +4,8 @@ namespace platform {
 
 namespace {
 
-std::optional<Number> numberOf(const std::optional<Value>& value, bool* found) {
-  const Number* number = value ? value->as<Number>() : nullptr;
+std::optional<plist::Number> numberOf(const std::optional<plist::Value>& value, bool* found) {
+  const plist::Number* number = value ? value->as<plist::Number>() : nullptr;
   if (found != nullptr) *found = number != nullptr;
   return number ? std::optional(*number) : std::nullopt;
 }

@@ -10,8 +10,8 @@
 #include <string_view>
 #include <vector>
 
-#include "platform/Exported.h"
-#include "platform/PropertyList.h"
+#include "base/Exported.h"
+#include "plist/Value.h"
 
 namespace MORVEND_EXPORTED platform {
 
@@ -22,9 +22,9 @@ class PreferenceStore {
   virtual ~PreferenceStore() = default;
 
   // The value of a key, or none. A write by this process is seen at once.
-  virtual std::optional<Value> QNSPreferencesGetValue(std::string_view key,
-                                                      std::string_view domain) = 0;
-  virtual void QNSPreferencesSetValue(std::string_view key, const Value* value,
+  virtual std::optional<plist::Value> QNSPreferencesGetValue(std::string_view key,
+                                                             std::string_view domain) = 0;
+  virtual void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                                       std::string_view domain) = 0;
 
   // Brings the domain's writes to storage; without it they get there when the process ends.
@@ -42,9 +42,10 @@ class AnalyticsConfiguration {
  public:
   virtual ~AnalyticsConfiguration() = default;
 
-  virtual std::optional<Value> getPreference(std::string_view key, std::string_view domain) = 0;
-  virtual void setPreference(std::string_view key, const Value* value, std::string_view domain,
-                             bool synchronize) = 0;
+  virtual std::optional<plist::Value> getPreference(std::string_view key,
+                                                    std::string_view domain) = 0;
+  virtual void setPreference(std::string_view key, const plist::Value* value,
+                             std::string_view domain, bool synchronize) = 0;
 
   // The bug types of the logs that are switched off; elements that aren't texts are left out.
   virtual std::vector<std::string> logBlocklist() = 0;
@@ -55,7 +56,7 @@ class PrivilegedPreferences {
   virtual ~PrivilegedPreferences() = default;
 
   virtual void setPreference(std::string_view key, std::string_view user, std::string_view domain,
-                             const Value* value) = 0;
+                             const plist::Value* value) = 0;
   virtual void deletePreference(std::string_view key, std::string_view user,
                                 std::string_view domain) = 0;
 };

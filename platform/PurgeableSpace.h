@@ -3,7 +3,7 @@
 
 #include <optional>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace platform {
 
@@ -15,8 +15,8 @@ class PurgeableSpace {
   virtual bool isPresent() = 0;
 
   // The itemized purgeable space of the volume that the query names ("SPACEREAP_VOLUME"), or none.
-  virtual std::optional<Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
-      const Dictionary& query) = 0;
+  virtual std::optional<plist::Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
+      const plist::Dictionary& query) = 0;
 };
 
 }  // namespace platform

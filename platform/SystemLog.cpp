@@ -1,6 +1,6 @@
 #include "platform/SystemLog.h"
 
-#include "platform/Text.h"
+#include "base/Text.h"
 
 namespace platform {
 
@@ -8,7 +8,7 @@ void SystemLog::log(LogLevel level, const char* format, ...) {
   if (!shows(level)) return;
   std::va_list arguments;
   va_start(arguments, format);
-  write(level, vformat(format, arguments));
+  write(level, base::vformat(format, arguments));
   va_end(arguments);
 }
 

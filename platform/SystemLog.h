@@ -4,7 +4,7 @@
 #include <cstdarg>
 #include <string_view>
 
-#include "platform/Exported.h"
+#include "base/Exported.h"
 
 namespace MORVEND_EXPORTED platform {
 

@@ -7,7 +7,7 @@
 #include <new>
 #include <string>
 
-#include "platform/Convert.h"
+#include "base/Convert.h"
 
 namespace report {
 
@@ -38,7 +38,7 @@ constexpr std::array<double, 23> kPowersOfTen = {1e0,  1e1,  1e2,  1e3,  1e4,  1
 // ceil(log10(number)), for a number above 0. Up to 10^14 the logarithm is never off by so much that
 // counting the powers below the number gives another answer, and counting is cheaper.
 std::uint64_t digitsOf(double number) {
-  if (number > 1e14) return platform::saturatingCast<std::uint64_t>(std::ceil(std::log10(number)));
+  if (number > 1e14) return base::saturatingCast<std::uint64_t>(std::ceil(std::log10(number)));
   std::uint64_t digits = 0;
   while (kPowersOfTen[digits] < number) ++digits;
   return digits;
@@ -57,7 +57,7 @@ std::int64_t roundToSignificantFigures(std::int64_t value, std::uint64_t figures
   if (excess < 1) return value;
   const double power = powerOfTen(excess);
   const double rounded = std::round(static_cast<double>(value) / power);
-  return platform::saturatingCast<std::int64_t>(power * rounded);
+  return base::saturatingCast<std::int64_t>(power * rounded);
 }
 
 std::string bucketLabel(const Intervals& intervals, std::size_t bucket) {
@@ -95,9 +95,9 @@ std::uint32_t determineHistBucketForValue(double value, const Intervals& interva
   return static_cast<std::uint32_t>(found - bounds.begin());
 }
 
-std::optional<platform::Dictionary> histogramDictForIntervals(
-    const Intervals& intervals, std::span<const std::uint64_t> counts) {
-  std::optional<platform::Dictionary> histogram;
+std::optional<plist::Dictionary> histogramDictForIntervals(const Intervals& intervals,
+                                                           std::span<const std::uint64_t> counts) {
+  std::optional<plist::Dictionary> histogram;
   for (std::size_t bucket = 0; bucket < counts.size(); ++bucket) {
     if (counts[bucket] == 0) continue;
     if (!histogram) histogram.emplace();
@@ -157,17 +157,17 @@ void Distribution::add(std::span<const double> values) {
   }
 }
 
-platform::Array Distribution::statistics() const {
+plist::Array Distribution::statistics() const {
   const auto count = static_cast<std::int32_t>(
       std::min<std::int64_t>(count_, std::numeric_limits<std::int32_t>::max()));
-  platform::Array array;
+  plist::Array array;
   array.reserve(5);
   for (const double value : {minimum_, maximum_, mean_, squares_}) array.emplace_back(value);
   array.emplace_back(count);
   return array;
 }
 
-std::optional<platform::Dictionary> Distribution::histogram() const {
+std::optional<plist::Dictionary> Distribution::histogram() const {
   if (counts_ == nullptr) return std::nullopt;
   return histogramDictForIntervals(*intervals_, {counts_.get(), intervals_->size() + 1});
 }

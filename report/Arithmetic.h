@@ -7,7 +7,7 @@
 #include <optional>
 #include <span>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 #include "report/CounterOptions.h"
 
 namespace report {
@@ -22,8 +22,8 @@ std::uint32_t determineHistBucketForValue(double value, const Intervals& interva
 
 // The histogram: a label such as "(10, 100]" for each bucket that holds samples, to the number of
 // samples (uint64). `counts` has one element more than there are bounds. None when all are zero.
-std::optional<platform::Dictionary> histogramDictForIntervals(
-    const Intervals& intervals, std::span<const std::uint64_t> counts);
+std::optional<plist::Dictionary> histogramDictForIntervals(const Intervals& intervals,
+                                                           std::span<const std::uint64_t> counts);
 
 // A day's samples of one key, reduced in one pass by Welford's method.
 class Distribution {
@@ -39,10 +39,10 @@ class Distribution {
 
   // [minimum, maximum, mean, sum of squared differences from the mean (doubles), number of samples
   // (int32, saturating)]; zeros without samples.
-  platform::Array statistics() const;
+  plist::Array statistics() const;
 
   // None without intervals or samples.
-  std::optional<platform::Dictionary> histogram() const;
+  std::optional<plist::Dictionary> histogram() const;
 
  private:
   template <typename CountBucket>

@@ -9,14 +9,14 @@
 #include <type_traits>
 #include <vector>
 
-#include "platform/Convert.h"
+#include "base/Convert.h"
 #include "report/KernelCounters.h"
 #include "report/PLReport.h"
 
 namespace report {
 
+using base::saturatingCast;
 using platform::LogLevel;
-using platform::saturatingCast;
 
 namespace {
 
@@ -88,7 +88,7 @@ void PLReport::addInstalledAppInfo() {
   if (allOptions != nullptr) addScalar(all, kAll, *allOptions);
   if (thirdPartyOptions != nullptr) addScalar(thirdParty, kThirdParty, *thirdPartyOptions);
   platform_.eventra.EventraSendEventLazy(kEvent, [all, thirdParty] {
-    return platform::Dictionary{{"numThirdPartyApps", thirdParty}, {"numAllApps", all}};
+    return plist::Dictionary{{"numThirdPartyApps", thirdParty}, {"numAllApps", all}};
   });
 }
 

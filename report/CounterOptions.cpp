@@ -4,8 +4,8 @@
 
 namespace report {
 
-using platform::Number;
-using platform::Value;
+using plist::Number;
+using plist::Value;
 
 Intervals::Intervals(std::vector<Number> bounds) : bounds_(std::move(bounds)), ascending_(true) {
   values_.reserve(bounds_.size());
@@ -34,7 +34,7 @@ bool readUnsigned(const Value* value, std::optional<std::uint64_t>& option) {
 
 bool readIntervals(const Value* value, std::optional<Intervals>& option) {
   if (value == nullptr) return true;
-  const auto* array = value->as<platform::Array>();
+  const auto* array = value->as<plist::Array>();
   if (array == nullptr) return false;
   std::vector<Number> bounds;
   bounds.reserve(array->size());
@@ -50,7 +50,7 @@ bool readIntervals(const Value* value, std::optional<Intervals>& option) {
 }  // namespace
 
 std::optional<CounterOptions> parseCounterOptions(const Value& entry) {
-  const auto* dictionary = entry.as<platform::Dictionary>();
+  const auto* dictionary = entry.as<plist::Dictionary>();
   if (dictionary == nullptr) return std::nullopt;
   CounterOptions options;
   const bool usable = readUnsigned(dictionary->find("bucket_interval"), options.bucketInterval) &&

@@ -5,24 +5,24 @@
 #include <optional>
 #include <vector>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace report {
 
 // The upper bounds of a histogram's buckets, expected in ascending order.
 class Intervals {
  public:
-  explicit Intervals(std::vector<platform::Number> bounds);
+  explicit Intervals(std::vector<plist::Number> bounds);
 
   std::size_t size() const { return bounds_.size(); }
-  const platform::Number& operator[](std::size_t i) const { return bounds_[i]; }
+  const plist::Number& operator[](std::size_t i) const { return bounds_[i]; }
 
   // The bounds as doubles, and whether they never descend (not-a-number counts as descending).
   const std::vector<double>& values() const { return values_; }
   bool ascending() const { return ascending_; }
 
  private:
-  std::vector<platform::Number> bounds_;
+  std::vector<plist::Number> bounds_;
   std::vector<double> values_;
   bool ascending_;
 };
@@ -36,6 +36,6 @@ struct CounterOptions {
 
 // The options that an entry of the whitelist holds; none when one of them has the wrong type or is
 // negative. Keys that aren't options are ignored.
-std::optional<CounterOptions> parseCounterOptions(const platform::Value& entry);
+std::optional<CounterOptions> parseCounterOptions(const plist::Value& entry);
 
 }  // namespace report

@@ -4,14 +4,14 @@
 
 namespace report {
 
-using platform::KeyIndex;
+using base::KeyIndex;
 
 std::uint32_t OptionsTable::place(std::string_view key, std::uint32_t hash) const {
   return index_.find(hash, [&](std::uint32_t entry) { return entries_[entry].key == key; });
 }
 
 void OptionsTable::set(const std::string& key, CounterOptions options) {
-  const std::uint32_t hash = platform::keyHash(key);
+  const std::uint32_t hash = base::keyHash(key);
   const std::uint32_t found = place(key, hash);
   if (found != KeyIndex::kNone) {
     entries_[found].options = std::move(options);
@@ -22,7 +22,7 @@ void OptionsTable::set(const std::string& key, CounterOptions options) {
 }
 
 const CounterOptions* OptionsTable::find(std::string_view key) const {
-  const std::uint32_t found = place(key, platform::keyHash(key));
+  const std::uint32_t found = place(key, base::keyHash(key));
   return found != KeyIndex::kNone ? &entries_[found].options : nullptr;
 }
 

@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "platform/KeyIndex.h"
+#include "base/KeyIndex.h"
 #include "report/CounterOptions.h"
 
 namespace report {
@@ -29,7 +29,7 @@ class OptionsTable {
   std::uint32_t place(std::string_view key, std::uint32_t hash) const;
 
   std::vector<Entry> entries_;
-  platform::KeyIndex index_;
+  base::KeyIndex index_;
 };
 
 }  // namespace report

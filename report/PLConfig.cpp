@@ -2,13 +2,15 @@
 
 #include <utility>
 
-#include "platform/Text.h"
+#include "base/Text.h"
+#include "plist/MD5.h"
+#include "plist/PropertyList.h"
 
 namespace report {
 
-using platform::Dictionary;
 using platform::LogLevel;
-using platform::Value;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 
@@ -18,7 +20,7 @@ constexpr char kKeyGroupDomain[] = "com.norba.da";
 
 std::string hexadecimal(const std::array<std::uint8_t, 16>& digest) {
   std::string text;
-  for (const std::uint8_t byte : digest) text += platform::format("%02x", byte);
+  for (const std::uint8_t byte : digest) text += base::format("%02x", byte);
   return text;
 }
 
@@ -82,14 +84,13 @@ std::unique_ptr<PLConfig> PLConfig::init(platform::Platform& platform,
                                          morvend::DeviceContext& context) {
   std::unique_ptr<PLConfig> config(new PLConfig(platform.log, context.PLIsInternalDevice()));
   // One byte more than the codec takes, so that a longer file is refused, not cut.
-  const auto bytes =
-      platform.files.readFile(kWhitelistPath, platform::kMaximumPropertyListSize + 1);
+  const auto bytes = platform.files.readFile(kWhitelistPath, plist::kMaxSize + 1);
   if (!bytes) {
     platform.log.log(LogLevel::error, "Couldn't load whitelist");
     return nullptr;
   }
-  config->configFileDigest_ = hexadecimal(platform.digest.md5(*bytes));
-  const auto parsed = platform.propertyLists.read(*bytes);
+  config->configFileDigest_ = hexadecimal(plist::md5(*bytes));
+  const auto parsed = plist::read(*bytes);
   const Dictionary* groups = parsed ? parsed->as<Dictionary>() : nullptr;
   if (groups == nullptr) {
     platform.log.log(LogLevel::error, "Couldn't parse the contents of the config file. Error: %s",

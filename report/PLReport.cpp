@@ -3,15 +3,16 @@
 #include <optional>
 #include <utility>
 
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
+#include "plist/PropertyList.h"
 #include "report/Arithmetic.h"
 
 namespace report {
 
-using platform::Dictionary;
 using platform::LogLevel;
-using platform::Value;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 
@@ -33,7 +34,7 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
   bool unread = false;
   if (config_ != nullptr) {
     const auto history = platform_.history.initWithDefaultPath();
-    const std::int32_t first = platform::dayBefore(day);
+    const std::int32_t first = base::dayBefore(day);
     history->scalarsForKeyPrefix(
         "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
           if (const auto* options = config_->configOptionsForScalarKey(key)) {
@@ -58,7 +59,7 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
         : unread           ? "the counters can't be read"
         : refused.empty()
             ? "no counter was recorded on that day or the day before"
-            : platform::format("the whitelist names none of the %zu counters", refused.size());
+            : base::format("the whitelist names none of the %zu counters", refused.size());
     platform_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
   }
   serializeWithDate(day, appInfo);
@@ -77,7 +78,7 @@ void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appIn
                       unnamed_.size());
   }
 
-  const auto log = platform_.propertyLists.writeXML(buildLog(day, appInfo));
+  const auto log = plist::writeXML(buildLog(day, appInfo));
   if (!log) {
     platform_.log.log(LogLevel::error, "Could not create pellorand plist: %s", log.error.c_str());
     return;
@@ -95,7 +96,7 @@ Dictionary PLReport::buildLog(std::int32_t day, const ActivatedAppInfo* appInfo)
   };
   Value taskID = preference("TaskingID", "(no tasking id)");
   Value taskDigest = preference("TaskingDigest", "(no tasking digest)");
-  Value tasking = preference("TaskingPayload", platform::Array());
+  Value tasking = preference("TaskingPayload", plist::Array());
 
   Dictionary log;
   log.set("PLCrashLogVersion", kCrashLogVersion);

@@ -17,7 +17,7 @@ namespace report {
 
 // Activated-app info: one dictionary ("bundle", "version", "orloID", "arch", "uuid") for each
 // application, as a client delivered it.
-using ActivatedAppInfo = platform::Array;
+using ActivatedAppInfo = plist::Array;
 
 class PLReport {
  public:
@@ -54,22 +54,22 @@ class PLReport {
 
   // What has been added so far. Scalars: int64; distributions: the five statistics; histograms:
   // dictionaries of bucket label to count; metadata: texts.
-  const platform::Dictionary& scalarsOutput() const { return scalarsOutput_; }
-  const platform::Dictionary& distributionsOutput() const { return distributionsOutput_; }
-  const platform::Dictionary& histogramsOutput() const { return histogramsOutput_; }
-  const platform::Dictionary& metadataOutput() const { return metadataOutput_; }
+  const plist::Dictionary& scalarsOutput() const { return scalarsOutput_; }
+  const plist::Dictionary& distributionsOutput() const { return distributionsOutput_; }
+  const plist::Dictionary& histogramsOutput() const { return histogramsOutput_; }
+  const plist::Dictionary& metadataOutput() const { return metadataOutput_; }
 
  private:
   bool isEmpty() const;
   const CounterOptions* scalarOptions(std::string_view key) const;
   void noteOptions(std::string_view key, const CounterOptions& options);
-  platform::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
+  plist::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
   void submit(const std::string& log);
 
   platform::Platform& platform_;
   morvend::DeviceContext& context_;
   std::unique_ptr<PLConfig> config_;
-  platform::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;
+  plist::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;
   std::set<std::string, std::less<>> unnamed_;  // the keys that no whitelist entry names
 };
 

@@ -21,18 +21,19 @@ layering() {
   [ -z "$hits" ] || { echo "$hits"; failed=1; }
 }
 libraries='sqlite3|systemd/|expat|md5|uuid|CLI/|nlohmann/|unistd|fcntl|sys/|dlfcn|linux/|poll|signal'
-layering platform "platform/host/|platform/testing/|device/|report/|daemon/|tools/|$libraries" \
-  '^platform/(host|testing)/'
-layering platform/testing "platform/host/|device/|report/|daemon/|tools/|$libraries"
-layering platform/host 'platform/testing/|report/|daemon/|tools/'
-layering NANDInfo "platform/host/|platform/testing/|device/|report/|daemon/|tools/|$libraries"
-layering device "platform/host/|platform/testing/|NANDInfo/|report/|daemon/|tools/|$libraries"
-layering report "platform/host/|platform/testing/|daemon/|tools/|$libraries"
-layering daemon "platform/host/|platform/testing/|tools/|$libraries" '^daemon/main\.cpp$'
+above='host/|device/|NANDInfo/|report/|daemon/|tools/'
+layering base "plist/|platform/|$above|$libraries"
+layering plist "platform/|$above|${libraries//|expat|md5/}"
+layering platform "$above|$libraries"
+layering device "host/|platform/testing/|NANDInfo/|report/|daemon/|tools/|$libraries"
+layering host 'platform/testing/|NANDInfo/|report/|daemon/|tools/'
+layering NANDInfo "host/|platform/testing/|device/|report/|daemon/|tools/|$libraries"
+layering report "host/|platform/testing/|NANDInfo/|daemon/|tools/|$libraries"
+layering daemon "host/|platform/testing/|tools/|$libraries" '^daemon/main\.cpp$'
 
 echo "== clang-tidy"
 cmake --preset release -DMORVEND_TESTS=ON >/dev/null
-git ls-files -- '*.cpp' | grep -E '^(platform|device|NANDInfo|report|daemon|tools)/' |
+git ls-files -- '*.cpp' | grep -E '^(base|plist|platform|device|host|NANDInfo|report|daemon|tools)/' |
   xargs -P 2 -n 4 clang-tidy --quiet --extra-arg=-Wno-unknown-warning-option -p build/release 2>/dev/null || failed=1
 
 [ $failed -eq 0 ] && echo "all checks passed"

@@ -2,7 +2,7 @@
 
 #include <algorithm>
 
-#include "platform/Text.h"
+#include "base/Text.h"
 
 namespace platform::fakes {
 
@@ -51,22 +51,22 @@ FakeDeviceRegistry::Answer FakeDeviceRegistry::announce(std::uint32_t size) {
 
 void FakeDeviceRegistry::willTunnel(std::uint32_t method, std::uint32_t opType,
                                     std::uint32_t argument, const Bytes& bytes) {
-  script.push_back({format("%u size %u/%u", method, opType, argument),
+  script.push_back({base::format("%u size %u/%u", method, opType, argument),
                     announce(static_cast<std::uint32_t>(bytes.size()))});
-  script.push_back({format("%u data %u/%u", method, opType, argument), {.output = bytes}});
+  script.push_back({base::format("%u data %u/%u", method, opType, argument), {.output = bytes}});
 }
 
 void FakeDeviceRegistry::alwaysTunnels(std::uint32_t method, std::uint32_t opType,
                                        std::uint32_t argument, const Bytes& bytes) {
-  standing[format("%u size %u/%u", method, opType, argument)] =
+  standing[base::format("%u size %u/%u", method, opType, argument)] =
       announce(static_cast<std::uint32_t>(bytes.size()));
-  standing[format("%u data %u/%u", method, opType, argument)] = {.output = bytes};
+  standing[base::format("%u data %u/%u", method, opType, argument)] = {.output = bytes};
 }
 
 std::vector<std::string> FakeDeviceRegistry::problems() const {
   auto all = problems_;
   for (const Step& step : script) all.push_back("not called: " + step.call);
-  if (!open_.empty()) all.push_back(format("%zu handles are open", open_.size()));
+  if (!open_.empty()) all.push_back(base::format("%zu handles are open", open_.size()));
   return all;
 }
 
@@ -79,7 +79,7 @@ FakeDeviceRegistry::Handle* FakeDeviceRegistry::find(std::uint32_t handle, Handl
                                                      const char* user) {
   const auto found = open_.find(handle);
   if (found != open_.end() && found->second.kind == kind) return &found->second;
-  problems_.push_back(format("%s: no such handle: %u", user, handle));
+  problems_.push_back(base::format("%s: no such handle: %u", user, handle));
   return nullptr;
 }
 
@@ -112,8 +112,9 @@ bool FakeDeviceRegistry::conformsTo(RegistryObject entry, std::string_view class
   return handle != nullptr && conforms(*handle->entry, className);
 }
 
-std::optional<Value> FakeDeviceRegistry::searchProperty(RegistryObject entry, std::string_view key,
-                                                        Direction direction) {
+std::optional<plist::Value> FakeDeviceRegistry::searchProperty(RegistryObject entry,
+                                                               std::string_view key,
+                                                               Direction direction) {
   const Handle* handle = find(entry, Handle::Kind::entry, "searchProperty");
   if (handle == nullptr) return std::nullopt;
   std::vector<const Entry*> places{handle->entry};
@@ -134,7 +135,7 @@ std::optional<Value> FakeDeviceRegistry::searchProperty(RegistryObject entry, st
     }
   }
   for (const Entry* place : places) {
-    if (const Value* value = place->properties.find(key)) return *value;
+    if (const plist::Value* value = place->properties.find(key)) return *value;
   }
   return std::nullopt;
 }
@@ -144,7 +145,7 @@ void FakeDeviceRegistry::release(RegistryObject object) {
   if (found != open_.end() && found->second.kind != Handle::Kind::connection) {
     open_.erase(found);
   } else {
-    problems_.push_back(format("release: no such handle: %u", object));
+    problems_.push_back(base::format("release: no such handle: %u", object));
   }
 }
 
@@ -154,7 +155,7 @@ DriverConnections::OpenResult FakeDeviceRegistry::DrvServiceOpen(RegistryObject 
   if (handle == nullptr) return {kUnsupported, 0};
   const Entry* entry = handle->entry;
   calls.push_back("open " + entry->className);
-  if (type != 0) problems_.push_back(format("opened with type %u", type));
+  if (type != 0) problems_.push_back(base::format("opened with type %u", type));
   const bool opens = (entry->openStatus == 0) != entry->oddHandle;
   return {entry->openStatus, opens ? handOut({Handle::Kind::connection, entry, {}}) : 0};
 }
@@ -187,13 +188,13 @@ DriverConnections::CallResult FakeDeviceRegistry::DrvCallStructMethod(
     DriverConnection connection, std::uint32_t method, std::span<const std::byte> input,
     std::span<std::byte> output) {
   inputs.emplace_back(input.begin(), input.end());
-  std::string call = format("%u", method);
+  std::string call = base::format("%u", method);
   if (input.size() == 24) {
     const std::uint32_t opType = word(input, 0), query = word(input, 4), index = word(input, 8);
-    call += format(" %s %u/%u", (query & 1) != 0 ? "size" : "data", opType,
-                   index != 0 ? index : query >> 2 & 0xFF);
+    call += base::format(" %s %u/%u", (query & 1) != 0 ? "size" : "data", opType,
+                         index != 0 ? index : query >> 2 & 0xFF);
   } else if (!input.empty()) {
-    problems_.push_back(format("%u: an input of %zu bytes", method, input.size()));
+    problems_.push_back(base::format("%u: an input of %zu bytes", method, input.size()));
   }
   const Answer answered = answer(connection, call);
   const std::size_t delivered = std::min(answered.output.size(), output.size());
@@ -205,11 +206,11 @@ DriverStatus FakeDeviceRegistry::DrvCallMethod(DriverConnection connection, std:
                                                std::span<const std::uint64_t> input,
                                                std::span<std::uint64_t> output) {
   if (input.size() != 1 || output.size() != 1) {
-    problems_.push_back(format("%u: not one scalar in and one out", method));
+    problems_.push_back(base::format("%u: not one scalar in and one out", method));
     return kUnsupported;
   }
   const Answer answered = answer(
-      connection, format("%u(%llu)", method, static_cast<unsigned long long>(input.front())));
+      connection, base::format("%u(%llu)", method, static_cast<unsigned long long>(input.front())));
   if (answered.status == 0) output.front() = answered.scalar;
   return answered.status;
 }

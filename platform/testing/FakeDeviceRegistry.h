@@ -25,7 +25,7 @@ class FakeDeviceRegistry : public DeviceRegistry, public DriverConnections {
     std::string className;
     std::vector<std::string> conforms = {};  // further classes
     bool registered = true;                  // else only a walk finds it
-    Dictionary properties = {};
+    plist::Dictionary properties = {};
     std::vector<Entry> children = {};
 
     DriverStatus openStatus = 0, closeStatus = 0;
@@ -84,8 +84,8 @@ class FakeDeviceRegistry : public DeviceRegistry, public DriverConnections {
   RegistryObject createIterator() override;
   RegistryObject next(RegistryObject iterator) override;
   bool conformsTo(RegistryObject entry, std::string_view className) override;
-  std::optional<Value> searchProperty(RegistryObject entry, std::string_view key,
-                                      Direction direction) override;
+  std::optional<plist::Value> searchProperty(RegistryObject entry, std::string_view key,
+                                             Direction direction) override;
   void release(RegistryObject object) override;
 
   OpenResult DrvServiceOpen(RegistryObject service, std::uint32_t type) override;

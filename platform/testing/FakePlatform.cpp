@@ -4,7 +4,7 @@
 #include <cerrno>
 #include <thread>
 
-#include "platform/Text.h"
+#include "base/Text.h"
 
 namespace platform::fakes {
 
@@ -87,34 +87,35 @@ std::unique_ptr<PLHistory> FakeHistory::initWithDefaultPath() {
   return std::make_unique<OpenHistory>(*this);
 }
 
-std::optional<Value> FakePreferences::mobile(std::string_view domain, std::string_view key) const {
+std::optional<plist::Value> FakePreferences::mobile(std::string_view domain,
+                                                    std::string_view key) const {
   const auto found = values.find({"mobile", std::string(domain), std::string(key)});
   return found != values.end() ? std::optional(found->second) : std::nullopt;
 }
 
-void FakePreferences::setMobile(std::string_view domain, std::string_view key, Value value) {
+void FakePreferences::setMobile(std::string_view domain, std::string_view key, plist::Value value) {
   values.insert_or_assign({"mobile", std::string(domain), std::string(key)}, std::move(value));
 }
 
 void FakePreferences::write(std::string_view user, std::string_view domain, std::string_view key,
-                            const Value* value) {
+                            const plist::Value* value) {
   const std::tuple place{std::string(user), std::string(domain), std::string(key)};
   const std::string where = std::string(user) + "/" + std::get<1>(place) + "/" + std::get<2>(place);
   if (value != nullptr) {
     values.insert_or_assign(place, *value);
-    journal_.push_back("set " + where + " = " + description(*value));
+    journal_.push_back("set " + where + " = " + plist::description(*value));
   } else {
     values.erase(place);
     journal_.push_back("remove " + where);
   }
 }
 
-std::optional<Value> FakePreferences::QNSPreferencesGetValue(std::string_view key,
-                                                             std::string_view domain) {
+std::optional<plist::Value> FakePreferences::QNSPreferencesGetValue(std::string_view key,
+                                                                    std::string_view domain) {
   return mobile(domain, key);
 }
 
-void FakePreferences::QNSPreferencesSetValue(std::string_view key, const Value* value,
+void FakePreferences::QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                                              std::string_view domain) {
   write("mobile", domain, key, value);
 }
@@ -123,19 +124,20 @@ void FakePreferences::QNSPreferencesSynchronize(std::string_view domain) {
   journal_.push_back("synchronize " + std::string(domain));
 }
 
-std::optional<Value> FakePreferences::getPreference(std::string_view key, std::string_view domain) {
+std::optional<plist::Value> FakePreferences::getPreference(std::string_view key,
+                                                           std::string_view domain) {
   const auto found = values.find({"__quenset__", std::string(domain), std::string(key)});
   return found != values.end() ? std::optional(found->second) : std::nullopt;
 }
 
-void FakePreferences::setPreference(std::string_view key, const Value* value,
+void FakePreferences::setPreference(std::string_view key, const plist::Value* value,
                                     std::string_view domain, bool synchronize) {
   write("__quenset__", domain, key, value);
   if (synchronize) journal_.push_back("synchronize configuration " + std::string(domain));
 }
 
 void FakePreferences::setPreference(std::string_view key, std::string_view user,
-                                    std::string_view domain, const Value* value) {
+                                    std::string_view domain, const plist::Value* value) {
   journal_.push_back("privileged set");
   write(user, domain, key, value);
 }
@@ -163,7 +165,8 @@ class StringHandle : public LogHandle {
 }  // namespace
 
 bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
-                                              const Dictionary* options, const Writer& writer) {
+                                              const plist::Dictionary* options,
+                                              const Writer& writer) {
   beforeLog();
   Log log{std::string(logType), std::string(logName), {}, {}};
   if (options != nullptr) log.options = *options;
@@ -174,9 +177,9 @@ bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::str
   return true;
 }
 
-void FakeHousekeeping::logStructuredData(std::int32_t type, const Dictionary& data) {
+void FakeHousekeeping::logStructuredData(std::int32_t type, const plist::Dictionary& data) {
   structured.emplace_back(type, data);
-  journal_.push_back(format("structured %d ", type) + description(Value(data)));
+  journal_.push_back(base::format("structured %d ", type) + plist::description(plist::Value(data)));
 }
 
 class FakeService::Listener : public NamedServiceListener {
@@ -188,7 +191,7 @@ class FakeService::Listener : public NamedServiceListener {
   FakeService& service_;
 };
 
-void FakeService::willDeliver(std::optional<Dictionary> message) {
+void FakeService::willDeliver(std::optional<plist::Dictionary> message) {
   script.push_back([this, message = std::move(message)] {
     if (handler_) handler_(message ? &*message : nullptr);
     return RunResult::handledSource;
@@ -196,7 +199,7 @@ void FakeService::willDeliver(std::optional<Dictionary> message) {
 }
 
 EventLoop::RunResult FakeService::run(double seconds, bool returnAfterSourceHandled) {
-  journal_.push_back(format("run loop %g %d", seconds, returnAfterSourceHandled ? 1 : 0));
+  journal_.push_back(base::format("run loop %g %d", seconds, returnAfterSourceHandled ? 1 : 0));
   if (script.empty()) return RunResult::timedOut;
   const auto step = std::move(script.front());
   script.pop_front();
@@ -305,38 +308,14 @@ std::unique_ptr<ChannelSubscription> FakeReportingChannels::subscribe(
   return subscribes ? std::make_unique<Subscription>(*this) : nullptr;
 }
 
-FakePlatform::FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest)
-    : log(lowest),
-      platform{log,
-               streams,
-               clock,
-               digest,
-               codec,
-               files,
-               counters,
-               history,
-               preferences,
-               preferences,
-               preferences,
-               submission,
-               housekeeping,
-               housekeeping,
-               service,
-               service,
-               service,
-               eventra,
-               device,
-               device,
-               kernel,
-               snapshots,
-               registry,
-               registry,
-               purgeableSpace,
-               reportingChannels,
-               networkUsage,
-               device,
-               device,
-               device,
-               runLock} {}
+FakePlatform::FakePlatform(LogLevel lowest)
+    : log(lowest), platform{log,          streams,    clock,          files,
+                            counters,     history,    preferences,    preferences,
+                            preferences,  submission, housekeeping,   housekeeping,
+                            service,      service,    service,        eventra,
+                            device,       device,     kernel,         snapshots,
+                            registry,     registry,   purgeableSpace, reportingChannels,
+                            networkUsage, device,     device,         device,
+                            runLock} {}
 
 }  // namespace platform::fakes

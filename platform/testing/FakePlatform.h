@@ -27,8 +27,8 @@ class FakeClock : public Clock {
  public:
   double secondsSince1970 = 0;
   std::int32_t zone = 0;  // seconds ahead of UTC
-  Date now() override { return {secondsSince1970}; }
-  std::int32_t secondsFromUTC(Date) override { return zone; }
+  plist::Date now() override { return {secondsSince1970}; }
+  std::int32_t secondsFromUTC(plist::Date) override { return zone; }
 };
 
 class FakeFileSystem : public FileSystem {
@@ -45,7 +45,7 @@ class FakeCounters : public CountersService {
   explicit FakeCounters(Journal& journal) : journal_(journal) {}
   std::int32_t today = 0;
   std::int32_t PLDaysSince1970() override { return today; }
-  Date PLDateFromDaysSince1970(std::int32_t day) override { return {day * 86400.0}; }
+  plist::Date PLDateFromDaysSince1970(std::int32_t day) override { return {day * 86400.0}; }
   void PLClientCheckpoint() override { journal_.push_back("checkpoint"); }
 
   // What was recorded, in order: "set <key> <value>", "add <key> <value>".
@@ -86,29 +86,29 @@ class FakePreferences : public PreferenceStore,
   explicit FakePreferences(Journal& journal) : journal_(journal) {}
 
   // By user, domain and key.
-  std::map<std::tuple<std::string, std::string, std::string>, Value> values;
+  std::map<std::tuple<std::string, std::string, std::string>, plist::Value> values;
 
-  std::optional<Value> mobile(std::string_view domain, std::string_view key) const;
-  void setMobile(std::string_view domain, std::string_view key, Value value);
+  std::optional<plist::Value> mobile(std::string_view domain, std::string_view key) const;
+  void setMobile(std::string_view domain, std::string_view key, plist::Value value);
 
-  std::optional<Value> QNSPreferencesGetValue(std::string_view key,
-                                              std::string_view domain) override;
-  void QNSPreferencesSetValue(std::string_view key, const Value* value,
+  std::optional<plist::Value> QNSPreferencesGetValue(std::string_view key,
+                                                     std::string_view domain) override;
+  void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                               std::string_view domain) override;
   void QNSPreferencesSynchronize(std::string_view domain) override;
-  std::optional<Value> getPreference(std::string_view key, std::string_view domain) override;
-  void setPreference(std::string_view key, const Value* value, std::string_view domain,
+  std::optional<plist::Value> getPreference(std::string_view key, std::string_view domain) override;
+  void setPreference(std::string_view key, const plist::Value* value, std::string_view domain,
                      bool synchronize) override;
   std::vector<std::string> blocklist;
   std::vector<std::string> logBlocklist() override { return blocklist; }
   void setPreference(std::string_view key, std::string_view user, std::string_view domain,
-                     const Value* value) override;
+                     const plist::Value* value) override;
   void deletePreference(std::string_view key, std::string_view user,
                         std::string_view domain) override;
 
  private:
   void write(std::string_view user, std::string_view domain, std::string_view key,
-             const Value* value);
+             const plist::Value* value);
 
   Journal& journal_;
 };
@@ -117,7 +117,7 @@ class FakeSubmission : public LogSubmission {
  public:
   struct Log {
     std::string type, name, contents;
-    std::optional<Dictionary> options;
+    std::optional<plist::Dictionary> options;
   };
 
   explicit FakeSubmission(Journal& journal) : journal_(journal) {}
@@ -127,7 +127,7 @@ class FakeSubmission : public LogSubmission {
 
   bool DiagnosticLogSubmissionEnabled() override { return allowed; }
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
-                                const Dictionary* options, const Writer& writer) override;
+                                const plist::Dictionary* options, const Writer& writer) override;
 
  private:
   Journal& journal_;
@@ -136,8 +136,8 @@ class FakeSubmission : public LogSubmission {
 class FakeHousekeeping : public FaultwatchSupport, public ServitaLogs {
  public:
   explicit FakeHousekeeping(Journal& journal) : journal_(journal) {}
-  std::vector<std::pair<std::int32_t, Dictionary>> structured;  // type and data of each log
-  void logStructuredData(std::int32_t type, const Dictionary& data) override;
+  std::vector<std::pair<std::int32_t, plist::Dictionary>> structured;  // type and data of each log
+  void logStructuredData(std::int32_t type, const plist::Dictionary& data) override;
   void dumpAllOldStructuredDataLogs() override { journal_.push_back("dump structured logs"); }
   std::string newIncidentIdentifier() override { return "incident"; }
   void rollServitaLogs() override { journal_.push_back("roll servita logs"); }
@@ -155,7 +155,7 @@ class FakeService : public EventLoop, public NamedServices, public NotificationC
   std::deque<std::function<RunResult()>> script;
 
   // Scripts the delivery of a message, or of an event that isn't one.
-  void willDeliver(std::optional<Dictionary> message);
+  void willDeliver(std::optional<plist::Dictionary> message);
 
   RunResult run(double seconds, bool returnAfterSourceHandled) override;
   std::unique_ptr<NamedServiceListener> listen(std::string_view serviceName) override;
@@ -175,7 +175,7 @@ class FakeEventra : public Eventra {
   bool hasLazySend = true, everyEventIsUsed = true, queuesEvents = true;
   std::set<std::string, std::less<>> unused;  // events that aren't used even so
   bool defers = false;                        // leaves what is sent to deliver()
-  std::vector<std::pair<std::string, Dictionary>> events;
+  std::vector<std::pair<std::string, plist::Dictionary>> events;
 
   // Asks the producers that still wait for their payloads, on a thread of its own.
   void deliver();
@@ -203,7 +203,7 @@ class FakeDevice : public DeviceProperties,
   std::optional<std::string> container;
   std::uint64_t containerError = 2;
   int containerQueries = 0;
-  std::optional<Dictionary> version;
+  std::optional<plist::Dictionary> version;
   std::string versionText;
   std::vector<BundleType> bundles;
   int enumerations = 0;
@@ -220,7 +220,7 @@ class FakeDevice : public DeviceProperties,
   std::optional<std::uint32_t> multiUserIndicator() override { return multiUser; }
   std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
                                                       std::uint64_t& error) override;
-  std::optional<Dictionary> systemVersionDictionary() override { return version; }
+  std::optional<plist::Dictionary> systemVersionDictionary() override { return version; }
   std::string operatingSystemVersion() override { return versionText; }
   void enumerateBundles(const std::function<void(BundleType)>& handler) override;
   std::vector<std::string> preferredLanguages() override { return languages; }
@@ -272,11 +272,11 @@ class FakeSnapshots : public KernelSnapshots {
 class FakePurgeableSpace : public PurgeableSpace {
  public:
   bool present = false;
-  std::optional<Dictionary> answer;
-  Dictionary lastQuery;
+  std::optional<plist::Dictionary> answer;
+  plist::Dictionary lastQuery;
   bool isPresent() override { return present; }
-  std::optional<Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
-      const Dictionary& query) override {
+  std::optional<plist::Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
+      const plist::Dictionary& query) override {
     lastQuery = query;
     return answer;
   }
@@ -285,7 +285,7 @@ class FakePurgeableSpace : public PurgeableSpace {
 // Replies within the query, or leaves the replies to the test.
 class FakeNetworkUsage : public NetworkUsage {
  public:
-  std::optional<Array> records;
+  std::optional<plist::Array> records;
   bool repliesAtOnce = true;
   std::vector<Reply> pending;
   void queryAllProcesses(Reply reply) override;
@@ -317,10 +317,10 @@ class FakeRunLock : public RunLock {
   void unlock() override { --held; }
 };
 
-// All of them, assembled. The codec and the digest have no state: tests bring the real ones.
+// All of them, assembled.
 class FakePlatform {
  public:
-  FakePlatform(PropertyListCodec& codec, Digest& digest, LogLevel lowest = LogLevel::debug);
+  explicit FakePlatform(LogLevel lowest = LogLevel::debug);
 
   Journal journal;
   RecordingLog log;

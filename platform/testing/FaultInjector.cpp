@@ -26,18 +26,6 @@ struct Files : FileSystem {
   }
 };
 
-struct PropertyLists : PropertyListCodec {
-  PropertyLists(PropertyListCodec& i, Plan& p) : inner(i), plan(p) {}
-  PropertyListCodec& inner;
-  Plan& plan;
-  Result<Value> read(std::string_view bytes) override {
-    return plan.fails() ? Result<Value>::failure("injected") : inner.read(bytes);
-  }
-  Result<std::string> writeXML(const Value& value) override {
-    return plan.fails() ? Result<std::string>::failure("injected") : inner.writeXML(value);
-  }
-};
-
 struct FailedHistory : PLHistory {
   void scalarsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
                            const ScalarRowHandler&) override {}
@@ -60,11 +48,11 @@ struct Preferences : PreferenceStore {
   Preferences(PreferenceStore& i, Plan& p) : inner(i), plan(p) {}
   PreferenceStore& inner;
   Plan& plan;
-  std::optional<Value> QNSPreferencesGetValue(std::string_view key,
-                                              std::string_view domain) override {
+  std::optional<plist::Value> QNSPreferencesGetValue(std::string_view key,
+                                                     std::string_view domain) override {
     return plan.fails() ? std::nullopt : inner.QNSPreferencesGetValue(key, domain);
   }
-  void QNSPreferencesSetValue(std::string_view key, const Value* value,
+  void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                               std::string_view domain) override {
     inner.QNSPreferencesSetValue(key, value, domain);
   }
@@ -79,7 +67,7 @@ struct Submissions : LogSubmission {
   Plan& plan;
   bool DiagnosticLogSubmissionEnabled() override { return inner.DiagnosticLogSubmissionEnabled(); }
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
-                                const Dictionary* options, const Writer& writer) override {
+                                const plist::Dictionary* options, const Writer& writer) override {
     return !plan.fails() && inner.QNSWriteLogForSubmission(logType, logName, options, writer);
   }
 };
@@ -127,7 +115,7 @@ struct Device : DeviceProperties, SystemVersion, LibraryLoader {
     if (plan.fails()) return std::nullopt;
     return inner.deviceProperties.systemGroupContainerPath(identifier, error);
   }
-  std::optional<Dictionary> systemVersionDictionary() override {
+  std::optional<plist::Dictionary> systemVersionDictionary() override {
     return plan.fails() ? std::nullopt : inner.systemVersion.systemVersionDictionary();
   }
   std::string operatingSystemVersion() override {
@@ -174,8 +162,8 @@ struct Registry : DeviceRegistry, DriverConnections {
   bool conformsTo(RegistryObject entry, std::string_view className) override {
     return registry.conformsTo(entry, className);
   }
-  std::optional<Value> searchProperty(RegistryObject entry, std::string_view key,
-                                      Direction direction) override {
+  std::optional<plist::Value> searchProperty(RegistryObject entry, std::string_view key,
+                                             Direction direction) override {
     return plan.fails() ? std::nullopt : registry.searchProperty(entry, key, direction);
   }
   void release(RegistryObject object) override { registry.release(object); }
@@ -207,8 +195,8 @@ struct Storage : KernelSnapshots, PurgeableSpace {
     return plan.fails() ? std::nullopt : inner.snapshots.capture(flags);
   }
   bool isPresent() override { return inner.purgeableSpace.isPresent(); }
-  std::optional<Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
-      const Dictionary& query) override {
+  std::optional<plist::Dictionary> SpacereapCopyItemizedPurgeableSpaceWithInfo(
+      const plist::Dictionary& query) override {
     if (plan.fails()) return std::nullopt;
     return inner.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(query);
   }
@@ -251,7 +239,6 @@ struct Channels : ReportingChannels {
 struct FaultInjector::Services {
   explicit Services(Platform& inner)
       : files(inner.files, plan),
-        propertyLists(inner.propertyLists, plan),
         history(inner.history, plan),
         preferences(inner.preferences, plan),
         submission(inner.submission, plan),
@@ -266,8 +253,6 @@ struct FaultInjector::Services {
         platform{inner.log,
                  inner.streams,
                  inner.clock,
-                 inner.digest,
-                 propertyLists,
                  files,
                  inner.counters,
                  history,
@@ -297,7 +282,6 @@ struct FaultInjector::Services {
 
   Plan plan;
   Files files;
-  PropertyLists propertyLists;
   Histories history;
   Preferences preferences;
   Submissions submission;

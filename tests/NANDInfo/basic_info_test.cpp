@@ -7,7 +7,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary, platform::Number;
+using plist::Dictionary, plist::Number;
 using support::kZMCStorage, support::StorageDevice;
 
 constexpr char kPrefix[] = "com.norba.NANDInfo.";
@@ -83,7 +83,7 @@ TEST(BasicInfo, EveryFixedFieldHasItsKeyAndType) {
     const auto* entry = info.begin() + i;
     const std::int64_t least = type == int32 ? INT32_MIN : INT64_MIN + (std::int64_t{1} << 31);
     EXPECT_EQ(entry->key, std::string(kPrefix) + key);
-    EXPECT_EQ(entry->value, platform::Value(from != 0 ? least + from : value)) << key;
+    EXPECT_EQ(entry->value, plist::Value(from != 0 ? least + from : value)) << key;
     EXPECT_EQ(entry->value.as<Number>()->type(), type) << key;
     EXPECT_EQ(none.number(entry->key)->int64Value(), i == 2 ? 1 : 0) << key;
   }

@@ -4,7 +4,7 @@
 
 #include <functional>
 
-#include "platform/Text.h"
+#include "base/Text.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
@@ -12,7 +12,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 using support::kEmbedded, support::kQRT3, support::kZMCStorage, support::StorageDevice;
 using Lines = std::vector<std::string>;
 
@@ -105,7 +105,7 @@ TEST(StorageStats, DerivedFieldsAndImages) {
   std::uint64_t answer = 1234561;
   for (const EANQuery& query : EANQueries()) {
     const int method = query.query == GetEANImageSize ? 3 : 7;
-    device.registry.standing[platform::format("%d(%u)", method, query.code)] = {.scalar = answer++};
+    device.registry.standing[base::format("%d(%u)", method, query.code)] = {.scalar = answer++};
   }
   const Dictionary derived{{"TLM_formatWeeksSince2000", 0},
                            {"TLM_DQ_Capacity_GB", 128},

@@ -52,12 +52,11 @@ TEST(GenericParserContext, CutsLongNamesAndKeepsEqualOnes) {
   const auto dictionary = CreateDictFromCxt(context);
   EXPECT_EQ(dictionary.size(), 3u);
   EXPECT_EQ(dictionary.number("boots")->uint64Value(), 4u);
-  EXPECT_EQ(dictionary.number("boots")->type(), platform::Number::Type::uint64);
+  EXPECT_EQ(dictionary.number("boots")->type(), plist::Number::Type::uint64);
   EXPECT_EQ(dictionary.number(name97 + "1")->uint64Value(), kLargest);
   const NameRow allowed[] = {{"boots", 0}, {"absent", 0}};
   const NameTable table(allowed);
-  EXPECT_EQ(CreateDictFromCxt(context, &table),
-            (platform::Dictionary{{"boots", std::uint64_t{4}}}));
+  EXPECT_EQ(CreateDictFromCxt(context, &table), (plist::Dictionary{{"boots", std::uint64_t{4}}}));
   for (int i = 0; i < 2; ++i) ReleaseGenericParserCxt(&context);
   EXPECT_TRUE(context.empty() && CreateDictFromCxt(context).empty());
   AddSingleValueToGenericContext(&context, "again", "", 5);

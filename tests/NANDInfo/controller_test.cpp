@@ -191,8 +191,8 @@ TEST_F(ControllerTest, DeletionAndConnectionsByTheirFailures) {
   const auto announce = FakeDeviceRegistry::announce;
   const auto recommends = [&] {
     const auto value = NandRecommendsContentDeletion(platform);
-    EXPECT_EQ(value.as<platform::Number>()->type(), platform::Number::Type::boolean);
-    return value == platform::Value(true);
+    EXPECT_EQ(value.as<plist::Number>()->type(), plist::Number::Type::boolean);
+    return value == plist::Value(true);
   };
   const auto connect = [&] {
     zmc_connection_t connection{};

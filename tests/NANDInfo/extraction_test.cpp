@@ -10,7 +10,7 @@
 #include <functional>
 
 #include "NANDInfo/Events.h"
-#include "NANDInfo/ExtractionSteps.h"
+#include "NANDInfo/deliver/ExtractionSteps.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
@@ -18,7 +18,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary, platform::Value;
+using plist::Dictionary, plist::Value;
 using support::StorageDevice;
 using u64 = std::uint64_t;
 

@@ -9,7 +9,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary, platform::Number;
+using plist::Dictionary, plist::Number;
 using support::kQRT3, support::kZMCStorage, support::StorageDevice;
 
 constexpr std::uint64_t kMany = ~std::uint64_t{0};

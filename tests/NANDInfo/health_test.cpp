@@ -7,7 +7,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 using support::kQRT3, support::kZMCStorage, support::StorageDevice;
 
 constexpr std::uint64_t kNegative = 0xFFFFFFFF;  // in 32 bits
@@ -74,7 +74,7 @@ TEST(HealthInfo, EachConsumerGetsItsFigures) {
                              {"SpareAvailablePercent", f.spare},
                              {"NumDieFailures", f.dies}}));
     for (const auto& [key, value] : all) {
-      EXPECT_EQ(value.as<platform::Number>()->type(), platform::Number::Type::int64) << key;
+      EXPECT_EQ(value.as<plist::Number>()->type(), plist::Number::Type::int64) << key;
     }
     const auto common = prefixed({{"MaxPercentageNANDUsed", f.used},
                                   {"HostReadErrors", f.reads},

@@ -5,14 +5,14 @@
 
 #include <gtest/gtest.h>
 
-#include "NANDInfo/MagazineDeltas.h"
+#include "NANDInfo/collect/MagazineDeltas.h"
 #include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 using support::FTLFields, support::StorageDevice;
 using u64 = std::uint64_t;
 
@@ -74,7 +74,7 @@ TEST(WriteAmplification, IsOfTheBucketThatGainsABand) {
         older{{"gcWrites", olderWrites}, {kTLM_magazineTimeStamp, u64{100}}};
     for (const auto& [place, value] : curve) older.set("vcurve_" + std::to_string(place), value);
     const auto result = instantaneousWriteAmplification(newer, older);
-    EXPECT_EQ(result, platform::Value(bucket == 0 ? 0.0 : 1.0 / (1.0 - 0.033 * bucket)))
+    EXPECT_EQ(result, plist::Value(bucket == 0 ? 0.0 : 1.0 / (1.0 - 0.033 * bucket)))
         << newerWrites << " " << bucket;
   }
 }

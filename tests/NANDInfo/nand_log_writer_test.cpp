@@ -6,13 +6,13 @@
 
 #include <stdexcept>
 
-#include "NANDInfo/NANDLog.h"
+#include "NANDInfo/deliver/NANDLog.h"
 #include "support/TestPlatform.h"
 
 namespace NANDInfo {
 namespace {
 
-using platform::Array, platform::Date, platform::Dictionary, platform::Value;
+using plist::Array, plist::Date, plist::Dictionary, plist::Value;
 using Lines = std::vector<std::string>;
 
 constexpr char kDomain[] = "com.norba.pellorand.morvend";

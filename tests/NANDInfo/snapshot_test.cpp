@@ -94,9 +94,9 @@ TEST(Snapshot, TheThreadIsFoundWhereverItIs) {
       EXPECT_TRUE(info.empty());
     } else {
       const auto written = static_cast<std::uint64_t>(row.written);
-      EXPECT_EQ(info, (platform::Dictionary{
-                          {"TLM_VMFreezer_bytesWritten", written},
-                          {"com.norba.NANDInfo.VMFreezer.NumPhysicalWrites", written}}));
+      EXPECT_EQ(info,
+                (plist::Dictionary{{"TLM_VMFreezer_bytesWritten", written},
+                                   {"com.norba.NANDInfo.VMFreezer.NumPhysicalWrites", written}}));
     }
   }
   support::StorageDevice withoutSnapshots;

@@ -11,20 +11,20 @@
 #include <limits>
 #include <string>
 
-#include "NANDInfo/DefectsList.h"
-#include "NANDInfo/ListHandlers.h"
-#include "NANDInfo/StructuredLogState.h"
-#include "NANDInfo/TelemetryList.h"
-#include "NANDInfo/ValidityList.h"
-#include "NANDInfo/WriteAmplification.h"
+#include "NANDInfo/collect/WriteAmplification.h"
+#include "NANDInfo/decode/DefectsList.h"
+#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/deliver/ListHandlers.h"
+#include "NANDInfo/deliver/StructuredLogState.h"
 #include "support/ControllerLists.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {
 namespace {
 
-using platform::Array, platform::Dictionary, platform::Value;
 using platform::fakes::FakeDeviceRegistry;
+using plist::Array, plist::Dictionary, plist::Value;
 using support::Bytes, support::kEmbedded, support::kQRT3, support::kZMCStorage;
 using Entry = FakeDeviceRegistry::Entry;
 using Answer = FakeDeviceRegistry::Answer;
@@ -412,7 +412,7 @@ TEST_F(StructuredLogsTest, TelemetryNeedsThreeCharacteristics) {
   } rows[] = {
       {Array{}, "ERROR: Could not parse the Device Characteristics dictionary\n", 0},
       {with("chip-id", {}), missing + "chip-id\n", 0},
-      {with("chip-id", platform::Data{1}), no + "chip-id" + noText, 0},
+      {with("chip-id", plist::Data{1}), no + "chip-id" + noText, 0},
       {with("chip-id", std::string(63, 'Q')), "", 2},
       {with("chip-id", std::string(64, 'Q')),
        "ERROR: Unable to obtain chip-id as conversion from the UniChar contents of Orvalstr "

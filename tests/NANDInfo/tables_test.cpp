@@ -9,8 +9,8 @@
 #include "NANDInfo/CounterRecords.h"
 #include "NANDInfo/Events.h"
 #include "NANDInfo/KeyTables.h"
-#include "NANDInfo/NameRows.h"
 #include "NANDInfo/Whitelists.h"
+#include "NANDInfo/vocabulary/NameRows.h"
 #include "support/ControllerBuffers.h"
 #include "support/Fingerprint.h"
 

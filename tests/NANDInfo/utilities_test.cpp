@@ -11,7 +11,7 @@
 namespace NANDInfo {
 namespace {
 
-using platform::Array, platform::Dictionary, platform::Number, platform::Value;
+using plist::Array, plist::Dictionary, plist::Number, plist::Value;
 
 TEST(NumberValue, IsReadInItsKindFromAnyAddressAndItsAbsenceLogged) {
   support::TestPlatform fakes;

@@ -8,12 +8,12 @@
 #include <limits>
 #include <string>
 
-#include "NANDInfo/NameRows.h"
+#include "NANDInfo/vocabulary/NameRows.h"
 
 namespace NANDInfo {
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 
 constexpr NameRow kRows[] = {{"n{1, 3..4, 10}", 2}, {"all", 20}, {"n{4, 5}", 3}, {"zero", 0}};
 static_assert(countNames(kRows) == 8);
@@ -58,7 +58,7 @@ TEST(Filter, KeepsTheNamedInOrderAndRoundsOnlyNumbersOnDemand) {
                                  {"all", std::uint64_t{12345}},
                                  {"n4", Dictionary{{"n2", 12345}}}}));
   for (const char* key : {"zero", "n10", "n3", "all"}) {
-    EXPECT_EQ(rounded.number(key)->type(), platform::Number::Type::uint64) << key;
+    EXPECT_EQ(rounded.number(key)->type(), plist::Number::Type::uint64) << key;
   }
 }
 

@@ -24,7 +24,7 @@ prefix=$work/moved lib=$work/moved/$libdir
 export PKG_CONFIG_PATH=$lib/pkgconfig LD_LIBRARY_PATH=$lib
 
 strangers=$(nm -DC --defined-only "$lib/libNANDInfo.so" | cut -d' ' -f3- |
-  grep -vE '^(NANDInfo|platform)::|^PLIsInternalDevice$' || true)
+  grep -vE '^(NANDInfo|base|host|platform|plist)::|^PLIsInternalDevice$' || true)
 [ -z "$strangers" ] || fail "exported: $strangers"
 readelf -d "$lib/libNANDInfo.so" | grep -q 'SONAME.*\[libNANDInfo\.so\.0\]' || fail "no SONAME"
 

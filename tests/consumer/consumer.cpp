@@ -1,13 +1,12 @@
 // A program of somebody else's that loads the storage library.
 #include <NANDInfo/NANDInfo.h>
+#include <host/HostPlatform.h>
 #include <platform/Platform.h>
-#include <platform/host/HostPlatform.h>
 
 int main() {
-  const auto platform = platform::host::makeHostPlatform();
+  const auto platform = host::makeHostPlatform();
   platform->log.log(platform::LogLevel::debug, "not shown");
-  platform->streams.writeOutput(description(platform::Value(NANDInfo::GetDiskInfo(*platform))) +
-                                "\n");
+  platform->streams.writeOutput(description(plist::Value(NANDInfo::GetDiskInfo(*platform))) + "\n");
   platform->counters.PLClientAddValueForScalarKey("consumer", 5);
-  if (platform::host::PLIsInternalDevice()) platform->streams.writeOutput("internal\n");
+  if (host::PLIsInternalDevice()) platform->streams.writeOutput("internal\n");
 }

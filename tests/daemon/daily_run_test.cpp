@@ -10,8 +10,8 @@
 namespace morvend {
 namespace {
 
-using platform::Dictionary;
-using platform::Value;
+using plist::Dictionary;
+using plist::Value;
 using Lines = std::vector<std::string>;
 
 constexpr char kDomain[] = "com.norba.pellorand.morvend";
@@ -68,7 +68,7 @@ TEST_F(DailyRunTest, RunsTheSequenceInItsOrderThenWritesTheRecord) {
   EXPECT_EQ(platform.log.lines().back(), "default: morvend ended");
   EXPECT_EQ(reportedDays(), std::vector<std::int64_t>{20000});
   const auto record = platform.preferences.mobile(kDomain, kRecord);
-  EXPECT_EQ(record->as<platform::Number>()->type(), platform::Number::Type::int32);
+  EXPECT_EQ(record->as<plist::Number>()->type(), plist::Number::Type::int32);
   platform.submission.allowed = false;  // leaves the report out, and nothing else
   platform.journal.clear();
   run({"morvend", "-f"});

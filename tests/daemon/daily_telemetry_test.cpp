@@ -14,8 +14,8 @@ namespace morvend {
 namespace {
 
 using platform::ChannelSample;
-using platform::Dictionary;
 using platform::ReportChannel;
+using plist::Dictionary;
 using Lines = std::vector<std::string>;
 
 constexpr char kNextEvent[] = "kern.next_ecc_event";
@@ -113,7 +113,7 @@ TEST_F(DailyTelemetryTest, RunsItsCollectorsInOrder) {
   platform.registry.alwaysTunnels(9, 15, 0, support::defectsList(2, {{0, 0, 0, 0, 0, 0, 0, 0}}));
   platform.kernel.deliveries[kNextEvent] = {{0, event(1, 0)}};
   platform.networkUsage.records = {
-      Dictionary{{"procName", "p"}, {"since", platform::Date{0}}, {"wifiInBytes", 4096}}};
+      Dictionary{{"procName", "p"}, {"since", plist::Date{0}}, {"wifiInBytes", 4096}}};
   platform.reportingChannels.samples = {{{1, 1, "a"}, 5}};
   platform.counters.areInJournal = true;
   CollectDailyTelemetry(platform.platform);
@@ -136,7 +136,7 @@ TEST_F(DailyTelemetryTest, AnEccEventIsLoggedWithTheEntriesThatCount) {
   support::Bytes record = event(255, 8);
   record.back() = std::byte{0x80};
   const Dictionary data = eccEventData(std::span(record).first<kEccEventRecordSize>());
-  EXPECT_EQ(*data.find("reg7"), platform::Value(INT64_MIN + 8));
+  EXPECT_EQ(*data.find("reg7"), plist::Value(INT64_MIN + 8));
 }
 
 TEST_F(DailyTelemetryTest, AtMostTenEccEventsAreLoggedInARun) {
@@ -156,7 +156,7 @@ TEST_F(DailyTelemetryTest, AnEccReadHasTheLengthOfTheOneBefore) {
   shortened[8] = std::byte{9};
   platform.kernel.deliveries[kNextEvent] = {{0, event(1, 1)}, {0, shortened}, {0, event(3, 2)}};
   const auto structured = [](const Dictionary& data) {
-    return "structured 172 " + description(platform::Value(data));
+    return "structured 172 " + description(plist::Value(data));
   };
   EXPECT_EQ(structuredLogs(),
             (Lines{structured({{"id", 1}, {"count", 1}, {"reg0", 1}}),

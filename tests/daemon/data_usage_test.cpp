@@ -6,17 +6,18 @@
 #include <limits>
 
 #include "daemon/DataUsageChanges.h"
-#include "platform/host/Host.h"
+#include "host/Host.h"
+#include "plist/PropertyList.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 
 namespace morvend {
 namespace {
 
-using platform::Array;
-using platform::Date;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Date;
+using plist::Dictionary;
+using plist::Value;
 using Lines = std::vector<std::string>;
 
 constexpr char kDomain[] = "com.norba.quenset.morvend";
@@ -173,14 +174,13 @@ class DataUsageThreads : public ::testing::Test {
   }
 
   void answer(const Array& records, double delay) {
-    support::RealCodecs codecs;
     folder.write("device/network-usage.plist",
-                 *codecs.codec.writeXML(Dictionary{{"Records", records}, {"ReplyDelay", delay}}));
+                 *plist::writeXML(Dictionary{{"Records", records}, {"ReplyDelay", delay}}));
   }
 
   // The sum of the day's scalars.
   std::int64_t recorded() {
-    platform::host::Host host({.root = folder.path()});
+    host::Host host({.root = folder.path()});
     std::int64_t sum = 0;
     host.platform().history.initWithDefaultPath()->scalarsForKeyPrefix(
         "", INT32_MIN, INT32_MAX,
@@ -195,7 +195,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   constexpr int kProcesses = 100, kOthers = 100;
   answer(processes(kProcesses), 0);
   {
-    platform::host::Host host({.root = folder.path()});
+    host::Host host({.root = folder.path()});
     platform::Platform& platform = host.platform();
     CollectDataUsage(platform, std::chrono::nanoseconds(0));
     for (int i = 0; i < kOthers; ++i) {
@@ -218,7 +218,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
 TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
   EXPECT_EQ(kUsageServicePatience, std::chrono::seconds(10));
   answer(processes(2000), 0);
-  platform::host::Host host({.root = folder.path()});
+  host::Host host({.root = folder.path()});
   CollectDataUsage(host.platform());
   const std::string file = folder.read("var/preferences/mobile/" + std::string(kDomain) + ".plist");
   EXPECT_NE(file.find("<key>1999</key>"), file.npos);
@@ -229,7 +229,7 @@ TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
   for (const bool comes : {false, true}) {
     answer(processes(2), comes ? 0 : std::numeric_limits<double>::infinity());
     for (int i = 0; i < 20; ++i) {
-      platform::host::Host host({.root = folder.path()});
+      host::Host host({.root = folder.path()});
       CollectDataUsage(host.platform(), comes && i == 19 ? kUsageServicePatience
                                                          : std::chrono::microseconds(20 * i));
     }

@@ -8,10 +8,10 @@
 namespace morvend {
 namespace {
 
-using platform::Array;
-using platform::Data;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Data;
+using plist::Dictionary;
+using plist::Value;
 using Lines = std::vector<std::string>;
 
 Dictionary operation(std::int64_t number) { return {{"operation", number}}; }

@@ -7,9 +7,9 @@
 namespace morvend {
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 using Lines = std::vector<std::string>;
 
 constexpr char kDomain[] = "com.norba.pellorand.morvend";

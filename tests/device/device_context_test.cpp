@@ -7,7 +7,7 @@
 namespace morvend {
 namespace {
 
-using platform::Value;
+using plist::Value;
 
 // The two functions of the support library, over one stored count.
 std::int64_t storedCount = 0;
@@ -20,7 +20,7 @@ std::int64_t readInteger(const char* key, const char* domain, bool* found) {
 
 void writeValue(const char* key, const Value* value, const char* domain) {
   asked.push_back(std::string("write ") + key + " " + domain);
-  storedCount = value->as<platform::Number>()->int64Value();
+  storedCount = value->as<plist::Number>()->int64Value();
 }
 
 class DeviceContextTest : public ::testing::Test {

@@ -3,17 +3,17 @@
 #include <algorithm>
 #include <filesystem>
 
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
-#include "platform/host/Host.h"
-#include "platform/host/HostPropertyListCodec.h"
-#include "platform/host/SystemClock.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
+#include "host/Host.h"
+#include "host/process/SystemClock.h"
+#include "plist/PropertyList.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
 
 namespace end_to_end {
 
-using platform::format;
+using base::format;
 
 namespace {
 
@@ -26,7 +26,7 @@ Dictionary controller() {
   const support::Bytes statistics =
       support::words({support::header(4, 1), 1, support::header(20, 1), 3, support::header(49, 1),
                       4096, support::header(50, 1), 1, support::header(1, 1), 7});
-  const platform::Data telemetry = support::data(support::telemetryList(1));
+  const plist::Data telemetry = support::data(support::telemetryList(1));
   const Dictionary buffers{
       {"13", support::data(statistics)},
       {"11", support::data(support::validityList(2, {{0, 5}, {1, 7}, {0, 6}}))},
@@ -47,10 +47,10 @@ Dictionary controller() {
 
 Device::Device()
     : root_(std::make_unique<support::TemporaryFolder>()),
-      today_(platform::dayNumber(platform::host::SystemClock().now().secondsSince1970)) {}
+      today_(base::dayNumber(host::SystemClock().now().secondsSince1970)) {}
 
 void Device::fill() {
-  platform::host::Host host({.root = root_->path()});
+  host::Host host({.root = root_->path()});
   for (std::int32_t day = today_ - 3; day < today_; ++day) {
     for (const char* key : {"exact", "family.a", "family.b", "secret"}) {
       host.counters().set(key, 1000 * (day % 7) + 123, day);
@@ -94,13 +94,13 @@ void Device::fill() {
   writePropertyList(
       "device/network-usage.plist",
       Dictionary{{"Records", Array{Dictionary{{"procName", "process"},
-                                              {"since", platform::Date{today_ * 86400.0}},
+                                              {"since", plist::Date{today_ * 86400.0}},
                                               {"wifiInBytes", 2048}}}}});
   root_->write("device/ecc-events/1", std::string("\1\0", 2));
   writePropertyList("device/registry.plist", Dictionary{{"Children", Array{controller()}}});
   writePropertyList("device/purgeable-space.plist",
                     Dictionary{{"SPACEREAP_TOTAL_AVAILABLE", 5000}});
-  const platform::Data snapshot = support::data(support::kernelSnapshot(4096));
+  const plist::Data snapshot = support::data(support::kernelSnapshot(4096));
   root_->write("device/kernel-snapshot.bin", std::string(snapshot.begin(), snapshot.end()));
   writePropertyList("device/locale.plist", Dictionary{{"PreferredLanguages", Array{"de-AT"}},
                                                       {"Localizations", Array{"en", "de"}},
@@ -136,11 +136,11 @@ void Device::become(const Device& other) {
 }
 
 void Device::writePropertyList(const std::string& path, const Value& value) const {
-  root_->write(path, *platform::host::HostPropertyListCodec().writeXML(value));
+  root_->write(path, *plist::writeXML(value));
 }
 
 std::optional<Value> Device::readPropertyList(const std::string& path) const {
-  return platform::host::HostPropertyListCodec().read(root_->read(path)).value;
+  return plist::read(root_->read(path)).value;
 }
 
 std::optional<Value> Device::record(const std::string& key) const {
@@ -203,11 +203,11 @@ Dictionary Device::expectedSections() const {
                                                        Value(1332.5), Value(40)}}}},
       {"PLDistributionsHistogram",
        Dictionary{{"samples", Dictionary{{"(-inf, 5]", 11}, {"(5, 10]", 10}, {"(10, inf)", 19}}}}},
-      {"PLStartDate", platform::Date{(today_ - 1) * 86400.0}}};
+      {"PLStartDate", plist::Date{(today_ - 1) * 86400.0}}};
 }
 
 Lines Device::rows(std::int32_t first, std::int32_t last) const {
-  platform::host::Host host({.root = root_->path()});
+  host::Host host({.root = root_->path()});
   Lines rows;
   const auto history = host.platform().history.initWithDefaultPath();
   history->scalarsForKeyPrefix(

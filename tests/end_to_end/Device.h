@@ -7,14 +7,14 @@
 #include <vector>
 
 #include "faults/FaultRun.h"
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 #include "support/TemporaryFolder.h"
 
 namespace end_to_end {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 using Lines = std::vector<std::string>;
 
 inline constexpr char kDomain[] = "com.norba.pellorand.morvend";

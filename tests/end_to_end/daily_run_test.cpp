@@ -8,7 +8,7 @@
 #include <thread>
 
 #include "end_to_end/Device.h"
-#include "platform/host/Host.h"
+#include "host/Host.h"
 #include "support/BinaryPropertyList.h"
 #include "support/TemporaryFolder.h"
 
@@ -210,7 +210,7 @@ TEST(DailyRun, KnowsAKeyAgainThatIsNotWrittenAsItCame) {
   device.fill();
   const std::string key = "datausage.wifiInKB.com.norba.p";
   const Dictionary record{{"procName", "p\x01"},
-                          {"since", platform::Date{device.today() * 86400.0}},
+                          {"since", plist::Date{device.today() * 86400.0}},
                           {"wifiInBytes", 2048}};
   const Dictionary keys{{key + "\x01", Dictionary()}};
   using List = support::BinaryPropertyList;

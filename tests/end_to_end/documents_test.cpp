@@ -68,8 +68,8 @@ TEST(Documents, ManualPagesNameWhatTheHelpNames) {
 // A counter, an event, a notification or a preference domain that the day uses in silence.
 TEST(Documents, TheDayAndItsDataNameEveryKey) {
   const std::string documents = contentOf("docs/DATA.md") + contentOf("docs/DAY.md");
-  std::vector<std::filesystem::path> sources = {"NANDInfo/Events.h", "NANDInfo/NANDLogWriter.cpp",
-                                                "NANDInfo/StructuredLogs.cpp"};
+  std::vector<std::filesystem::path> sources = {"NANDInfo/include/NANDInfo/Events.h", "NANDInfo/deliver/NANDLogWriter.cpp",
+                                                "NANDInfo/deliver/StructuredLogs.cpp"};
   for (const char* room : {"daemon", "report"}) {
     for (const auto& file : std::filesystem::directory_iterator(kSource / room)) {
       if (file.path().extension() == ".cpp") sources.push_back(file.path());

@@ -9,20 +9,20 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"
-#include "NANDInfo/ProcessState.h"
-#include "NANDInfo/StructuredLogState.h"
+#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/deliver/StructuredLogState.h"
 #include "daemon/Entry.h"
 #include "end_to_end/Device.h"
-#include "platform/host/Host.h"
-#include "platform/host/HostPropertyListCodec.h"
+#include "host/Host.h"
 #include "platform/testing/FaultInjector.h"
+#include "plist/PropertyList.h"
 #include "support/FreshErrors.h"
 
 namespace end_to_end {
 namespace {
 
-using platform::Data;
 using platform::Platform;
+using plist::Data;
 
 std::ptrdiff_t entriesOf(const char* folder) {
   return std::distance(std::filesystem::directory_iterator(folder), {});
@@ -41,7 +41,7 @@ std::string runDay(
   const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
   ::testing::internal::CaptureStderr();
   {
-    platform::host::Host host({.root = device.root().path()});
+    host::Host host({.root = device.root().path()});
     wrap(host.platform(), [](Platform& platform) {
       morvend::DeviceContext context(platform);
       const char* const arguments[] = {"morvend", "-d"};
@@ -108,7 +108,6 @@ TEST_F(HostileDevice, EndsTheDayWhateverAValueIsReplacedBy) {
                           lyingCount,        randomData(1),  INT64_MAX, 1e300,
                           Array{"x"},        randomData(40), true,      Dictionary{{"", -1}}};
   std::size_t next = 0;
-  platform::host::HostPropertyListCodec codec;
   for (const std::string& name : filled.names("device")) {
     if (!name.ends_with(".plist")) continue;
     Value list = *filled.readPropertyList("device/" + name);
@@ -118,7 +117,7 @@ TEST_F(HostileDevice, EndsTheDayWhateverAValueIsReplacedBy) {
       for (std::size_t turn = 0; turn < kTurns; ++turn) {
         // Moved, so that the values within stay where they are.
         Value whole = std::exchange(*values[i], others[next++ % std::size(others)]);
-        runWith("device/" + name, *codec.writeXML(list), std::to_string(i));
+        runWith("device/" + name, *plist::writeXML(list), std::to_string(i));
         *values[i] = std::move(whole);
       }
     }
@@ -126,7 +125,6 @@ TEST_F(HostileDevice, EndsTheDayWhateverAValueIsReplacedBy) {
 }
 
 TEST_F(HostileDevice, EndsTheDayWhateverAFileHolds) {
-  platform::host::HostPropertyListCodec codec;
   Array channels;
   for (int i = 0; i < 3000; ++i) {
     channels.push_back(Dictionary{{"Name", std::string(300, 'c') + std::to_string(i)},
@@ -141,7 +139,7 @@ TEST_F(HostileDevice, EndsTheDayWhateverAFileHolds) {
     const std::string whole = filled.root().read(path);
     runWith(path, "", "empty");
     runWith(path, whole.substr(0, whole.size() / 2), "cut");
-    runWith(path, *codec.writeXML(channels), "an array");
+    runWith(path, *plist::writeXML(channels), "an array");
     for (const std::size_t size : {1u, 71u, 73u, 5000u}) {
       const Data bytes = randomData(size);
       runWith(path, std::string(bytes.begin(), bytes.end()), "random");

@@ -216,9 +216,9 @@ std::vector<std::pair<const char*, std::vector<std::pair<const char*, Value>>>> 
   const auto registry = [](Array children) {
     return Dictionary{{"Children", std::move(children)}};
   };
-  const platform::Data statistics =
+  const plist::Data statistics =
       support::data(support::words({support::header(4, 1), 24, support::header(14, 1), 5}));
-  const platform::Data msp = support::data(support::everyMSPCounter(7));
+  const plist::Data msp = support::data(support::everyMSPCounter(7));
   const Dictionary characteristics{
       {"Controller Characteristics", Dictionary{{"chip-id", "QM8"},
                                                 {"manufacturer-id", "2C64A1D40500"},
@@ -235,8 +235,8 @@ std::vector<std::pair<const char*, std::vector<std::pair<const char*, Value>>>> 
       {"221:4", msp},
       {"11", announcing(0, {{"FailData", 3}})},
       {"15", Dictionary{{"FailSize", 7}}},
-      {"17:0", announcing(6000, {{"Data", platform::Data(100, 17)}})},
-      {"17:2", announcing(100, {{"Data", platform::Data(5000, 17)}, {"FailData", 4}})}};
+      {"17:0", announcing(6000, {{"Data", plist::Data(100, 17)}})},
+      {"17:2", announcing(100, {{"Data", plist::Data(5000, 17)}, {"FailData", 4}})}};
   const Dictionary unwilling{{"RefuseOpen", true}};
   return {
       {"whole",
@@ -274,7 +274,7 @@ std::vector<std::pair<const char*, std::vector<std::pair<const char*, Value>>>> 
       {"the second one",
        {{"device/registry.plist",
          registry({controller("ZMCStorage", {{"Buffers", Dictionary{{"13", statistics}}},
-                                             {"RecommendsDeletion", platform::Data{1, 0, 0}}}),
+                                             {"RecommendsDeletion", plist::Data{1, 0, 0}}}),
                    controller("NorbaEmbeddedNVMeController", unwilling)})}}},
       {"silent",
        {{"device/registry.plist",

@@ -70,10 +70,8 @@ void waitForService(BusClient& client) {
 }
 
 Dictionary application(const char* bundle) {
-  return {{"bundle_id", bundle},
-          {"version", "2.1"},
-          {"orlo_id", 9},
-          {"uuid", platform::Data(16, 0xab)}};
+  return {
+      {"bundle_id", bundle}, {"version", "2.1"}, {"orlo_id", 9}, {"uuid", plist::Data(16, 0xab)}};
 }
 
 TEST(Service, TakesADeliveryIntoTheReportWhileATimerRunsToo) {

@@ -10,7 +10,7 @@
 namespace report {
 namespace {
 
-using platform::Number;
+using plist::Number;
 constexpr auto kMax = std::numeric_limits<std::int64_t>::max();
 constexpr auto kMin = std::numeric_limits<std::int64_t>::min();
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
@@ -132,7 +132,7 @@ TEST(Distribution, SummarisesInOnePass) {
   }
 }
 
-std::vector<double> doubles(const platform::Array& statistics) {
+std::vector<double> doubles(const plist::Array& statistics) {
   std::vector<double> values;
   for (const auto& value : statistics) values.push_back(value.as<Number>()->doubleValue());
   return values;
@@ -210,12 +210,12 @@ TEST(Histogram, LabelsBucketsWithTheirBounds) {
   const std::uint64_t counts[] = {1, 2, 3, 4, 5, ~std::uint64_t{0}};
   const auto histogram = histogramDictForIntervals(intervals, counts);
   ASSERT_TRUE(histogram);
-  const platform::Dictionary expected{{"(-inf, 10]", 1},
-                                      {"(10, 100]", 2},
-                                      {"(100, 0.3]", 3},
-                                      {"(0.3, 1e+21]", 4},
-                                      {"(1e+21, 9223372036854775808]", 5},
-                                      {"(9223372036854775808, inf)", ~std::uint64_t{0}}};
+  const plist::Dictionary expected{{"(-inf, 10]", 1},
+                                   {"(10, 100]", 2},
+                                   {"(100, 0.3]", 3},
+                                   {"(0.3, 1e+21]", 4},
+                                   {"(1e+21, 9223372036854775808]", 5},
+                                   {"(9223372036854775808, inf)", ~std::uint64_t{0}}};
   EXPECT_EQ(description(*histogram), description(expected)) << "the order counts";
   for (const auto& [label, count] : *histogram) {
     EXPECT_EQ(count.as<Number>()->type(), Number::Type::uint64) << label;

@@ -10,9 +10,9 @@
 namespace report {
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 Dictionary bucket(std::int64_t interval) { return {{"bucket_interval", interval}}; }
 

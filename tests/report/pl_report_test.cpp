@@ -4,6 +4,7 @@
 
 #include <new>
 
+#include "plist/PropertyList.h"
 #include "report/KernelCounters.h"
 #include "support/TestPlatform.h"
 
@@ -21,9 +22,9 @@ void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
 namespace report {
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 constexpr char kDomain[] = "com.norba.pellorand.morvend";
 constexpr std::int32_t kDay = 20000;
 
@@ -88,8 +89,8 @@ TEST_F(PLReportTest, WritesTheWholeLog) {
   EXPECT_EQ(log.options, (Dictionary{{"previous_os_version", "<unknown>"}}));
   const Dictionary expected{
       {"PLCrashLogVersion", 1},
-      {"PLStartDate", platform::Date{20000 * 86400.0}},
-      {"PLLogCreationDate", platform::Date{20001 * 86400.0 + 4 * 3600}},
+      {"PLStartDate", plist::Date{20000 * 86400.0}},
+      {"PLLogCreationDate", plist::Date{20001 * 86400.0 + 4 * 3600}},
       {"PLMetadata", Dictionary{{"PLUserInterfaceLanguage", "de"},
                                 {"PLPreferredUserInterfaceLanguage", "de-AT"},
                                 {"PLUserSetRegionFormat", "AT"}}},
@@ -104,7 +105,7 @@ TEST_F(PLReportTest, WritesTheWholeLog) {
       {"PLTaskDigest", "(no tasking digest)"},
       {"PLWhitelistDigest", digestOfWhitelist()},
       {"PLActivatedAppInfo", Array{Dictionary{{"bundle", "com.x"}}}}};
-  EXPECT_EQ(log.contents, *platform::host::HostPropertyListCodec().writeXML(expected));
+  EXPECT_EQ(log.contents, *plist::writeXML(expected));
 }
 
 // Nothing is let through: no log, no collector, no record, but a line that says why.

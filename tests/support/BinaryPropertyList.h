@@ -9,7 +9,7 @@
 #include <string_view>
 #include <vector>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace support {
 
@@ -17,7 +17,7 @@ class BinaryPropertyList {
  public:
   explicit BinaryPropertyList(std::size_t referenceSize = 2) : referenceSize_(referenceSize) {}
 
-  static std::string of(const platform::Value& value) {
+  static std::string of(const plist::Value& value) {
     BinaryPropertyList list(3);
     const std::size_t top = list.add(value);
     return list.finish(top);
@@ -48,27 +48,27 @@ class BinaryPropertyList {
     return counted(marker, references.size() / (marker == 0xD ? 2 : 1), content);
   }
 
-  std::size_t add(const platform::Value& value) {
-    if (const auto* number = value.as<platform::Number>()) {
+  std::size_t add(const plist::Value& value) {
+    if (const auto* number = value.as<plist::Number>()) {
       return number->isReal()
                  ? object("\x23" +
                           bigEndian(std::bit_cast<std::uint64_t>(number->doubleValue()), 8))
                  : object("\x13" + bigEndian(number->uint64Value(), 8));
     }
     if (const auto* text = value.as<std::string>()) return counted(0x7, text->size(), *text);
-    if (const auto* data = value.as<platform::Data>()) {
+    if (const auto* data = value.as<plist::Data>()) {
       return counted(0x4, data->size(), std::string(data->begin(), data->end()));
     }
-    if (const auto* date = value.as<platform::Date>()) {
+    if (const auto* date = value.as<plist::Date>()) {
       const double since2001 = date->secondsSince1970 - 978307200;
       return object("\x33" + bigEndian(std::bit_cast<std::uint64_t>(since2001), 8));
     }
     std::vector<std::size_t> references, values;
-    if (const auto* array = value.as<platform::Array>()) {
-      for (const platform::Value& element : *array) references.push_back(add(element));
+    if (const auto* array = value.as<plist::Array>()) {
+      for (const plist::Value& element : *array) references.push_back(add(element));
       return container(0xA, references);
     }
-    for (const auto& [key, content] : *value.as<platform::Dictionary>()) {
+    for (const auto& [key, content] : *value.as<plist::Dictionary>()) {
       references.push_back(counted(0x7, key.size(), key));
       values.push_back(add(content));
     }

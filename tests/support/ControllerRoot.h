@@ -5,13 +5,13 @@
 #include <string_view>
 
 #include "NANDInfo/KeyTables.h"
-#include "platform/host/HostPropertyListCodec.h"
+#include "plist/PropertyList.h"
 #include "support/ControllerBuffers.h"
 #include "support/TemporaryFolder.h"
 
 namespace support {
 
-inline platform::Data data(const Bytes& bytes) {
+inline plist::Data data(const Bytes& bytes) {
   const auto* begin = reinterpret_cast<const std::uint8_t*>(bytes.data());
   return {begin, begin + bytes.size()};
 }
@@ -37,8 +37,8 @@ inline Bytes everyMSPCounter(std::uint64_t first) {
 }
 
 inline void writeController(const TemporaryFolder& root) {
-  using platform::Array;
-  using platform::Dictionary;
+  using plist::Array;
+  using plist::Dictionary;
   const auto text = [](const Bytes& bytes) {
     return std::string_view(reinterpret_cast<const char*>(bytes.data()), bytes.size());
   };
@@ -48,8 +48,8 @@ inline void writeController(const TemporaryFolder& root) {
                            {"221:0", data(everyMSPCounter(0))},
                            {"221:1", data(everyMSPCounter(1000000))},
                            {"221:2", data(everyMSPCounter(2000000))},
-                           {"15", platform::Data()},
-                           {"17:1", platform::Data(5000, 17)}};
+                           {"15", plist::Data()},
+                           {"17:1", plist::Data(5000, 17)}};
   const Dictionary controller{
       {"Class", "NorbaQRT3NVMeController"},
       {"Properties", Dictionary{{"Controller Characteristics", Dictionary{{"chip-id", "A1"}}}}},
@@ -61,10 +61,9 @@ inline void writeController(const TemporaryFolder& root) {
   const Dictionary disk{{"TotalDiskCapacity", std::int64_t{128} << 30},
                         {"TotalDataAvailable", std::int64_t{32} << 30},
                         {"AmountDataAvailable", std::int64_t{16} << 30}};
-  platform::host::HostPropertyListCodec codec;
   root.write("device/registry.plist",
-             *codec.writeXML(Dictionary{{"Children", Array{controller, images}}}));
-  root.write("device/properties.plist", *codec.writeXML(Dictionary{{"DiskUsage", disk}}));
+             *plist::writeXML(Dictionary{{"Children", Array{controller, images}}}));
+  root.write("device/properties.plist", *plist::writeXML(Dictionary{{"DiskUsage", disk}}));
 }
 
 }  // namespace support

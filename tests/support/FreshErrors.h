@@ -3,7 +3,7 @@
 
 #include <optional>
 
-#include "NANDInfo/ProcessState.h"
+#include "NANDInfo/decode/ProcessState.h"
 
 namespace support {
 

@@ -14,7 +14,7 @@
 #include <stdexcept>
 #include <string>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 #include "support/TemporaryFolder.h"
 
 namespace support {
@@ -104,7 +104,7 @@ class BusClient {
 
   // Sends a message to the service: integers as x, texts as s, data as ay, arrays, which hold
   // dictionaries, as aa{sv}.
-  void send(const platform::Dictionary& message) {
+  void send(const plist::Dictionary& message) {
     sendCall([&](sd_bus_message* call) { append(call, message); });
   }
 
@@ -156,7 +156,7 @@ class BusClient {
     return process;
   }
 
-  static void append(sd_bus_message* call, const platform::Dictionary& dictionary) {
+  static void append(sd_bus_message* call, const plist::Dictionary& dictionary) {
     check(sd_bus_message_open_container(call, 'a', "{sv}"));
     for (const auto& entry : dictionary) {
       check(sd_bus_message_open_container(call, 'e', "sv"));
@@ -173,20 +173,20 @@ class BusClient {
     return result;
   }
 
-  static void append(sd_bus_message* call, const platform::Value& value) {
+  static void append(sd_bus_message* call, const plist::Value& value) {
     if (const auto* text = value.as<std::string>()) {
       check(sd_bus_message_append(call, "v", "s", text->c_str()));
-    } else if (const auto* number = value.as<platform::Number>()) {
+    } else if (const auto* number = value.as<plist::Number>()) {
       check(sd_bus_message_append(call, "v", "x", number->int64Value()));
-    } else if (const auto* data = value.as<platform::Data>()) {
+    } else if (const auto* data = value.as<plist::Data>()) {
       check(sd_bus_message_open_container(call, 'v', "ay"));
       check(sd_bus_message_append_array(call, 'y', data->data(), data->size()));
       check(sd_bus_message_close_container(call));
     } else {
       check(sd_bus_message_open_container(call, 'v', "aa{sv}"));
       check(sd_bus_message_open_container(call, 'a', "a{sv}"));
-      for (const auto& element : *value.as<platform::Array>()) {
-        append(call, *element.as<platform::Dictionary>());
+      for (const auto& element : *value.as<plist::Array>()) {
+        append(call, *element.as<plist::Dictionary>());
       }
       check(sd_bus_message_close_container(call));
       check(sd_bus_message_close_container(call));

@@ -1,6 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "platform/host/Host.h"
+#include "host/Host.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 #include "tools/demo/Rules.h"
@@ -9,7 +9,7 @@
 
 namespace {
 
-using platform::Dictionary;
+using plist::Dictionary;
 
 TEST(DemoRules, TellsOwnEntriesFromPrefixesAndTheLongestOfThem) {
   support::TestPlatform device;
@@ -56,7 +56,7 @@ TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
              "{\"event\": \"com.norba.a\", \"payload\": {\"b\": 1}}\n"
              "{\"event\": \"com.norba.a\", \"payload\": {\"b\": 1, \"c\": 2}}\n"
              "{\"event\": \"com.norba.massStorage.NANDInfo.SM.Daily.FTLCounters_1\"}\n");
-  platform::host::Host host({.root = root.path()});
+  host::Host host({.root = root.path()});
   for (const char* key : {"com.norba.NANDInfo.BandsPerInternalFlow3", "datausage.wifiInKB.a",
                           "com.norba.tarvenn.numAllInstalledApps", "host.loadavg.1m"}) {
     host.counters().set(key, 1, host.platform().counters.PLDaysSince1970());

@@ -7,10 +7,10 @@
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
 #include "NANDInfo/StructuredLogs.h"
-#include "NANDInfo/TelemetryList.h"
-#include "platform/Text.h"
-#include "platform/host/Host.h"
-#include "platform/host/JSON.h"
+#include "NANDInfo/decode/TelemetryList.h"
+#include "base/Text.h"
+#include "host/Host.h"
+#include "plist/JSON.h"
 #include "support/ControllerBuffers.h"
 #include "support/FreshErrors.h"
 #include "support/TemporaryFolder.h"
@@ -76,7 +76,7 @@ TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
       EXPECT_TRUE(change.seconds >= 0 && change.seconds < 86400) << change.key;
     }
 
-    platform::host::Host host({.root = folder / "a"});
+    host::Host host({.root = folder / "a"});
     std::vector<std::int32_t> recorded;
     host.counters().history()->scalarsForKeyPrefix(
         scalarTable().front().key, INT32_MIN, INT32_MAX,
@@ -164,14 +164,14 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
     const auto start = device.readLog(logs[i])->content.date("PLStartDate")->secondsSince1970;
     EXPECT_EQ(start, (kToday - 4.0 + static_cast<double>(i)) * 86400);
   }
-  platform::host::Host host({.root = folder / "a"});
+  host::Host host({.root = folder / "a"});
   EXPECT_EQ(host.platform().preferences.QNSPreferencesGetIntegerValue(
                 "LastCrashLogSerializationDateInDaysSince1970", "com.norba.pellorand.morvend"),
             kToday - 2);
 
   const auto received = [](std::int32_t day) {
     const auto usage = networkUsage({.today = day});
-    const auto* process = usage.array("Records")->front().as<platform::Dictionary>();
+    const auto* process = usage.array("Records")->front().as<plist::Dictionary>();
     return process->number("wifiInBytes")->int64Value();
   };
   std::map<std::int32_t, std::int64_t> expected, recorded;
@@ -258,7 +258,7 @@ TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
     support::TemporaryFolder folder;
     ASSERT_EQ(Maker().make(folder.path(), {.today = kToday, .chip = chipNamed(row.name)}), "");
     {
-      platform::host::Host host({.root = folder.path()});
+      host::Host host({.root = folder.path()});
       EXPECT_TRUE(NANDInfo::DumpStorageStructuredLog(host.platform(), false));
     }
     std::string logs;
@@ -266,12 +266,12 @@ TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
       logs += folder.read(file.path().lexically_relative(folder.path()).string());
     }
     for (int list = 0; list < 3; ++list) {
-      const auto bytes = folder.read(platform::format("device/controller/telemetry-%d.bin", list));
+      const auto bytes = folder.read(base::format("device/controller/telemetry-%d.bin", list));
       const auto channels =
           NANDInfo::parseTelemetryList(std::as_bytes(std::span(bytes)), kChannels);
       for (const auto& channel : channels.value()) {
         std::string log;
-        platform::host::appendJSON(log, NANDInfo::telemetryLog(channel, row.kind, row.convert));
+        plist::appendJSON(log, NANDInfo::telemetryLog(channel, row.kind, row.convert));
         EXPECT_NE(logs.find(log), logs.npos) << list;
       }
     }

@@ -7,6 +7,7 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "plist/PropertyList.h"
 #include "support/CommandLine.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
@@ -19,9 +20,9 @@
 
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 using support::argumentsOf;
 using support::header;
 using Words = std::vector<std::string>;
@@ -208,11 +209,10 @@ TEST_F(Nandinfo, DecodesListsAndSnapshots) {
 // What a capture says of itself is as foreign as its buffers.
 TEST_F(Nandinfo, DecodesAWholeCapture) {
   const auto capture = [this](const Dictionary& buffers) {
-    platform::host::HostPropertyListCodec codec;
     const Dictionary chip{{"chip-id", "QM8"}, {"manufacturer-id", "00"}, {"num-bus", 1}};
     folder.write(
         "c/registry.plist",
-        *codec.writeXML(Dictionary{
+        *plist::writeXML(Dictionary{
             {"Children",
              Array{5, Dictionary{{"Class", support::kQRT3},
                                  {"Properties", Dictionary{{"Controller Characteristics", chip}}},
@@ -226,7 +226,7 @@ TEST_F(Nandinfo, DecodesAWholeCapture) {
   const Dictionary good{{"13", "ftl"},
                         {"221:1", support::data(support::everyMSPCounter(1))},
                         {"17:0", support::data(support::telemetryList(1))},
-                        {"11:0", Dictionary{{"Data", platform::Data()}, {"Announce", 5}}},
+                        {"11:0", Dictionary{{"Data", plist::Data()}, {"Announce", 5}}},
                         {"15:0", refused.front()},
                         {"39\x1b:0", "ftl"},
                         {"22:0", "ftl"}};
@@ -432,7 +432,7 @@ TEST(NandinfoTable, ShowsEveryShape) {
        "msg  tab?here ? \xEF\xBF\xBD\ne    []\n\n"
        "              0           1\na         1,000          22\nname?[2J  x\n"
        "b                -1,234,567\n"},
-      {Dictionary{{"n", 1000}, {"error", "longer"}, {"m", 1}, {"d", platform::Date{0}}}, 80,
+      {Dictionary{{"n", 1000}, {"error", "longer"}, {"m", 1}, {"d", plist::Date{0}}}, 80,
        "n      1,000\nerror  longer\nm          1\nd      1970-01-01T00:00:00Z\n"},
       {Dictionary{{"0", one}, {"1", one}, {"2", other}}, 23,
        "              0      1\na         1,000  1,000\nname?[2J  x      x\n\n"
@@ -494,7 +494,7 @@ TEST_F(Nandinfo, CapturesWhatIsAnsweredAndListsWhatIsNot) {
   EXPECT_EQ(folder.read("c/statistics-0.bin"), std::string("\1\0\0\0\0\0\0\0", 8));
   const Dictionary driver{
       {"Buffers", Dictionary{{"13:0", "statistics-0.bin"}, {"10:720", "read-statistics-720.bin"}}},
-      {"RecommendsDeletion", platform::Data(4, 1)}};
+      {"RecommendsDeletion", plist::Data(4, 1)}};
   EXPECT_EQ(
       device.parse(folder.read("c/registry.plist")),
       (Dictionary{{"Class", "Root"},

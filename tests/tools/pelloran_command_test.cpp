@@ -2,7 +2,7 @@
 
 #include <sstream>
 
-#include "platform/host/counter_store_support.h"
+#include "host/counter_store_support.h"
 #include "support/CommandLine.h"
 #include "tools/pelloran/Pelloran.h"
 

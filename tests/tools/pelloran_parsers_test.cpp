@@ -1,12 +1,12 @@
 #include <gtest/gtest.h>
 
-#include "platform/Text.h"
+#include "base/Text.h"
 #include "tools/pelloran/ImportLine.h"
 #include "tools/pelloran/MachineFigures.h"
 
 namespace {
 
-using Kind = platform::host::CounterChange::Kind;
+using Kind = host::CounterChange::Kind;
 
 constexpr pelloran::Moment kNow{20000, 3600};
 
@@ -71,7 +71,7 @@ std::string text(const pelloran::MachineFigures& figures) {
   std::string lines;
   for (const auto& [key, count] : figures.counts) lines += key + " " + std::to_string(count) + "\n";
   for (const auto& [key, value] : figures.measurements) {
-    lines += key + " ~" + platform::doubleText(value) + "\n";
+    lines += key + " ~" + base::doubleText(value) + "\n";
   }
   return lines;
 }
@@ -106,7 +106,7 @@ TEST(PelloranMachineFigures, OnlyWholeDisksAreCounted) {
   const auto disksOf = [](std::initializer_list<const char*> names) {
     std::string lines = "   8 0 cut 1 2 3\n";
     for (const char* name : names) {
-      lines += platform::format("   8       0 %s 1 2 3 4 5 6 7 8 0 9 10 11\n", name);
+      lines += base::format("   8       0 %s 1 2 3 4 5 6 7 8 0 9 10 11\n", name);
     }
     pelloran::MachineFigures figures;
     pelloran::parseDiskstats(lines, figures);

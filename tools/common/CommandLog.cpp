@@ -5,13 +5,13 @@
 #include <cstdlib>
 #include <utility>
 
-#include "platform/host/Files.h"
+#include "host/files/Files.h"
 #include "tools/common/TerminalText.h"
 
 namespace tools {
 
+using host::StandardErrorLog;
 using platform::LogLevel;
-using platform::host::StandardErrorLog;
 
 namespace {
 
@@ -37,8 +37,8 @@ CommandLog::~CommandLog() {
   for (const std::string& line : take()) say(line);
 }
 
-platform::host::HostOptions CommandLog::hostOptions() {
-  auto options = platform::host::HostOptions::fromEnvironment();
+host::HostOptions CommandLog::hostOptions() {
+  auto options = host::HostOptions::fromEnvironment();
   options.log = this;
   return options;
 }
@@ -67,7 +67,7 @@ void CommandLog::write(LogLevel level, std::string_view message) {
 }
 
 void CommandLog::say(const std::string& line) {
-  platform::host::writeAll(STDERR_FILENO, command_ + ": " + printable(line) + '\n');
+  host::writeAll(STDERR_FILENO, command_ + ": " + printable(line) + '\n');
 }
 
 }  // namespace tools

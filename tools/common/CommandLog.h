@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
+#include "host/Host.h"
+#include "host/process/StandardErrorLog.h"
 #include "platform/SystemLog.h"
-#include "platform/host/Host.h"
-#include "platform/host/StandardErrorLog.h"
 
 namespace tools {
 
@@ -23,7 +23,7 @@ class CommandLog final : public platform::SystemLog {
   ~CommandLog() override;
 
   // The host of the environment, with this log.
-  platform::host::HostOptions hostOptions();
+  host::HostOptions hostOptions();
 
   // Whether the environment has asked for the system log itself.
   bool isSystemLog() const { return systemLog_.has_value(); }
@@ -38,7 +38,7 @@ class CommandLog final : public platform::SystemLog {
   void say(const std::string& line);
 
   const std::string command_;
-  std::optional<platform::host::StandardErrorLog> systemLog_;
+  std::optional<host::StandardErrorLog> systemLog_;
   std::mutex mutex_;
   bool keeps_ = false;
   std::vector<std::string> kept_;

@@ -6,7 +6,7 @@
 #include <csignal>
 #include <string_view>
 
-#include "platform/host/Files.h"
+#include "host/files/Files.h"
 
 namespace tools {
 
@@ -18,7 +18,7 @@ int StandardOutput::Buffer::sync() {
   const std::string_view text(pbase(), static_cast<std::size_t>(pptr() - pbase()));
   setp(bytes_.data(), bytes_.data() + bytes_.size());
   if (readerIsGone_) return 0;
-  const int error = platform::host::writeAll(STDOUT_FILENO, text);
+  const int error = host::writeAll(STDOUT_FILENO, text);
   readerIsGone_ = error == EPIPE;
   return error == 0 || readerIsGone_ ? 0 : -1;
 }

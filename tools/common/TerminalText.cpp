@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <iterator>
 
-#include "platform/Text.h"
-#include "platform/host/UTF8.h"
+#include "base/Text.h"
+#include "base/UTF8.h"
 
 namespace tools {
 
@@ -45,7 +45,7 @@ struct Character {
   std::size_t length;
 };
 Character firstOf(std::string_view text) {
-  const std::size_t length = platform::host::characterLength(text);
+  const std::size_t length = base::characterLength(text);
   if (length == 0) return {0xFFFD, 1};
   const auto byte = [text](std::size_t at) { return static_cast<unsigned char>(text[at]); };
   if (length == 1) return {byte(0), 1};
@@ -69,7 +69,7 @@ std::string printable(std::string_view text) {
     if (code < 0x20 || code == 0x7F || isIn(kControls, code)) {
       shown += '?';
     } else if (code == 0xFFFD) {
-      shown += platform::host::kReplacementCharacter;
+      shown += base::kReplacementCharacter;
     } else {
       shown += text.substr(0, length);
     }
@@ -107,7 +107,7 @@ std::string printableJSON(std::string json) {
   for (std::size_t i = 0; (i = json.find_first_of("\x7f\xC2", i)) != std::string::npos; ++i) {
     const bool ascii = json[i] == '\x7f';
     const auto code = static_cast<unsigned char>(json[ascii ? i : i + 1]);
-    if (ascii || code < 0xA0) json.replace(i, ascii ? 1 : 2, platform::format("\\u%04x", code));
+    if (ascii || code < 0xA0) json.replace(i, ascii ? 1 : 2, base::format("\\u%04x", code));
   }
   return json;
 }

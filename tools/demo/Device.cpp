@@ -5,13 +5,14 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/host/Files.h"
+#include "host/files/Files.h"
+#include "plist/PropertyList.h"
 
 namespace demo {
 
-using platform::Dictionary;
-using platform::Result;
-using platform::host::FileDescriptor;
+using base::Result;
+using host::FileDescriptor;
+using plist::Dictionary;
 
 namespace {
 
@@ -20,7 +21,7 @@ constexpr std::size_t kLargestFile = std::size_t{64} << 20;
 Result<std::string> readHostFile(const std::string& path) {
   const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
   if (!file) return Result<std::string>::failure(std::strerror(errno));
-  return platform::host::readRegularFile(file.get(), kLargestFile);
+  return host::readRegularFile(file.get(), kLargestFile);
 }
 
 }  // namespace
@@ -45,14 +46,13 @@ Result<SubmittedLog> Device::readLog(const std::string& path) {
   };
   const auto bytes = readHostFile(path);
   if (!bytes) return failure(bytes.error);
-  platform::PropertyListCodec& codec = host_.platform().propertyLists;
-  auto parsed = codec.read(*bytes);
+  auto parsed = plist::read(*bytes);
   if (!parsed) return failure(parsed.error);
   auto* content = parsed->as<Dictionary>();
   if (content == nullptr) return failure("not a dictionary");
   SubmittedLog log{path, bytes->size(), std::move(*content), std::nullopt};
   if (const auto beside = readHostFile(path + kOptions)) {
-    const auto options = codec.read(*beside);
+    const auto options = plist::read(*beside);
     const auto* dictionary = options ? options->as<Dictionary>() : nullptr;
     const std::string* version =
         dictionary != nullptr ? dictionary->text("previous_os_version") : nullptr;
@@ -77,9 +77,8 @@ Recorded Device::recorded(std::int32_t firstDay, std::int32_t lastDay) {
 
 std::vector<std::string> Device::namesIn(const std::string& folder) {
   std::vector<std::string> names;
-  const FileDescriptor opened =
-      host_.root().openFolder(folder, platform::host::DeviceRoot::Missing::fails);
-  if (opened) platform::host::namesInFolder(opened.get(), names);
+  const FileDescriptor opened = host_.root().openFolder(folder, host::DeviceRoot::Missing::fails);
+  if (opened) host::namesInFolder(opened.get(), names);
   return names;
 }
 
@@ -90,7 +89,7 @@ std::optional<std::string> Device::bytes(const std::string& path) {
 std::optional<Dictionary> Device::propertyList(const std::string& path) {
   const auto content = bytes(path);
   if (!content) return std::nullopt;
-  auto parsed = host_.platform().propertyLists.read(*content);
+  auto parsed = plist::read(*content);
   auto* dictionary = parsed ? parsed->as<Dictionary>() : nullptr;
   return dictionary != nullptr ? std::optional(std::move(*dictionary)) : std::nullopt;
 }

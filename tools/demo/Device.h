@@ -9,8 +9,8 @@
 #include <string>
 #include <vector>
 
-#include "platform/Result.h"
-#include "platform/host/Host.h"
+#include "base/Result.h"
+#include "host/Host.h"
 #include "report/PLConfig.h"
 
 namespace demo {
@@ -19,7 +19,7 @@ namespace demo {
 struct SubmittedLog {
   std::string path;  // of the host
   std::size_t size;
-  platform::Dictionary content;
+  plist::Dictionary content;
   std::optional<std::string> previousVersion;  // from the options that were submitted with it
 };
 
@@ -39,7 +39,7 @@ class Device {
   // The submitted reports, the oldest first: paths of the host.
   std::vector<std::string> logs();
 
-  platform::Result<SubmittedLog> readLog(const std::string& path);
+  base::Result<SubmittedLog> readLog(const std::string& path);
   Recorded recorded(std::int32_t firstDay, std::int32_t lastDay);
 
   // Null, with a line on standard error, when it can't be read.
@@ -50,7 +50,7 @@ class Device {
 
   // A file of the device: its bytes, or the property list that it is. None if there is none.
   std::optional<std::string> bytes(const std::string& path);
-  std::optional<platform::Dictionary> propertyList(const std::string& path);
+  std::optional<plist::Dictionary> propertyList(const std::string& path);
 
   platform::Platform& platform() { return host_.platform(); }
 
@@ -59,7 +59,7 @@ class Device {
 
  private:
   std::string root_;
-  platform::host::Host host_;
+  host::Host host_;
   std::unique_ptr<report::PLConfig> whitelist_;
 };
 

@@ -1,6 +1,6 @@
 #include "tools/demo/Rules.h"
 
-#include "platform/Text.h"
+#include "base/Text.h"
 
 namespace demo {
 

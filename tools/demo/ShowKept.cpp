@@ -1,13 +1,13 @@
-#include "platform/Text.h"
+#include "base/Text.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
 
 namespace demo {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::format;
-using platform::Value;
+using base::format;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 using Align = Table::Align;
 
 namespace {
@@ -36,7 +36,7 @@ std::string settingsOf(Device& device, const Array& payload) {
     const auto preferences = device.propertyList(preferencesPath(*user, *domain));
     table.addRow(
         {"  " + *user + "/" + *domain + ".plist",
-         *key + " = " + platform::description(preferences ? preferences->find(*key) : nullptr)});
+         *key + " = " + plist::description(preferences ? preferences->find(*key) : nullptr)});
   }
   return "  " + device.pathOf("var/preferences") + "\n" + table.text();
 }
@@ -44,7 +44,7 @@ std::string settingsOf(Device& device, const Array& payload) {
 std::string inShort(const Value& value) {
   if (const auto* array = value.as<Array>()) return format("%zu settings", array->size());
   const auto* dictionary = value.as<Dictionary>();
-  if (dictionary == nullptr) return platform::description(value);
+  if (dictionary == nullptr) return plist::description(value);
   std::string text;
   for (const auto& [key, content] : *dictionary) {
     text += (text.empty() ? "" : ", ") + key + " " + inShort(content);

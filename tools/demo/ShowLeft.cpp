@@ -4,8 +4,8 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "base/Text.h"
 #include "platform/Platform.h"
-#include "platform/Text.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
@@ -13,8 +13,8 @@
 
 namespace demo {
 
-using platform::Dictionary;
-using platform::format;
+using base::format;
+using plist::Dictionary;
 using Align = Table::Align;
 
 namespace {
@@ -238,7 +238,7 @@ class LeftText {
     Tally kept;
     for (const auto& [key, value] : result) {
       const auto* entry = digits.find(key);
-      if (entry != nullptr && value.as<platform::Number>() != nullptr) kept.add(entry->number);
+      if (entry != nullptr && value.as<plist::Number>() != nullptr) kept.add(entry->number);
     }
     return "storage whitelist, " + kept.range() + " significant digits";
   }

@@ -2,19 +2,19 @@
 #include <array>
 #include <cmath>
 
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
 
 namespace demo {
 
-using platform::Array;
-using platform::Date;
-using platform::Dictionary;
-using platform::format;
-using platform::Value;
+using base::format;
+using plist::Array;
+using plist::Date;
+using plist::Dictionary;
+using plist::Value;
 using Align = Table::Align;
 
 namespace {
@@ -31,13 +31,13 @@ std::string keyText(const std::string& key, const std::optional<Rule>& rule) {
 
 std::string moment(const Date* date) {
   if (date == nullptr) return "?";
-  const auto time = platform::civilFromSeconds(date->secondsSince1970);
+  const auto time = base::civilFromSeconds(date->secondsSince1970);
   return format("%04d-%02d-%02d %02d:%02d:%02d UTC", static_cast<int>(time.date.year),
                 time.date.month, time.date.day, time.hour, time.minute, time.second);
 }
 
 std::string dayText(std::int32_t day) {
-  const auto date = platform::civilFromDays(day);
+  const auto date = base::civilFromDays(day);
   return format("%04d-%02d-%02d", static_cast<int>(date.year), date.month, date.day);
 }
 
@@ -56,7 +56,7 @@ class LogText {
   LogText(Device& device, const SubmittedLog& log, const ShowOptions& options)
       : device_(device), log_(log), options_(options), rules_(device.whitelist()) {
     const Date* start = log.content.date("PLStartDate");
-    day_ = platform::dayNumber(start != nullptr ? start->secondsSince1970 : 0);
+    day_ = base::dayNumber(start != nullptr ? start->secondsSince1970 : 0);
   }
 
   std::string text() {
@@ -82,7 +82,7 @@ class LogText {
   bool isAskedFor(std::string_view key) const { return key.starts_with(options_.prefix); }
   std::size_t atMost(std::size_t rows) const { return options_.all ? kAll : rows; }
 
-  std::string plain(const char* key) const { return platform::description(log_.content.find(key)); }
+  std::string plain(const char* key) const { return plist::description(log_.content.find(key)); }
 
   std::string applications() const {
     const Array* delivered = log_.content.array("PLActivatedAppInfo");
@@ -107,7 +107,7 @@ class LogText {
   std::string languageText() const {
     const Dictionary& metadata = section("PLMetadata");
     const auto text = [&metadata](const char* key) {
-      return platform::description(metadata.find(key));
+      return plist::description(metadata.find(key));
     };
     return text("PLUserInterfaceLanguage") + ", preferred " +
            text("PLPreferredUserInterfaceLanguage") + ", region " + text("PLUserSetRegionFormat");
@@ -162,7 +162,7 @@ class LogText {
       const auto recorded = recorded_.scalars.find(key);
       scalars.push_back(
           {key, recorded != recorded_.scalars.end() ? std::to_string(recorded->second) : "-",
-           platform::description(value), rules_.ofScalar(key)});
+           plist::description(value), rules_.ofScalar(key)});
     }
     std::vector<const Scalar*> own, byPrefix, collected;
     for (const Scalar& scalar : scalars) {
@@ -223,7 +223,7 @@ class LogText {
       std::array<double, 5> statistics{};
       const Array& values = *rows[i]->value.as<Array>();
       for (std::size_t j = 0; j < values.size(); ++j) {
-        const auto* number = values[j].as<platform::Number>();
+        const auto* number = values[j].as<plist::Number>();
         statistics[j] = number != nullptr ? number->doubleValue() : 0;
       }
       const auto [minimum, maximum, mean, squares, count] = statistics;
@@ -243,7 +243,7 @@ class LogText {
   static std::vector<std::uint64_t> countsOf(const Dictionary& histogram) {
     std::vector<std::uint64_t> counts;
     for (const auto& [label, count] : histogram) {
-      const auto* number = count.as<platform::Number>();
+      const auto* number = count.as<plist::Number>();
       counts.push_back(number != nullptr ? number->uint64Value() : 0);
     }
     return counts;

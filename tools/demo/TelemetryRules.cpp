@@ -3,8 +3,8 @@
 #include <set>
 
 #include "NANDInfo/Events.h"
-#include "NANDInfo/NameRows.h"
-#include "platform/Text.h"
+#include "NANDInfo/vocabulary/NameRows.h"
+#include "base/Text.h"
 
 namespace demo {
 
@@ -51,8 +51,8 @@ std::string eventRule(std::string_view event) {
   const NANDInfo::NameTable* fields = NANDInfo::EventraConfigDetails(event);
   if (fields == nullptr) return kFixed;
   const bool magazine = event.starts_with("com.norba.massStorage.NANDInfo.SM.");
-  return platform::format("%s whitelist, list of %zu", magazine ? "magazine" : "storage",
-                          fields->size());
+  return base::format("%s whitelist, list of %zu", magazine ? "magazine" : "storage",
+                      fields->size());
 }
 
 }  // namespace demo

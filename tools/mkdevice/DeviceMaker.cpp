@@ -10,20 +10,21 @@
 #include <memory>
 #include <optional>
 
+#include "base/CivilDate.h"
+#include "base/Text.h"
 #include "daemon/DailyRun.h"
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
-#include "platform/host/Files.h"
-#include "platform/host/Host.h"
-#include "platform/host/RandomUUID.h"
+#include "host/Host.h"
+#include "host/files/Files.h"
+#include "host/outbox/RandomUUID.h"
+#include "plist/PropertyList.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Wear.h"
 
 namespace mkdevice {
 
 namespace fs = std::filesystem;
-using platform::host::FileDescriptor;
-using platform::host::Host;
+using host::FileDescriptor;
+using host::Host;
 
 namespace {
 
@@ -51,11 +52,10 @@ std::string makeEmptyFolder(const fs::path& folder) {
 std::string writeFile(const Host& host, const std::string& path, std::string_view bytes) {
   const auto slash = path.rfind('/');
   const FileDescriptor folder =
-      host.root().openFolder(path.substr(0, slash), platform::host::DeviceRoot::Missing::create);
-  const int error =
-      folder ? platform::host::replaceFile(folder.get(), path.substr(slash + 1), bytes) : errno;
+      host.root().openFolder(path.substr(0, slash), host::DeviceRoot::Missing::create);
+  const int error = folder ? host::replaceFile(folder.get(), path.substr(slash + 1), bytes) : errno;
   if (error == 0) return {};
-  return located(fs::path(host.root().path()) / path, platform::host::errorText(error));
+  return located(fs::path(host.root().path()) / path, host::errorText(error));
 }
 
 std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
@@ -64,7 +64,7 @@ std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
     if (const auto* text = file.content.as<std::string>()) {
       error = writeFile(host, file.path, *text);
     } else {
-      const auto xml = host.platform().propertyLists.writeXML(file.content);
+      const auto xml = plist::writeXML(file.content);
       error = xml ? writeFile(host, file.path, *xml) : located(file.path, xml.error.c_str());
     }
     if (!error.empty()) return error;
@@ -79,7 +79,7 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
                      "; the device will lack its crash-reporting support library");
     return {};
   }
-  const auto bytes = platform::host::readRegularFile(file.get(), kLargestModule);
+  const auto bytes = host::readRegularFile(file.get(), kLargestModule);
   return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error.c_str());
 }
 
@@ -91,7 +91,7 @@ std::string makeRoot(const MakingOptions& options, const Sample& first,
   if (error.empty()) error = writeFiles(host, filesOfDay(first));
   if (error.empty()) error = copyModule(host, options.module, listener);
   for (int done = 0; error.empty() && done < kDaysOfCounters; ++done) {
-    listener.progress(platform::format("counters of day %d of %d", done + 1, kDaysOfCounters));
+    listener.progress(base::format("counters of day %d of %d", done + 1, kDaysOfCounters));
     error = host.counters().apply(counters.ofDay(first.today - kDaysOfCounters + done));
     host.counters().PLClientCheckpoint();
   }
@@ -99,7 +99,7 @@ std::string makeRoot(const MakingOptions& options, const Sample& first,
 }
 
 // The run of the day that begins with `sample.today`, by the timer some minutes past midnight.
-platform::host::PlayedRun dailyRun(const Sample& sample) {
+host::PlayedRun dailyRun(const Sample& sample) {
   constexpr std::uint64_t kTicksPerSecond = 1'000'000'000;
   Random random(sample.seed, "daily run", sample.today);
   const std::int64_t second = random.between(600, 2400);
@@ -107,10 +107,10 @@ platform::host::PlayedRun dailyRun(const Sample& sample) {
       Wear(sample, 0).hoursSinceBoot() * 3600 + static_cast<std::uint64_t>(second);
   std::array<std::uint32_t, 4> words;
   for (std::uint32_t& word : words) word = static_cast<std::uint32_t>(random.next());
-  return {.now = {static_cast<double>(sample.today * platform::kSecondsPerDay + second)},
+  return {.now = {static_cast<double>(sample.today * base::kSecondsPerDay + second)},
           .sinceBoot = sinceBoot * kTicksPerSecond,
           .process = {"morvend", static_cast<std::int32_t>(random.between(300, 30000))},
-          .incident = platform::host::UUIDFrom(words)};
+          .incident = host::UUIDFrom(words)};
 }
 
 // The day that begins with `sample.today`, and what is new when the next one begins.
@@ -137,7 +137,7 @@ std::string makeDevice(const MakingOptions& options, const Listener& listener) {
   std::string error = makeRoot(options, sample, counters, listener);
   for (; error.empty() && sample.today < options.sample.today; ++sample.today) {
     const int played = options.days - (options.sample.today - sample.today);
-    listener.progress(platform::format("playing day %d of %d", played + 1, options.days));
+    listener.progress(base::format("playing day %d of %d", played + 1, options.days));
     error = playDay(options, sample, counters);
   }
   return error;

@@ -6,8 +6,8 @@
 #include <string>
 #include <vector>
 
-#include "platform/PropertyList.h"
-#include "platform/host/CounterStore.h"
+#include "host/counters/CounterStore.h"
+#include "plist/Value.h"
 
 namespace mkdevice {
 
@@ -31,7 +31,7 @@ inline constexpr int kLargestScale = 100;
 std::string scaledKey(const char* key, int copy);
 
 // The whitelist: key groups, their sections, the entries' options.
-platform::Dictionary whitelist(int scale);
+plist::Dictionary whitelist(int scale);
 
 class SampleCounters {
  public:
@@ -39,7 +39,7 @@ class SampleCounters {
 
   // What was recorded on a day: every scalar, then the samples of every distribution in the order
   // of their seconds. The keys are borrowed from this object.
-  std::vector<platform::host::CounterChange> ofDay(std::int32_t day) const;
+  std::vector<host::CounterChange> ofDay(std::int32_t day) const;
 
  private:
   Sample sample_;
@@ -49,7 +49,7 @@ class SampleCounters {
 // A file of the device and what it holds.
 struct SampleFile {
   std::string path;
-  platform::Value content;  // a text stands for itself, anything else for a property list
+  plist::Value content;  // a text stands for itself, anything else for a property list
 };
 
 // What stays from day to day: the whitelist, most files below device/, the preferences; and logs of

@@ -2,15 +2,15 @@
 
 #include <algorithm>
 
+#include "base/Text.h"
 #include "platform/DeviceRegistry.h"
-#include "platform/Text.h"
 #include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/Random.h"
 
 namespace mkdevice {
 
-using platform::Array;
-using platform::Dictionary;
+using plist::Array;
+using plist::Dictionary;
 
 namespace {
 
@@ -43,7 +43,7 @@ const auto& rowOf(ControllerKind kind) { return kControllers[static_cast<std::si
 struct Buffers {
   void add(std::uint32_t opType, int argument, const std::string& name, std::string bytes) {
     const std::string file = "controller/" + name + ".bin";
-    named.set(platform::format("%u:%d", opType, argument), file);
+    named.set(base::format("%u:%d", opType, argument), file);
     files.push_back({"device/" + file, std::move(bytes)});
   }
 
@@ -55,16 +55,15 @@ Buffers buffersOf(const Sample& sample, const Wear& wear) {
   Buffers buffers;
   buffers.add(13, 0, "statistics", ftlStatistics(wear));
   for (const int hours : kHistoryHours) {
-    buffers.add(10, hours, platform::format("read-statistics-%d", hours),
+    buffers.add(10, hours, base::format("read-statistics-%d", hours),
                 ftlStatistics(Wear(sample, hours)));
   }
   for (std::uint32_t msp = 0; msp < kMSPs && rowOf(sample.controller).hasMSPs; ++msp) {
-    buffers.add(221, static_cast<int>(msp), platform::format("msp-%u", msp),
-                mspStatistics(wear, msp));
+    buffers.add(221, static_cast<int>(msp), base::format("msp-%u", msp), mspStatistics(wear, msp));
   }
   buffers.add(11, 0, "band-statistics", bandStatistics(wear));
   for (const std::uint32_t list : {0u, 1u, 2u}) {
-    buffers.add(17, static_cast<int>(list), platform::format("telemetry-%u", list),
+    buffers.add(17, static_cast<int>(list), base::format("telemetry-%u", list),
                 telemetryList(wear, list));
   }
   buffers.add(15, 0, "defects", defectsList(wear));

@@ -1,15 +1,15 @@
 #include <algorithm>
 #include <cmath>
 
-#include "platform/CivilDate.h"
-#include "platform/Convert.h"
+#include "base/CivilDate.h"
+#include "base/Convert.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
 #include "tools/mkdevice/Vocabulary.h"
 
 namespace mkdevice {
 
-using platform::host::CounterChange;
+using host::CounterChange;
 
 namespace {
 
@@ -57,7 +57,7 @@ std::int32_t secondInDay(Random& random) {
   constexpr std::int64_t kMorning = 6 * 3600 + 1800, kNight = 23 * 3600 + 1800;
   const bool awake = random.fraction() < 0.85;
   return static_cast<std::int32_t>(awake ? random.between(kMorning, kNight)
-                                         : random.between(0, platform::kSecondsPerDay - 1));
+                                         : random.between(0, base::kSecondsPerDay - 1));
 }
 
 double rounded(double value, double steps) { return std::round(value * steps) / steps; }
@@ -90,7 +90,7 @@ std::vector<CounterChange> SampleCounters::ofDay(std::int32_t day) const {
     changes.push_back({.kind = CounterChange::Kind::set,
                        .key = scalars_[i],
                        .day = day,
-                       .amount = platform::saturatingCast<std::int64_t>(std::round(value))});
+                       .amount = base::saturatingCast<std::int64_t>(std::round(value))});
   }
   std::vector<std::int32_t> seconds;
   for (std::size_t i = 0; i < distributions_.size(); ++i) {

@@ -1,6 +1,6 @@
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
-#include "platform/host/Timestamp.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
+#include "base/Timestamp.h"
 #include "tools/mkdevice/BufferWriter.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
@@ -10,9 +10,9 @@
 
 namespace mkdevice {
 
-using platform::Array;
-using platform::Data;
-using platform::Dictionary;
+using plist::Array;
+using plist::Data;
+using plist::Dictionary;
 
 namespace {
 
@@ -39,8 +39,8 @@ std::string bootSession(const Wear& wear) {
   const auto bits = [&random](int count) {
     return static_cast<unsigned>(random.next() >> (64 - count));
   };
-  return platform::format("%08X-%04X-4%03X-A%03X-%04X%08X", bits(32), bits(16), bits(12), bits(12),
-                          bits(16), bits(32));
+  return base::format("%08X-%04X-4%03X-A%03X-%04X%08X", bits(32), bits(16), bits(12), bits(12),
+                      bits(16), bits(32));
 }
 
 // Total, available and used bytes, the page size, and whether the swap is encrypted.
@@ -71,7 +71,7 @@ Dictionary kernelValues(const Sample& sample, const Wear& wear) {
   for (const char* size : {"1", "2", "4", "8", "16", "32", "64", "128", "256"}) {
     const std::int64_t found = random.between(0, 3);
     total += found;
-    values.set(platform::format("vm.vmtc_%s_byte", size), found);
+    values.set(base::format("vm.vmtc_%s_byte", size), found);
   }
   const std::int64_t bitFlips = random.between(0, 2), undiagnosed = random.between(1, 3);
   values.set("vm.vmtc_one_bit_flip", bitFlips);
@@ -104,7 +104,7 @@ Dictionary kernelValues(const Sample& sample, const Wear& wear) {
       {"freezer_bytes_refrozen", refrozen * random.between(8, 40) * kPageSize * 64},
   };
   for (const auto& [name, value] : freezer) {
-    values.set(platform::format("kern.memorystatus_%s", name), value);
+    values.set(base::format("kern.memorystatus_%s", name), value);
   }
   return values;
 }
@@ -154,8 +154,8 @@ std::vector<SampleFile> memoryErrors(const Sample& sample) {
     for (int entry = 0; entry < kEntries; ++entry) {
       record.number(entry < used ? random.next() >> 24 : 0, 8);
     }
-    files.push_back({platform::format("device/ecc-events/%05d-%02d.bin",
-                                      static_cast<int>(sample.today), static_cast<int>(i)),
+    files.push_back({base::format("device/ecc-events/%05d-%02d.bin", static_cast<int>(sample.today),
+                                  static_cast<int>(i)),
                      record.bytes()});
   }
   return files;
@@ -165,11 +165,11 @@ std::string supportLog(const Sample& sample, const char* name, std::int32_t day)
   Random random(sample.seed, name, day);
   std::string lines;
   for (int i = 0; i < 4; ++i) {
-    const double second = static_cast<double>(day) * static_cast<double>(platform::kSecondsPerDay) +
+    const double second = static_cast<double>(day) * static_cast<double>(base::kSecondsPerDay) +
                           i * 21600 + static_cast<double>(random.between(0, 21599));
-    platform::host::appendTimestamp(lines, second);
-    lines += platform::format(" session %04d: %d requests answered\n", i + 1,
-                              static_cast<int>(random.between(2, 60)));
+    base::appendTimestamp(lines, second);
+    lines += base::format(" session %04d: %d requests answered\n", i + 1,
+                          static_cast<int>(random.between(2, 60)));
   }
   return lines;
 }

@@ -1,16 +1,16 @@
 #include "NANDInfo/Events.h"
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
-#include "platform/host/JSON.h"
-#include "platform/host/Timestamp.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
+#include "base/Timestamp.h"
+#include "plist/JSON.h"
 #include "tools/mkdevice/Random.h"
 #include "tools/mkdevice/Sample.h"
 
 namespace mkdevice {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 
@@ -22,7 +22,7 @@ Array applications(Random& random) {
   Array installed;
   const auto add = [&installed](const char* maker, const char* name, const char* type) {
     installed.push_back(
-        Dictionary{{"Bundle", platform::format("com.%s.%s", maker, name)}, {"Type", type}});
+        Dictionary{{"Bundle", base::format("com.%s.%s", maker, name)}, {"Type", type}});
   };
   for (const char* name :
        {"camera", "maps", "messages", "music", "notes", "phone", "photos", "settings", "calendar",
@@ -73,16 +73,16 @@ Dictionary analyticsConfiguration(Random& random) {
 
 // Two structured logs of a day that is over.
 std::string structuredLogs(Random& random, std::int32_t day) {
-  const auto midnight = static_cast<double>(day) * static_cast<double>(platform::kSecondsPerDay);
+  const auto midnight = static_cast<double>(day) * static_cast<double>(base::kSecondsPerDay);
   std::string lines;
   for (const double hour : {4.0, 16.0}) {
     std::string time;
-    platform::host::appendTimestamp(time, midnight + hour * 3600);
+    base::appendTimestamp(time, midnight + hour * 3600);
     const Dictionary data{{"records", random.between(40, 400)},
                           {"dropped", random.between(0, 3)},
                           {"free_percent", 20 + 0.5 * static_cast<double>(random.between(0, 60))}};
-    platform::host::appendJSON(
-        lines, Dictionary{{"type", std::int64_t{176}}, {"time", time}, {"data", data}});
+    plist::appendJSON(lines,
+                      Dictionary{{"type", std::int64_t{176}}, {"time", time}, {"data", data}});
     lines += '\n';
   }
   return lines;
@@ -123,10 +123,10 @@ std::vector<SampleFile> lastingFiles(const Sample& sample) {
     files.push_back({path, content(random)});
   }
   const std::int32_t yesterday = sample.today - 1;
-  const platform::CivilDate date = platform::civilFromDays(yesterday);
+  const base::CivilDate date = base::civilFromDays(yesterday);
   Random random(sample.seed, "structured", yesterday);
-  files.push_back({platform::format("var/spool/morvend/structured/%04d-%02d-%02d.jsonl",
-                                    static_cast<int>(date.year), date.month, date.day),
+  files.push_back({base::format("var/spool/morvend/structured/%04d-%02d-%02d.jsonl",
+                                static_cast<int>(date.year), date.month, date.day),
                    structuredLogs(random, yesterday)});
   return files;
 }

@@ -3,15 +3,15 @@
 #include <iterator>
 #include <string>
 
-#include "platform/CivilDate.h"
-#include "platform/Convert.h"
+#include "base/CivilDate.h"
+#include "base/Convert.h"
 #include "platform/NetworkUsage.h"
 #include "tools/mkdevice/Random.h"
 
 namespace mkdevice {
 
-using platform::Array;
-using platform::Dictionary;
+using plist::Array;
+using plist::Dictionary;
 
 namespace {
 
@@ -46,16 +46,16 @@ Dictionary networkUsage(const Sample& sample) {
     Random random(sample.seed, process.name);
     const auto phase = static_cast<std::int32_t>(random.next() % 90);
     const std::int32_t start = sample.today - 1 - (sample.today + phase) % process.daysOfLife;
-    const auto second = start * platform::kSecondsPerDay + random.between(18000, 79200);
+    const auto second = start * base::kSecondsPerDay + random.between(18000, 79200);
     Dictionary record{{"procName", process.name},
-                      {platform::kUsageSinceKey, platform::Date{static_cast<double>(second)}}};
+                      {platform::kUsageSinceKey, plist::Date{static_cast<double>(second)}}};
     if (process.bundle != nullptr) record.set("bundleName", process.bundle);
     for (std::size_t i = 0; i < std::size(kCounters); ++i) {
       std::uint64_t bytes = 0;
       for (std::int32_t day = start; day < sample.today; ++day) {
         Random ofDay(sample.seed, std::string(process.name) + kCounters[i], day);
-        bytes += platform::saturatingCast<std::uint64_t>(process.kibibytesPerDay[i] * 1024 *
-                                                         (0.5 + ofDay.fraction()));
+        bytes += base::saturatingCast<std::uint64_t>(process.kibibytesPerDay[i] * 1024 *
+                                                     (0.5 + ofDay.fraction()));
       }
       record.set(kCounters[i], process.countsIn32Bits ? bytes & UINT32_MAX : bytes);
     }

@@ -6,6 +6,6 @@
 namespace mkdevice {
 
 // As counted when `today` begins, each process since it was last started.
-platform::Dictionary networkUsage(const Sample& sample);
+plist::Dictionary networkUsage(const Sample& sample);
 
 }  // namespace mkdevice

@@ -4,8 +4,8 @@
 #include <cmath>
 #include <string>
 
-#include "platform/CivilDate.h"
-#include "platform/Convert.h"
+#include "base/CivilDate.h"
+#include "base/Convert.h"
 #include "tools/mkdevice/Random.h"
 
 namespace mkdevice {
@@ -17,7 +17,7 @@ constexpr std::int64_t kYoungest = 60;           // days: older than the oldest 
 constexpr std::uint64_t kSectorsPerPage = kBytesPerPage / 4096;
 
 std::uint64_t times(std::uint64_t value, double factor) {
-  return platform::saturatingCast<std::uint64_t>(static_cast<double>(value) * factor);
+  return base::saturatingCast<std::uint64_t>(static_cast<double>(value) * factor);
 }
 
 const WearCounter* findWearCounter(std::string_view name) {
@@ -54,8 +54,8 @@ Wear::Wear(const Sample& sample, int hoursAgo) : seed(sample.seed) {
   const double readsPerWrite = 1.8 + random.fraction(), amplification = 1.6 + random.fraction();
   const double fastAmplification = 0.6 + 0.4 * random.fraction();
 
-  formatTime = static_cast<std::uint64_t>(formatDay * platform::kSecondsPerDay);
-  time = static_cast<std::uint64_t>(sample.today * platform::kSecondsPerDay -
+  formatTime = static_cast<std::uint64_t>(formatDay * base::kSecondsPerDay);
+  time = static_cast<std::uint64_t>(sample.today * base::kSecondsPerDay -
                                     std::int64_t{hoursAgo} * 3600);
   hours = (time - formatTime) / 3600;
   magazineMeta = (time & 0xFFFFFFFF) << 24 | (hours & 0xFFFFFF);
@@ -70,7 +70,7 @@ Wear::Wear(const Sample& sample, int hoursAgo) : seed(sample.seed) {
 }
 
 std::uint64_t Wear::sinceFormat(double perDay) const {
-  return platform::saturatingCast<std::uint64_t>(perDay * static_cast<double>(hours) / 24);
+  return base::saturatingCast<std::uint64_t>(perDay * static_cast<double>(hours) / 24);
 }
 
 std::vector<std::uint64_t> counterValues(const Wear& wear, std::string_view name,
@@ -96,7 +96,7 @@ std::vector<std::uint64_t> counterValues(const Wear& wear, std::string_view name
         values.push_back(wear.sinceFormat(varied * std::exp(-4 * distance * distance)));
         break;
       case Growth::level:
-        values.push_back(platform::saturatingCast<std::uint64_t>(std::round(varied)));
+        values.push_back(base::saturatingCast<std::uint64_t>(std::round(varied)));
         break;
     }
   }

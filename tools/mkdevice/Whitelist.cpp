@@ -5,9 +5,9 @@
 
 namespace mkdevice {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 namespace {
 

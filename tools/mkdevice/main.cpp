@@ -10,8 +10,8 @@
 #include <string>
 #include <vector>
 
-#include "platform/CivilDate.h"
-#include "platform/host/SystemClock.h"
+#include "base/CivilDate.h"
+#include "host/process/SystemClock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/SampleController.h"
@@ -79,7 +79,7 @@ int main(int argc, char** argv) {
 
   const bool terminal = ::isatty(STDERR_FILENO) == 1;
   const char* const clearLine = terminal ? "\r\x1b[K" : "";
-  options.sample.today = platform::dayNumber(platform::host::SystemClock().now().secondsSince1970);
+  options.sample.today = base::dayNumber(host::SystemClock().now().secondsSince1970);
   const std::string error =
       mkdevice::makeDevice(options, {.progress =
                                          [&](const std::string& text) {

@@ -4,21 +4,21 @@
 #include <optional>
 #include <string_view>
 
-#include "NANDInfo/ByteReader.h"
-#include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/ProcessState.h"
-#include "NANDInfo/TelemetryList.h"
-#include "NANDInfo/ValidityList.h"
-#include "platform/Text.h"
-#include "platform/host/UTF8.h"
+#include "NANDInfo/decode/DefectsList.h"
+#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/decode/ValidityList.h"
+#include "base/ByteReader.h"
+#include "base/Text.h"
+#include "base/UTF8.h"
 #include "tools/nandinfo/SnapshotItems.h"
 
 namespace nandinfo {
 
 namespace {
 
-using NANDInfo::ByteReader;
+using base::ByteReader;
 using NANDInfo::GenericParserCxt;
 using Bytes = std::span<const std::byte>;
 
@@ -32,7 +32,7 @@ bool isText(Bytes bytes) {
   std::string_view text = textOf(bytes);
   const std::size_t rest = text.size() > kLooked ? text.size() - kLooked : 0;
   while (text.size() > rest) {
-    const std::size_t length = platform::host::characterLength(text);
+    const std::size_t length = base::characterLength(text);
     const bool control = static_cast<unsigned char>(text[0]) < 0x20 &&
                          std::string_view("\t\n\f\r").find(text[0]) == std::string_view::npos;
     if (length == 0 || control) return false;
@@ -139,10 +139,10 @@ std::string whyNot(BufferKind wanted, Bytes bytes) {
   const auto other = std::find_if(std::rbegin(kRows), std::rend(kRows),
                                   [bytes](const Row& row) { return row.recognise(bytes); });
   if (other != std::rend(kRows)) {
-    return platform::format("it holds %s, not %s", other->name, own.name);
+    return base::format("it holds %s, not %s", other->name, own.name);
   }
   if (bytes.size() >= own.least) return {};
-  return platform::format("%zu bytes are too few for %s", bytes.size(), own.name);
+  return base::format("%zu bytes are too few for %s", bytes.size(), own.name);
 }
 
 }  // namespace nandinfo

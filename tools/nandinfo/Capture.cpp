@@ -7,7 +7,8 @@
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/NANDInfo.h"
-#include "platform/host/JSON.h"
+#include "plist/JSON.h"
+#include "plist/PropertyList.h"
 #include "tools/nandinfo/CaptureFolder.h"
 #include "tools/nandinfo/ControllerCapture.h"
 
@@ -15,10 +16,10 @@ namespace nandinfo {
 
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
 using platform::Platform;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 constexpr char kBootSession[] = "kern.bootsessionuuid";
 
@@ -62,7 +63,7 @@ class Capture {
     };
     for (const auto& [name, content] : files) {
       if (!content) continue;
-      const auto bytes = platform_.propertyLists.writeXML(*content);
+      const auto bytes = plist::writeXML(*content);
       if (!bytes) return invocation_.arguments.folder + "/" + name + ": " + bytes.error;
       if (std::string error = folder_.write(name, *bytes); !error.empty()) return error;
     }
@@ -81,7 +82,7 @@ class Capture {
                            {"buffers", std::move(controller.buffers)},
                            {"leftOut", std::move(controller.leftOut)}};
     std::string json;
-    platform::host::appendIndentedJSON(json, manifest_);
+    plist::appendIndentedJSON(json, manifest_);
     return folder_.write("manifest.json", json + '\n');
   }
 
@@ -117,7 +118,7 @@ class Capture {
     if (read.error != 0) {
       return Dictionary{{kBootSession, Dictionary{{"Error", std::int64_t{read.error}}}}};
     }
-    platform::Data session;
+    plist::Data session;
     for (const std::byte byte : std::span(buffer).first(std::min(read.length, buffer.size()))) {
       const bool kept = session.empty() || !invocation_.arguments.redact;
       session.push_back(kept ? std::to_integer<std::uint8_t>(byte) : 0);

@@ -6,7 +6,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "platform/host/Files.h"
+#include "host/files/Files.h"
 
 namespace nandinfo {
 
@@ -14,11 +14,10 @@ std::string CaptureFolder::open(const std::string& path) {
   path_ = path;
   made_ = ::mkdir(path.c_str(), 0700) == 0;
   if (!made_ && errno != EEXIST) return path + ": " + std::strerror(errno);
-  folder_ =
-      platform::host::FileDescriptor(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  folder_ = host::FileDescriptor(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
   if (!folder_) return path + ": " + std::strerror(errno);
   std::vector<std::string> names;
-  if (const int error = platform::host::namesInFolder(folder_.get(), names)) {
+  if (const int error = host::namesInFolder(folder_.get(), names)) {
     return path + ": " + std::strerror(error);
   }
   return names.empty() ? "" : path + ": the folder is not empty";
@@ -26,8 +25,8 @@ std::string CaptureFolder::open(const std::string& path) {
 
 std::string CaptureFolder::write(const std::string& name, std::string_view bytes) {
   files_.push_back(name);  // a failure may come after the file got its name
-  const int error = platform::host::replaceFile(folder_.get(), name, bytes);
-  return error == 0 ? "" : path_ + "/" + name + ": " + platform::host::errorText(error);
+  const int error = host::replaceFile(folder_.get(), name, bytes);
+  return error == 0 ? "" : path_ + "/" + name + ": " + host::errorText(error);
 }
 
 CaptureFolder::~CaptureFolder() {

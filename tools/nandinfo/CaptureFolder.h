@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "platform/host/FileDescriptor.h"
+#include "host/files/FileDescriptor.h"
 
 namespace nandinfo {
 
@@ -26,7 +26,7 @@ class CaptureFolder {
 
  private:
   std::string path_;
-  platform::host::FileDescriptor folder_;
+  host::FileDescriptor folder_;
   bool made_ = false, finished_ = false;
   std::vector<std::string> files_;
 };

@@ -11,8 +11,8 @@ namespace nandinfo {
 
 namespace {
 
-using platform::Dictionary;
-using platform::Value;
+using plist::Dictionary;
+using plist::Value;
 
 CommandResult result(std::optional<Dictionary> dictionary) {
   return {dictionary ? std::optional<Value>(*std::move(dictionary)) : std::nullopt, {}};

@@ -7,8 +7,8 @@
 #include <string>
 #include <string_view>
 
+#include "base/Result.h"
 #include "platform/Platform.h"
-#include "platform/Result.h"
 
 namespace nandinfo {
 
@@ -28,7 +28,7 @@ struct Invocation {
 
 // What a command came to: a value to print, or none; with an error when the command knows better
 // than the library why the work failed.
-using CommandResult = platform::Result<platform::Value>;
+using CommandResult = base::Result<plist::Value>;
 
 // The parts of the command line that a command takes.
 enum Takes : std::uint16_t {

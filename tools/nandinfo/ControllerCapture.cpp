@@ -6,18 +6,18 @@
 #include <array>
 #include <set>
 
-#include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Text.h"
-#include "platform/host/SimulatedDriver.h"
+#include "NANDInfo/controller/DriverHandles.h"
+#include "base/Text.h"
+#include "host/recorded/SimulatedDriver.h"
 
 namespace nandinfo {
 
 using NANDInfo::nand_exporter_t;
-using platform::Array;
-using platform::Dictionary;
 using platform::DriverStatus;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 // The buffers of one kind: a command for each argument from 0 on.
 struct ControllerCapture::BufferKind {
@@ -51,7 +51,7 @@ std::string sha256(std::string_view bytes) {
 }
 
 std::string statusText(DriverStatus status) {
-  return platform::format("the driver answers with status 0x%x", status);
+  return base::format("the driver answers with status 0x%x", status);
 }
 
 }  // namespace
@@ -118,7 +118,7 @@ std::string ControllerCapture::captureBuffers(const BufferKind& kind) {
     return {};
   }
   for (std::uint32_t argument = 0; argument < kind.arguments; ++argument) {
-    invocation_.progress(platform::format("%s %u", kind.name, argument));
+    invocation_.progress(base::format("%s %u", kind.name, argument));
     if (std::string error = captureBuffer(kind, *selectors, argument); !error.empty()) return error;
   }
   return {};
@@ -127,14 +127,14 @@ std::string ControllerCapture::captureBuffers(const BufferKind& kind) {
 std::string ControllerCapture::captureBuffer(const BufferKind& kind,
                                              const NANDInfo::SelectorPair& selectors,
                                              std::uint32_t argument) {
-  const std::string key = platform::format("%u:%u", selectors.dataOpType, argument);
+  const std::string key = base::format("%u:%u", selectors.dataOpType, argument);
   std::array<std::byte, 4> announced{};
   const auto asked = tunnel(exporter_->sizeSelector, selectors.sizeOpType, true, kind.argumentIn,
                             argument, announced);
   if (asked.status != 0) {
     leaveOut(kind, argument, statusText(asked.status));
     // What nothing is known of fails like that.
-    if (asked.status != platform::host::kNotSupported) {
+    if (asked.status != host::recorded::kNotSupported) {
       answers_.set(key, Dictionary{{"FailSize", std::uint64_t{asked.status}}});
     }
     return {};
@@ -163,7 +163,7 @@ std::string ControllerCapture::captureBuffer(const BufferKind& kind,
   const std::string digest = sha256(bytes);
   std::string& file = files_[digest];
   if (file.empty()) {
-    file = platform::format("%s-%u.bin", kind.name, argument);
+    file = base::format("%s-%u.bin", kind.name, argument);
     if (std::string error = folder_.write(file, bytes); !error.empty()) return error;
   }
   buffers.push_back(Dictionary{{"name", kind.name},
@@ -200,7 +200,7 @@ void ControllerCapture::captureRecommendation(Dictionary& driver) {
   const auto answer = platform_.drivers.DrvCallStructMethod(
       connection_, exporter_->recommendDeletionSelector, {}, output);
   if (answer.status != 0) return leaveOut("deletion recommendation", statusText(answer.status));
-  platform::Data bytes;
+  plist::Data bytes;
   for (std::size_t i = 0; i < std::min(output.size(), answer.outputSize); ++i) {
     bytes.push_back(std::to_integer<std::uint8_t>(output[i]));
   }
@@ -243,7 +243,7 @@ void ControllerCapture::captureEAN() {
     Dictionary scalars;
     for (const std::uint32_t method : kMethods) {
       for (const std::uint32_t code : codes) {
-        std::string key = platform::format("%u:", method);
+        std::string key = base::format("%u:", method);
         for (int shift = 24; shift >= 0; shift -= 8) key += static_cast<char>(code >> shift & 0xFF);
         const std::uint64_t input[] = {code};
         std::uint64_t output[] = {0};
@@ -292,8 +292,8 @@ void ControllerCapture::leaveOut(const BufferKind& kind, std::uint32_t argument,
   }
   lastLeftOut_ = argument;
   leaveOut(firstLeftOut_ == argument
-               ? platform::format("%s %u", kind.name, argument)
-               : platform::format("%s %u to %u", kind.name, firstLeftOut_, argument),
+               ? base::format("%s %u", kind.name, argument)
+               : base::format("%s %u to %u", kind.name, firstLeftOut_, argument),
            std::move(reason));
   kindLeftOut_ = &kind;
 }

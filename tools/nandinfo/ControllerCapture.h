@@ -24,7 +24,7 @@ class ControllerCapture {
 
   // What came of it: the registry's entries, the class of the controller that was asked; what was
   // captured and what was not, for the manifest.
-  platform::Array entries, buffers, leftOut;
+  plist::Array entries, buffers, leftOut;
   std::string className;
 
  private:
@@ -39,8 +39,8 @@ class ControllerCapture {
   std::string captureBuffers(const BufferKind& kind);
   std::string captureBuffer(const BufferKind& kind, const NANDInfo::SelectorPair& selectors,
                             std::uint32_t argument);
-  void captureRecommendation(platform::Dictionary& driver);
-  void captureCharacteristics(platform::RegistryObject service, platform::Dictionary& entry);
+  void captureRecommendation(plist::Dictionary& driver);
+  void captureCharacteristics(platform::RegistryObject service, plist::Dictionary& entry);
   void captureEAN();
   void captureNVRAM();
 
@@ -56,7 +56,7 @@ class ControllerCapture {
   CaptureFolder& folder_;
   const NANDInfo::nand_exporter_t* exporter_ = nullptr;  // the one that is asked
   platform::DriverConnection connection_ = 0;
-  platform::Dictionary answers_;              // the driver's, by op type and argument
+  plist::Dictionary answers_;                 // the driver's, by op type and argument
   std::map<std::string, std::string> files_;  // by their digests: what is equal is written once
   std::uint32_t firstLeftOut_ = 0, lastLeftOut_ = 0;  // arguments of the last entry of leftOut
   const BufferKind* kindLeftOut_ = nullptr;

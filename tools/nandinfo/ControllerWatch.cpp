@@ -3,9 +3,9 @@
 #include <algorithm>
 #include <span>
 
-#include "NANDInfo/DriverHandles.h"
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Text.h"
+#include "NANDInfo/controller/DriverHandles.h"
+#include "base/Text.h"
 
 namespace nandinfo {
 
@@ -48,8 +48,6 @@ ControllerWatch::ControllerWatch(platform::Platform& inner, DirectTexts texts)
       platform_{inner.log,
                 *this,
                 inner.clock,
-                inner.digest,
-                inner.propertyLists,
                 inner.files,
                 inner.counters,
                 inner.history,
@@ -95,7 +93,7 @@ std::string ControllerWatch::problem() {
   }
   if (answered_ || stage_ == Stage::opened) return {};
   const std::string status =
-      lastFailure_ != 0 ? platform::format(" (status 0x%x)", lastFailure_) : std::string();
+      lastFailure_ != 0 ? base::format(" (status 0x%x)", lastFailure_) : std::string();
   return "the storage controller " + found_ +
          (stage_ == Stage::asked ? " answers no command" : " can't be opened") + status;
 }

@@ -43,9 +43,8 @@ class ControllerWatch : private platform::DeviceRegistry,
     return inner_.registry.next(iterator);
   }
   bool conformsTo(platform::RegistryObject entry, std::string_view className) override;
-  std::optional<platform::Value> searchProperty(platform::RegistryObject entry,
-                                                std::string_view key,
-                                                Direction direction) override {
+  std::optional<plist::Value> searchProperty(platform::RegistryObject entry, std::string_view key,
+                                             Direction direction) override {
     return inner_.registry.searchProperty(entry, key, direction);
   }
   void release(platform::RegistryObject object) override { inner_.registry.release(object); }

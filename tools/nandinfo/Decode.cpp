@@ -8,8 +8,8 @@
 #include <vector>
 
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Text.h"
-#include "platform/host/FileDescriptor.h"
+#include "base/Text.h"
+#include "host/files/FileDescriptor.h"
 #include "tools/nandinfo/BufferKind.h"
 #include "tools/nandinfo/DecodedBuffer.h"
 
@@ -17,17 +17,17 @@ namespace nandinfo {
 
 namespace {
 
-using platform::Array;
+using plist::Array;
 using FileBytes = std::vector<std::byte>;
 
 // Of a file of any kind that can be read to its end.
-platform::Result<FileBytes> readInput(const std::string& path) {
+base::Result<FileBytes> readInput(const std::string& path) {
   constexpr std::size_t kStep = std::size_t{1} << 16;
   const auto failed = [&path](const char* why) {
-    return platform::Result<FileBytes>::failure(path + ": " + why);
+    return base::Result<FileBytes>::failure(path + ": " + why);
   };
-  const platform::host::FileDescriptor file(
-      path == "-" ? ::dup(STDIN_FILENO) : ::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  const host::FileDescriptor file(path == "-" ? ::dup(STDIN_FILENO)
+                                              : ::open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (!file) return failed(std::strerror(errno));
   FileBytes bytes;
   for (;;) {
@@ -38,13 +38,13 @@ platform::Result<FileBytes> readInput(const std::string& path) {
     bytes.resize(filled + static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
     if (got < 0 && error == EINTR) continue;
     if (got < 0) return failed(std::strerror(error));
-    if (got == 0) return platform::Result<FileBytes>::success(std::move(bytes));
+    if (got == 0) return base::Result<FileBytes>::success(std::move(bytes));
     if (bytes.size() > NANDInfo::kLargestBuffer) return failed("longer than 16 MiB");
   }
 }
 
 // What has been read; a failed one says which file it is about.
-CommandResult outcome(const std::string& path, platform::Dictionary decoded) {
+CommandResult outcome(const std::string& path, plist::Dictionary decoded) {
   const std::string* error = decoded.text("error");
   std::string why = decoded.number("ok")->boolValue() ? "" : path + ": ";
   if (!why.empty()) why += *error != "NA" ? *error : "nothing in it can be decoded";
@@ -95,9 +95,9 @@ CommandResult decodeCounters(const Invocation& invocation) {
     return CommandResult::failure(arguments.file + ": " + why);
   }
   if (bytes->size() < layout->words * sizeof(std::uint32_t)) {
-    return CommandResult::failure(
-        platform::format("%s: %zu bytes, but the layout %s reads %zu", arguments.file.c_str(),
-                         bytes->size(), layout->name, layout->words * sizeof(std::uint32_t)));
+    return CommandResult::failure(base::format("%s: %zu bytes, but the layout %s reads %zu",
+                                               arguments.file.c_str(), bytes->size(), layout->name,
+                                               layout->words * sizeof(std::uint32_t)));
   }
   bytes->resize(NANDInfo::kCounterBlockSize);
   NANDInfo::NandCountersRecord record{};

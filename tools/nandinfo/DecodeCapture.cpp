@@ -6,20 +6,21 @@
 #include <string>
 #include <string_view>
 
-#include "NANDInfo/ListHandlers.h"
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/TelemetryList.h"
-#include "platform/Text.h"
-#include "platform/host/DeviceRoot.h"
+#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/deliver/ListHandlers.h"
+#include "base/Text.h"
+#include "host/files/DeviceRoot.h"
+#include "plist/PropertyList.h"
 #include "tools/nandinfo/DecodedBuffer.h"
 
 namespace nandinfo {
 
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 struct CapturedController {
   const char* className;
@@ -80,7 +81,7 @@ Characteristics characteristicsOf(platform::Platform& platform,
   const auto layouts = counterLayouts();
   const auto layout = std::find_if(layouts.begin(), layouts.end(),
                                    [&](const CounterLayout& row) { return row.parse == convert; });
-  const platform::Number* channels = device->number("num-bus");
+  const plist::Number* channels = device->number("num-bus");
   const std::int64_t count = channels != nullptr ? channels->int64Value() : 0;
   return {&*layout, count > 0 && count < INT32_MAX ? static_cast<std::uint32_t>(count) : 0};
 }
@@ -124,7 +125,7 @@ class Capture {
     constexpr char kRegistry[] = "registry.plist";
     const auto bytes = read(kRegistry);
     if (!bytes) return failed(kRegistry, bytes.error);
-    const auto registry = platform_.propertyLists.read(*bytes);
+    const auto registry = plist::read(*bytes);
     if (!registry) return failed(kRegistry, registry.error);
     const auto* top = registry->as<Dictionary>();
     const auto controller = top != nullptr ? findController(*top) : std::nullopt;
@@ -145,8 +146,8 @@ class Capture {
   }
 
   // A file of the capture, as long as all of them together aren't too long.
-  platform::Result<std::string> read(const std::string& name) {
-    using Result = platform::Result<std::string>;
+  base::Result<std::string> read(const std::string& name) {
+    using Result = base::Result<std::string>;
     auto bytes = folder_.readFile(name, left_ + 1);
     if (!bytes) return bytes;
     if (bytes->size() > left_) return Result::failure("the capture is longer than 16 MiB");
@@ -156,17 +157,17 @@ class Capture {
 
   // A driver's answer: the bytes, a file, or a dictionary with either; none if it answers a
   // failure.
-  std::optional<platform::Result<std::string>> answer(const Value& value) {
+  std::optional<base::Result<std::string>> answer(const Value& value) {
     const auto* options = value.as<Dictionary>();
     const auto* file = options != nullptr ? options->text("File") : value.as<std::string>();
-    const auto* data = options != nullptr ? options->data("Data") : value.as<platform::Data>();
+    const auto* data = options != nullptr ? options->data("Data") : value.as<plist::Data>();
     for (const char* failure : {"FailSize", "FailData"}) {
       const auto* status = options != nullptr ? options->number(failure) : nullptr;
       if (status != nullptr && status->boolValue()) return std::nullopt;
     }
     if (file != nullptr) return read(*file);
     if (data == nullptr) return std::nullopt;
-    return platform::Result<std::string>::success(std::string(data->begin(), data->end()));
+    return base::Result<std::string>::success(std::string(data->begin(), data->end()));
   }
 
   void decodeBuffers(const CapturedController& controller) {
@@ -179,9 +180,8 @@ class Capture {
               ? std::find_if(std::begin(kOpTypes), std::end(kOpTypes),
                              [&](const OpType& known) { return known.number == opType; })
               : std::end(kOpTypes);
-      const std::string name = row != std::end(kOpTypes)
-                                   ? platform::format("%s %u", row->name, argument)
-                                   : "buffer " + key;
+      const std::string name =
+          row != std::end(kOpTypes) ? base::format("%s %u", row->name, argument) : "buffer " + key;
       if (row == std::end(kOpTypes) || (row->decode == nullptr && opType != kTelemetry)) {
         undecoded_.push_back(name);
         continue;
@@ -221,7 +221,7 @@ class Capture {
   }
 
   platform::Platform& platform_;
-  const platform::host::DeviceRoot folder_;
+  const host::DeviceRoot folder_;
   std::size_t left_ = NANDInfo::kLargestBuffer;  // bytes that may still be read
   std::size_t count_ = 0;                        // of decoded buffers
   Dictionary decoded_;

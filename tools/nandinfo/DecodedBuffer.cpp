@@ -6,14 +6,14 @@
 #include <utility>
 #include <vector>
 
-#include "NANDInfo/ByteReader.h"
-#include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/ProcessState.h"
 #include "NANDInfo/SnapshotReader.h"
-#include "NANDInfo/TelemetryList.h"
-#include "NANDInfo/ValidityList.h"
-#include "platform/Text.h"
+#include "NANDInfo/decode/DefectsList.h"
+#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/decode/ValidityList.h"
+#include "base/ByteReader.h"
+#include "base/Text.h"
 #include "tools/nandinfo/BufferKind.h"
 #include "tools/nandinfo/SnapshotItems.h"
 
@@ -22,9 +22,9 @@ namespace nandinfo {
 namespace {
 
 using NANDInfo::GenericParserCxt;
-using platform::Array;
-using platform::Dictionary;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Value;
 
 static_assert(kChannelSize == NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize);
 
@@ -67,7 +67,7 @@ std::string typeName(std::uint32_t type) {
     case kThreadName:
       return "thread name";
     default:
-      return platform::format("0x%x", type);
+      return base::format("0x%x", type);
   }
 }
 
@@ -135,7 +135,7 @@ Dictionary decodedValidity(Bytes bytes) {
   Array fields;
   for (std::size_t i = 0; i < lists->size(); ++i) {
     if ((*lists)[i].empty()) continue;
-    fields.push_back(Array{platform::format("ValidityList[%zu]", i), std::move((*lists)[i])});
+    fields.push_back(Array{base::format("ValidityList[%zu]", i), std::move((*lists)[i])});
   }
   return whole({{"fields", std::move(fields)}}, true, "NA");
 }
@@ -166,11 +166,11 @@ Dictionary decodedSnapshot(Bytes bytes) {
   constexpr char kThread[] = "VM_swapout";
   if (const auto statistics = NANDInfo::getIOStatsWithThreadnameFromKCData(bytes, kThread)) {
     constexpr int kMostCounters = 64;
-    NANDInfo::ByteReader reader(*statistics);
+    base::ByteReader reader(*statistics);
     for (int i = 0; i < kMostCounters; ++i) {
       const auto counter = reader.read<std::uint64_t>();
       if (!counter) break;
-      fields.push_back(Array{platform::format("%s[%d]", kThread, i), *counter});
+      fields.push_back(Array{base::format("%s[%d]", kThread, i), *counter});
     }
   }
   return whole({{"fields", std::move(fields)}, {"items", std::move(items)}}, true, "NA");
@@ -180,14 +180,13 @@ Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout, std::uint3
   if (const auto why = whyNot(BufferKind::telemetry, bytes); !why.empty()) return refused(why);
   if (channels == 0) {
     if (bytes.size() % kChannelSize != 0) {
-      return refused(
-          platform::format("%zu bytes are no whole number of channels, of %zu bytes each",
-                           bytes.size(), kChannelSize));
+      return refused(base::format("%zu bytes are no whole number of channels, of %zu bytes each",
+                                  bytes.size(), kChannelSize));
     }
     channels = static_cast<std::uint32_t>(bytes.size() / kChannelSize);
   }
   const auto list = NANDInfo::parseTelemetryList(bytes, static_cast<std::int32_t>(channels));
-  if (!list) return refused(platform::format("there are not %u channels in it", channels));
+  if (!list) return refused(base::format("there are not %u channels in it", channels));
   Dictionary byIndex;
   for (std::size_t i = 0; i < list->size(); ++i) {
     byIndex.set(std::to_string(i),

@@ -11,28 +11,28 @@
 #include <string_view>
 
 #include "NANDInfo/CounterRecords.h"
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace nandinfo {
 
 using Bytes = std::span<const std::byte>;
 
 // "fields".
-platform::Dictionary decodedFTL(Bytes bytes);
-platform::Dictionary decodedFTLStat(Bytes bytes);
-platform::Dictionary decodedLegacy(Bytes bytes);
-platform::Dictionary decodedMSP(Bytes bytes);
+plist::Dictionary decodedFTL(Bytes bytes);
+plist::Dictionary decodedFTLStat(Bytes bytes);
+plist::Dictionary decodedLegacy(Bytes bytes);
+plist::Dictionary decodedMSP(Bytes bytes);
 
 // "fields": the values of each list, an array.
-platform::Dictionary decodedValidity(Bytes bytes);
+plist::Dictionary decodedValidity(Bytes bytes);
 
 // "Factory Count", and "defects", a dictionary for each, whose "Reason" is without what its "Mode"
 // adds when it is logged.
-platform::Dictionary decodedDefects(Bytes bytes);
+plist::Dictionary decodedDefects(Bytes bytes);
 
 // "fields": what the swap-out thread has written, and its counters; none when it isn't in the
 // snapshot. "items": a dictionary for each type, with how many there are and their bytes.
-platform::Dictionary decodedSnapshot(Bytes bytes);
+plist::Dictionary decodedSnapshot(Bytes bytes);
 
 // A vendor's layout of the counter block.
 struct CounterLayout {
@@ -46,8 +46,8 @@ const CounterLayout* findCounterLayout(std::string_view name);
 
 // "channels": a dictionary for each, under its index: the summary and the counters. `channels` is
 // how many the controller has; 0: as many as fill the bytes.
-platform::Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout,
-                                      std::uint32_t channels);
+plist::Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout,
+                                   std::uint32_t channels);
 
 // The bytes of a channel in a telemetry list.
 inline constexpr std::size_t kChannelSize = 4096 + 32;

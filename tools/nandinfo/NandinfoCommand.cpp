@@ -9,8 +9,8 @@
 #include <string_view>
 
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Text.h"
-#include "platform/host/JSON.h"
+#include "base/Text.h"
+#include "plist/JSON.h"
 #include "tools/common/ClosestName.h"
 #include "tools/common/TerminalText.h"
 #include "tools/nandinfo/Commands.h"
@@ -22,8 +22,8 @@ namespace nandinfo {
 
 namespace {
 
-using platform::Dictionary;
-using platform::Value;
+using plist::Dictionary;
+using plist::Value;
 
 constexpr int kDone = 0, kFailed = 1, kUsage = 2;
 
@@ -96,21 +96,21 @@ std::string shown(const CommandServices& services, const Command& command, Form 
   if (services.outIsTerminal && !form.json && !form.compact) {
     if (!result) return {};
     if (!isEmpty(*result)) return tableText(*result, services.width);
-    return command.empty != nullptr ? platform::format("(%s)\n", command.empty) : "(nothing)\n";
+    return command.empty != nullptr ? base::format("(%s)\n", command.empty) : "(nothing)\n";
   }
   std::string json;
   if (!result) {
     json = "null";
   } else if (form.compact) {
-    platform::host::appendJSON(json, *result);
+    plist::appendJSON(json, *result);
   } else {
-    platform::host::appendIndentedJSON(json, *result);
+    plist::appendIndentedJSON(json, *result);
   }
   return tools::printableJSON(std::move(json)) + '\n';
 }
 
 std::string nameOf(const Command& command) {
-  return command.group != nullptr ? platform::format("%s %s", command.group, command.name)
+  return command.group != nullptr ? base::format("%s %s", command.group, command.name)
                                   : command.name;
 }
 
@@ -176,7 +176,7 @@ CLI::Option* addNumber(CLI::App& app, const std::string& name, std::uint32_t& nu
     const auto [stop, error] = std::from_chars(text.data(), end, number);
     if (error == std::errc() && stop == end && number <= most) return;
     throw CLI::ValidationError(
-        name, platform::format("'%s' is not a number from 0 to %u", text.c_str(), most));
+        name, base::format("'%s' is not a number from 0 to %u", text.c_str(), most));
   };
   return app.add_option_function<std::string>(name, set, description)->type_name("N");
 }
@@ -197,7 +197,7 @@ void addSteps(CLI::App& app, Arguments& arguments) {
   constexpr std::uint32_t kLastStep = 6;
   std::string steps = "the first step (default: 0):";
   for (std::uint32_t step = 0; step <= kLastStep; ++step) {
-    steps += platform::format("\n%u  %s", step, NANDInfo::kEV_Extraction_Step_Names[step].name);
+    steps += base::format("\n%u  %s", step, NANDInfo::kEV_Extraction_Step_Names[step].name);
   }
   app.add_flag("--monthly", arguments.monthly, "with the last step, which is the monthly one");
   addNumber(app, "--from", arguments.from, kLastStep, steps);
@@ -210,7 +210,7 @@ class Help : public CLI::Formatter {
     if (app->get_parent() != nullptr) return Formatter::make_subcommands(app, mode);
     std::string list = "\nCommands:\n";
     for (const Command& command : commands()) {
-      list += platform::format("  %-21s  %s\n", nameOf(command).c_str(), command.description);
+      list += base::format("  %-21s  %s\n", nameOf(command).c_str(), command.description);
     }
     return list;
   }

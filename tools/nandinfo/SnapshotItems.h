@@ -6,7 +6,7 @@
 #include <optional>
 #include <span>
 
-#include "NANDInfo/ByteReader.h"
+#include "base/ByteReader.h"
 
 namespace nandinfo {
 
@@ -39,7 +39,7 @@ class SnapshotItems {
   bool isWhole() const { return whole_; }
 
  private:
-  NANDInfo::ByteReader reader_;
+  base::ByteReader reader_;
   bool whole_ = false;
 };
 

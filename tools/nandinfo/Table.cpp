@@ -6,19 +6,19 @@
 #include <utility>
 #include <vector>
 
-#include "platform/Text.h"
-#include "platform/host/JSON.h"
-#include "platform/host/Timestamp.h"
+#include "base/Text.h"
+#include "base/Timestamp.h"
+#include "plist/JSON.h"
 #include "tools/common/TerminalText.h"
 
 namespace nandinfo {
 
 namespace {
 
-using platform::Array;
-using platform::Dictionary;
-using platform::Number;
-using platform::Value;
+using plist::Array;
+using plist::Dictionary;
+using plist::Number;
+using plist::Value;
 using tools::columnsOf;
 using tools::cutToColumns;
 using tools::printable;
@@ -43,13 +43,13 @@ Cell cellOf(const Value& value) {
     return {grouped(number->text()), true};
   }
   if (const auto* text = value.as<std::string>()) return {printable(*text)};
-  if (const auto* date = value.as<platform::Date>()) {
+  if (const auto* date = value.as<plist::Date>()) {
     Cell cell;
-    platform::host::appendTimestamp(cell.text, date->secondsSince1970);
+    base::appendTimestamp(cell.text, date->secondsSince1970);
     return cell;
   }
   std::string json;
-  platform::host::appendJSON(json, value);
+  plist::appendJSON(json, value);
   return {printable(json)};
 }
 

@@ -5,13 +5,13 @@
 #include <cstddef>
 #include <string>
 
-#include "platform/PropertyList.h"
+#include "plist/Value.h"
 
 namespace nandinfo {
 
 // A value as lines. Dictionaries within a dictionary stand side by side, as many as `width` columns
 // allow, then the next ones, after them those that hold arrays or dictionaries themselves, one by
 // one; rows of dictionaries are cut at that width.
-std::string tableText(const platform::Value& value, std::size_t width);
+std::string tableText(const plist::Value& value, std::size_t width);
 
 }  // namespace nandinfo

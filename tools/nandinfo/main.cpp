@@ -12,7 +12,7 @@ namespace {
 
 int run(std::ostream& out, int argc, char** argv) {
   tools::CommandLog log("nandinfo");
-  platform::host::Host host(log.hostOptions());
+  host::Host host(log.hostOptions());
   nandinfo::CommandServices services{.platform = host.platform(),
                                      .out = out,
                                      .err = std::cerr,

@@ -4,15 +4,15 @@
 #include <cmath>
 #include <limits>
 
-#include "platform/CivilDate.h"
-#include "platform/Convert.h"
-#include "platform/Text.h"
-#include "platform/host/Timestamp.h"
-#include "platform/host/UTF8.h"
+#include "base/CivilDate.h"
+#include "base/Convert.h"
+#include "base/Text.h"
+#include "base/Timestamp.h"
+#include "base/UTF8.h"
 
 namespace pelloran {
 
-using platform::Result;
+using base::Result;
 
 namespace {
 
@@ -28,7 +28,7 @@ bool parsed(std::string_view text, T& value) {
 
 bool isUTF8(std::string_view text) {
   while (!text.empty()) {
-    const std::size_t length = platform::host::firstCharacter(text).length;
+    const std::size_t length = base::firstCharacter(text).length;
     if (length == 0) return false;
     text.remove_prefix(length);
   }
@@ -40,7 +40,7 @@ bool isUTF8(std::string_view text) {
 std::string keyProblem(std::string_view key) {
   if (key.empty()) return "the key is empty";
   if (key.size() > kLongestKey) {
-    return platform::format("the key has %zu bytes, more than %zu", key.size(), kLongestKey);
+    return base::format("the key has %zu bytes, more than %zu", key.size(), kLongestKey);
   }
   if (key.find('\0') != std::string_view::npos) return "the key holds a NUL";
   if (!isUTF8(key)) return "the key is not UTF-8";
@@ -49,11 +49,11 @@ std::string keyProblem(std::string_view key) {
 
 Result<std::int32_t> parseDay(std::string_view text, std::int32_t today) {
   if (text == "today") return Result<std::int32_t>::success(today);
-  if (text == "yesterday") return Result<std::int32_t>::success(platform::dayBefore(today));
+  if (text == "yesterday") return Result<std::int32_t>::success(base::dayBefore(today));
   std::int64_t day = 0;
   if (parsed(text, day)) return dayOf(day);
-  const auto midnight = platform::host::secondsFromTimestamp(std::string(text) + "T00:00:00Z");
-  if (midnight && *midnight >= 0) return dayOf(platform::dayNumber(*midnight));
+  const auto midnight = base::secondsFromTimestamp(std::string(text) + "T00:00:00Z");
+  if (midnight && *midnight >= 0) return dayOf(base::dayNumber(*midnight));
   return Result<std::int32_t>::failure(
       quoted(text) + " is not a day: a day number, a date as 2026-11-22, today or yesterday");
 }
@@ -73,14 +73,13 @@ Result<double> parseReal(std::string_view text) {
 Result<std::int64_t> integral(double value) {
   const double above = std::ldexp(1.0, 63);
   if (std::trunc(value) != value || value < -above || value >= above) {
-    return Result<std::int64_t>::failure(platform::doubleText(value) +
-                                         " is not an integer of 64 bits");
+    return Result<std::int64_t>::failure(base::doubleText(value) + " is not an integer of 64 bits");
   }
-  return Result<std::int64_t>::success(platform::saturatingCast<std::int64_t>(value));
+  return Result<std::int64_t>::success(base::saturatingCast<std::int64_t>(value));
 }
 
 Result<std::int32_t> secondInDay(std::int64_t second) {
-  if (second >= 0 && second < platform::kSecondsPerDay) {
+  if (second >= 0 && second < base::kSecondsPerDay) {
     return Result<std::int32_t>::success(static_cast<std::int32_t>(second));
   }
   return Result<std::int32_t>::failure(std::to_string(second) +

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "platform/Result.h"
+#include "base/Result.h"
 
 namespace pelloran {
 
@@ -14,20 +14,20 @@ namespace pelloran {
 std::string keyProblem(std::string_view key);
 
 // A day number, a date such as "2026-11-22", or "today" or "yesterday"; none before 1970.
-platform::Result<std::int32_t> parseDay(std::string_view text, std::int32_t today);
+base::Result<std::int32_t> parseDay(std::string_view text, std::int32_t today);
 
-platform::Result<std::int64_t> parseInteger(std::string_view text);
+base::Result<std::int64_t> parseInteger(std::string_view text);
 
 // A finite number.
-platform::Result<double> parseReal(std::string_view text);
+base::Result<double> parseReal(std::string_view text);
 
 // An integral number of the range as a 64-bit integer.
-platform::Result<std::int64_t> integral(double value);
+base::Result<std::int64_t> integral(double value);
 
 // A second within a day.
-platform::Result<std::int32_t> secondInDay(std::int64_t second);
+base::Result<std::int32_t> secondInDay(std::int64_t second);
 
 // A day number, from 0.
-platform::Result<std::int32_t> dayOf(std::int64_t number);
+base::Result<std::int32_t> dayOf(std::int64_t number);
 
 }  // namespace pelloran

@@ -5,14 +5,14 @@
 #include <optional>
 #include <variant>
 
-#include "platform/CivilDate.h"
-#include "platform/Convert.h"
+#include "base/CivilDate.h"
+#include "base/Convert.h"
 #include "tools/pelloran/Arguments.h"
 
 namespace pelloran {
 
-using platform::Result;
-using platform::host::CounterChange;
+using base::Result;
+using host::CounterChange;
 
 namespace {
 
@@ -127,10 +127,9 @@ Result<std::int32_t> secondsFrom(const Scalar& scalar) {
 
 }  // namespace
 
-Moment momentOf(platform::Date now) {
-  const platform::CivilTime time = platform::civilFromSeconds(now.secondsSince1970);
-  return {platform::dayNumber(now.secondsSince1970),
-          time.hour * 3600 + time.minute * 60 + time.second};
+Moment momentOf(plist::Date now) {
+  const base::CivilTime time = base::civilFromSeconds(now.secondsSince1970);
+  return {base::dayNumber(now.secondsSince1970), time.hour * 3600 + time.minute * 60 + time.second};
 }
 
 Result<ImportLine> parseImportLine(std::string_view line, Moment now) {

@@ -5,8 +5,8 @@
 #include <string>
 #include <string_view>
 
-#include "platform/Result.h"
-#include "platform/host/CounterStore.h"
+#include "base/Result.h"
+#include "host/counters/CounterStore.h"
 
 namespace pelloran {
 
@@ -15,15 +15,15 @@ struct Moment {
   std::int32_t day;
   std::int32_t second;
 };
-Moment momentOf(platform::Date now);
+Moment momentOf(plist::Date now);
 
 struct ImportLine {
   std::string key;
-  platform::host::CounterChange change;  // its key is left empty
+  host::CounterChange change;  // its key is left empty
 };
 
 // Parses {"set"|"add"|"push": key, "value": number, "day": D, "seconds": S}; the last two may be
 // missing. Pure; anything else is an error that says what it stumbled over.
-platform::Result<ImportLine> parseImportLine(std::string_view line, Moment now);
+base::Result<ImportLine> parseImportLine(std::string_view line, Moment now);
 
 }  // namespace pelloran

@@ -11,7 +11,7 @@
 #include <unordered_set>
 #include <vector>
 
-#include "platform/Convert.h"
+#include "base/Convert.h"
 #include "tools/common/ClosestName.h"
 #include "tools/common/TerminalText.h"
 #include "tools/pelloran/Arguments.h"
@@ -23,7 +23,7 @@ namespace pelloran {
 
 namespace {
 
-using platform::host::CounterChange;
+using host::CounterChange;
 
 constexpr int kDone = 0, kFailed = 1, kUsage = 2;
 constexpr std::size_t kLongestLine = std::size_t{1} << 20;
@@ -118,7 +118,7 @@ class Command {
       }
     }
     const auto start = std::chrono::steady_clock::now();
-    const auto readings = platform::saturatingCast<std::int64_t>(lasting / every) + 1;
+    const auto readings = base::saturatingCast<std::int64_t>(lasting / every) + 1;
     Progress progress(environment_);
     for (std::int64_t reading = 1; reading <= readings; ++reading) {
       if (const std::string error = record(readMachineFigures(environment_.figuresRoot));
@@ -144,7 +144,7 @@ class Command {
     return wrongUsage(environment_.err, why, " " + arguments_.command);
   }
   template <typename From, typename To>
-  bool given(const platform::Result<From>& result, To& value) {
+  bool given(const base::Result<From>& result, To& value) {
     if (!result) {
       usage(result.error);
       return false;

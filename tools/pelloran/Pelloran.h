@@ -6,13 +6,13 @@
 #include <iosfwd>
 #include <string>
 
+#include "host/counters/CounterStore.h"
 #include "platform/Clock.h"
-#include "platform/host/CounterStore.h"
 
 namespace pelloran {
 
 struct Environment {
-  platform::host::CounterStore& store;
+  host::CounterStore& store;
   platform::Clock& clock;
   std::istream& in;
   std::ostream& out;

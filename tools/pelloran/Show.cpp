@@ -8,8 +8,8 @@
 #include <tuple>
 #include <vector>
 
-#include "platform/CivilDate.h"
-#include "platform/Text.h"
+#include "base/CivilDate.h"
+#include "base/Text.h"
 #include "tools/common/TerminalText.h"
 
 namespace pelloran {
@@ -80,13 +80,12 @@ std::string summary(PLHistoryDistributionEnumerator& samples) {
   }
   std::string text = "count " + std::to_string(count);
   if (count == 0) return text;
-  return text + platform::format("  min %.10g  mean %.10g  max %.10g", least, mean, most);
+  return text + base::format("  min %.10g  mean %.10g  max %.10g", least, mean, most);
 }
 
 std::string dateText(std::int32_t day) {
-  const platform::CivilDate date = platform::civilFromDays(day);
-  return platform::format("%04lld-%02d-%02d", static_cast<long long>(date.year), date.month,
-                          date.day);
+  const base::CivilDate date = base::civilFromDays(day);
+  return base::format("%04lld-%02d-%02d", static_cast<long long>(date.year), date.month, date.day);
 }
 
 }  // namespace

@@ -5,7 +5,7 @@
 #include <iostream>
 #include <thread>
 
-#include "platform/host/Host.h"
+#include "host/Host.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/StandardOutput.h"
 #include "tools/pelloran/Pelloran.h"
@@ -14,7 +14,7 @@ namespace {
 
 int run(std::ostream& out, int argc, char** argv) {
   tools::CommandLog log("pelloran");
-  platform::host::Host host(log.hostOptions());
+  host::Host host(log.hostOptions());
   return pelloran::runPelloran(
       {.store = host.counters(),
        .clock = host.platform().clock,

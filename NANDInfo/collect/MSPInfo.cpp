@@ -1,0 +1,122 @@
+// The statistics of each media storage processor.
+
+#include <memory>
+#include <new>
+#include <string>
+
+#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/controller/DriverHandles.h"
+#include "platform/Platform.h"
+
+namespace NANDInfo {
+
+using platform::Platform;
+using plist::Dictionary;
+
+namespace {
+
+constexpr std::uint32_t kMostMSPs = 10;
+
+bool getNANDMSPBuffer(Platform& platform, const OpenExporter& exporter, std::uint32_t index,
+                      Buffer& buffer) {
+  TunnelCommandBlock block{.argument = index};
+  return executeTunnelCommand(platform, exporter->io_connection, exporter.get(),
+                              exporter->getMSPStatsSelectors(), block, buffer);
+}
+
+// The number of MSPs that answer.
+std::uint32_t countMSPs(Platform& platform, const OpenExporter& exporter) {
+  std::uint32_t count = 0;
+  for (Buffer buffer; count < kMostMSPs; ++count, buffer.clear()) {
+    if (!getNANDMSPBuffer(platform, exporter, count, buffer)) break;
+  }
+  return count;
+}
+
+// All counters of each MSP under its index, as far as they could be read. The count is taken first:
+// a controller that stops answering in between is seen as such.
+Dictionary readMSPs(Platform& platform, const OpenExporter& exporter) {
+  Dictionary msps;
+  const std::uint32_t count = countMSPs(platform, exporter);
+  if (count == 0) {
+    SetAPIErrorMessage("CopyWhitelistedNANDMSPInfo: Unable to gather any NAND MSP fields");
+    return msps;
+  }
+  const std::unique_ptr<GenericParserCxt> context(new (std::nothrow) GenericParserCxt);
+  if (context == nullptr) {
+    SetAPIErrorMessage("gatherZMCMSPData: Could not allocate memory for genericPCxt");
+    return msps;
+  }
+  for (std::uint32_t index = 0; index < count; ++index) {
+    Buffer buffer;
+    if (!getNANDMSPBuffer(platform, exporter, index, buffer)) {
+      SetAPIErrorMessage("gatherZMCMSPData: getNANDMSPBuffer tunnel command failed !");
+      break;
+    }
+    if (exporter->parseMSP(context.get(), buffer) == 0) {
+      SetAPIErrorMessage("gatherZMCMSPData: parseMSP failed !");
+      break;
+    }
+    msps.set(std::to_string(index), CreateDictFromCxt(*context));
+    exporter->releaseGeneric(context.get());
+  }
+  return msps;
+}
+
+// All MSPs' counters; none when there is no controller with MSPs. Nothing is held when it returns.
+std::optional<Dictionary> gatherZMCMSPData(Platform& platform) {
+  const OpenExporter exporter(platform);
+  if (exporter.get() == nullptr) {
+    SetAPIErrorMessage("gatherZMCMSPData: Could not get nand_exporter_t");
+    return std::nullopt;
+  }
+  if (exporter->getMSPStatsSelectors == nullptr || exporter->parseMSP == nullptr) {
+    SetAPIErrorMessage("gatherZMCMSPData: Controller does not support MSP data");
+    return std::nullopt;
+  }
+  if (exporter->io_connection == 0) {
+    SetAPIErrorMessage("gatherZMCMSPData: No io_connection exist");
+    return std::nullopt;
+  }
+  return readMSPs(platform, exporter);
+}
+
+// The four parts of the firmware version, 16 bits each, the lowest first.
+Dictionary firmwareVersion(const Dictionary& counters) {
+  const auto* identifier = counters.number(kTLM_MSP_fw_version_identifier);
+  if (identifier == nullptr) return {};
+  const auto part = [bits = identifier->uint64Value()](int place) {
+    return static_cast<std::int64_t>(bits >> 16 * place & 0xFFFF);
+  };
+  return {{kTLM_MSP_fw_version_identifier_0, part(0)},
+          {kTLM_MSP_fw_version_identifier_1, part(1)},
+          {kTLM_MSP_fw_version_identifier_2, part(2)},
+          {kTLM_MSP_fw_version_identifier_3, part(3)}};
+}
+
+// An MSP's whitelisted counters, with the fields that all MSPs share.
+Dictionary reported(const Dictionary& counters, const Dictionary& shared, bool round) {
+  Dictionary msp =
+      CreateFilteredDict_SigDig(counters, &WhitelistedRawNANDMSPCounters_SigDigDict(), round);
+  addEntries(shared, msp);
+  addEntries(firmwareVersion(counters), msp);
+  return msp;
+}
+
+}  // namespace
+
+Dictionary CopyWhitelistedNANDMSPInfo(Platform& platform, bool round) {
+  Dictionary result;
+  if (const auto msps = gatherZMCMSPData(platform)) {
+    const Dictionary shared = gatherZMCOtherData(platform);
+    for (const auto& [index, counters] : *msps) {
+      result.set(index, reported(*counters.as<Dictionary>(), shared, round));
+    }
+  } else {
+    SetAPIErrorMessage("CopyWhitelistedNANDMSPInfo: Unable to gather MSP fields");
+  }
+  result.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
+  return result;
+}
+
+}  // namespace NANDInfo

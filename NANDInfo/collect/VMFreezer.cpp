@@ -1,0 +1,32 @@
+// The writes of the kernel's swap-out thread.
+
+#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/SnapshotReader.h"
+#include "base/ByteReader.h"
+#include "platform/Platform.h"
+
+namespace NANDInfo {
+
+namespace {
+
+constexpr std::size_t kBytesWritten = 3;  // its place among the 64-bit counters
+
+std::uint64_t bytesWritten(std::span<const std::byte> statistics) {
+  base::ByteReader reader(statistics);
+  if (!reader.take(kBytesWritten * sizeof(std::uint64_t))) return 0;
+  return reader.read<std::uint64_t>().value_or(0);
+}
+
+}  // namespace
+
+plist::Dictionary CopyVMFreezerNANDInfo(platform::Platform& platform) {
+  const auto snapshot = platform.snapshots.capture(platform::KernelSnapshots::kChunkedData);
+  if (!snapshot) return {};
+  const auto statistics = getIOStatsWithThreadnameFromKCData(*snapshot, "VM_swapout");
+  if (!statistics) return {};
+  const std::uint64_t written = bytesWritten(*statistics);
+  return {{kTLM_VMFreezer_bytesWritten, written},
+          {kNANDInfoVMFreezerNumPhysicalWritesKey, written}};
+}
+
+}  // namespace NANDInfo

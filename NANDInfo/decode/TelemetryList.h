@@ -1,0 +1,40 @@
+// The telemetry list: for each channel of the controller a block of raw counters in its vendor's
+// layout (4,096 bytes, all blocks first), and a summary of seven words (32 bytes).
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <span>
+#include <string_view>
+#include <vector>
+
+#include "NANDInfo/CounterRecords.h"
+#include "plist/Value.h"
+
+namespace NANDInfo {
+
+inline constexpr std::size_t kTelemetrySummarySize = 32;
+
+struct TelemetryChannel {
+  CounterBlock counters;
+  std::span<const std::byte, kTelemetrySummarySize> summary;
+};
+
+// The channels, borrowed from the buffer; none when it is too short for so many. A negative number
+// of channels counts as 0.
+std::optional<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const std::byte> buffer,
+                                                                std::int32_t channels);
+
+enum class ChipKind : std::uint8_t { other, QM7, QM8 };
+ChipKind chipKind(std::string_view chipIdentifier);
+
+// The converter of the counter blocks; the vendor (48 bits) tells only on other chips.
+using CounterConverter = void(CounterBlock block, NandCountersRecord& record);
+CounterConverter* counterConverter(ChipKind chip, std::uint64_t vendor);
+
+// The summary and the counters of one channel, each counter under its name and index.
+plist::Dictionary telemetryLog(const TelemetryChannel& channel, ChipKind chip,
+                               CounterConverter* convert);
+
+}  // namespace NANDInfo

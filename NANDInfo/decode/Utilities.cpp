@@ -1,0 +1,98 @@
+#include "NANDInfo/Utilities.h"
+
+#include <algorithm>
+#include <cstring>
+#include <optional>
+#include <string>
+
+#include "platform/Platform.h"
+
+namespace NANDInfo {
+
+using plist::Value;
+
+namespace {
+
+template <typename Stored, typename Read>
+Value valueAt(const void* pointer) {
+  Read number;
+  std::memcpy(&number, pointer, sizeof number);
+  return Stored{number};
+}
+
+// The number at the pointer; its absence is logged.
+std::optional<Value> numberAt(platform::Platform& platform, const void* pointer, NumberKind kind) {
+  if (pointer != nullptr) {
+    switch (kind) {
+      case NumberKind::signed8:
+        return valueAt<std::int32_t, std::int8_t>(pointer);
+      case NumberKind::signed32:
+        return valueAt<std::int32_t, std::int32_t>(pointer);
+      case NumberKind::signed64:
+        return valueAt<std::int64_t, std::int64_t>(pointer);
+      case NumberKind::float64:
+        return valueAt<double, double>(pointer);
+    }
+  }
+  platform.log.log(platform::LogLevel::standard, "Failed to create Orvalix from value: %p",
+                   pointer);
+  return std::nullopt;
+}
+
+}  // namespace
+
+void setNumberValueForType(platform::Platform& platform, plist::Dictionary& dictionary,
+                           std::string_view key, const void* value, NumberKind kind) {
+  if (auto number = numberAt(platform, value, kind)) dictionary.set(key, *number);
+}
+
+void appendNumberValueForType(platform::Platform& platform, plist::Array& array, const void* value,
+                              NumberKind kind) {
+  if (auto number = numberAt(platform, value, kind)) array.push_back(*number);
+}
+
+Value GetNumberFromDictionarySafe(const plist::Dictionary& dictionary, std::string_view key) {
+  const Value* const value = dictionary.find(key);
+  return value != nullptr ? *value : Value(std::int32_t{0});
+}
+
+Value GetStringFromDictionarySafe(const plist::Dictionary& dictionary, std::string_view key) {
+  const Value* const value = dictionary.find(key);
+  return value != nullptr ? *value : Value("empty");
+}
+
+void CopyDictionary(std::string_view key, const Value& value, plist::Dictionary& target) {
+  target.set(key, value);
+}
+
+void addEntries(const plist::Dictionary& entries, plist::Dictionary& target) {
+  for (const auto& [key, value] : entries) CopyDictionary(key, value, target);
+}
+
+std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text) {
+  unsigned byte = 0;
+  for (const char given : text.substr(0, 2)) {
+    const char character = given >= 'A' && given <= 'Z' ? static_cast<char>(given + 32) : given;
+    byte *= 16;
+    if (character >= '0' && character <= '9') {
+      byte += static_cast<unsigned>(character - '0');
+    } else if (character >= 'a' && character <= 'f') {
+      byte += static_cast<unsigned>(character - 'a' + 10);
+    } else {
+      platform.streams.writeOutput(std::string("unrecognized hex character: ") + character);
+    }
+  }
+  return static_cast<std::uint8_t>(byte);
+}
+
+std::uint32_t hexStringToInt32(platform::Platform& platform, std::string_view text) {
+  text = text.substr(0, 8);
+  std::uint32_t number = 0;
+  // A lone digit at the end is the lowest byte by itself.
+  for (; !text.empty(); text.remove_prefix(std::min<std::size_t>(text.size(), 2))) {
+    number |= std::uint32_t{hexStringToByte(platform, text)} << 8 * ((text.size() - 1) / 2);
+  }
+  return number;
+}
+
+}  // namespace NANDInfo

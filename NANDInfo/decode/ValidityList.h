@@ -1,0 +1,23 @@
+// The flash validity list: how much of the flash still holds valid data, as sixteen short lists.
+//
+// Little-endian: the number of records and the place of the first one in units of 8 bytes, 32 bits
+// each; then records of five 32-bit words, the fourth of them the index of a list, the last a value
+// for it.
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <optional>
+#include <span>
+
+#include "plist/Value.h"
+
+namespace NANDInfo {
+
+using ValidityLists = std::array<plist::Array, 16>;
+
+// The values of each list, in record order; records of other lists are left out. None when there
+// are no records or they don't all fit.
+std::optional<ValidityLists> parseValidityList(std::span<const std::byte> buffer);
+
+}  // namespace NANDInfo

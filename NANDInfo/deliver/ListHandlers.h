@@ -1,0 +1,40 @@
+// What becomes of each list that the storage controller's driver delivers.
+//
+// A handler gets the list as large as the driver announced it, the device characteristics and the
+// driver's class name. False, with a message on standard error, when it could make nothing of them.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <string_view>
+
+#include "plist/Value.h"
+
+namespace platform {
+struct Platform;
+}
+
+namespace NANDInfo {
+
+using ListHandler = bool(platform::Platform& platform, std::span<const std::byte> list,
+                         const plist::Value& characteristics, std::string_view className);
+
+// The type of the structured-data logs.
+inline constexpr int kStorageLogType = 176;
+
+// With the write amplification and the legacy counters, as a NAND log; nothing when this run needs
+// no validity list.
+ListHandler DumpValidityList;
+
+// A structured-data log for each channel.
+ListHandler DumpTelemetryList;
+
+// The vendor that a "manufacturer-id" names: its first six bytes but the lowest, in the order in
+// which they are read.
+std::uint64_t vendorCode(platform::Platform& platform, std::string_view identifier);
+
+// A structured-data log for the list, and one for each defect.
+ListHandler DumpDefectsList;
+
+}  // namespace NANDInfo

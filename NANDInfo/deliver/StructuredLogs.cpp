@@ -1,0 +1,208 @@
+#include "NANDInfo/StructuredLogs.h"
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <span>
+#include <vector>
+
+#include "NANDInfo/Collectors.h"
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/collect/WriteAmplification.h"
+#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/deliver/ListHandlers.h"
+#include "NANDInfo/deliver/StructuredLogState.h"
+#include "base/ByteReader.h"
+#include "base/Text.h"
+#include "platform/Platform.h"
+
+namespace NANDInfo {
+
+using platform::Platform;
+
+namespace {
+
+// The lists in the order of their retrieval; each is asked for with the arguments from 0 on.
+struct ListRow {
+  SelectorGetter nand_exporter_t::*slot;
+  std::uint32_t arguments;
+  ListHandler* handler;
+  const char* unsupported;
+};
+
+constexpr ListRow kLists[] = {
+    {&nand_exporter_t::getBandStatsSelectors, 1, DumpValidityList,
+     "Validity list retrieval is not supported\n"},
+    {&nand_exporter_t::getTelemetryListSelectors, 3, DumpTelemetryList,
+     "Telemetry list retrieval is not supported\n"},
+    {&nand_exporter_t::getDefectsListSelectors, 1, DumpDefectsList,
+     "Defects list retrieval is not supported\n"},
+};
+
+struct ListRetrieval {
+  SelectorGetter getSelectors;
+  ListHandler* handler;
+  std::uint32_t argument;
+};
+
+std::vector<ListRetrieval> retrievalsFrom(Platform& platform, const nand_exporter_t& exporter) {
+  std::vector<ListRetrieval> retrievals;
+  for (const ListRow& row : kLists) {
+    const SelectorGetter getter = exporter.*row.slot;
+    if (getter == nullptr) {
+      platform.streams.writeError(row.unsupported);
+      continue;
+    }
+    for (std::uint32_t argument = 0; argument < row.arguments; ++argument) {
+      retrievals.push_back({getter, row.handler, argument});
+    }
+  }
+  return retrievals;
+}
+
+// The flags of a list command; the argument stands in the bits from the third on.
+constexpr std::uint32_t kSizeQuery = 1, kCallersFlag = 2;
+constexpr int kArgumentShift = 2;
+
+std::array<std::byte, 24> commandBlock(std::uint32_t opType, std::uint32_t flags) {
+  std::array<std::byte, 24> block{};
+  for (unsigned i = 0; i < 4; ++i) {
+    block[i] = static_cast<std::byte>(opType >> 8 * i & 0xFF);
+    block[4 + i] = static_cast<std::byte>(flags >> 8 * i & 0xFF);
+  }
+  return block;
+}
+
+struct FreeMemory {
+  void operator()(std::byte* memory) const { std::free(memory); }
+};
+using Pages = std::unique_ptr<std::byte[], FreeMemory>;
+
+// Zeroed memory that begins at a page, as drivers want it for a list; null when it is refused.
+Pages allocatePages(std::size_t size) {
+  constexpr std::size_t kLargestPage = 16384;
+  if (size > kLargestBuffer) return nullptr;
+  const std::size_t rounded = (size + kLargestPage - 1) / kLargestPage * kLargestPage;
+  Pages pages(static_cast<std::byte*>(std::aligned_alloc(kLargestPage, rounded)));
+  if (pages) std::memset(pages.get(), 0, rounded);
+  return pages;
+}
+
+// An open driver whose lists are dumped.
+struct Source {
+  platform::DriverConnection connection;
+  const nand_exporter_t& exporter;
+  const plist::Value& characteristics;
+  std::uint32_t flags;  // of every command
+};
+
+// Fetches one list, `index` in the order of retrieval, and has it handled.
+bool retrieveList(Platform& platform, const Source& source, const ListRetrieval& retrieval,
+                  int index) {
+  const SelectorPair* selectors = retrieval.getSelectors();
+  if (selectors == nullptr) return false;
+  const std::uint32_t flags = source.flags | retrieval.argument << kArgumentShift;
+  std::array<std::byte, 4> announced{};
+  const auto asked = platform.drivers.DrvCallStructMethod(
+      source.connection, source.exporter.sizeSelector,
+      commandBlock(selectors->sizeOpType, flags | kSizeQuery), announced);
+  if (asked.status != 0) {
+    platform.streams.writeError(base::format(
+        "DrvCallStructMethod failed with status 0x%x on selector index %d\n", asked.status, index));
+    return true;
+  }
+  const std::size_t size = base::littleEndian<std::uint32_t>(announced);
+  if (size == 0) return true;
+  const Pages pages = allocatePages(size);
+  if (!pages) {
+    platform.streams.writeError(
+        base::format("Could not malloc %zd bytes", static_cast<std::ptrdiff_t>(size)));
+    return false;
+  }
+  const std::span list(pages.get(), size);
+  const auto fetched =
+      platform.drivers.DrvCallStructMethod(source.connection, source.exporter.dataSelector,
+                                           commandBlock(selectors->dataOpType, flags), list);
+  if (fetched.status != 0) {
+    platform.streams.writeError(base::format(
+        "Could not retrieve data from driver for selector %u\n", selectors->dataOpType));
+    return true;
+  }
+  return retrieval.handler(platform, list, source.characteristics, source.exporter.className);
+}
+
+bool retrieveLists(Platform& platform, const Source& source) {
+  bool handled = true;
+  int index = 0;
+  for (const ListRetrieval& retrieval : retrievalsFrom(platform, source.exporter)) {
+    if (!retrieveList(platform, source, retrieval, index++)) handled = false;
+  }
+  return handled;
+}
+
+// The legacy counters, handed to the user and released; nothing when they can't be had.
+template <typename User>
+void withLegacyCounters(Platform& platform, User use) {
+  LegacyNandInfoCxt context;
+  nand_exporter_t* exporter = nullptr;
+  if (!load_nand_info(platform, exporter, &context)) return;
+  use(context);
+  if (exporter->releaseLegacy != nullptr) exporter->releaseLegacy(&context);
+}
+
+void decideOnValidityList(Platform& platform) {
+  WriteAmplification amplification;
+  withLegacyCounters(platform, [&](const LegacyNandInfoCxt& context) {
+    amplification = writeAmplificationOf(context);
+  });
+  gCurrentUserWamp = amplification.user;
+  gCurrentSysWamp = amplification.intermediate;
+  gNeedValidityList =
+      isHighWriteAmplification(gCurrentUserWamp, platform.preferences.QNSPreferencesGetValue(
+                                                     "userWAmp", "com.norba.NANDInfo")) ||
+      gForceCollectionSet;
+}
+
+}  // namespace
+
+bool DumpStorageStructuredLog(Platform& platform, bool flag) {
+  decideOnValidityList(platform);
+
+  nand_exporter_t* exporter = nullptr;
+  const RegistryHandle service(platform, findNandExporter(platform, exporter));
+  if (service.get() == 0) {
+    platform.streams.writeError("Could not get matching Regmora service for exporting classes\n");
+    return false;
+  }
+  DriverHandle connection(platform, service.get());
+  if (connection.status() != 0 || connection.get() == 0) {
+    platform.streams.writeError("Could not get connection to service\n");
+    return false;
+  }
+  const auto characteristics = platform.registry.searchProperty(
+      service.get(), exporter->propertyKey, platform::DeviceRegistry::Direction::parents);
+  bool handled = false;
+  if (characteristics) {
+    handled = retrieveLists(
+        platform, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0});
+  } else {
+    platform.streams.writeError("failed to create dictionary");
+  }
+  if (connection.close() != 0) {
+    platform.streams.writeError("Could not close connection to service\n");
+  }
+  return handled;
+}
+
+void DumpNANDInfo(Platform& platform, plist::Dictionary& dictionary) {
+  withLegacyCounters(platform, [&](const LegacyNandInfoCxt& context) {
+    for (const auto& [key, value] : buildLegacyNANDInfoDict(platform, context, true)) {
+      dictionary.set(key, value);
+    }
+  });
+}
+
+}  // namespace NANDInfo

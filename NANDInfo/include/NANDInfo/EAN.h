@@ -1,0 +1,31 @@
+// The EAN service's images: which are asked for, and under which key each answer is reported.
+#pragma once
+
+#include <cstdint>
+#include <span>
+
+#include "base/Exported.h"
+
+namespace platform {
+struct Platform;
+}
+
+namespace MORVEND_EXPORTED NANDInfo {
+
+// The size of an image in bytes, and the number of its updates, by its four-character code (the
+// first character in the highest byte). 0 on any failure, with a line in the log.
+std::uint64_t GetEANImageSize(platform::Platform& platform, std::uint32_t code);
+std::uint64_t GetEANUpdateCount(platform::Platform& platform, std::uint32_t code);
+
+inline constexpr char kEANClassName[] = "NorbaNVMeEAN";
+
+struct EANQuery {
+  const char* key;  // of the storage statistics
+  std::uint64_t (*query)(platform::Platform& platform, std::uint32_t code);
+  std::uint32_t code;
+};
+
+// In the order in which the storage statistics ask.
+std::span<const EANQuery> EANQueries();
+
+}  // namespace NANDInfo

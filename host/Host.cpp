@@ -1,0 +1,119 @@
+#include "host/Host.h"
+
+#include <csignal>
+#include <cstdlib>
+
+#include "host/PlayedServices.h"
+#include "host/bus/Bus.h"
+#include "host/files/DeviceFileSystem.h"
+#include "host/outbox/EventSink.h"
+#include "host/outbox/ServitaLogFiles.h"
+#include "host/outbox/StructuredLogFiles.h"
+#include "host/outbox/SubmissionSpool.h"
+#include "host/preferences/PreferenceFiles.h"
+#include "host/process/LibraryLoader.h"
+#include "host/process/RunLockFile.h"
+#include "host/process/StandardErrorLog.h"
+#include "host/process/StandardStreams.h"
+#include "host/recorded/Applications.h"
+#include "host/recorded/DeviceProperties.h"
+#include "host/recorded/DeviceRegistry.h"
+#include "host/recorded/Kernel.h"
+#include "host/recorded/KernelSnapshots.h"
+#include "host/recorded/Locale.h"
+#include "host/recorded/NetworkUsage.h"
+#include "host/recorded/PurgeableSpace.h"
+#include "host/recorded/ReportingChannels.h"
+#include "host/recorded/SystemVersion.h"
+#include "plist/MD5.h"
+#include "plist/PropertyList.h"
+
+namespace host {
+
+HostOptions HostOptions::fromEnvironment() {
+  HostOptions options;
+  if (const char* root = std::getenv("MORVEND_ROOT"); root != nullptr && *root != '\0') {
+    options.root = root;
+  }
+  options.lowestLevel = StandardErrorLog::levelNamed(std::getenv("MORVEND_LOG"));
+  return options;
+}
+
+// In the order of construction: each service stands after those that it uses.
+struct Host::Services {
+  explicit Services(const HostOptions& options)
+      : root(options.root),
+        ownLog(options.lowestLevel),
+        log(options.log != nullptr ? *options.log : ownLog),
+        played(options.played) {}
+
+  void countDamagedDatabase() {
+    preferences.addToInteger("DatabaseCorruptionCount", "com.norba.pellorand", 1);
+  }
+
+  DeviceRoot root;
+  StandardErrorLog ownLog;
+  platform::SystemLog& log;
+  const std::optional<PlayedRun> played;
+  StandardStreams streams;
+  const std::unique_ptr<SystemClock> ownClock =
+      played ? std::make_unique<PlayedClock>(played->now) : std::make_unique<SystemClock>();
+  platform::Clock& clock = *ownClock;
+  DeviceFile propertiesFile{root, log, "device/properties.plist"};
+  DeviceFileSystem files{root, propertiesFile};
+  PreferenceFiles preferences{root, log};
+  recorded::DeviceProperties deviceProperties{root, propertiesFile};
+  LibraryLoader libraries{root, preferences};
+  morvend::DeviceContext context{deviceProperties, files, libraries, log};
+  CounterStore counters{root, clock, log, [this] { return context.homeOfCounters(); },
+                        [this] { countDamagedDatabase(); }};
+  SubmissionSpool submission{root, preferences, clock, log};
+  const std::unique_ptr<StructuredLogFiles> structuredLogs =
+      played ? std::make_unique<PlayedStructuredLogs>(root, clock, log, played->incident)
+             : std::make_unique<StructuredLogFiles>(root, clock, log);
+  ServitaLogFiles servitaLogs{root, log};
+  Bus bus{log};
+  PlayedNotifications playedNotifications;
+  platform::NotificationCenter& notifications =
+      played ? static_cast<platform::NotificationCenter&>(playedNotifications) : bus;
+  EventSink eventSink{root, clock, log};
+  recorded::SystemVersion systemVersion{root, log};
+  const std::unique_ptr<recorded::Kernel> kernel =
+      played ? std::make_unique<PlayedKernel>(root, log, *played)
+             : std::make_unique<recorded::Kernel>(root, log);
+  recorded::KernelSnapshots snapshots{root};
+  recorded::DeviceRegistry registry{root, log};
+  recorded::PurgeableSpace purgeableSpace{root, log};
+  recorded::ReportingChannels reportingChannels{root, log};
+  recorded::Applications applications{root, log};
+  recorded::Locale locale{root, log};
+  RunLockFile runLock{root, log};
+  recorded::NetworkUsage networkUsage{root, log};  // last: its replies use the others
+
+  platform::Platform platform{
+      log,          streams,      clock,         files,      counters,         counters,
+      preferences,  preferences,  preferences,   submission, *structuredLogs,  servitaLogs,
+      bus,          bus,          notifications, eventSink,  deviceProperties, systemVersion,
+      *kernel,      snapshots,    registry,      registry,   purgeableSpace,   reportingChannels,
+      networkUsage, applications, locale,        libraries,  runLock};
+};
+
+Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {
+  // A reader of our output that goes away must not end a run.
+  std::signal(SIGPIPE, SIG_IGN);
+}
+
+Host::~Host() = default;
+
+platform::Platform& Host::platform() { return services_->platform; }
+morvend::DeviceContext& Host::context() { return services_->context; }
+CounterStore& Host::counters() { return services_->counters; }
+const DeviceRoot& Host::root() const { return services_->root; }
+
+std::string Host::unkept() {
+  if (std::string why = services_->preferences.flushAll(); !why.empty()) return why;
+  if (std::string why = services_->submission.unsubmitted(); !why.empty()) return why;
+  return services_->counters.unrecorded();
+}
+
+}  // namespace host

@@ -1,0 +1,49 @@
+// The Linux host: every service of the platform, assembled over one device root.
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "device/DeviceContext.h"
+#include "host/PlayedRun.h"
+#include "host/counters/CounterStore.h"
+#include "host/files/DeviceRoot.h"
+#include "platform/Platform.h"
+
+namespace host {
+
+struct HostOptions {
+  std::string root = "/";  // the device root, a path of the host
+  platform::LogLevel lowestLevel = platform::LogLevel::standard;
+  std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
+  platform::SystemLog* log = nullptr;    // borrowed; instead of the one on standard error
+
+  // As the environment says: MORVEND_ROOT and MORVEND_LOG.
+  static HostOptions fromEnvironment();
+};
+
+class Host {
+ public:
+  explicit Host(const HostOptions& options = HostOptions::fromEnvironment());
+
+  // Waits for a reply of the usage service that has begun, flushes the preferences and writes every
+  // event that was sent.
+  ~Host();
+
+  // The services live as long as the host.
+  platform::Platform& platform();
+  morvend::DeviceContext& context();  // says where the counters lie
+  CounterStore& counters();
+  const DeviceRoot& root() const;
+
+  // Brings the preferences to disk, and tells what couldn't be kept of all that this process was to
+  // keep: one file's path, and why. Empty when everything is kept.
+  std::string unkept();
+
+ private:
+  struct Services;
+  std::unique_ptr<Services> services_;
+};
+
+}  // namespace host

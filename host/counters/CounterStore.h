@@ -1,0 +1,78 @@
+// The counters service and the history store: an SQLite database below the device root.
+#pragma once
+
+#include <mutex>
+#include <span>
+
+#include "host/counters/CounterHistory.h"
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+
+namespace host {
+
+// One thing to be recorded: a scalar set or added to, or a sample pushed. In the key, what can't be
+// written is recorded as U+FFFD.
+struct CounterChange {
+  enum class Kind { set, add, push };
+
+  Kind kind;
+  std::string_view key;
+  std::int32_t day;
+  std::int64_t amount = 0;   // set, add
+  double sample = 0;         // push; not-a-number is refused
+  std::int32_t seconds = 0;  // push: the second within the day
+};
+
+// For any thread; each history for one. Nothing is opened before it is needed.
+class CounterStore : public platform::CountersService, public platform::HistoryStore {
+ public:
+  // `home` yields the device path of the folder that holds the counters' data; while it yields none
+  // there is no database: reads are empty, writes fail. `foundDamaged` is called once for each
+  // database that is found damaged and set aside; it must not use the store.
+  CounterStore(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
+               std::function<std::optional<std::string>()> home,
+               std::function<void()> foundDamaged);
+
+  std::int32_t PLDaysSince1970() override;
+  plist::Date PLDateFromDaysSince1970(std::int32_t day) override;
+
+  // Packs the samples, drops what is older than the newest 60 days up to today that hold rows, and
+  // brings the write-ahead log into the database file. Failures are logged.
+  void PLClientCheckpoint() override;
+
+  // Makes the database one file, as whoever copies it wants it. Returns the empty text or what went
+  // wrong.
+  std::string settle();
+
+  // Failures are logged, the same one once for as long as it lasts.
+  void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
+  void PLClientAddValueForScalarKey(std::string_view key, std::int64_t value) override;
+  // Several in one transaction: each of its own costs a dozen system calls.
+  void PLClientSetValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
+  void PLClientAddValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
+
+  // Why the first of these values that was lost couldn't be recorded; empty when none was.
+  std::string unrecorded();
+
+  // The history lives no longer than the store.
+  std::unique_ptr<platform::PLHistory> initWithDefaultPath() override { return history(); }
+  std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
+
+  // Records all the changes or none. Like the three for one change, it returns the empty text or
+  // what went wrong. Sums saturate.
+  std::string apply(std::span<const CounterChange> changes);
+  std::string set(std::string_view key, std::int64_t value, std::int32_t day);
+  std::string add(std::string_view key, std::int64_t value, std::int32_t day);
+  std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
+
+ private:
+  void record(CounterChange::Kind kind, std::span<const platform::ScalarValue> values);
+
+  CounterPlace place_;
+  platform::Clock& clock_;
+  std::mutex mutex_;  // over what follows
+  CounterDatabase database_;
+  std::string clientError_, unrecorded_;
+};
+
+}  // namespace host

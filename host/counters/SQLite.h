@@ -1,0 +1,186 @@
+// SQLite, thinly: a connection, and the use of one of its prepared statements.
+//
+// A failure stays with its connection: the first is kept, statements made after it do nothing and
+// deliver no row. So a piece of work is written straight down, and whoever gave it the connection
+// asks once, at its end, how it went. A connection that failed is of no further use: closing it
+// takes back what was not committed.
+#pragma once
+
+#include <sqlite3.h>
+
+#include <concepts>
+#include <cstddef>
+#include <cstdint>
+#include <deque>
+#include <string>
+#include <string_view>
+
+namespace host::sqlite {
+
+struct Failure {
+  // damaged: the file is not a sound database. unwritable: it, or what must stand beside it, can't
+  // be written.
+  enum class Kind { none, damaged, unwritable, other };
+
+  Kind kind = Kind::none;
+  std::string text;
+
+  explicit operator bool() const { return kind != Kind::none; }
+};
+
+class Connection {
+ public:
+  // readOnly: leaves the file and its log as they are. immutable: reads the file alone, as it
+  // stands, and needs nothing beside it.
+  enum class Access { readWrite, readOnly, immutable };
+  enum class Checkpoint { passive, truncate };
+
+  // Opens an existing file; a link anywhere in its path is refused. The connection distrusts the
+  // file, and checkpoints only when told to. For one thread.
+  Connection(const std::string& path, Access access);
+  ~Connection();
+  Connection(const Connection&) = delete;
+  Connection& operator=(const Connection&) = delete;
+
+  const Failure& failure() const { return failure_; }
+  void fail(Failure::Kind kind, std::string text);
+
+  // Runs statements that deliver nothing.
+  void execute(const char* sql);
+
+  // True when the header of a file that was opened for writing forbids that. Known once something
+  // has been read.
+  bool headerForbidsWriting() const { return !openedReadOnly_ && readOnly(); }
+  bool inTransaction() const { return sqlite3_get_autocommit(database_) == 0; }
+
+  // Pages in the write-ahead log after the last commit on this connection.
+  int pagesInLog() const { return pagesInLog_; }
+  // Brings the log into the file. `passive` does what it can without waiting for anybody.
+  void checkpoint(Checkpoint mode);
+
+  // Lets the end of this connection, if it is the last to the file, remove what stands beside it.
+  void leaveNothingBeside();
+
+ private:
+  friend class Statement;
+
+  struct Prepared {
+    const char* sql;
+    sqlite3_stmt* statement;
+    bool inUse;
+  };
+
+  Prepared* prepare(const char* sql);
+  void check(int code) {
+    if (code != SQLITE_OK) failWithCode(code);
+  }
+  void failWithCode(int code);
+  int errorOfFiles() const;
+  bool readOnly() const { return sqlite3_db_readonly(database_, "main") == 1; }
+
+  sqlite3* database_ = nullptr;
+  bool openedReadOnly_ = false;
+  std::deque<Prepared> prepared_;
+  int pagesInLog_ = 0;
+  Failure failure_;
+};
+
+// An argument that is bound as data.
+struct Blob {
+  std::string_view bytes;
+};
+
+// A value of a row. The value of another type than it has is not asked for.
+class Column {
+ public:
+  explicit Column(sqlite3_value* value) : value_(value) {}
+
+  bool isInteger() const { return sqlite3_value_type(value_) == SQLITE_INTEGER; }
+  bool isReal() const { return sqlite3_value_type(value_) == SQLITE_FLOAT; }
+  bool isText() const { return sqlite3_value_type(value_) == SQLITE_TEXT; }
+  bool isBlob() const { return sqlite3_value_type(value_) == SQLITE_BLOB; }
+
+  std::int64_t integer() const { return sqlite3_value_int64(value_); }
+  double real() const { return sqlite3_value_double(value_); }
+  // Of a text or a blob. A text is not copied for the sake of a closing NUL.
+  std::string_view bytes() const {
+    const void* start = sqlite3_value_blob(value_);
+    return {static_cast<const char*>(start), static_cast<std::size_t>(sqlite3_value_bytes(value_))};
+  }
+
+ private:
+  sqlite3_value* value_;
+};
+
+// One use of a prepared statement, reset at the end of its scope. The connection keeps the
+// statement for the next use under the address of its text, so that the text must be a constant.
+class Statement {
+ public:
+  // Binds the arguments in order; texts are borrowed for the life of the object.
+  template <typename... Arguments>
+  Statement(Connection& connection, const char* sql, const Arguments&... arguments)
+      : connection_(connection), prepared_(connection.prepare(sql)) {
+    if (prepared_ == nullptr) return;
+    statement_ = prepared_->statement;
+    int index = 0;
+    (connection_.check(bind(++index, arguments)), ...);
+  }
+  ~Statement();
+  Statement(const Statement&) = delete;
+  Statement& operator=(const Statement&) = delete;
+
+  // True while there is a row; not to be called again after false.
+  bool step() {
+    if (statement_ == nullptr) return false;
+    const int code = sqlite3_step(statement_);
+    if (code == SQLITE_ROW) return true;
+    if (code != SQLITE_DONE) connection_.failWithCode(code);
+    return false;
+  }
+  void run() {
+    while (step()) {
+    }
+  }
+
+  // A column of the current row, from 0; borrowed until the next step.
+  Column column(int index) const { return Column(sqlite3_column_value(statement_, index)); }
+
+ private:
+  template <std::integral Integer>
+  int bind(int index, Integer value) {
+    return sqlite3_bind_int64(statement_, index, value);
+  }
+  int bind(int index, double value) { return sqlite3_bind_double(statement_, index, value); }
+  int bind(int index, std::string_view text) {
+    return sqlite3_bind_text64(statement_, index, text.empty() ? "" : text.data(), text.size(),
+                               SQLITE_STATIC, SQLITE_UTF8);
+  }
+  int bind(int index, Blob blob) {
+    return sqlite3_bind_blob64(statement_, index, blob.bytes.data(), blob.bytes.size(),
+                               SQLITE_STATIC);
+  }
+
+  Connection& connection_;
+  Connection::Prepared* prepared_;
+  sqlite3_stmt* statement_ = nullptr;
+};
+
+// A transaction; one that is open already is joined. What isn't committed is taken back at the end
+// of the scope.
+class Transaction {
+ public:
+  enum class Kind { read, write };
+
+  Transaction(Connection& connection, Kind kind);
+  ~Transaction();
+  Transaction(const Transaction&) = delete;
+  Transaction& operator=(const Transaction&) = delete;
+
+  void commit();
+
+ private:
+  Connection& connection_;
+  bool open_;
+};
+
+}  // namespace host::sqlite

@@ -1,0 +1,68 @@
+// The device root: the directory that stands for a device's file system.
+//
+// Every path of the device is resolved below it, ".." and links included, so that nothing outside
+// is read or written: by the kernel where it offers that (openat2), else part by part. Links within
+// the root are followed to what is read, and refused on the way to what is written. Paths are
+// device paths, with or without a leading slash. Nothing here logs: failures come back as error
+// numbers, for the service that knows what they mean to its user.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "base/Result.h"
+#include "host/files/FileDescriptor.h"
+#include "host/files/PathWalk.h"
+
+namespace host {
+
+class DeviceRoot {
+ public:
+  // `path` is a path of the host; a root that isn't there reads as an empty device.
+  explicit DeviceRoot(std::string path);
+
+  const std::string& path() const { return path_; }
+
+  // Why nothing can be had from this root: its path, which is `what`, and the reason. Empty when it
+  // is a folder.
+  std::string problem(const char* what = "the device root") const;
+
+  // Whether this is a recorded device: a root with a folder device/, which alone answers for all
+  // that is not a file of the device. Any other root is this machine. Looked up at each call.
+  bool isRecorded() const;
+
+  // A device path as a path of the host, for who is to find the file.
+  std::string hostPath(std::string_view path) const;
+
+  // The same of a file in a folder, or of the folder if the name is empty, for a line of the log.
+  std::string hostPath(std::string_view folder, std::string_view name) const;
+
+  // Opens a file for reading; links are followed, within the root. The file may be of any kind, and
+  // opening never blocks. On failure the descriptor is empty and errno says why.
+  FileDescriptor openForReading(std::string_view path) const;
+
+  // Opens a file of any kind for its status only: no right to read it is needed. Otherwise as
+  // openForReading.
+  FileDescriptor openForStatus(std::string_view path) const;
+
+  // The bytes of a regular file, at most `maximum` of them. The error is an error number's text.
+  base::Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
+
+  // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700,
+  // but not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay
+  // within the root, as a system's own links from one of its folders to another do. On failure as
+  // openForReading.
+  enum class Missing { fails, create };
+  using Links = host::Links;
+  FileDescriptor openFolder(std::string_view path, Missing missing,
+                            Links links = Links::refused) const;
+
+ private:
+  FileDescriptor open(const std::string& path, int flags, Links links) const;
+
+  std::string path_;
+  FileDescriptor root_;
+  int error_;  // of the root's opening; 0
+};
+
+}  // namespace host

@@ -1,0 +1,120 @@
+#include "host/outbox/SpoolFolder.h"
+
+#include <fcntl.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cstring>
+#include <map>
+#include <tuple>
+
+namespace host {
+
+namespace {
+
+// A log counts for no more than what makes the folder full, so that no sum overflows.
+std::uint64_t counted(const struct stat& status) {
+  return std::min(static_cast<std::uint64_t>(status.st_size), SpoolFolder::kMaximumBytes + 1);
+}
+
+}  // namespace
+
+SpoolFolder::SpoolFolder(const DeviceRoot& root, platform::SystemLog& log)
+    : root_(root),
+      log_(log),
+      folder_(root.openFolder(kPath, DeviceRoot::Missing::create)),
+      error_(folder_ ? 0 : errno),
+      lock_(folder_.get()) {
+  if (error_ == 0) error_ = lookAround();
+}
+
+int SpoolFolder::lookAround() {
+  remove(kUnfinishedLog);
+  remove(kUnfinishedOptions);
+  std::vector<std::string> names;
+  if (const int error = namesInFolder(folder_.get(), names)) return error;
+  const std::string_view suffix = kOptionsSuffix;
+  std::vector<std::pair<std::string, std::uint64_t>> options;  // by the name of their log
+  std::map<std::string, Log> logs;
+  for (std::string& name : names) {
+    struct stat status;
+    const bool regular =
+        ::fstatat(folder_.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 &&
+        S_ISREG(status.st_mode);
+    if (regular && name.ends_with(suffix)) {
+      options.emplace_back(name.substr(0, name.size() - suffix.size()), counted(status));
+    } else if (regular && !name.starts_with('.')) {
+      logs.emplace(name, Log{name, status.st_mtim, counted(status)});
+    }
+    names_.insert(std::move(name));
+  }
+  // Options stand before their log does: without it, the run that wrote them was killed.
+  for (const auto& [name, bytes] : options) {
+    if (const auto log = logs.find(name); log != logs.end()) {
+      log->second.bytes += bytes;
+    } else {
+      remove(name + kOptionsSuffix);
+    }
+  }
+  for (auto& [name, log] : logs) {
+    bytes_ += log.bytes;
+    logs_.push_back(std::move(log));
+  }
+  // Logs of one moment differ by the number in their names.
+  std::sort(logs_.begin(), logs_.end(), [](const Log& a, const Log& b) {
+    const auto time = [](const Log& log) {
+      return std::tie(log.modified.tv_sec, log.modified.tv_nsec);
+    };
+    return time(a) != time(b) ? time(a) > time(b)
+                              : ::strverscmp(a.name.c_str(), b.name.c_str()) > 0;
+  });
+  return 0;
+}
+
+bool SpoolFolder::isFree(const std::string& name) const {
+  return !names_.contains(name) && !names_.contains(name + kOptionsSuffix);
+}
+
+void SpoolFolder::remove(const std::string& name) {
+  if (::unlinkat(folder_.get(), name.c_str(), 0) == 0) names_.erase(name);
+}
+
+void SpoolFolder::makeRoom(std::uint64_t bytes) {
+  while (!logs_.empty() && (logs_.size() + 1 > kMaximumLogs || bytes_ + bytes > kMaximumBytes)) {
+    const Log oldest = std::move(logs_.back());
+    logs_.pop_back();
+    bytes_ -= oldest.bytes;
+    const std::string path = root_.hostPath(kPath, oldest.name);
+    // The log goes first: its options alone are known for a remainder.
+    if (::unlinkat(folder_.get(), oldest.name.c_str(), 0) != 0 && errno != ENOENT) {
+      log_.log(platform::LogLevel::error, "Could not remove %s: %s", path.c_str(),
+               errorText(errno));
+      continue;
+    }
+    names_.erase(oldest.name);
+    remove(oldest.name + kOptionsSuffix);
+    log_.log(platform::LogLevel::standard, "Removed %s, the oldest log: the spool is full",
+             path.c_str());
+  }
+}
+
+int SpoolFolder::place(const std::string& stem, const std::string& extension, std::uint64_t bytes,
+                       const Put& put) {
+  if (bytes > kMaximumBytes) return EFBIG;
+  makeRoom(bytes);
+  for (int number = 1;; ++number) {
+    std::string name = stem;
+    if (number > 1) name.append("-").append(std::to_string(number));
+    name += extension;
+    if (!isFree(name)) continue;
+    const int error = put(name);
+    if (error == EEXIST) continue;
+    if (error != 0) return error;
+    names_.insert(name);
+    logs_.insert(logs_.begin(), Log{name, {}, bytes});
+    bytes_ += bytes;
+    return 0;
+  }
+}
+
+}  // namespace host

@@ -1,0 +1,77 @@
+// The folder of submitted logs, var/spool/morvend/submitted, as one process has it to itself:
+// opened under its lock, cleared of what a killed run left, with its contents known.
+//
+// A log is a regular file; its options, if any, lie beside it under its name and kOptionsSuffix,
+// and come and go with it. Functions that write return 0 or an error number.
+#pragma once
+
+#include <sys/stat.h>
+
+#include <cstdint>
+#include <functional>
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "host/files/DeviceRoot.h"
+#include "host/files/Files.h"
+#include "platform/SystemLog.h"
+
+namespace host {
+
+class SpoolFolder {
+ public:
+  static constexpr char kPath[] = "/var/spool/morvend/submitted";
+  static constexpr char kOptionsSuffix[] = ".options.plist";
+
+  // What the folder may hold. Options count for the bytes.
+  static constexpr std::size_t kMaximumLogs = 1000;
+  static constexpr std::uint64_t kMaximumBytes = std::uint64_t{64} << 20;
+
+  // Files that aren't logs yet are kept under these names.
+  static constexpr char kUnfinishedLog[] = ".log.new";
+  static constexpr char kUnfinishedOptions[] = ".options.new";
+
+  // Opens the folder, made when it is missing, waiting for its lock. Both are borrowed. error() is
+  // to be asked before anything else.
+  SpoolFolder(const DeviceRoot& root, platform::SystemLog& log);
+
+  // 0, or why the folder can't be used.
+  int error() const { return error_; }
+
+  int descriptor() const { return folder_.get(); }
+
+  // Gives a new log of this size a name: `stem`, with "-2", "-3", … where the log's or its options'
+  // name is taken, and `extension`. The oldest logs make room first, each with a line in the log.
+  // `put` moves the files in, synchronises the folder and returns 0 or an error number; EEXIST asks
+  // for the next name.
+  using Put = std::function<int(const std::string& name)>;
+  int place(const std::string& stem, const std::string& extension, std::uint64_t bytes,
+            const Put& put);
+
+  // Removes what stands under a name, if anything does.
+  void remove(const std::string& name);
+
+ private:
+  struct Log {
+    std::string name;
+    timespec modified;
+    std::uint64_t bytes;
+  };
+
+  int lookAround();
+  void makeRoom(std::uint64_t bytes);
+  bool isFree(const std::string& name) const;
+
+  const DeviceRoot& root_;
+  platform::SystemLog& log_;
+  const FileDescriptor folder_;
+  int error_;
+  const FileLock lock_;
+  std::set<std::string> names_;
+  std::vector<Log> logs_;  // newest first
+  std::uint64_t bytes_ = 0;
+};
+
+}  // namespace host

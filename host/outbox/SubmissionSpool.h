@@ -1,0 +1,48 @@
+// Log submission into a spool folder: var/spool/morvend/submitted/<log name>.<log type>.<time>,
+// with the options beside it (see SpoolFolder). Consent is the user's preference
+// "DiagnosticLogSubmissionEnabled".
+#pragma once
+
+#include <string>
+
+#include "host/files/DeviceRoot.h"
+#include "platform/Clock.h"
+#include "platform/LogSubmission.h"
+#include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
+#include "plist/PropertyList.h"
+
+namespace host {
+
+class SpoolFolder;
+
+class SubmissionSpool final : public platform::LogSubmission {
+ public:
+  // All are borrowed.
+  SubmissionSpool(const DeviceRoot& root, platform::PreferenceStore& preferences,
+                  platform::Clock& clock, platform::SystemLog& log)
+      : root_(root), preferences_(preferences), clock_(clock), log_(log) {}
+
+  bool DiagnosticLogSubmissionEnabled() override;
+
+  // The spool is locked while the writer writes: it must not submit a log itself. Type and name
+  // must be fit for a file's name, and the name not begin with "."; a log larger than the spool
+  // fails. A failure is logged, with its reason.
+  bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
+                                const plist::Dictionary* options, const Writer& writer) override;
+
+  // The path of the first log that couldn't be submitted, and why; empty when there is none.
+  const std::string& unsubmitted() const { return unsubmitted_; }
+
+ private:
+  static int submit(SpoolFolder& spool, const std::string& stem, const std::string* options,
+                    const Writer& writer);
+
+  const DeviceRoot& root_;
+  platform::PreferenceStore& preferences_;
+  platform::Clock& clock_;
+  platform::SystemLog& log_;
+  std::string unsubmitted_;
+};
+
+}  // namespace host

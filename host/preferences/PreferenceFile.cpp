@@ -1,0 +1,157 @@
+#include "host/preferences/PreferenceFile.h"
+
+#include <fcntl.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <limits>
+
+#include "base/Text.h"
+#include "host/files/Files.h"
+#include "plist/PropertyList.h"
+
+namespace host {
+
+namespace {
+
+bool sameFile(const struct stat& a, const struct stat& b) {
+  return a.st_dev == b.st_dev && a.st_ino == b.st_ino && a.st_size == b.st_size &&
+         a.st_mtim.tv_sec == b.st_mtim.tv_sec && a.st_mtim.tv_nsec == b.st_mtim.tv_nsec;
+}
+
+std::int64_t saturatingSum(std::int64_t a, std::int64_t b) {
+  std::int64_t sum = 0;
+  if (!__builtin_add_overflow(a, b, &sum)) return sum;
+  using Limits = std::numeric_limits<std::int64_t>;
+  return b > 0 ? Limits::max() : Limits::min();
+}
+
+}  // namespace
+
+PreferenceFile::PreferenceFile(const DeviceRoot& root, platform::SystemLog& log,
+                               std::string_view user, std::string_view domain)
+    : root_(root),
+      log_(log),
+      folder_("/var/preferences/" + std::string(user)),
+      name_(std::string(domain) + ".plist") {}
+
+std::optional<plist::Value> PreferenceFile::value(std::string_view key) {
+  if (const plist::Value* value = set_.find(key)) return *value;
+  if (removed_.contains(key)) return std::nullopt;
+  load(false);
+  const plist::Value* value = stored_.find(key);
+  return value != nullptr ? std::optional(*value) : std::nullopt;
+}
+
+void PreferenceFile::change(std::string_view key, const plist::Value* value) {
+  if (value != nullptr) {
+    removed_.erase(std::string(key));
+    set_.set(key, *value);
+  } else {
+    set_.remove(key);
+    removed_.emplace(key);
+  }
+}
+
+void PreferenceFile::flush() {
+  if (!set_.empty() || !removed_.empty()) write(nullptr);
+}
+
+std::string PreferenceFile::unwritten() const {
+  return writeError_.empty() ? "" : path() + ": " + writeError_;
+}
+
+void PreferenceFile::add(std::string_view key, std::int64_t delta) {
+  write([key, delta](plist::Dictionary& values) {
+    const plist::Number* number = values.number(key);
+    values.set(key, saturatingSum(number != nullptr ? number->int64Value() : 0, delta));
+  });
+}
+
+// Reading
+
+void PreferenceFile::load(bool evenIfUnchanged) {
+  const FileDescriptor file = root_.openForReading(folder_ + "/" + name_);
+  struct stat status;
+  if (!file || ::fstat(file.get(), &status) != 0) {
+    if (errno == ENXIO) return fail(State::broken, errorText(EINVAL));  // a socket
+    if (errno != ENOENT) return fail(State::unreadable, errorText(errno));
+    state_ = State::absent;
+    stored_ = {};
+    return;
+  }
+  const bool known =
+      (state_ == State::whole || state_ == State::broken) && sameFile(status, status_);
+  if (known && !evenIfUnchanged) return;
+  if (!known) readError_.clear();
+  status_ = status;
+  if (!S_ISREG(status.st_mode)) return fail(State::broken, errorText(EINVAL));
+  if (static_cast<std::size_t>(status_.st_size) > plist::kMaxSize) {
+    return fail(State::broken, "larger than 16 MiB");
+  }
+  const auto bytes = readRegularFile(file.get(), plist::kMaxSize);
+  if (!bytes) return fail(State::unreadable, bytes.error);
+  auto value = plist::read(*bytes);
+  if (!value) return fail(State::broken, value.error);
+  auto* dictionary = value->as<plist::Dictionary>();
+  if (dictionary == nullptr) return fail(State::broken, "the top level is not a dictionary");
+  state_ = State::whole;
+  stored_ = std::move(*dictionary);
+}
+
+void PreferenceFile::fail(State state, const std::string& why) {
+  state_ = state;
+  stored_ = {};
+  if (why == readError_) return;
+  readError_ = why;
+  log_.log(platform::LogLevel::error, "Could not read %s: %s; it reads as empty%s", path().c_str(),
+           why.c_str(),
+           state == State::broken ? " and is kept as .corrupt when it is replaced" : "");
+}
+
+// Writing
+
+void PreferenceFile::write(const Edit& edit) {
+  const std::string error = merge(edit);
+  if (error.empty()) {
+    set_ = {};
+    removed_.clear();
+  } else if (error != writeError_) {
+    log_.log(platform::LogLevel::error, "Could not write %s: %s", path().c_str(), error.c_str());
+  }
+  writeError_ = error;
+}
+
+// Empty, or why the changes aren't in the file.
+std::string PreferenceFile::merge(const Edit& edit) {
+  const bool adds = edit != nullptr || !set_.empty();
+  const FileDescriptor folder =
+      root_.openFolder(folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
+  if (!folder) return errno == ENOENT && !adds ? "" : errorText(errno);
+  const FileLock lock(folder.get());
+  if (isLink(folder.get(), name_)) return errorText(EINVAL);
+  // Another process's writing may leave all that is compared as it was.
+  load(true);
+  if (state_ == State::unreadable) return readError_;
+
+  plist::Dictionary merged = stored_;
+  for (const std::string& key : removed_) merged.remove(key);
+  for (const plist::Dictionary::Entry& entry : set_) merged.set(entry.key, entry.value);
+  if (edit != nullptr) edit(merged);
+  // Compared as they are written: values of two types may be equal.
+  const auto before = plist::writeXML(stored_);
+  const auto after = plist::writeXML(std::move(merged));
+  if (!after) return after.error;
+  if (before && *before == *after) return {};
+  if (after->size() > plist::kMaxSize) return "it would be larger than 16 MiB";
+
+  const std::string kept = name_ + ".corrupt";
+  if (state_ == State::broken &&
+      ::renameat(folder.get(), name_.c_str(), folder.get(), kept.c_str()) != 0) {
+    return base::format("it can't be kept as .corrupt: %s", errorText(errno));
+  }
+  const int error = replaceFile(folder.get(), name_, *after);
+  return error == 0 ? "" : errorText(error);
+}
+
+}  // namespace host

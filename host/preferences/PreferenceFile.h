@@ -1,0 +1,76 @@
+// One preference file: a domain of a user, var/preferences/<user>/<domain>.plist, and the changes
+// that this process has yet to write to it.
+//
+// Reads see what other processes have written, and this process's changes before they are. Writing
+// merges under a lock on the user's folder: the file is read again and only the changed keys are
+// replaced. A file that can't be understood reads as empty and is kept as <domain>.plist.corrupt
+// before it is replaced. Links within the root are followed to what is read and refused where the
+// file would be replaced. Failures are logged here: a state of the file, or a reason why it can't
+// be written, once for as long as it lasts. Not thread-safe.
+#pragma once
+
+#include <sys/stat.h>
+
+#include <cstdint>
+#include <functional>
+#include <optional>
+#include <set>
+#include <string>
+#include <string_view>
+
+#include "host/files/DeviceRoot.h"
+#include "platform/SystemLog.h"
+#include "plist/PropertyList.h"
+
+namespace host {
+
+class PreferenceFile {
+ public:
+  // Both names are plain file names, with room for what is appended to them; the rest is borrowed.
+  PreferenceFile(const DeviceRoot& root, platform::SystemLog& log, std::string_view user,
+                 std::string_view domain);
+
+  std::optional<plist::Value> value(std::string_view key);
+
+  // Sets a key, or removes it (null); to be written by the next flush.
+  void change(std::string_view key, const plist::Value* value);
+
+  // Brings the changes to the file. What couldn't be written stays a change.
+  void flush();
+
+  // Why the last change or addition isn't in the file, the file's path first; empty when all are.
+  std::string unwritten() const;
+
+  // Flushes, and adds to an integer in the same write: no process's addition is lost. A value that
+  // is missing or not a number counts as 0; the sum saturates. An addition that can't be written is
+  // lost.
+  void add(std::string_view key, std::int64_t delta);
+
+ private:
+  enum class State { absent, whole, broken, unreadable };
+  using Edit = std::function<void(plist::Dictionary& values)>;
+
+  void load(bool evenIfUnchanged);
+  void fail(State state, const std::string& why);
+  void write(const Edit& edit);
+  std::string merge(const Edit& edit);
+  std::string path() const { return root_.hostPath(folder_, name_); }
+
+  const DeviceRoot& root_;
+  platform::SystemLog& log_;
+  const std::string folder_;
+  const std::string name_;
+
+  // What was last read, and the status of the file that it was read from.
+  State state_ = State::absent;
+  struct stat status_ {};
+  plist::Dictionary stored_;
+
+  plist::Dictionary set_;
+  std::set<std::string, std::less<>> removed_;
+
+  std::string readError_;
+  std::string writeError_;
+};
+
+}  // namespace host

@@ -1,0 +1,115 @@
+#include "host/preferences/PreferenceFiles.h"
+
+#include <tuple>
+
+#include "host/files/Files.h"
+
+namespace host {
+
+namespace {
+
+constexpr std::string_view kSystemUser = "mobile";
+constexpr std::string_view kAnalyticsUser = "__quenset__";
+constexpr std::string_view kAnalyticsDomain = "com.norba.Varnhollow";
+
+constexpr std::size_t kLongestDomain = kLongestFileName - std::string_view(".plist.corrupt").size();
+
+}  // namespace
+
+PreferenceFiles::~PreferenceFiles() { flushAll(); }
+
+std::string PreferenceFiles::flushAll() {
+  const std::scoped_lock lock(mutex_);
+  std::string unwritten;
+  for (auto& [name, file] : files_) {
+    file.flush();
+    if (unwritten.empty()) unwritten = file.unwritten();
+  }
+  return unwritten;
+}
+
+// The file of a domain, or null when there can't be one. The mutex is held.
+PreferenceFile* PreferenceFiles::file(std::string_view user, std::string_view domain) {
+  std::string name = std::string(user) + "/" + std::string(domain);
+  if (const auto known = files_.find(name); known != files_.end()) return &known->second;
+  if (!isPlainFileName(user, kLongestFileName) || !isPlainFileName(domain, kLongestDomain)) {
+    log_.log(platform::LogLevel::error,
+             "Refused preferences of user \"%s\", domain \"%s\": not a file name",
+             shownText(user).c_str(), shownText(domain).c_str());
+    return nullptr;
+  }
+  return &files_
+              .emplace(std::piecewise_construct, std::forward_as_tuple(std::move(name)),
+                       std::forward_as_tuple(root_, log_, user, domain))
+              .first->second;
+}
+
+std::optional<plist::Value> PreferenceFiles::get(std::string_view user, std::string_view domain,
+                                                 std::string_view key) {
+  const std::scoped_lock lock(mutex_);
+  PreferenceFile* known = file(user, domain);
+  return known != nullptr ? known->value(key) : std::nullopt;
+}
+
+void PreferenceFiles::set(std::string_view user, std::string_view domain, std::string_view key,
+                          const plist::Value* value, bool synchronize) {
+  const std::scoped_lock lock(mutex_);
+  PreferenceFile* known = file(user, domain);
+  if (known == nullptr) return;
+  known->change(key, value);
+  if (synchronize) known->flush();
+}
+
+void PreferenceFiles::addToInteger(std::string_view key, std::string_view domain,
+                                   std::int64_t delta) {
+  const std::scoped_lock lock(mutex_);
+  if (PreferenceFile* known = file(kSystemUser, domain)) known->add(key, delta);
+}
+
+std::optional<plist::Value> PreferenceFiles::QNSPreferencesGetValue(std::string_view key,
+                                                                    std::string_view domain) {
+  return get(kSystemUser, domain, key);
+}
+
+void PreferenceFiles::QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
+                                             std::string_view domain) {
+  set(kSystemUser, domain, key, value, false);
+}
+
+void PreferenceFiles::QNSPreferencesSynchronize(std::string_view domain) {
+  const std::scoped_lock lock(mutex_);
+  if (PreferenceFile* known = file(kSystemUser, domain)) known->flush();
+}
+
+std::optional<plist::Value> PreferenceFiles::getPreference(std::string_view key,
+                                                           std::string_view domain) {
+  return get(kAnalyticsUser, domain, key);
+}
+
+void PreferenceFiles::setPreference(std::string_view key, const plist::Value* value,
+                                    std::string_view domain, bool synchronize) {
+  set(kAnalyticsUser, domain, key, value, synchronize);
+}
+
+std::vector<std::string> PreferenceFiles::logBlocklist() {
+  const auto value = get(kAnalyticsUser, kAnalyticsDomain, "LogBlocklist");
+  const plist::Array* list = value ? value->as<plist::Array>() : nullptr;
+  std::vector<std::string> bugTypes;
+  if (list == nullptr) return bugTypes;
+  for (const plist::Value& element : *list) {
+    if (const auto* text = element.as<std::string>()) bugTypes.push_back(*text);
+  }
+  return bugTypes;
+}
+
+void PreferenceFiles::setPreference(std::string_view key, std::string_view user,
+                                    std::string_view domain, const plist::Value* value) {
+  set(user, domain, key, value, true);
+}
+
+void PreferenceFiles::deletePreference(std::string_view key, std::string_view user,
+                                       std::string_view domain) {
+  set(user, domain, key, nullptr, true);
+}
+
+}  // namespace host

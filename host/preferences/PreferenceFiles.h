@@ -1,0 +1,67 @@
+// The preference services over files, one for each domain of a user (see PreferenceFile). The
+// system's own preferences are those of user "mobile", the analytics configuration's those of user
+// "__quenset__".
+//
+// A user or domain that can't be a plain file name is refused with an error line. Thread-safe.
+#pragma once
+
+#include <map>
+#include <mutex>
+#include <string>
+
+#include "host/preferences/PreferenceFile.h"
+#include "platform/PreferenceStore.h"
+
+namespace host {
+
+class PreferenceFiles final : public platform::PreferenceStore,
+                              public platform::AnalyticsConfiguration,
+                              public platform::PrivilegedPreferences {
+ public:
+  // All are borrowed.
+  PreferenceFiles(const DeviceRoot& root, platform::SystemLog& log) : root_(root), log_(log) {}
+
+  // Flushes everything.
+  ~PreferenceFiles() override;
+
+  // Writes what is not yet in the files; every domain is tried. Returns the empty text, or the path
+  // of a file that couldn't be written, and why.
+  std::string flushAll();
+
+  // Adds to an integer of user "mobile", at once and atomically: see PreferenceFile::add.
+  void addToInteger(std::string_view key, std::string_view domain, std::int64_t delta);
+
+  // PreferenceStore
+  std::optional<plist::Value> QNSPreferencesGetValue(std::string_view key,
+                                                     std::string_view domain) override;
+  void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
+                              std::string_view domain) override;
+  void QNSPreferencesSynchronize(std::string_view domain) override;
+
+  // AnalyticsConfiguration
+  std::optional<plist::Value> getPreference(std::string_view key, std::string_view domain) override;
+  void setPreference(std::string_view key, const plist::Value* value, std::string_view domain,
+                     bool synchronize) override;
+  std::vector<std::string> logBlocklist() override;
+
+  // PrivilegedPreferences. Both write at once: the user's own processes shall see the change, and
+  // the interface has no later moment to ask for it.
+  void setPreference(std::string_view key, std::string_view user, std::string_view domain,
+                     const plist::Value* value) override;
+  void deletePreference(std::string_view key, std::string_view user,
+                        std::string_view domain) override;
+
+ private:
+  PreferenceFile* file(std::string_view user, std::string_view domain);
+  std::optional<plist::Value> get(std::string_view user, std::string_view domain,
+                                  std::string_view key);
+  void set(std::string_view user, std::string_view domain, std::string_view key,
+           const plist::Value* value, bool synchronize);
+
+  const DeviceRoot& root_;
+  platform::SystemLog& log_;
+  std::mutex mutex_;
+  std::map<std::string, PreferenceFile, std::less<>> files_;  // by "<user>/<domain>"
+};
+
+}  // namespace host

@@ -1,0 +1,54 @@
+#include "host/process/StandardErrorLog.h"
+
+#include <string>
+
+#include "host/files/Files.h"
+
+namespace host {
+
+namespace {
+
+constexpr struct {
+  platform::LogLevel level;
+  std::string_view name, prefix;
+} kLevels[] = {
+    {platform::LogLevel::debug, "debug", "<7>"},
+    {platform::LogLevel::info, "info", "<6>"},
+    {platform::LogLevel::standard, "default", "<5>"},
+    {platform::LogLevel::error, "error", "<3>"},
+};
+
+std::string_view prefixOf(platform::LogLevel level) {
+  for (const auto& row : kLevels) {
+    if (row.level == level) return row.prefix;
+  }
+  return {};
+}
+
+}  // namespace
+
+StandardErrorLog::StandardErrorLog(platform::LogLevel lowest, int file)
+    : platform::SystemLog(lowest), file_(file), terminal_(::isatty(file) == 1) {}
+
+platform::LogLevel StandardErrorLog::levelNamed(const char* name) {
+  for (const auto& row : kLevels) {
+    if (name != nullptr && row.name == name) return row.level;
+  }
+  return platform::LogLevel::standard;
+}
+
+void StandardErrorLog::write(platform::LogLevel level, std::string_view message) {
+  if (message.ends_with('\n')) message.remove_suffix(1);
+  const std::string_view prefix = terminal_ ? std::string_view() : prefixOf(level);
+  std::string text;
+  text.reserve(message.size() + prefix.size() + 1);
+  while (true) {
+    const std::size_t end = message.find('\n');
+    text.append(prefix).append(message.substr(0, end)).push_back('\n');
+    if (end == message.npos) break;
+    message.remove_prefix(end + 1);
+  }
+  writeAll(file_, text);
+}
+
+}  // namespace host

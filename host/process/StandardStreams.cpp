@@ -1,0 +1,19 @@
+#include "host/process/StandardStreams.h"
+
+#include <unistd.h>
+
+#include <string>
+
+#include "host/files/Files.h"
+
+namespace host {
+
+void StandardStreams::writeError(std::string_view text) {
+  std::string line(text);
+  if (!line.ends_with('\n')) line += '\n';
+  writeAll(STDERR_FILENO, line);
+}
+
+void StandardStreams::writeOutput(std::string_view text) { writeAll(STDOUT_FILENO, text); }
+
+}  // namespace host

@@ -1,0 +1,16 @@
+#include "host/recorded/Applications.h"
+
+namespace host::recorded {
+
+void Applications::enumerateBundles(const std::function<void(BundleType type)>& handler) {
+  const plist::Array* bundles = file_.array();
+  if (bundles == nullptr) return;
+  for (const plist::Value& element : *bundles) {
+    const auto* bundle = element.as<plist::Dictionary>();
+    if (bundle == nullptr) continue;
+    const std::string* type = bundle->text("Type");
+    handler(type != nullptr && *type == "User" ? BundleType::user : BundleType::system);
+  }
+}
+
+}  // namespace host::recorded

@@ -1,0 +1,157 @@
+#include "host/recorded/DeviceRegistry.h"
+
+#include <algorithm>
+
+namespace host::recorded {
+
+namespace {
+
+bool conforms(const plist::Dictionary& content, std::string_view className) {
+  const std::string* ownClass = content.text("Class");
+  if (ownClass != nullptr && *ownClass == className) return true;
+  const plist::Array* others = content.array("Conforms");
+  return others != nullptr && std::ranges::any_of(*others, [&](const plist::Value& other) {
+           const auto* name = other.as<std::string>();
+           return name != nullptr && *name == className;
+         });
+}
+
+bool isRegistered(const plist::Dictionary& content) {
+  const plist::Number* registered = content.number("Registered");
+  return registered == nullptr || registered->boolValue();
+}
+
+const plist::Value* property(const plist::Dictionary& content, std::string_view key) {
+  const plist::Dictionary* properties = content.dictionary("Properties");
+  return properties != nullptr ? properties->find(key) : nullptr;
+}
+
+}  // namespace
+
+DeviceRegistry::~DeviceRegistry() {
+  if (handles_.empty()) return;
+  log_.log(platform::LogLevel::error, "%zu driver handles were not released", handles_.size());
+}
+
+const std::vector<DeviceRegistry::Entry>& DeviceRegistry::entries() {
+  if (!isRead_) {
+    isRead_ = true;
+    if (const plist::Dictionary* root = file_.dictionary()) add(*root, 0);
+  }
+  return entries_;
+}
+
+// No deeper than the property list, whose depth is limited.
+void DeviceRegistry::add(const plist::Dictionary& content, std::size_t parent) {
+  const std::size_t place = entries_.size();
+  entries_.push_back({content, parent, 0});
+  if (const plist::Array* children = content.array("Children")) {
+    for (const plist::Value& child : *children) {
+      if (const auto* entry = child.as<plist::Dictionary>()) add(*entry, place);
+    }
+  }
+  entries_[place].end = entries_.size();
+}
+
+std::uint32_t DeviceRegistry::handOut(Kind kind, std::size_t place) {
+  do {
+    ++lastHandle_;
+  } while (lastHandle_ == 0 || !handles_.try_emplace(lastHandle_, Handle{kind, place}).second);
+  return lastHandle_;
+}
+
+DeviceRegistry::Handle* DeviceRegistry::held(std::uint32_t handle, Kind kind) {
+  const auto found = handles_.find(handle);
+  return found != handles_.end() && found->second.kind == kind ? &found->second : nullptr;
+}
+
+platform::RegistryObject DeviceRegistry::DrvGetMatchingService(std::string_view className) {
+  for (std::size_t place = 1; place < entries().size(); ++place) {
+    const plist::Dictionary& content = entries_[place].content;
+    if (isRegistered(content) && conforms(content, className)) return handOut(Kind::entry, place);
+  }
+  return 0;
+}
+
+platform::RegistryObject DeviceRegistry::rootEntry() {
+  return entries().empty() ? 0 : handOut(Kind::entry, 0);
+}
+
+platform::RegistryObject DeviceRegistry::createIterator() {
+  return entries().empty() ? 0 : handOut(Kind::iterator, 1);
+}
+
+platform::RegistryObject DeviceRegistry::next(platform::RegistryObject iterator) {
+  Handle* handle = held(iterator, Kind::iterator);
+  if (handle == nullptr || handle->place >= entries_.size()) return 0;
+  return handOut(Kind::entry, handle->place++);
+}
+
+bool DeviceRegistry::conformsTo(platform::RegistryObject entry, std::string_view className) {
+  const Handle* handle = held(entry, Kind::entry);
+  return handle != nullptr && conforms(entries_[handle->place].content, className);
+}
+
+std::optional<plist::Value> DeviceRegistry::searchProperty(platform::RegistryObject entry,
+                                                           std::string_view key,
+                                                           Direction direction) {
+  const Handle* handle = held(entry, Kind::entry);
+  if (handle == nullptr) return std::nullopt;
+  const Entry& start = entries_[handle->place];
+  for (std::size_t place = handle->place;;) {
+    if (const plist::Value* found = property(entries_[place].content, key)) return *found;
+    const std::size_t after = direction == Direction::parents ? entries_[place].parent : place + 1;
+    if (after == place || after == start.end) return std::nullopt;
+    place = after;
+  }
+}
+
+void DeviceRegistry::release(platform::RegistryObject object) {
+  if (held(object, Kind::connection) == nullptr) handles_.erase(object);
+}
+
+std::optional<SimulatedDriver> DeviceRegistry::driverAt(std::size_t place) {
+  const plist::Dictionary* answers = entries_[place].content.dictionary("Driver");
+  return answers != nullptr ? std::optional<SimulatedDriver>(std::in_place, *answers, files_)
+                            : std::nullopt;
+}
+
+std::optional<SimulatedDriver> DeviceRegistry::driverOf(platform::DriverConnection connection) {
+  const Handle* handle = held(connection, Kind::connection);
+  return handle != nullptr ? driverAt(handle->place) : std::nullopt;
+}
+
+platform::DriverConnections::OpenResult DeviceRegistry::DrvServiceOpen(
+    platform::RegistryObject service, std::uint32_t) {
+  const Handle* handle = held(service, Kind::entry);
+  if (handle == nullptr) return {kDriverFailed, 0};
+  const std::size_t place = handle->place;
+  const auto driver = driverAt(place);
+  if (!driver || driver->refusesOpen()) return {kDriverFailed, 0};
+  return {0, handOut(Kind::connection, place)};
+}
+
+platform::DriverStatus DeviceRegistry::DrvServiceClose(platform::DriverConnection connection) {
+  const auto driver = driverOf(connection);
+  if (!driver) return kDriverFailed;
+  handles_.erase(connection);
+  return driver->failsClose() ? kDriverFailed : 0;
+}
+
+platform::DriverConnections::CallResult DeviceRegistry::DrvCallStructMethod(
+    platform::DriverConnection connection, std::uint32_t method, std::span<const std::byte> input,
+    std::span<std::byte> output) {
+  const auto driver = driverOf(connection);
+  if (!driver) return {kDriverFailed, 0};
+  return driver->callStructMethod(method, input, output);
+}
+
+platform::DriverStatus DeviceRegistry::DrvCallMethod(platform::DriverConnection connection,
+                                                     std::uint32_t method,
+                                                     std::span<const std::uint64_t> input,
+                                                     std::span<std::uint64_t> output) {
+  const auto driver = driverOf(connection);
+  return driver ? driver->callScalarMethod(method, input, output) : kDriverFailed;
+}
+
+}  // namespace host::recorded

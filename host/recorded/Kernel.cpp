@@ -1,0 +1,174 @@
+#include "host/recorded/Kernel.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <sys/sysinfo.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstring>
+#include <ctime>
+#include <memory>
+#include <vector>
+
+#include "base/Text.h"
+#include "host/files/Files.h"
+
+namespace host::recorded {
+
+namespace {
+
+constexpr char kEventsFolder[] = "device/ecc-events";
+constexpr char kRejected[] = "rejected";
+constexpr std::size_t kEventSize = 72;  // at most
+constexpr std::size_t kSwapUsageSize = 32;
+
+platform::Kernel::ReadResult failure(int error) { return {error, 0}; }
+
+platform::Kernel::ReadResult deliver(const void* bytes, std::size_t length,
+                                     std::span<std::byte> buffer) {
+  if (length > buffer.size()) return failure(ENOMEM);
+  if (length > 0) std::memcpy(buffer.data(), bytes, length);
+  return {0, length};
+}
+
+platform::Kernel::ReadResult deliverText(const std::string& text, std::span<std::byte> buffer) {
+  return deliver(text.c_str(), text.size() + 1, buffer);
+}
+
+platform::Kernel::ReadResult deliverInteger(std::uint64_t value, std::span<std::byte> buffer) {
+  std::array<std::byte, 8> bytes;
+  for (std::size_t i = 0; i < bytes.size(); ++i)
+    bytes[i] = static_cast<std::byte>(value >> (8 * i));
+  return deliver(bytes.data(), std::min(bytes.size(), buffer.size()), buffer);
+}
+
+platform::Kernel::ReadResult deliverValue(const plist::Value& value, std::span<std::byte> buffer) {
+  if (const auto* number = value.as<plist::Number>())
+    return deliverInteger(number->uint64Value(), buffer);
+  if (const auto* data = value.as<plist::Data>())
+    return deliver(data->data(), data->size(), buffer);
+  if (const auto* text = value.as<std::string>()) return deliverText(*text, buffer);
+  const auto* dictionary = value.as<plist::Dictionary>();
+  const plist::Number* error = dictionary != nullptr ? dictionary->number("Error") : nullptr;
+  const std::int64_t code = error != nullptr ? error->int64Value() : 0;
+  return failure(code > 0 && code <= INT32_MAX ? static_cast<int>(code) : EIO);
+}
+
+platform::Kernel::ReadResult bootSession(std::span<std::byte> buffer) {
+  const FileDescriptor file(::open("/proc/sys/kernel/random/boot_id", O_RDONLY | O_CLOEXEC));
+  std::string text(36, '\0');
+  if (!file || ::read(file.get(), text.data(), text.size()) != ssize_t{36}) return failure(ENOENT);
+  for (char& c : text) {
+    if (c >= 'a' && c <= 'f') c = static_cast<char>(c - 'a' + 'A');
+  }
+  return deliverText(text, buffer);
+}
+
+platform::Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
+  struct sysinfo host;
+  if (::sysinfo(&host) != 0) return failure(errno);
+  std::array<std::byte, kSwapUsageSize> record{};
+  deliverInteger(std::uint64_t{host.totalswap} * host.mem_unit, record);
+  // A caller that has no room for the record gets its first field.
+  return deliver(record.data(), buffer.size() < record.size() ? 8 : record.size(), buffer);
+}
+
+// Moves a file of the folder to its rejected ones, under a name that is free. 0 or an error number.
+int reject(int folder, const std::string& name) {
+  if (::mkdirat(folder, kRejected, 0700) != 0 && errno != EEXIST) return errno;
+  const FileDescriptor rejected(
+      ::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!rejected) return errno;
+  for (int number = 1;; ++number) {
+    const std::string to = number == 1 ? name : name + "-" + std::to_string(number);
+    const int error = renameToFreeName(folder, name, rejected.get(), to);
+    if (error != EEXIST) return error;
+  }
+}
+
+}  // namespace
+
+platform::Kernel::ReadResult Kernel::sysctlbyname(std::string_view name,
+                                                  std::span<std::byte> buffer) {
+  if (name == "kern.next_ecc_event") {
+    if (const auto event = nextEvent(buffer)) return *event;
+  }
+  if (const plist::Value* value = deviceValue(name)) return deliverValue(*value, buffer);
+  if (root_.isRecorded()) return failure(ENOENT);
+  if (name == "kern.bootsessionuuid") return bootSession(buffer);
+  if (name == "vm.swapusage") return swapUsage(buffer);
+  return failure(ENOENT);
+}
+
+const plist::Value* Kernel::deviceValue(std::string_view name) {
+  const plist::Dictionary* values = values_.dictionary();
+  return values != nullptr ? values->find(name) : nullptr;
+}
+
+std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byte> buffer) {
+  // Events are taken away, so the folder is one that is written to.
+  const FileDescriptor folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
+  // The events are asked for until there is none: what is in the way is said once.
+  const auto say = [this](const std::string& name, const std::string& what) {
+    if (!saidEvents_.insert(name).second) return;
+    const std::string path = root_.hostPath(kEventsFolder) + (name.empty() ? "" : "/" + name);
+    log_.log(platform::LogLevel::error, "%s: %s", shownText(path).c_str(), what.c_str());
+  };
+  if (!folder) {
+    if (errno != ENOENT) say("", errorText(errno));
+    return std::nullopt;
+  }
+  std::vector<std::string> names;
+  if (const int error = namesInFolder(folder.get(), names)) say("", errorText(error));
+  for (const std::string& name : names) {
+    if (name == kRejected) continue;
+    const FileDescriptor file = root_.openForReading(kEventsFolder + ("/" + name));
+    const auto bytes = file ? readRegularFile(file.get(), kEventSize + 1)
+                            : base::Result<std::string>::failure(errorText(errno));
+    if (!bytes) {
+      say(name, bytes.error);
+      continue;
+    }
+    if (bytes->size() > kEventSize) {
+      const int error = reject(folder.get(), name);
+      say(name, error == 0
+                    ? "longer than an event; moved to rejected/"
+                    : base::format("longer than an event, and can't be moved to rejected/: %s",
+                                   errorText(error)));
+      continue;
+    }
+    // It stays for a caller with room for it.
+    if (bytes->size() > buffer.size()) return failure(ENOMEM);
+    // Removed first: an event that stays would be delivered again and again.
+    if (::unlinkat(folder.get(), name.c_str(), 0) != 0) {
+      const int error = errno;
+      say(name, errorText(error));
+      return failure(error);
+    }
+    return deliver(bytes->data(), bytes->size(), buffer);
+  }
+  return std::nullopt;
+}
+
+std::uint64_t Kernel::pageSize() {
+  const plist::Value* given = deviceValue("hw.pagesize");
+  const plist::Number* size = given != nullptr ? given->as<plist::Number>() : nullptr;
+  return size != nullptr ? size->uint64Value()
+                         : static_cast<std::uint64_t>(::sysconf(_SC_PAGESIZE));
+}
+
+std::uint64_t Kernel::absoluteTime() {
+  timespec time{};
+  ::clock_gettime(CLOCK_MONOTONIC, &time);
+  return static_cast<std::uint64_t>(time.tv_sec) * 1'000'000'000 +
+         static_cast<std::uint64_t>(time.tv_nsec);
+}
+
+std::optional<platform::Kernel::Timebase> Kernel::timebase() { return Timebase{1, 1}; }
+
+platform::Kernel::Process Kernel::process() { return {program_invocation_short_name, ::getpid()}; }
+
+}  // namespace host::recorded

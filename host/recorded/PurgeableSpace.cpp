@@ -1,0 +1,13 @@
+#include "host/recorded/PurgeableSpace.h"
+
+namespace host::recorded {
+
+bool PurgeableSpace::isPresent() { return file_.value() != nullptr; }
+
+std::optional<plist::Dictionary> PurgeableSpace::SpacereapCopyItemizedPurgeableSpaceWithInfo(
+    const plist::Dictionary&) {
+  const plist::Dictionary* answer = file_.dictionary();
+  return answer != nullptr ? std::optional(*answer) : std::nullopt;
+}
+
+}  // namespace host::recorded

@@ -1,0 +1,55 @@
+// A counters store over a temporary device root, and what a history holds as text.
+#pragma once
+
+#include <map>
+#include <string>
+#include <vector>
+
+#include "HostServices.h"
+#include "base/Text.h"
+#include "host/counters/CounterStore.h"
+
+namespace support {
+
+inline constexpr char kDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
+
+// The rows of a history, one line each: "day key value", "day key second:value second:value".
+inline std::vector<std::string> rows(platform::PLHistory& history, std::string_view prefix = "",
+                                     std::int32_t first = INT32_MIN,
+                                     std::int32_t last = INT32_MAX) {
+  std::vector<std::string> lines;
+  history.scalarsForKeyPrefix(
+      prefix, first, last, [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
+        lines.push_back(std::to_string(day) + " " + std::string(key) + " " + std::to_string(value));
+      });
+  history.distributionsForKeyPrefix(
+      prefix, first, last,
+      [&](std::string_view key, std::int32_t day,
+          platform::PLHistoryDistributionEnumerator& samples, bool&) {
+        std::string line = std::to_string(day) + " " + std::string(key);
+        for (auto block = samples.getNextValues(); !block.values.empty();
+             block = samples.getNextValues()) {
+          for (std::size_t i = 0; i < block.values.size(); ++i) {
+            line += base::format(" %d:", block.secondsInDayOffsets[i]) +
+                    base::doubleText(block.values[i]);
+          }
+        }
+        lines.push_back(line);
+      });
+  return lines;
+}
+
+struct StoreFixture {
+  explicit StoreFixture(const std::filesystem::path& path) : root(path.string()) {}
+
+  std::vector<std::string> rows() { return support::rows(*store.initWithDefaultPath()); }
+
+  host::DeviceRoot root;
+  SetClock clock;
+  platform::fakes::RecordingLog log;
+  std::optional<std::string> home = "/var/mobile";
+  int damaged = 0;
+  host::CounterStore store{root, clock, log, [this] { return home; }, [this] { ++damaged; }};
+};
+
+}  // namespace support

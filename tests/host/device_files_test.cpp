@@ -1,0 +1,498 @@
+// The services of a recorded device, which answer from files below device/, and of this machine.
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <systemd/sd-id128.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <future>
+#include <regex>
+#include <set>
+#include <thread>
+
+#include "host/files/DeviceFile.h"
+#include "host/files/DeviceFileSystem.h"
+#include "host/outbox/RandomUUID.h"
+#include "host/process/LibraryLoader.h"
+#include "host/process/SystemClock.h"
+#include "host/recorded/Applications.h"
+#include "host/recorded/DeviceProperties.h"
+#include "host/recorded/Kernel.h"
+#include "host/recorded/Locale.h"
+#include "host/recorded/NetworkUsage.h"
+#include "host/recorded/ReportingChannels.h"
+#include "host/recorded/SystemVersion.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/testing/RecordingLog.h"
+#include "plist/MD5.h"
+#include "plist/PropertyList.h"
+#include "support/TemporaryFolder.h"
+
+namespace {
+
+using namespace host::recorded;
+using namespace host;
+using BundleType = platform::InstalledApplications::BundleType;
+using Texts = std::vector<std::string>;
+
+class DeviceFiles : public testing::Test {
+ protected:
+  void writePlist(const char* path, const plist::Value& value) {
+    folder.write(path, *plist::writeXML(value));
+  }
+
+  support::TemporaryFolder folder;
+  DeviceRoot root{folder.path().string()};
+  platform::fakes::RecordingLog log;
+};
+
+TEST_F(DeviceFiles, ABrokenFileIsSaidOnceAndCountsAsMissing) {
+  folder.write("device/broken.plist", "<plist><dict>");
+  std::filesystem::create_directories(folder / "device/folder.plist");
+  ASSERT_EQ(::mkfifo((folder / "device/fifo.plist").c_str(), 0600), 0);
+  std::filesystem::create_symlink("loop.plist", folder / "device/loop.plist");
+  std::ofstream(folder / "device/long.plist");
+  std::filesystem::resize_file(folder / "device/long.plist", plist::kMaxSize + 1);
+  for (const char* name : {"broken", "folder", "fifo", "loop", "long"}) {
+    const std::string path = std::string("device/") + name + ".plist";
+    DeviceFile file(root, log, path);
+    for (int i = 0; i < 2; ++i) EXPECT_EQ(file.value(), nullptr) << name;
+    EXPECT_EQ(log.count("error: " + (folder / path).string() + ": "), 1) << name;
+  }
+  log.clear();
+  DeviceFile missing(root, log, "device/missing.plist");
+  EXPECT_EQ(missing.value(), nullptr);
+  const DeviceRoot nowhere("/nonexistent");
+  DeviceFile rootless(nowhere, log, "device/missing.plist");
+  EXPECT_EQ(rootless.value(), nullptr);
+  EXPECT_TRUE(log.lines().empty());
+}
+
+TEST_F(DeviceFiles, KernelValuesComeInTheirForms) {
+  writePlist("device/kernel.plist",
+             plist::Dictionary{{"integer", std::int64_t{0x0102030405060708}},
+                               {"negative", std::int64_t{-2}},
+                               {"data", plist::Data{9, 8, 7}},
+                               {"text", "abc"},
+                               {"busy", plist::Dictionary{{"Error", std::int64_t{EBUSY}}}},
+                               {"no number", plist::Dictionary{{"Error", "x"}}},
+                               {"success?", plist::Dictionary{{"Error", std::int64_t{0}}}},
+                               {"hw.pagesize", std::int64_t{16384}}});
+  Kernel kernel(root, log);
+  const struct {
+    const char* name;
+    std::size_t room;
+    int error;
+    std::string bytes;
+  } rows[] = {
+      {"integer", 4, 0, "\x08\x07\x06\x05"},
+      {"integer", 8, 0, "\x08\x07\x06\x05\x04\x03\x02\x01"},
+      {"integer", 12, 0, "\x08\x07\x06\x05\x04\x03\x02\x01"},
+      {"negative", 4, 0, "\xFE\xFF\xFF\xFF"},
+      {"data", 3, 0, "\x09\x08\x07"},
+      {"data", 2, ENOMEM, ""},
+      {"text", 4, 0, std::string("abc", 4)},
+      {"text", 3, ENOMEM, ""},
+      {"busy", 8, EBUSY, ""},
+      {"no number", 8, EIO, ""},
+      {"success?", 8, EIO, ""},
+      {"unknown", 8, ENOENT, ""},
+      {"kern.next_ecc_event", 72, ENOENT, ""},
+  };
+  for (const auto& row : rows) {
+    std::string buffer(16, '#');
+    const auto result = kernel.sysctlbyname(
+        row.name,
+        std::as_writable_bytes(std::span(buffer).first(std::min<std::size_t>(row.room, 16))));
+    EXPECT_EQ(result.error, row.error) << row.name << " " << row.room;
+    EXPECT_EQ(result.length, row.bytes.size()) << row.name << " " << row.room;
+    EXPECT_EQ(buffer, row.bytes + std::string(16 - row.bytes.size(), '#')) << row.name;
+  }
+  EXPECT_EQ(kernel.pageSize(), 16384u);
+}
+
+TEST_F(DeviceFiles, ThisMachineAnswersForTheKernelWhereItCan) {
+  Kernel kernel(root, log);
+  std::string text(64, '#');
+  EXPECT_EQ(
+      kernel.sysctlbyname("kern.bootsessionuuid", std::as_writable_bytes(std::span(text))).length,
+      37u);
+  EXPECT_EQ(text.find_first_not_of("0123456789ABCDEF-"), 36u);
+  for (const auto& [room, length] : {std::pair{32u, 32u}, {40u, 32u}, {31u, 8u}, {8u, 8u}}) {
+    std::vector<std::byte> record(room);
+    EXPECT_EQ(kernel.sysctlbyname("vm.swapusage", record).length, length) << room;
+  }
+  EXPECT_EQ(kernel.pageSize(), static_cast<std::uint64_t>(::sysconf(_SC_PAGESIZE)));
+  const auto before = kernel.absoluteTime();
+  EXPECT_GE(kernel.absoluteTime(), before);
+}
+
+TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
+  writePlist("device/kernel.plist",
+             plist::Dictionary{
+                 {"kern.next_ecc_event", plist::Dictionary{{"Error", std::int64_t{EBUSY}}}}});
+  folder.write("device/ecc-events/2", "two");
+  folder.write("device/ecc-events/10", "ten");
+  folder.write("device/ecc-events/.1", "dot");
+  folder.write("device/ecc-events/1-long", std::string(73, '3'));
+  folder.write("device/ecc-events/rejected/1-long", "taken");
+  folder.write("linked", "linked");
+  std::filesystem::create_symlink("../../linked", folder / "device/ecc-events/1-within");
+  std::filesystem::create_symlink(folder.path() / "linked", folder / "device/ecc-events/1-out");
+  std::filesystem::create_directories(folder / "device/ecc-events/1-folder");
+  Kernel kernel(root, log);
+  std::string buffer(72, '\0');
+  const auto read = [&] {
+    return kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
+  };
+  for (const std::string_view expected : {"dot", "linked", "ten", "two"}) {
+    EXPECT_EQ(read().length, expected.size());
+    EXPECT_TRUE(buffer.starts_with(expected)) << expected;
+  }
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(folder.read("linked"), "linked");
+  EXPECT_EQ(folder.read("device/ecc-events/rejected/1-long-2").size(), 73u);
+  const std::string events = "error: " + (folder / "device/ecc-events").string();
+  EXPECT_EQ(log.count(events + "/1-long: longer than an event; moved"), 1);
+  EXPECT_EQ(log.count(events + "/1-out: No such file"), 1);
+  // One that the caller has no room for stays, and one that can't be moved.
+  buffer.resize(40);
+  folder.write("device/ecc-events/3", std::string(72, '3'));
+  EXPECT_EQ(read().error, ENOMEM);
+  std::filesystem::remove_all(folder / "device/ecc-events/rejected");
+  folder.write("device/ecc-events/rejected", "in the way");
+  folder.write("device/ecc-events/0", std::string(73, '0'));
+  buffer.resize(72);
+  EXPECT_EQ(read().length, 72u);
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(log.count(events + "/0: longer than an event, and can't be moved to rejected/"), 1);
+  std::filesystem::rename(folder / "device/ecc-events", folder / "device/elsewhere");
+  std::filesystem::create_symlink("elsewhere", folder / "device/ecc-events");
+  EXPECT_EQ(read().error, EBUSY);
+  EXPECT_EQ(log.count(events + ": too many links"), 1);
+}
+
+TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
+  DeviceFile file(root, log, "device/properties.plist");
+  host::recorded::DeviceProperties none(root, file);
+  EXPECT_FALSE(none.booleanProperty("InternalBuild"));
+  EXPECT_EQ(none.multiUserIndicator(), std::nullopt);
+  writePlist("device/properties.plist",
+             plist::Dictionary{{"InternalBuild", true}, {"MultiUser", std::int64_t{1}}});
+  DeviceFile written(root, log, "device/properties.plist");
+  host::recorded::DeviceProperties properties(root, written);
+  EXPECT_TRUE(properties.booleanProperty("InternalBuild"));
+  EXPECT_EQ(properties.multiUserIndicator(), 1u);
+
+  folder.write("var/containers/systemgroup/there/file", "");
+  std::uint64_t error = 1;
+  EXPECT_EQ(properties.systemGroupContainerPath("there", error),
+            "/var/containers/systemgroup/there");
+  EXPECT_EQ(error, 1u);
+  for (const auto name : {std::string_view("absent"), std::string_view(), std::string_view("."),
+                          std::string_view(".."), std::string_view("there/file"),
+                          std::string_view("../systemgroup"), std::string_view("there\0x", 7)}) {
+    error = 1;
+    EXPECT_EQ(properties.systemGroupContainerPath(name, error), std::nullopt) << name;
+    EXPECT_EQ(error, 2u) << name;
+  }
+}
+
+// Whatever a service has no file for, or a broken one, the device hasn't got.
+TEST_F(DeviceFiles, ARecordedDeviceAnswersAlone) {
+  ::setenv("LANGUAGE", "fr", 1);
+  ::setenv("LANG", "de_AT.UTF-8", 1);
+  const auto known = [this] {
+    DeviceFile file(root, log, "device/properties.plist");
+    host::recorded::DeviceProperties properties(root, file);
+    host::recorded::SystemVersion version(root, log);
+    host::recorded::Locale locale(root, log);
+    Kernel kernel(root, log);
+    std::array<std::byte, 64> buffer;
+    std::string names;
+    const auto note = [&names](const char* name, bool isKnown) {
+      if (isKnown) names += std::string(name) + " ";
+    };
+    for (const char* name : {"SystemIdentifier", "HardwareModel", "InverseDeviceID"}) {
+      note(name, properties.textProperty(name).has_value());
+    }
+    note("usage", properties.diskUsage().has_value());
+    note("statfs", DeviceFileSystem(root, file).statfs("/").has_value());
+    note("version", version.systemVersionDictionary().has_value());
+    note("version text", !version.operatingSystemVersion().empty());
+    note("languages", !locale.preferredLanguages().empty());
+    note("localizations", !locale.systemLocalizations().empty());
+    note("country", locale.countryCode().has_value());
+    for (const char* name : {"kern.bootsessionuuid", "vm.swapusage"}) {
+      note(name, kernel.sysctlbyname(name, buffer).error == 0);
+    }
+    return names;
+  };
+  const std::string machine = known();
+  for (const char* name : {"HardwareModel", "usage", "statfs", "languages", "localizations",
+                           "country", "kern.bootsessionuuid", "vm.swapusage"}) {
+    EXPECT_NE(machine.find(name), machine.npos) << name << " of " << machine;
+  }
+  folder.write("device", "no folder");
+  EXPECT_EQ(known(), machine);
+  std::filesystem::remove(folder / "device");
+  std::filesystem::create_directories(folder / "device");
+  EXPECT_EQ(known(), "");
+  for (const char* file : {"properties", "system-version", "locale", "kernel"}) {
+    folder.write("device/" + std::string(file) + ".plist", "broken");
+  }
+  EXPECT_EQ(known(), "");
+  const plist::Dictionary numbers{
+      {"SystemIdentifier", 1}, {"HardwareModel", 1}, {"InverseDeviceID", 1}};
+  writePlist("device/properties.plist", numbers);
+  EXPECT_EQ(known(), "");
+  writePlist("device/properties.plist",
+             plist::Dictionary{
+                 {"SystemIdentifier", "a"}, {"HardwareModel", "b"}, {"InverseDeviceID", "c"}});
+  EXPECT_EQ(known(), "SystemIdentifier HardwareModel InverseDeviceID ");
+}
+
+TEST_F(DeviceFiles, NobodyLearnsTheMachinesOwnIdentifier) {
+  DeviceFile file(root, log, "device/properties.plist");
+  const auto identifier =
+      host::recorded::DeviceProperties(root, file).textProperty("SystemIdentifier");
+  sd_id128_t machine;
+  ASSERT_EQ(identifier.has_value(), ::sd_id128_get_machine(&machine) == 0);
+  if (!identifier) GTEST_SKIP() << "this machine has no identifier";
+  EXPECT_TRUE(std::regex_match(*identifier, std::regex("[0-9a-f]{32}"))) << *identifier;
+  EXPECT_FALSE(::sd_id128_string_equal(identifier->c_str(), machine));
+  EXPECT_EQ(host::recorded::DeviceProperties(root, file).textProperty("SystemIdentifier"),
+            identifier);
+}
+
+TEST_F(DeviceFiles, TheZoneIsTheHosts) {
+  const char* before = std::getenv("TZ");
+  const std::string zone = before != nullptr ? before : "";
+  SystemClock clock;
+  // Six months in summer time; a time that no calendar reaches has no zone.
+  ::setenv("TZ", "ABC-1:30DEF,M4.1.0,M10.1.0", 1);
+  EXPECT_EQ(clock.secondsFromUTC({1795320000}), 5400);
+  EXPECT_EQ(clock.secondsFromUTC({1782864000.5}), 9000);
+  EXPECT_EQ(clock.secondsFromUTC({1e300}), 0);
+  ::setenv("TZ", "XYZ3", 1);
+  EXPECT_EQ(clock.secondsFromUTC({1795320000}), -10800);
+  before != nullptr ? ::setenv("TZ", zone.c_str(), 1) : ::unsetenv("TZ");
+}
+
+TEST_F(DeviceFiles, IncidentIdentifiersAreRandomUUIDs) {
+  std::set<std::string> seen;
+  for (int i = 0; i < 100; ++i) {
+    const std::string text = randomUUID();
+    EXPECT_TRUE(std::regex_match(
+        text, std::regex("[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}")))
+        << text;
+    seen.insert(text);
+  }
+  EXPECT_EQ(seen.size(), 100u);
+}
+
+TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesOrThisMachines) {
+  const struct {
+    const char *release, *text;
+  } rows[] = {
+      {"NAME=x\nVERSION_ID=\"12\"\nBUILD_ID='b\\'1'\n", "12 (b'1)"},
+      {"VERSION_ID=12", "12 (12)"},
+      {"BUILD_ID=rolling\nXVERSION_ID=1\nVERSION_IDX=2\n", "rolling"},
+      {"", ""},
+  };
+  const std::string release = (folder / "os-release").string();
+  for (const auto& row : rows) {
+    folder.write("os-release", row.release);
+    EXPECT_EQ(host::recorded::SystemVersion(root, log, release).operatingSystemVersion(), row.text);
+  }
+  EXPECT_EQ(host::recorded::SystemVersion(root, log, release).systemVersionDictionary(),
+            std::nullopt);
+  writePlist("device/system-version.plist",
+             plist::Dictionary{{"ProductVersion", "7.1"}, {"ProductBuildVersion", "7B2"}});
+  EXPECT_EQ(host::recorded::SystemVersion(root, log).operatingSystemVersion(), "7.1 (7B2)");
+}
+
+TEST_F(DeviceFiles, LanguagesComeFromTheEnvironmentUnlessTheDeviceSaysThem) {
+  const struct {
+    const char *language, *lang;
+    Texts preferred;
+    std::optional<std::string> country;
+  } rows[] = {
+      {"", "de_AT.UTF-8@euro", {"de-AT"}, "AT"},
+      {"fr_CA:fr:en", "de_AT", {"fr-CA", "fr", "en"}, "AT"},
+      {"", "C.UTF-8", {}, std::nullopt},
+      {"::", "POSIX", {}, std::nullopt},
+      {"", "eo", {"eo"}, std::nullopt},
+      {"", "", {}, std::nullopt},
+  };
+  for (const auto& row : rows) {
+    ::setenv("LANGUAGE", row.language, 1);
+    ::setenv("LANG", row.lang, 1);
+    host::recorded::Locale locale(root, log);
+    EXPECT_EQ(locale.preferredLanguages(), row.preferred) << row.lang;
+    EXPECT_EQ(locale.countryCode(), row.country) << row.lang;
+    EXPECT_EQ(locale.systemLocalizations(), Texts{"en"});
+  }
+  ::setenv("LANG", "de_AT", 1);
+  writePlist("device/locale.plist",
+             plist::Dictionary{{"PreferredLanguages", plist::Array{"ja", std::int64_t{1}}}});
+  host::recorded::Locale locale(root, log);
+  EXPECT_EQ(locale.preferredLanguages(), Texts{"ja"});
+  EXPECT_EQ(locale.systemLocalizations(), Texts{});
+  EXPECT_EQ(locale.countryCode(), std::nullopt);
+}
+
+TEST_F(DeviceFiles, TheBestMatchIsTheLongestPrefixOfEachLanguage) {
+  const struct {
+    Texts localizations, preferred, best;
+  } rows[] = {
+      {{"en", "de", "de-AT"}, {"de-AT"}, {"de-AT"}},
+      {{"en", "zh", "zh-hant"}, {"zh-Hant-TW"}, {"zh-hant"}},
+      {{"en", "d", "de"}, {"den", "de-CH", "DE"}, {"de"}},
+      {{"fr", "en"}, {"ja", "en-US", "fr"}, {"en", "fr"}},
+      {{"fr", "en"}, {"ja"}, {"fr"}},
+      {{"fr", "en"}, {}, {"fr"}},
+      {{}, {"en"}, {}},
+      {{""}, {"en", ""}, {""}},
+  };
+  host::recorded::Locale locale(root, log);
+  for (const auto& row : rows) {
+    EXPECT_EQ(locale.bestMatch(row.localizations, row.preferred), row.best);
+  }
+}
+
+TEST_F(DeviceFiles, ApplicationsAreTheDictionariesOfTheArray) {
+  std::vector<BundleType> types;
+  const auto collect = [&](BundleType type) { types.push_back(type); };
+  host::recorded::Applications(root, log).enumerateBundles(collect);
+  EXPECT_TRUE(types.empty());
+  writePlist("device/applications.plist",
+             plist::Array{plist::Dictionary{{"Type", "User"}}, plist::Dictionary{{"Type", "user"}},
+                          "x", plist::Dictionary{}});
+  host::recorded::Applications(root, log).enumerateBundles(collect);
+  EXPECT_EQ(types, (std::vector{BundleType::user, BundleType::system, BundleType::system}));
+}
+
+TEST_F(DeviceFiles, ReportChannelsAreThoseOfACategoryWithANameAndAValue) {
+  ReportingChannels missing(root, log);
+  EXPECT_TRUE(missing.copyChannels(~0U).empty());
+  EXPECT_EQ(missing.subscribe({}), nullptr);
+  const auto channel = [](plist::Value name, plist::Value category, plist::Value value) {
+    return plist::Dictionary{
+        {"Name", name}, {"Category", category}, {"Format", 1}, {"Value", value}};
+  };
+  writePlist(
+      "device/report-channels.plist",
+      plist::Array{
+          "x", channel("a", 0x300, 5), channel("other", 0x200, 6), channel(7, 0x100, 7),
+          channel("text", 0x100, "8"), channel("untold", "0x100", 9), plist::Dictionary{},
+          plist::Dictionary{{"Name", "b"}, {"Category", 0x100}, {"Value", std::int64_t{-9}}}});
+  ReportingChannels facility(root, log);
+  const auto channels = facility.copyChannels(0x100);
+  auto asked = channels;
+  asked.push_back({99, 1, "made up"});
+  Texts found;
+  for (const auto& one : channels) found.push_back(one.name + " " + std::to_string(one.format));
+  EXPECT_EQ(found, (Texts{"a 1", "text 1", "b 0"}));
+  found.clear();
+  const auto samples = facility.subscribe(asked)->createSamples();
+  for (const auto& [one, value] : *samples) {
+    found.push_back(one.name + " " + std::to_string(one.format) + " " + std::to_string(value));
+  }
+  EXPECT_EQ(found, (Texts{"a 1 5", "b 0 -9"}));
+}
+
+TEST_F(DeviceFiles, NetworkUsageIsRepliedOnAThreadOfTheService) {
+  using Answer = std::optional<plist::Array>;
+  const auto ask = [this] {
+    std::promise<Answer> answer;
+    NetworkUsage service(root, log);
+    service.queryAllProcesses([&, asker = std::this_thread::get_id()](const plist::Array* records) {
+      EXPECT_NE(std::this_thread::get_id(), asker);
+      answer.set_value(records != nullptr ? Answer(*records) : Answer());
+    });
+    return answer.get_future().get();
+  };
+  EXPECT_EQ(ask(), Answer());
+  const plist::Array records{plist::Dictionary{{"procName", "p"}}, 7};
+  const plist::Value delays[] = {0, -1e300, std::numeric_limits<double>::quiet_NaN(), "text",
+                                 0.001};
+  for (const plist::Value& delay : delays) {
+    writePlist("device/network-usage.plist",
+               plist::Dictionary{{"Records", records}, {"ReplyDelay", delay}});
+    EXPECT_EQ(ask(), records);
+  }
+  for (const plist::Value& wrong :
+       {plist::Value(plist::Dictionary{{"Records", "text"}}), plist::Value("text")}) {
+    writePlist("device/network-usage.plist", wrong);
+    EXPECT_EQ(ask(), Answer());
+  }
+}
+
+struct CountingPreferences : platform::PreferenceStore {
+  std::optional<plist::Value> QNSPreferencesGetValue(std::string_view key,
+                                                     std::string_view domain) override {
+    EXPECT_EQ(std::string(domain) + " " + std::string(key), "domain key");
+    return value;
+  }
+  void QNSPreferencesSetValue(std::string_view, const plist::Value* newValue,
+                              std::string_view) override {
+    value = *newValue;
+  }
+  void QNSPreferencesSynchronize(std::string_view) override {}
+
+  plist::Value value = std::int64_t{41};
+};
+
+TEST_F(DeviceFiles, ALibraryOfTheDeviceActsOnThisProcessesPreferences) {
+  CountingPreferences preferences;
+  LibraryLoader loader(root, preferences);
+  EXPECT_EQ(loader.load(platform::kFaultwatchSupportPath), nullptr);
+  const auto place = folder / std::string_view(platform::kFaultwatchSupportPath).substr(1);
+  std::filesystem::create_directories(place.parent_path());
+  // A link leads nowhere outside the root.
+  std::filesystem::create_symlink(FAULTWATCH_SUPPORT_MODULE, place);
+  EXPECT_EQ(loader.load(platform::kFaultwatchSupportPath), nullptr);
+  std::filesystem::remove(place);
+  folder.write("not-a-library", "text");
+  EXPECT_EQ(loader.load("/not-a-library"), nullptr);
+  EXPECT_EQ(loader.load("/System"), nullptr);
+
+  std::filesystem::copy_file(FAULTWATCH_SUPPORT_MODULE, place);
+  void* library = loader.load(platform::kFaultwatchSupportPath);
+  ASSERT_NE(library, nullptr);
+  EXPECT_EQ(loader.load(platform::kFaultwatchSupportPath), library);
+  auto* get = reinterpret_cast<platform::QNSPreferencesGetIntegerValueFunction*>(
+      loader.symbol(library, "QNSPreferencesGetIntegerValue"));
+  auto* set = reinterpret_cast<platform::QNSPreferencesSetValueFunction*>(
+      loader.symbol(library, "QNSPreferencesSetValue"));
+  ASSERT_TRUE(get != nullptr && set != nullptr);
+  bool found = false;
+  EXPECT_EQ(get("key", "domain", &found), 41);
+  EXPECT_TRUE(found);
+  const plist::Value zero(std::int64_t{0});
+  set("key", &zero, "domain");
+  EXPECT_EQ(preferences.value, zero);
+  EXPECT_EQ(loader.symbol(library, "QNSPreferencesSynchronize"), nullptr);
+}
+
+TEST(MD5, TheVectorsOfItsDefinition) {
+  const struct {
+    const char *text, *digest;
+  } rows[] = {{"", "d41d8cd98f00b204e9800998ecf8427e"},
+              {"abc", "900150983cd24fb0d6963f7d28e17f72"},
+              {"12345678901234567890123456789012345678901234567890123456789012345678901234567890",
+               "57edf4a22be3c955ac49da2e2107b67a"}};
+  for (const auto& row : rows) {
+    std::string hex;
+    for (const int byte : plist::md5(row.text)) {
+      hex += {"0123456789abcdef"[byte >> 4], "0123456789abcdef"[byte & 15]};
+    }
+    EXPECT_EQ(hex, row.digest);
+  }
+}
+
+}  // namespace

@@ -1,0 +1,159 @@
+#include "host/outbox/EventSink.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <future>
+
+#include "HostServices.h"
+
+namespace host {
+namespace {
+
+constexpr char kEvents[] = "var/spool/morvend/events.jsonl";
+
+struct EventSinkTest : testing::Test, support::HostServices {
+  EventSink sink{root, clock, log};
+
+  static plist::Dictionary nothing() { return {}; }
+  void send(const char* event = "event") {
+    EXPECT_TRUE(sink.EventraSendEventLazy(event, nothing));
+    sink.drain();
+  }
+  std::ptrdiff_t lines() const {
+    const std::string text = folder.read(kEvents);
+    return std::count(text.begin(), text.end(), '\n');
+  }
+};
+
+TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
+  std::promise<void> go;
+  sink.EventraSendEventLazy("first", [wait = go.get_future().share()] {
+    wait.wait();
+    return plist::Dictionary{{"a", 1}};
+  });
+  clock.seconds = clock.seconds + 1;
+  sink.EventraSendEventLazy("second", nothing);
+  clock.seconds = 0;
+  go.set_value();
+  sink.drain();
+  const std::string expected =
+      "{\"event\": \"first\", \"time\": \"2026-11-22T04:00:00Z\", \"payload\": {\"a\": 1}}\n"
+      "{\"event\": \"second\", \"time\": \"2026-11-22T04:00:01Z\", \"payload\": {}}\n";
+  EXPECT_EQ(folder.read(kEvents), expected);
+  send();
+  EXPECT_EQ(lines(), 3);
+}
+
+TEST_F(EventSinkTest, AFullFileMakesRoomAndTheOldestOfFourIsDropped) {
+  const std::string name = kEvents;
+  for (int round = 0; round < 6; ++round) {
+    folder.write(kEvents, std::string(EventSink::kMaximumFile - 1, 'x') + '\n');
+    send();
+    send();
+    EXPECT_EQ(lines(), 2) << round;
+    for (int number = 1; number <= 5; ++number) {
+      EXPECT_EQ(std::filesystem::exists(folder / (name + "." + std::to_string(number))),
+                number <= std::min(round + 1, EventSink::kKept));
+    }
+  }
+  EXPECT_EQ(log.count("default: Dropped the events of " + root.hostPath(name + ".4")), 2);
+  EXPECT_EQ(log.lines().size(), 2u);
+}
+
+TEST_F(EventSinkTest, OnlyUsedEventsAreProduced) {
+  folder.write("device/analytics.plist", xml({{"UsedEvents", plist::Array{"used", 7}}}));
+  const auto never = [] {
+    ADD_FAILURE();
+    return plist::Dictionary{};
+  };
+  EXPECT_FALSE(sink.EventraIsEventUsed("unused"));
+  EXPECT_FALSE(sink.EventraSendEventLazy("unused", never));
+  EXPECT_TRUE(sink.offersLazySend());
+  send("used");
+  EXPECT_EQ(lines(), 1);
+  folder.write("device/analytics.plist", xml({{"Available", false}}));
+  EventSink absent(root, clock, log);
+  EXPECT_FALSE(absent.offersLazySend());
+  EXPECT_TRUE(absent.EventraIsEventUsed("used"));
+  EXPECT_FALSE(absent.EventraSendEventLazy("used", never));
+}
+
+TEST_F(EventSinkTest, ABrokenConfigurationIsSaidOnceAndLeavesEveryEventUsed) {
+  folder.write("device/analytics.plist", "garbage");
+  EXPECT_TRUE(sink.EventraIsEventUsed("any"));
+  EXPECT_TRUE(sink.offersLazySend());
+  EXPECT_EQ(log.count("error: Could not read " + root.hostPath("device/analytics.plist: ")), 1);
+}
+
+TEST_F(EventSinkTest, TheQueueIsBounded) {
+  std::promise<void> begun, go;
+  sink.EventraSendEventLazy("blocking", [&begun, wait = go.get_future().share()] {
+    begun.set_value();
+    wait.wait();
+    return plist::Dictionary{};
+  });
+  begun.get_future().wait();
+  std::size_t queued = 0;
+  while (queued <= EventSink::kMaximumQueued && sink.EventraSendEventLazy("event", nothing)) {
+    ++queued;
+  }
+  EXPECT_EQ(queued, EventSink::kMaximumQueued);
+  go.set_value();
+  sink.drain();
+  EXPECT_EQ(lines(), static_cast<std::ptrdiff_t>(queued) + 1);
+}
+
+TEST_F(EventSinkTest, NoEventIsLostBetweenSendersProducersAndDrains) {
+  constexpr int kSenders = 4, kEach = 500;
+  std::vector<std::thread> senders;
+  for (int i = 0; i < kSenders; ++i) {
+    senders.emplace_back([this] {
+      for (int n = 0; n < kEach; ++n) {
+        sink.EventraSendEventLazy("outer", [this] {
+          sink.EventraSendEventLazy("inner", nothing);
+          return plist::Dictionary{};
+        });
+      }
+    });
+  }
+  for (int n = 0; n < 50; ++n) sink.drain();
+  for (std::thread& sender : senders) sender.join();
+  sink.drain();
+  EXPECT_EQ(lines(), 2 * kSenders * kEach);
+}
+
+TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
+  const std::string name = kEvents, full(EventSink::kMaximumFile, '\n');
+  const struct {
+    std::vector<const char*> folders;
+    bool secondName;
+    std::string line;
+  } rows[] = {{{""}, false, name + ": not a regular file"},
+              {{}, true, name + ": a file with several names"},
+              {{".1", ".2", ".3", ".4"}, false, name + ".1: not a regular file"}};
+  for (const auto& row : rows) {
+    log.clear();
+    std::filesystem::remove_all(folder / "var");
+    if (row.folders.size() != 1) folder.write(name, row.secondName ? "one\n" : full);
+    for (const char* end : row.folders) std::filesystem::create_directories(folder / (name + end));
+    if (row.secondName) std::filesystem::create_hard_link(folder / name, folder / "other");
+    EventSink failing(root, clock, log);
+    for (int n = 0; n < 3; ++n) {
+      EXPECT_TRUE(failing.EventraSendEventLazy("event", nothing));
+      failing.drain();
+    }
+    EXPECT_EQ(log.count("error: Could not write " + root.hostPath(row.line)), 1) << row.line;
+    EXPECT_EQ(log.lines().size(), 1u);
+  }
+  EXPECT_EQ(folder.read("other"), "one\n");
+  // What a number is taken by is passed over as long as another one is left.
+  std::filesystem::remove(folder / (name + ".3"));
+  send();
+  EXPECT_EQ(lines(), 1);
+  EXPECT_TRUE(folder.read(name + ".3") == full);
+  EXPECT_EQ(log.count("error: Passed over " + root.hostPath(name)), 2);
+}
+
+}  // namespace
+}  // namespace host

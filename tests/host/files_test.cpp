@@ -1,0 +1,93 @@
+#include "host/files/Files.h"
+
+#include <fcntl.h>
+#include <gtest/gtest.h>
+
+#include "HostServices.h"
+#include "host/files/DeviceFileSystem.h"
+
+namespace host {
+namespace {
+
+using Missing = DeviceRoot::Missing;
+using Links = DeviceRoot::Links;
+using support::TemporaryFolder;
+
+TEST(DeviceRoot, NoPathLeadsOutside) {
+  const TemporaryFolder outer;
+  outer.write("secret", "outside");
+  outer.write("root/inside", "inside");
+  std::filesystem::create_symlink(outer / "secret", outer / "root/absolute");
+  std::filesystem::create_symlink("../secret", outer / "root/relative");
+  std::filesystem::create_symlink("/inside", outer / "root/within");
+  std::filesystem::create_symlink("..", outer / "root/up");
+  const DeviceRoot root((outer / "root").string());
+  platform::fakes::RecordingLog log;
+  DeviceFile properties(root, log, "device/properties.plist");
+  DeviceFileSystem files(root, properties);
+  for (const char* path :
+       {"/absolute", "/relative", "../secret", "/x/../../secret", "/up/secret"}) {
+    EXPECT_FALSE(files.readFile(path, 100)) << path;
+    EXPECT_FALSE(files.fileStatus(path)) << path;
+  }
+  for (const char* path : {"/within", "inside", "//inside", "/../inside", "/up/inside"}) {
+    EXPECT_EQ(files.readFile(path, 100), "inside") << path;
+    EXPECT_EQ(files.fileStatus(path), 6u) << path;
+  }
+  EXPECT_EQ(files.readFile("/inside", 2), "in");
+  EXPECT_FALSE(files.readFile(std::string_view("/inside\0x", 9), 100));
+}
+
+TEST(DeviceRoot, FoldersAreMadePrivateAndNeverThroughLinks) {
+  const TemporaryFolder root;
+  const DeviceRoot device(root.path().string());
+  EXPECT_FALSE(device.openFolder("/a/b/c", Missing::fails));
+  ASSERT_TRUE(device.openFolder("/a/b/c", Missing::create));
+  for (const char* made : {"a", "a/b", "a/b/c"}) {
+    EXPECT_EQ(std::filesystem::status(root / made).permissions(),
+              std::filesystem::perms::owner_all);
+  }
+  std::filesystem::create_symlink("/a", root / "link");
+  EXPECT_FALSE(device.openFolder("/link/new", Missing::create));
+  EXPECT_EQ(errno, ELOOP);
+  EXPECT_FALSE(std::filesystem::exists(root / "a/new"));
+  EXPECT_TRUE(device.openFolder("/link/new", Missing::create, Links::followed));
+  EXPECT_TRUE(std::filesystem::exists(root / "a/new"));
+  root.write("file", "");
+  EXPECT_FALSE(device.openFolder("/file/below", Missing::create));
+  EXPECT_EQ(errno, ENOTDIR);
+}
+
+TEST(Files, NothingButARegularFileIsWritten) {
+  for (const support::Kind kind : support::kOtherKinds) {
+    for (const bool append : {false, true}) {
+      const TemporaryFolder root;
+      const auto at = root / "folder/file", target = root / "target";
+      support::put(kind, at, target);
+      const auto folder = DeviceRoot(root.path().string()).openFolder("/folder", Missing::fails);
+      EXPECT_EQ(append ? appendLines(folder.get(), "file", "x\n")
+                       : replaceFile(folder.get(), "file", "x"),
+                EINVAL);
+      EXPECT_TRUE(support::untouched(kind, at, target));
+    }
+  }
+}
+
+TEST(Files, AnUnfinishedLineIsRemovedBeforeOneIsAppended) {
+  const std::string line(5000, 'l'), torn(10000, 't');
+  const std::pair<std::string, std::string> rows[] = {
+      {"", ""},         {"one\n", "one\n"},
+      {"torn", ""},     {line + "\n" + torn, line + "\n"},
+      {"\n", "\n"},     {line + "\n\n" + torn, line + "\n\n"},
+      {torn + torn, ""}};
+  for (const auto& [before, kept] : rows) {
+    const TemporaryFolder root;
+    root.write("file", before);
+    const FileDescriptor folder(::open(root.path().c_str(), O_RDONLY | O_DIRECTORY));
+    EXPECT_EQ(appendLines(folder.get(), "file", "new\nlines\n"), 0);
+    EXPECT_EQ(root.read("file"), kept + "new\nlines\n");
+  }
+}
+
+}  // namespace
+}  // namespace host
