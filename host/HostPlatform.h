@@ -6,18 +6,17 @@
 #include "base/Exported.h"
 
 namespace platform {
-
 struct Platform;
+}
 
 namespace MORVEND_EXPORTED host {
 
 // Every service over the device root that MORVEND_ROOT names ("/" without it); what was written is
 // on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
-std::shared_ptr<Platform> makeHostPlatform();
+std::shared_ptr<platform::Platform> makeHostPlatform();
 
 // Whether that device is an internal (development) build. Asked once in the life of the process, by
 // whichever thread comes first; for a symbol look-up too, whence the plain name.
 extern "C" bool PLIsInternalDevice();
 
 }  // namespace host
-}  // namespace platform
