@@ -6,8 +6,8 @@
 #include <vector>
 
 #include "NANDInfo/KeyTables.h"
+#include "NANDInfo/NameTable.h"
 #include "NANDInfo/Whitelists.h"
-#include "NANDInfo/vocabulary/NameRows.h"
 #include "bench/Rows.h"
 
 namespace bench {
@@ -24,11 +24,9 @@ struct Record {
 
 std::vector<Record> keyMapRecords() {
   std::vector<Record> records;
-  for (const NANDInfo::KeyMapRow& row : NANDInfo::keyMapRows()) {
-    for (const std::string& counter : NANDInfo::expandFamily(row.counters)) {
-      Record& record = records.emplace_back(Record{{}, std::string(*NANDInfo::keyMapKey(counter))});
-      counter.copy(record.counter, sizeof record.counter - 1);
-    }
+  for (const auto& [counter, key] : NANDInfo::keyMapEntries()) {
+    Record& record = records.emplace_back(Record{{}, std::string(key)});
+    counter.copy(record.counter, sizeof record.counter - 1);
   }
   return records;
 }
@@ -82,9 +80,13 @@ void addStorageTableRows(Table& table) {
       },
       51);
 
+  std::vector<std::string> whitelisted;
+  for (const auto& [name, digits] : whitelist) whitelisted.emplace_back(name);
+  std::vector<NANDInfo::NameRow> rows;
+  for (const std::string& name : whitelisted) rows.push_back({name.c_str(), 8});
   table.compare(
-      "first use of the FTL whitelist", "a hash table of its names", 1.0, 1,
-      [] { keep(NANDInfo::NameTable(NANDInfo::ftlSignificantDigitsRows())); },
+      "a table of the FTL whitelist's names", "a hash table of them", 1.0, 1,
+      [&] { keep(NANDInfo::NameTable(rows)); },
       [&] {
         std::unordered_map<std::string, std::uint8_t> hashed(whitelist.size());
         for (const auto& [name, digits] : whitelist) hashed.emplace(name, digits);

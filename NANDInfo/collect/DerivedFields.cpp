@@ -125,7 +125,7 @@ Dictionary gatherZMCOtherData(Platform& platform) {
     return fields;
   }
   const Dictionary derived = gatherZMCFTLOtherData(platform, &*ftl);
-  for (const char* key : FTLStats4MSPStats()) copyIfPresent(derived, key, fields, key);
+  for (const auto& [key, digits] : FTLStats4MSPStats()) copyIfPresent(derived, key, fields, key);
   return fields;
 }
 

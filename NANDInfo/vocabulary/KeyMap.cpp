@@ -1,5 +1,5 @@
 #include "NANDInfo/Whitelists.h"
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "NANDInfo/vocabulary/CounterLists.h"
 
 namespace NANDInfo {
 
@@ -10,25 +10,39 @@ struct KeyMap {
   std::vector<std::string> keys;  // of the counters, in their order
 };
 
-KeyMap keyMap() {
-  std::vector<NameRow> counters;
-  std::vector<std::string> keys;
-  for (const KeyMapRow& row : keyMapRows()) {
-    counters.push_back({row.counters, 0});
-    for (std::string& key : expandFamily(std::string("com.norba.NANDInfo.") + row.suffixes)) {
-      keys.push_back(std::move(key));
+const KeyMap& keyMap() {
+  static const KeyMap map = [] {
+    std::vector<NameRow> counters;
+    std::vector<std::string> keys;
+    for (const FTLCounter& row : FTLCounters()) {
+      if (row.serviceKey == nullptr) continue;
+      const KeyMapRow names = keyMapRow(row);
+      counters.push_back(names.counters);
+      for (const std::string& suffix : expandNames(names.suffixes)) {
+        keys.push_back("com.norba.NANDInfo." + suffix);
+      }
     }
-  }
-  return {NameTable(counters), std::move(keys)};
+    return KeyMap{NameTable(counters), std::move(keys)};
+  }();
+  return map;
 }
 
 }  // namespace
 
 std::optional<std::string_view> keyMapKey(std::string_view counter) {
-  static const KeyMap map = keyMap();
+  const KeyMap& map = keyMap();
   const NameTable::Entry* const entry = map.counters.find(counter);
   if (entry == nullptr) return std::nullopt;
   return map.keys[static_cast<std::size_t>(entry - map.counters.begin())];
+}
+
+std::vector<KeyMapEntry> keyMapEntries() {
+  const KeyMap& map = keyMap();
+  std::vector<KeyMapEntry> entries;
+  for (const NameTable::Entry& entry : map.counters) {
+    entries.push_back({entry.name, map.keys[entries.size()]});
+  }
+  return entries;
 }
 
 }  // namespace NANDInfo

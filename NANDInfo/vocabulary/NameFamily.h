@@ -1,10 +1,17 @@
-// Walks the names of a family; for the tables, which count their names while they are compiled.
+// Names that begin alike, and how the tables write them: "padSizes_{0..3}" is a stem and, in its
+// braces, what may follow: a text, or a text and each number of a range. "{A0..2, B}" after a stem
+// stands for four names.
 #pragma once
 
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <span>
+#include <string>
 #include <string_view>
+#include <vector>
+
+#include "NANDInfo/NameTable.h"
 
 namespace NANDInfo {
 
@@ -13,30 +20,65 @@ constexpr std::string_view familyStem(std::string_view family) {
   return family.substr(0, family.find('{'));
 }
 
-// Calls visit(first, last) for each range of numbers in the braces; one number is a range too.
+constexpr bool hasBraces(std::string_view family) { return family.ends_with('}'); }
+
+// What follows a stem: a text and, after it, each of `count` numbers; no number when it is 0.
+struct FamilyItem {
+  std::string_view text;
+  std::uint32_t first = 0, count = 0;
+};
+
+// Calls visit(item) for each item in the braces.
 template <typename Visit>
-constexpr void visitRanges(std::string_view family, Visit visit) {
-  std::string_view rest = family.substr(familyStem(family).size());
-  const auto takeNumber = [&rest] {
-    rest.remove_prefix(std::min(rest.find_first_of("0123456789"), rest.size()));
+constexpr void visitItems(std::string_view braces, Visit visit) {
+  const auto numberAt = [&braces](std::size_t place) {
     std::uint32_t number = 0;
-    for (; !rest.empty() && rest[0] >= '0' && rest[0] <= '9'; rest.remove_prefix(1)) {
-      number = 10 * number + static_cast<std::uint32_t>(rest[0] - '0');
+    for (; braces[place] >= '0' && braces[place] <= '9'; ++place) {
+      number = 10 * number + static_cast<std::uint32_t>(braces[place] - '0');
     }
     return number;
   };
-  while (rest.size() > 1) {
-    const std::uint32_t first = takeNumber();
-    visit(first, rest.starts_with("..") ? takeNumber() : first);
+  for (std::size_t begin = 1, end = 0; begin < braces.size(); begin = end + 2) {
+    end = std::min(braces.find(',', begin), braces.size() - 1);
+    const std::string_view text = braces.substr(begin, end - begin);
+    const std::size_t dots = text.find("..");
+    if (dots == std::string_view::npos) {
+      visit(FamilyItem{text});
+      continue;
+    }
+    const std::size_t digits = text.find_last_not_of("0123456789", dots - 1) + 1;
+    const std::uint32_t first = numberAt(begin + digits);
+    visit(FamilyItem{text.substr(0, digits), first, numberAt(begin + dots + 2) - first + 1});
   }
 }
 
-// How many names a family stands for.
-constexpr std::size_t familySize(std::string_view family) {
-  std::size_t size = 0;
-  visitRanges(family,
-              [&size](std::uint32_t first, std::uint32_t last) { size += last - first + 1; });
-  return family.find('{') == std::string_view::npos ? 1 : size;
+// Calls visit(item) for each item of a row; a name that has none is one with nothing after it.
+template <typename Visit>
+constexpr void visitItems(const NameRow& row, Visit visit) {
+  const std::string_view family = row.family;
+  if (row.items != nullptr) {
+    visitItems(std::string_view(row.items), visit);
+  } else if (hasBraces(family)) {
+    visitItems(family.substr(familyStem(family).size()), visit);
+  } else {
+    visit(FamilyItem{"", 0, row.elements > 1 ? row.elements : 0u});
+  }
 }
+
+// How many names a row stands for.
+constexpr std::size_t familySize(const NameRow& row) {
+  std::size_t size = 0;
+  visitItems(row, [&size](const FamilyItem& item) { size += std::max(item.count, 1u); });
+  return size;
+}
+
+constexpr std::size_t countNames(std::span<const NameRow> rows) {
+  std::size_t count = 0;
+  for (const NameRow& row : rows) count += familySize(row);
+  return count;
+}
+
+// The names of one row, in its order.
+std::vector<std::string> expandNames(const NameRow& row);
 
 }  // namespace NANDInfo

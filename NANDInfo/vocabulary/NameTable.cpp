@@ -3,7 +3,7 @@
 #include <charconv>
 #include <limits>
 
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "NANDInfo/vocabulary/NameFamily.h"
 
 namespace NANDInfo {
 
@@ -11,34 +11,43 @@ namespace {
 
 constexpr std::size_t kMostDigits = std::numeric_limits<std::uint32_t>::digits10 + 1;
 
-// Calls visit(name) for each name of a family. Each is written where the one before ended if
+// Calls visit(name) for each name of a row. Each is written where the one before ended if
 // visit(name) says that this one is kept, else in its place; there must be room for all of them.
 template <typename Visit>
-char* writeNames(std::string_view family, char* out, Visit visit) {
-  const std::string_view stem = familyStem(family);
-  const auto write = [&](auto appendNumber) {
-    char* const end = appendNumber(out + stem.copy(out, stem.size()));
+char* writeNames(const NameRow& row, char* out, Visit visit) {
+  const std::string_view stem = familyStem(row.family);
+  const auto write = [&](const FamilyItem& item, auto appendNumber) {
+    char* end = out + stem.copy(out, stem.size());
+    if (row.joint != '\0') *end++ = row.joint;
+    end = appendNumber(end + item.text.copy(end, item.text.size()));
     if (visit(std::string_view(out, static_cast<std::size_t>(end - out)))) out = end;
   };
-  if (stem.size() == family.size()) write([](char* end) { return end; });
-  visitRanges(family, [&](std::uint32_t first, std::uint32_t last) {
-    for (std::uint32_t number = first; number <= last; ++number) {
-      write([number](char* end) { return std::to_chars(end, end + kMostDigits, number).ptr; });
+  visitItems(row, [&](const FamilyItem& item) {
+    if (item.count == 0) write(item, [](char* end) { return end; });
+    for (std::uint32_t i = 0; i < item.count; ++i) {
+      write(item, [number = item.first + i](char* end) {
+        return std::to_chars(end, end + kMostDigits, number).ptr;
+      });
     }
   });
   return out;
 }
 
-std::size_t mostBytes(std::string_view family) {
-  return familySize(family) * (familyStem(family).size() + kMostDigits);
+std::size_t mostBytes(const NameRow& row) {
+  std::size_t bytes = 0;
+  visitItems(row, [&](const FamilyItem& item) {
+    bytes += std::max(item.count, 1u) *
+             (familyStem(row.family).size() + 1 + item.text.size() + kMostDigits);
+  });
+  return bytes;
 }
 
 }  // namespace
 
-std::vector<std::string> expandFamily(std::string_view family) {
+std::vector<std::string> expandNames(const NameRow& row) {
   std::vector<std::string> names;
-  std::string text(familyStem(family).size() + kMostDigits, 0);
-  writeNames(family, text.data(), [&names](std::string_view name) {
+  std::string text(mostBytes(row), 0);
+  writeNames(row, text.data(), [&names](std::string_view name) {
     names.emplace_back(name);
     return false;
   });
@@ -47,12 +56,12 @@ std::vector<std::string> expandFamily(std::string_view family) {
 
 NameTable::NameTable(std::span<const NameRow> rows) : index_(countNames(rows)) {
   std::size_t bytes = 0;
-  for (const NameRow& row : rows) bytes += mostBytes(row.family);
+  for (const NameRow& row : rows) bytes += mostBytes(row);
   text_ = std::make_unique_for_overwrite<char[]>(bytes);
   entries_.reserve(countNames(rows));
   char* end = text_.get();
   for (const NameRow& row : rows) {
-    end = writeNames(row.family, end, [&](std::string_view name) {
+    end = writeNames(row, end, [&](std::string_view name) {
       const std::uint32_t hash = base::keyHash(name);
       if (place(name, hash) != base::KeyIndex::kNone) return false;
       index_.insert(hash, static_cast<std::uint32_t>(entries_.size()));

@@ -4,7 +4,7 @@
 #include <bit>
 #include <cmath>
 
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "NANDInfo/vocabulary/CounterLists.h"
 #include "base/Convert.h"
 
 namespace NANDInfo {
@@ -13,71 +13,13 @@ using plist::Dictionary;
 using plist::Number;
 using plist::Value;
 
-const NameTable& WhitelistedRawNANDFTLCounters_SigDigDict() {
-  static const NameTable table(ftlSignificantDigitsRows());
-  return table;
-}
-
-const NameTable& WhitelistedRawNANDMSPCounters_SigDigDict() {
-  static const NameTable table(mspSignificantDigitsRows());
-  return table;
-}
-
-const NameTable& WhitelistedStorageStats_SigDigDict() {
-  static const NameTable table(storageSignificantDigitsRows());
-  return table;
-}
-
-const NameTable& PrivacyApprovedSMagNANDFTLCounters_Accum() {
-  static const NameTable table(magazineAccumulatedSignificantDigitsRows());
-  return table;
-}
-
-const NameTable& PrivacyApprovedSMagNANDFTLCounters_Dynamic() {
-  static const NameTable table(magazineDynamicSignificantDigitsRows());
-  return table;
-}
-
-const NameTable& PrivacyApprovedSMagNANDFTLCounters_SigDigDict() {
-  static const NameTable table(magazineSignificantDigitsRows());
-  return table;
-}
-
-std::span<const char* const> FTLStats4MSPStats() {
-  static constexpr const char* kKeys[] = {
-      "TLM_APIErrorMessage",
-      "TLM_APIErrorCode",
-      "TLM_DQ_Diskfullness_BP",
-      "TLM_DQ_Capacity_GB",
-      "TLM_averageTLCPECycles",
-      "TLM_averageSLCPECycles",
-      "TLM_hostWrites",
-      "TLM_formatWeeksSince2000",
-      "TLM_Spacereap_totalPurgeable",
-      "TLM_Spacereap_totalNonPurgeable",
-      "TLM_mspBootBlockReadFails_main",
-      "TLM_mspBootBlockReadFails_backup",
-      "TLM_mspBootBlockProgFails_main",
-      "TLM_mspBootBlockProgFails_backup",
-      "TLM_mspBootBlockEraseFails_main",
-      "TLM_mspBootBlockEraseFails_backup",
-      "TLM_numBootBlockRefreshes_max",
-      "TLM_DQ_AmountDataAvailable_MB",
-      "TLM_Capacity_GB",
-      "TLM_Diskfullness_BP",
-      "TLM_SM_deltaDays",
-      "TLM_UserCapacity_MB",
-      "TLM_powerOnHours",
-      "TLM_powerOnSeconds",
-      "TLM_instantaneous_gc_wamp_0",
-      "TLM_instantaneous_gc_wamp_1",
-      "TLM_instantaneous_gc_wamp_2",
-      "TLM_instantaneous_gc_wamp_3",
-      "TLM_instantaneous_gc_wamp_4",
-      "TLM_instantaneous_gc_wamp_5",
-  };
-  return kKeys;
-}
+const NameTable& WhitelistedRawNANDFTLCounters_SigDigDict() { return tableOf<kFTL>(); }
+const NameTable& WhitelistedRawNANDMSPCounters_SigDigDict() { return tableOf<kMSP>(); }
+const NameTable& WhitelistedStorageStats_SigDigDict() { return tableOf<kStorage>(); }
+const NameTable& PrivacyApprovedSMagNANDFTLCounters_Accum() { return tableOf<kAccum>(); }
+const NameTable& PrivacyApprovedSMagNANDFTLCounters_Dynamic() { return tableOf<kDynamic>(); }
+const NameTable& PrivacyApprovedSMagNANDFTLCounters_SigDigDict() { return tableOf<kMagazine>(); }
+const NameTable& FTLStats4MSPStats() { return tableOf<kAlong>(); }
 
 Dictionary CreateFilteredDict(Dictionary dictionary, const NameTable* allowed) {
   if (allowed == nullptr) return dictionary;

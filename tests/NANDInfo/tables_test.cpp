@@ -1,8 +1,12 @@
-// The tables by their fingerprints: one wrong letter, key or number changes them.
+// The tables against golden/, which has a line for each name, key and word of them: what they must
+// be, whatever rows they are derived from.
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <fstream>
+#include <iterator>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -10,119 +14,113 @@
 #include "NANDInfo/Events.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Whitelists.h"
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "base/Text.h"
 #include "support/ControllerBuffers.h"
-#include "support/Fingerprint.h"
 
 namespace NANDInfo {
 namespace {
 
-std::uint64_t digestInOrder(const std::vector<std::string>& lines) {
-  std::string text;
-  for (const std::string& line : lines) text += line + "\n";
-  return support::fingerprint(text);
+using Lines = std::vector<std::string>;
+
+// Tells the lines in which they differ.
+void expectGolden(const std::string& name, const Lines& lines, bool ordered = false) {
+  std::ifstream file(MORVEND_SOURCE_DIR "/tests/NANDInfo/golden/" + name);
+  Lines golden;
+  for (std::string line; std::getline(file, line);) golden.push_back(line);
+  Lines missing, wrong, sorted = lines, sortedGolden = golden;
+  std::ranges::sort(sorted);
+  std::ranges::sort(sortedGolden);
+  std::ranges::set_difference(sortedGolden, sorted, std::back_inserter(missing));
+  std::ranges::set_difference(sorted, sortedGolden, std::back_inserter(wrong));
+  EXPECT_EQ(missing, Lines()) << "should be there: " << name;
+  EXPECT_EQ(wrong, Lines()) << "should not: " << name;
+  EXPECT_TRUE(!ordered || lines == golden) << "in this order: " << name;
 }
 
-// Of the lines in bytewise order.
-std::uint64_t digestOf(std::vector<std::string> lines) {
-  std::ranges::sort(lines);
-  return digestInOrder(lines);
-}
-
-std::string lineOf(std::string_view name, const std::vector<std::size_t>& numbers) {
-  std::string line(name);
-  for (const std::size_t number : numbers) line += " " + std::to_string(number);
-  return line;
-}
-
+// One line a name: the lists that have it, each with the digits that it says.
 TEST(Tables, HoldTheirNamesAndDigitsOnceEach) {
-  const auto event = [](const char* name) {
-    return EventraConfigDetails(std::string("com.norba.massStorage.NANDInfo.") + name);
-  };
-  const std::pair<const NameTable*, std::uint64_t> tables[] = {
-      {&WhitelistedRawNANDFTLCounters_SigDigDict(), 0x9f9155d605ed4a74},
-      {&WhitelistedRawNANDMSPCounters_SigDigDict(), 0x886f8d86b2526163},
-      {&WhitelistedStorageStats_SigDigDict(), 0x6836ac9c52a42c16},
-      {&PrivacyApprovedSMagNANDFTLCounters_Accum(), 0x938e689259d19ed3},
-      {&PrivacyApprovedSMagNANDFTLCounters_Dynamic(), 0xf757393dfba3ec47},
-      {&PrivacyApprovedSMagNANDFTLCounters_SigDigDict(), 0x224e9f65799d6ecb},
-      {event("FTLCounters_1"), 0xe6c43586349f0197},
-      {event("FTLHistograms_1"), 0x2808ebcff73a5ff6},
-      {event("FTLHistograms_2"), 0x59befb47e3512cd4},
-      {event("MSPCounters_1"), 0xaaab112dcc20c52c},
-      {event("SM.Daily.FTLCounters_1"), 0x57622c405bb6ac84},
-      {event("SM.WeeklyMA.FTLCounters_1"), 0x2535b454231f4917},
-      {event("SM.Monthly.FTLCounters_1"), 0x2535b454231f4917},
-      {event("StorageStats_1"), 0xbbb0837fd5900702}};
-  for (const auto& row : tables) {
-    SCOPED_TRACE(&row - tables);
-    const auto& [table, digest] = row;
-    ASSERT_NE(table, nullptr);
-    std::vector<std::string> lines;
-    for (const NameTable::Entry& entry : *table) {
-      lines.push_back(lineOf(entry.name, {entry.number}));
-      ASSERT_EQ(table->find(entry.name), &entry);
-      ASSERT_FALSE(table->contains(std::string(entry.name) + "x"));
+  std::map<std::string, std::string> lists;
+  const auto add = [&lists](const std::string& list, const NameTable& table, bool digits) {
+    for (const NameTable::Entry& entry : table) {
+      const std::string name(entry.name);
+      lists[name] += " " + list + (digits ? ":" + std::to_string(entry.number) : "");
+      ASSERT_EQ(table.find(name), &entry) << list;
+      ASSERT_FALSE(table.contains(name + "x")) << list;
     }
-    EXPECT_EQ(digestOf(lines), digest);
+  };
+  add("FTL", WhitelistedRawNANDFTLCounters_SigDigDict(), true);
+  add("MSP", WhitelistedRawNANDMSPCounters_SigDigDict(), true);
+  add("storage", WhitelistedStorageStats_SigDigDict(), true);
+  add("accumulated", PrivacyApprovedSMagNANDFTLCounters_Accum(), true);
+  add("dynamic", PrivacyApprovedSMagNANDFTLCounters_Dynamic(), true);
+  add("magazine", PrivacyApprovedSMagNANDFTLCounters_SigDigDict(), true);
+  constexpr std::string_view kPrefix = "com.norba.massStorage.NANDInfo.";
+  for (const char* const event : {"FTLCounters_1", "FTLHistograms_1", "FTLHistograms_2",
+                                  "SM.Daily.FTLCounters_1", "SM.WeeklyMA.FTLCounters_1",
+                                  "SM.Monthly.FTLCounters_1", "MSPCounters_1", "StorageStats_1"}) {
+    add(event, *EventraConfigDetails(std::string(kPrefix) + event), false);
   }
-  EXPECT_EQ(event("NORWrites"), nullptr);
-  const auto derived = FTLStats4MSPStats();
-  EXPECT_EQ(digestInOrder({derived.begin(), derived.end()}), 0x0e69bd3a0b74e822);
+  EXPECT_EQ(EventraConfigDetails(std::string(kPrefix) + "NORWrites"), nullptr);
+  Lines lines, fields;
+  for (const auto& [name, where] : lists) lines.push_back(name + where);
+  for (const NameTable::Entry& entry : FTLStats4MSPStats()) fields.emplace_back(entry.name);
+  expectGolden("names.txt", lines);
+  expectGolden("derived-fields.txt", fields, true);
 }
 
-// That every one is found is the parsers' business.
+// Key and elements; tag, width and elements. That every one is found is the parsers' business.
 TEST(Tables, HoldTheKeysAndTagsOfTheController) {
-  std::vector<std::string> keys, tags;
+  Lines lines;
   for (const auto& [key, elements, name] : FTLKeyTable()) {
-    keys.push_back(lineOf(name, {key, elements}));
+    lines.push_back(base::format("%u %u %s", key, elements, name));
   }
   for (const auto& [tag, width, elements, name] : MSPTagTable()) {
-    tags.push_back(lineOf(name, {tag, width, elements}));
+    lines.push_back(base::format("0x%04X %u %u %s", tag, width, elements, name));
   }
-  EXPECT_EQ(digestOf(keys), 0x7328e68f7d989f30);
-  EXPECT_EQ(digestOf(tags), 0xec0dd69f4eb763f7);
+  expectGolden("keys.txt", lines, true);
   EXPECT_EQ(findFTLKey(FTLKeyTable().back().key + 1u), nullptr);
 }
 
 TEST(Tables, HoldEveryCounterUnderItsKey) {
-  std::vector<std::string> lines;
-  for (const KeyMapRow& row : keyMapRows()) {
-    for (const std::string& counter : expandFamily(row.counters)) {
-      lines.push_back(counter + " " + std::string(keyMapKey(counter).value_or("")));
-    }
+  Lines lines;
+  for (const auto& [counter, key] : keyMapEntries()) {
+    lines.push_back(std::string(counter) + " " + std::string(key));
+    EXPECT_EQ(keyMapKey(counter), key);
   }
-  EXPECT_EQ(digestOf(lines), 0x0cb03a7af4f32c85);
+  expectGolden("key-map.txt", lines);
   for (const char* counter : {"", "boots", "padSizes", "padSizes4", "padSizes_0", "PadSize1"}) {
     EXPECT_FALSE(keyMapKey(counter)) << counter;
   }
 }
 
-// Word k of the block is k + 1000, words of the record are 7 beforehand: the fingerprint tells
-// copied, zeroed and untouched words apart.
+// Word k of the block is k + 1000, words of the record are 7 beforehand: a line for each word that
+// is written, and that of the block.
 TEST(CounterRecords, EachConverterWritesTheWordsOfItsMap) {
   support::Bytes block;
   for (std::uint64_t k = 1000; block.size() < kCounterBlockSize; ++k) support::put(block, k, 4);
   const struct {
+    const char* layout;
     void (*convert)(CounterBlock, NandCountersRecord&);
-    std::uint64_t fingerprint;
   } rows[] = {
-      {parseCounters1y, 0x8cf41de0364d1580},
-      {parseCounters1xSandisk, 0xa643238a1cbde590},
-      {parseCounters1xHynix, 0xb81ea124160ffdc5},
-      {parseOnlyAlgoGenericCounters, 0x60dfc5d6559117a0},
-      {parseCountersAlgoGeneric, 0x60dfc5d6559117a0},
-      {parseOnlyAlgoGenericCountersQ8, 0xbf0d94708632bead},
-      {parseCountersAlgoGenericQ8, 0xbf0d94708632bead},
+      {"1y", parseCounters1y},
+      {"1x-sandisk", parseCounters1xSandisk},
+      {"1x-hynix", parseCounters1xHynix},
+      {"generic", parseOnlyAlgoGenericCounters},
+      {"generic", parseCountersAlgoGeneric},
+      {"q8", parseOnlyAlgoGenericCountersQ8},
+      {"q8", parseCountersAlgoGenericQ8},
   };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(&row - rows);
+  for (const auto& [layout, convert] : rows) {
     NandCountersRecord record;
     record.fill(7);
-    row.convert(CounterBlock(block), record);
-    std::string text;
-    for (const std::uint32_t word : record) text += std::to_string(word) + "\n";
-    EXPECT_EQ(support::fingerprint(text), row.fingerprint);
+    convert(CounterBlock(block), record);
+    Lines lines;
+    for (std::size_t i = 0; i < record.size(); ++i) {
+      if (record[i] == 7) continue;
+      const std::string from = record[i] == 0 ? "zero" : std::to_string(record[i] - 1000);
+      lines.push_back(std::to_string(i) + " " + from);
+    }
+    expectGolden(std::string("words-") + layout + ".txt", lines, true);
   }
 }
 

@@ -8,7 +8,7 @@
 #include <limits>
 #include <string>
 
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "NANDInfo/vocabulary/NameFamily.h"
 
 namespace NANDInfo {
 namespace {
@@ -19,11 +19,18 @@ constexpr NameRow kRows[] = {{"n{1, 3..4, 10}", 2}, {"all", 20}, {"n{4, 5}", 3},
 static_assert(countNames(kRows) == 8);
 
 TEST(NameTable, ExpandsFamiliesInOrderAndKeepsTheFirstOfAName) {
-  std::string names;
-  for (const NameTable::Entry& entry : NameTable(kRows)) {
-    names += std::string(entry.name) + ":" + std::to_string(entry.number) + " ";
-  }
-  EXPECT_EQ(names, "n1:2 n3:2 n4:2 n10:2 all:20 n5:3 zero:0 ");
+  const auto names = [](std::span<const NameRow> rows) {
+    std::string text;
+    for (const NameTable::Entry& entry : NameTable(rows)) {
+      text += std::string(entry.name) + ":" + std::to_string(entry.number) + " ";
+    }
+    return text;
+  };
+  EXPECT_EQ(names(kRows), "n1:2 n3:2 n4:2 n10:2 all:20 n5:3 zero:0 ");
+  constexpr NameRow kArrays[] = {
+      {"a", 1, '_', 2}, {"b", 2, '\0', 9, "{0, 7..8}"}, {"k{, A9..10, B2C}"}};
+  static_assert(countNames(kArrays) == 9);
+  EXPECT_EQ(names(kArrays), "a_0:1 a_1:1 b0:2 b7:2 b8:2 k:0 kA9:0 kA10:0 kB2C:0 ");
 }
 
 TEST(Filter, KeepsTheNamedInOrderAndRoundsOnlyNumbersOnDemand) {

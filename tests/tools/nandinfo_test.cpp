@@ -290,6 +290,40 @@ TEST_F(Nandinfo, DecodesCounterBlocksThatHoldWhatTheLayoutReads) {
   }
 }
 
+TEST_F(Nandinfo, SaysWhatIsKnownOfACounter) {
+  const struct {
+    const char* names;
+    int status;
+    const char* part;
+  } rows[] = {
+      {"padSizes_2", 0,
+       R"([{"name": "padSizes_2", "key": "121", "elements": 4, "digits": 8, "whitelists": ["FTL", )"
+       R"("magazine"], "magazine": "accumulated", "events": ["massStorage_NANDInfo_FTLCounters_1"], )"
+       R"("countersKey": "com.norba.NANDInfo.PadSize3"}])"},
+      {"padSizes", 0, R"([{"name": "padSizes_{0..3}", "key": "121", )"},
+      {"padSizes", 0, R"("countersKey": "com.norba.NANDInfo.PadSize{1..4}"}])"},
+      {"bitflipAddr", 0, R"("countersKey": "com.norba.NANDInfo.BitFlipAddrCSW"}, {"name")"},
+      {"bandsPerSpecialFlow", 0,
+       R"({"name": "bandsPerSpecialFlow_3", "key": "114", "elements": 5})"},
+      {"dspExceptionParameter114", 0,
+       R"([{"name": "dspExceptionParameter114{0..19}", "key": "0x1091")"},
+      {"version Count", 0,
+       R"([{"name": "version", "key": "1", "elements": 1}, {"name": "Count", "key": "derived")"},
+      {"version padSise", 1, "there is no counter 'padSise'; did you mean 'padSizes'?"},
+  };
+  for (const auto& [names, status, part] : rows) {
+    Words command = argumentsOf(names);
+    command.insert(command.begin(), {"counters", "--compact"});
+    EXPECT_EQ(run(command), status) << err;
+    EXPECT_NE((out + err).find(part), std::string::npos) << out << err;
+  }
+  terminal = true;
+  EXPECT_EQ(run({"counters", "boots"}), 0);
+  EXPECT_EQ(out,
+            "name      boots\nkey       10\nelements  1\ndigits    5\n\nwhitelists:\nFTL\n\n"
+            "events:\nmassStorage_NANDInfo_FTLCounters_1\n");
+}
+
 // A verdict, a sum or an event that nobody has answered for.
 TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
   const auto commands =

@@ -3,7 +3,7 @@
 #include <set>
 
 #include "NANDInfo/Events.h"
-#include "NANDInfo/vocabulary/NameRows.h"
+#include "NANDInfo/Whitelists.h"
 #include "base/Text.h"
 
 namespace demo {
@@ -23,14 +23,12 @@ constexpr struct {
                  {"com.norba.velquist.", "report channels", "the simple channels"}};
 
 bool isKeyMapped(std::string_view key) {
-  static const auto suffixes = [] {
-    std::set<std::string, std::less<>> names;
-    for (const NANDInfo::KeyMapRow& row : NANDInfo::keyMapRows()) {
-      for (std::string& name : NANDInfo::expandFamily(row.suffixes)) names.insert(std::move(name));
-    }
+  static const auto keys = [] {
+    std::set<std::string_view> names;
+    for (const auto& [counter, name] : NANDInfo::keyMapEntries()) names.insert(name);
     return names;
   }();
-  return key.starts_with(kStorage) && suffixes.contains(key.substr(sizeof kStorage - 1));
+  return keys.contains(key);
 }
 
 }  // namespace

@@ -4,6 +4,7 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "tools/nandinfo/Capture.h"
+#include "tools/nandinfo/Counters.h"
 #include "tools/nandinfo/Decode.h"
 #include "tools/nandinfo/DecodeCapture.h"
 
@@ -112,6 +113,8 @@ constexpr Command kCommands[] = {
      nullptr, extract},
     {nullptr, "dump", "Dump the controller's diagnostic lists into logs", kNothing, Needs::answer,
      nullptr, dump},
+    {nullptr, "counters", "What is known of each counter, and where it may go", kNames,
+     Needs::noDevice, nullptr, counters},
     {nullptr, "capture", "Save all that the commands read, as a device folder", kFolder,
      Needs::controller, nullptr, capture},
     {"decode", "ftl", "A buffer's FTL statistics under their names", kFile, Needs::nothing, nullptr,

@@ -6,6 +6,7 @@
 #include <span>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "base/Result.h"
 #include "platform/Platform.h"
@@ -18,6 +19,7 @@ struct Arguments {
        monthly = false, redact = false;
   std::uint32_t hours = 0, mode = 2, from = 0, channels = 0;  // channels: 0 if it isn't said
   std::string code, layout, file, folder;
+  std::vector<std::string> names;
 };
 
 struct Invocation {
@@ -43,11 +45,12 @@ enum Takes : std::uint16_t {
   kSteps = 128,
   kCapture = 256,
   kChannels = 512,
+  kNames = 1024,
 };
 
-// What a command needs of a storage controller before its result means something: nothing, that it
-// can be opened (and the command itself says so when it can't), or an answer.
-enum class Needs : std::uint8_t { nothing, controller, answer };
+// What a command needs before its result means something: not even a device; nothing of a storage
+// controller; that it can be opened (and the command itself says so when it can't); an answer.
+enum class Needs : std::uint8_t { noDevice, nothing, controller, answer };
 
 struct Command {
   const char* group;  // the word before the name, or null

@@ -22,6 +22,7 @@ namespace nandinfo {
 
 namespace {
 
+using plist::Array;
 using plist::Dictionary;
 using plist::Value;
 
@@ -35,6 +36,7 @@ constexpr char kFooter[] =
     "  nandinfo magazine --hours 24\n"
     "  nandinfo extract --monthly --from 4\n"
     "  nandinfo ean image-size dBIC\n"
+    "  nandinfo counters padSizes\n"
     "  nandinfo capture copy\n"
     "  nandinfo decode ftl copy/statistics-0.bin\n"
     "  nandinfo decode counters 1y copy/telemetry-0.bin\n"
@@ -95,7 +97,9 @@ std::string shown(const CommandServices& services, const Command& command, Form 
                   const CommandResult& result) {
   if (services.outIsTerminal && !form.json && !form.compact) {
     if (!result) return {};
-    if (!isEmpty(*result)) return tableText(*result, services.width);
+    const auto* records = result->as<Array>();
+    const bool isLone = records != nullptr && records->size() == 1;  // it stands upright
+    if (!isEmpty(*result)) return tableText(isLone ? records->front() : *result, services.width);
     return command.empty != nullptr ? base::format("(%s)\n", command.empty) : "(nothing)\n";
   }
   std::string json;
@@ -124,7 +128,9 @@ class Run {
                                       : ControllerWatch::DirectTexts::kept) {}
 
   int run(const Arguments& arguments, Form form) {
-    if (!services_.rootProblem.empty()) return failed(services_.rootProblem);
+    if (command_.needs != Needs::noDevice && !services_.rootProblem.empty()) {
+      return failed(services_.rootProblem);
+    }
     const CommandResult result = resultOf(arguments);
     const std::string problem = command_.needs == Needs::answer ? watch_.problem() : "";
     if (services_.log != nullptr) complaints_ = services_.log->take();
@@ -263,6 +269,9 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
   if (takes(kChannels)) {
     addNumber(app, "--channels", arguments.channels, NANDInfo::kLargestBuffer / kChannelSize,
               "of the controller (default: as many as the file has room for, if it is full)");
+  }
+  if (takes(kNames)) {
+    app.add_option("NAME", arguments.names, "a counter, an array or one of its elements");
   }
   if (takes(kWindow)) addWindow(app, arguments);
   if (takes(kSteps)) addSteps(app, arguments);

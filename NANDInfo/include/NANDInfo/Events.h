@@ -3,6 +3,7 @@
 // An event is sent under its event name; the view name is what the sink's configuration calls it.
 #pragma once
 
+#include <span>
 #include <string_view>
 
 #include "NANDInfo/NameTable.h"
@@ -48,8 +49,15 @@ inline constexpr char kViewName_massStorage_NANDInfo_MSPCounters_1[] =
 inline constexpr char kViewName_massStorage_NANDInfo_StorageStats_1[] =
     "massStorage_NANDInfo_StorageStats_1";
 
-// The fields that an event may carry, expanded at the first use; null for an event that isn't one
-// of the eight above with a view. What else a dictionary holds stays on the device.
+// The events with a view, and the fields that each may carry.
+struct EventView {
+  std::string_view event, view;
+  const NameTable& (*fields)();
+};
+std::span<const EventView> eventViews();
+
+// The fields that an event may carry, expanded at the first use; null for an event that has
+// no view. What else a dictionary holds stays on the device.
 const NameTable* EventraConfigDetails(std::string_view event);
 
 }  // namespace NANDInfo

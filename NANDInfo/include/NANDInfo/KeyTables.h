@@ -3,7 +3,7 @@
 #pragma once
 
 #include <cstdint>
-#include <span>
+#include <vector>
 
 #include "base/Exported.h"
 
@@ -16,8 +16,8 @@ struct FTLKey {
   const char* name;
 };
 
-// Ordered by key.
-std::span<const FTLKey> FTLKeyTable();
+// All of them, ordered by key.
+std::vector<FTLKey> FTLKeyTable();
 
 // The row of a key, or null.
 const FTLKey* findFTLKey(std::uint32_t key);
@@ -30,8 +30,8 @@ struct MSPTag {
   const char* name;
 };
 
-// Ordered by tag.
-std::span<const MSPTag> MSPTagTable();
+// All of them, ordered by tag.
+std::vector<MSPTag> MSPTagTable();
 
 // The row of a tag, or null.
 const MSPTag* findMSPTag(std::uint32_t tag);

@@ -15,9 +15,14 @@
 
 namespace MORVEND_EXPORTED NANDInfo {
 
+// The names of a counter: those of its family or, for an array, the family followed by the joint,
+// if there is one, and by the index of each element, or of those elements that the items have.
 struct NameRow {
   const char* family;
   std::uint8_t number = 0;  // whatever the table says of its names; 0 where it says nothing
+  char joint = '\0';
+  std::uint16_t elements = 1;
+  const char* items = nullptr;  // such as "{0..2, 4}"
 };
 
 // The names that a table's rows stand for, in the order of the rows, found in constant time. Of
@@ -46,8 +51,5 @@ class NameTable {
   std::vector<Entry> entries_;
   base::KeyIndex index_;
 };
-
-// The names of one family, in the order of its braces.
-std::vector<std::string> expandFamily(std::string_view family);
 
 }  // namespace NANDInfo

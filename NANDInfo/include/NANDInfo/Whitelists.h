@@ -3,8 +3,8 @@
 
 #include <cstdint>
 #include <optional>
-#include <span>
 #include <string_view>
+#include <vector>
 
 #include "NANDInfo/NameTable.h"
 #include "base/Exported.h"
@@ -22,10 +22,16 @@ const NameTable& PrivacyApprovedSMagNANDFTLCounters_Dynamic();
 const NameTable& PrivacyApprovedSMagNANDFTLCounters_SigDigDict();
 
 // The derived fields that go with the MSP and storage statistics, in order.
-std::span<const char* const> FTLStats4MSPStats();
+const NameTable& FTLStats4MSPStats();
 
 // The counters service's key of a legacy counter ("com.norba.NANDInfo." and a suffix), or none.
 std::optional<std::string_view> keyMapKey(std::string_view counter);
+
+// Every legacy counter that has such a key.
+struct KeyMapEntry {
+  std::string_view counter, key;
+};
+std::vector<KeyMapEntry> keyMapEntries();
 
 // The entries whose key the collection holds, in their order; null lets everything through.
 plist::Dictionary CreateFilteredDict(plist::Dictionary dictionary, const NameTable* allowed);
