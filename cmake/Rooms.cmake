@@ -11,6 +11,7 @@ target_compile_options(morvend_options INTERFACE
   # GCC 12 takes the inlined concatenation of strings for overlapping copies.
   $<$<CXX_COMPILER_ID:GNU>:-Wno-restrict>)
 target_link_libraries(morvend_options INTERFACE $<$<CONFIG:Release,RelWithDebInfo>:-Wl,-O1>)
+include(cmake/Hardening.cmake)
 if(MORVEND_SANITIZE)
   target_compile_options(morvend_options INTERFACE
     -fsanitize=${MORVEND_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer

@@ -12,6 +12,7 @@
 //   MORVEND_FAULT_ONWARD  if set, every later call fails in the same way, too
 //   MORVEND_FAULT_COUNT   a file that gets the number of calls when the program ends normally
 #define _GNU_SOURCE
+#undef _FORTIFY_SOURCE  // it would take the names that are defined here
 #include <dlfcn.h>
 #include <errno.h>
 #include <fcntl.h>
