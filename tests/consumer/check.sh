@@ -28,6 +28,12 @@ strangers=$(nm -DC --defined-only "$lib/libNANDInfo.so" | cut -d' ' -f3- |
 [ -z "$strangers" ] || fail "exported: $strangers"
 readelf -d "$lib/libNANDInfo.so" | grep -q 'SONAME.*\[libNANDInfo\.so\.0\]' || fail "no SONAME"
 
+# What the static library needs, a user's build finds for itself.
+! grep -rlE "$build|/lib(sqlite3|expat|systemd|md)\." "$lib/cmake/NANDInfo" || fail "exported: a place of this machine"
+for dependency in sqlite3 expat libsystemd libmd; do
+  pkg-config --print-requires-private NANDInfo | grep -qx "$dependency" || fail "pkg-config lacks $dependency"
+done
+
 export MORVEND_ROOT=$work/root DBUS_SYSTEM_BUS_ADDRESS=unix:path=/nonexistent
 mkdir -p "$work/root/device"
 cat >"$work/root/device/properties.plist" <<'EOF'
