@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Formatting, the manual pages' form, clang-tidy over the release build's commands, and the layering of the rooms.
+# Formatting, the manual pages' form, how the rooms know each other, and clang-tidy, over the release build.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 sources() { git ls-files -- '*.cpp' '*.h'; }
@@ -11,28 +11,19 @@ sources | xargs clang-format --dry-run --Werror || failed=1
 echo "== manual pages"
 tools/check_pages.sh || failed=1
 
-# Which room may include what: the room's folder, then the folders that it must not name. The build
-# enforces the same with its include folders; this also sees the system's headers.
-echo "== layering"
-layering() {
-  local folder=$1 forbidden=$2 hits
-  hits=$(git ls-files -- "$folder/*.cpp" "$folder/*.h" | grep -vE "${3:-^$}" |
-    xargs -r grep -nE "^#include [<\"]($forbidden)" || true)
-  [ -z "$hits" ] || { echo "$hits"; failed=1; }
-}
-libraries='sqlite3|systemd/|expat|md5|uuid|CLI/|nlohmann/|unistd|fcntl|sys/|dlfcn|linux/|poll|signal'
-above='host/|device/|NANDInfo/|report/|daemon/|tools/'
-layering base "plist/|platform/|$above|$libraries"
-layering plist "platform/|$above|${libraries//|expat|md5/}"
-layering platform "$above|$libraries"
-layering device "host/|platform/testing/|NANDInfo/|report/|daemon/|tools/|$libraries"
-layering host 'platform/testing/|NANDInfo/|report/|daemon/|tools/'
-layering NANDInfo "host/|platform/testing/|device/|report/|daemon/|tools/|$libraries"
-layering report "host/|platform/testing/|NANDInfo/|daemon/|tools/|$libraries"
-layering daemon "host/|platform/testing/|tools/|$libraries" '^daemon/main\.cpp$'
+echo "== rooms"
+cmake --preset release -DMORVEND_TESTS=ON >/dev/null
+cmake --build --preset release -- --quiet
+tools/check_rooms.py build/release || failed=1
+# The system's headers stay below the host; plist/ has its libraries to itself.
+libraries='sqlite3|systemd/|CLI/|nlohmann/|unistd|fcntl|sys/|dlfcn|linux/|poll|signal|uuid'
+hits=$(git ls-files -- {base,plist,platform,device,NANDInfo,report,daemon}/'*.'{cpp,h} |
+  xargs grep -nE "^#include <($libraries)"
+  git ls-files -- {base,platform,device,NANDInfo,report,daemon}/'*.'{cpp,h} |
+    xargs grep -nE "^#include <(expat|md5)") || true
+[ -z "$hits" ] || { echo "$hits"; failed=1; }
 
 echo "== clang-tidy"
-cmake --preset release -DMORVEND_TESTS=ON >/dev/null
 git ls-files -- '*.cpp' | grep -E '^(base|plist|platform|device|host|NANDInfo|report|daemon|tools)/' |
   xargs -P 2 -n 4 clang-tidy --quiet --extra-arg=-Wno-unknown-warning-option -p build/release 2>/dev/null || failed=1
 

@@ -20,10 +20,9 @@ with open("docs/ARCHITECTURE.md", encoding="utf-8") as text:
 
 
 def room_of(path):
-    """The room of a file or folder; none for tests and the like."""
-    if os.path.basename(path) == "main.cpp" and "/" in path and room_of(os.path.dirname(path)):
-        return "main"
-    return max((room for room in rooms if f"{path}/".startswith(f"{room}/")), key=len, default=None)
+    """The room of a file; none for tests and the like."""
+    folder, name = os.path.split(path)
+    return None if folder not in rooms else "main" if name == "main.cpp" else folder
 
 
 def height(room):
@@ -37,7 +36,7 @@ def arrow(source, target, what):
 
 for folder in sorted({os.path.dirname(path) for path in sources}):
     top = folder.split("/")[0]
-    if top not in ("tests", "fuzz", "bench") and room_of(folder) is None:
+    if top not in ("tests", "fuzz", "bench") and folder not in rooms:
         failures.append(f"{folder}: no room of docs/ARCHITECTURE.md")
 for path in filter(room_of, sources):
     with open(path, encoding="utf-8") as text:
@@ -55,7 +54,7 @@ for path in subprocess.check_output(["git", "ls-files", "--", "*CMakeLists.txt"]
             used = re.search(r"USES([^A-Z]*)", rest)
             uses += [(name, target) for target in (used[1].split() if used else [])]
 for name, target in uses:
-    arrow(room_of(folder_of[name]), room_of(folder_of.get(target, "")), f"{name} uses {target}")
+    arrow(folder_of[name], folder_of.get(target), f"{name} uses {target}")
 
 # The calls: an edge for each symbol from the object that needs it to the one that has it.
 build = sys.argv[1]
