@@ -18,8 +18,7 @@ constexpr struct {
                    {"storage", WhitelistedStorageStats_SigDigDict},
                    {"magazine", PrivacyApprovedSMagNANDFTLCounters_SigDigDict}};
 
-// Adds where the lists say that the name may go.
-CounterEntry looked(CounterEntry entry) {
+void addLists(CounterEntry& entry) {
   for (const auto& [name, table] : kWhitelists) {
     const NameTable::Entry* const listed = table().find(entry.name);
     if (listed == nullptr) continue;
@@ -34,7 +33,13 @@ CounterEntry looked(CounterEntry entry) {
   for (const EventView& event : eventViews()) {
     if (event.fields().contains(entry.name)) entry.events.push_back(event.view);
   }
-  return entry;
+}
+
+// Under its legacy name.
+void addCountersKey(CounterEntry& entry) {
+  std::string name = entry.name;
+  if (!entry.array.empty()) name = std::string(entry.array) + std::to_string(entry.index);
+  entry.countersKey = keyMapKey(name).value_or("");
 }
 
 // The names of a row and, for the elements of an array, the array and the index.
@@ -70,13 +75,9 @@ std::vector<CounterEntry> counterDictionary() {
     for (CounterEntry& entry : entries) {
       // An element that goes elsewhere than its array has a row of its own, but it isn't another.
       if (!known.insert(entry.name).second && entry.buffer == Buffer::none) continue;
-      if (entry.buffer == Buffer::FTL) {
-        const std::string legacyName = entry.array.empty()
-                                           ? entry.name
-                                           : std::string(entry.array) + std::to_string(entry.index);
-        entry.countersKey = keyMapKey(legacyName).value_or("");
-      }
-      dictionary.push_back(looked(std::move(entry)));
+      addLists(entry);
+      if (entry.buffer == Buffer::FTL) addCountersKey(entry);
+      dictionary.push_back(std::move(entry));
     }
   };
   for (const FTLCounter& row : FTLCounters()) add(namesOf(namesOf(row), Buffer::FTL, row.key));

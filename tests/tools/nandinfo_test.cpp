@@ -301,6 +301,7 @@ TEST_F(Nandinfo, SaysWhatIsKnownOfACounter) {
        R"("magazine"], "magazine": "accumulated", "events": ["massStorage_NANDInfo_FTLCounters_1"], )"
        R"("countersKey": "com.norba.NANDInfo.PadSize3"}])"},
       {"padSizes", 0, R"([{"name": "padSizes_{0..3}", "key": "121", )"},
+      {"com.norba.NANDInfo.PadSize3", 0, R"([{"name": "padSizes_2", "key": "121", )"},
       {"padSizes", 0, R"("countersKey": "com.norba.NANDInfo.PadSize{1..4}"}])"},
       {"bitflipAddr", 0, R"("countersKey": "com.norba.NANDInfo.BitFlipAddrCSW"}, {"name")"},
       {"bandsPerSpecialFlow", 0,

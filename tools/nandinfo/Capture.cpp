@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <cstddef>
 #include <string_view>
+#include <vector>
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/NANDInfo.h"
@@ -136,23 +137,15 @@ class Capture {
 
   // Which of the library's events are used; none when all of them are.
   std::optional<Value> analytics() {
-    constexpr const char* kEvents[] = {
-        NANDInfo::kEventName_massStorage_NANDInfo_FTLCounters_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_FTLHistograms_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_FTLHistograms_2,
-        NANDInfo::kEventName_massStorage_NANDInfo_SM_Daily_FTLCounters_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_SM_Monthly_FTLCounters_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_MSPCounters_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_StorageStats_1,
-        NANDInfo::kEventName_massStorage_NANDInfo_NORWrites,
-    };
     if (!platform_.eventra.offersLazySend()) return Dictionary{{"Available", false}};
+    std::vector<std::string_view> events;
+    for (const NANDInfo::EventView& event : NANDInfo::eventViews()) events.push_back(event.event);
+    events.push_back(NANDInfo::kEventName_massStorage_NANDInfo_NORWrites);
     Array used;
-    for (const char* const event : kEvents) {
+    for (const std::string_view event : events) {
       if (platform_.eventra.EventraIsEventUsed(event)) used.push_back(event);
     }
-    if (used.size() == std::size(kEvents)) return std::nullopt;
+    if (used.size() == events.size()) return std::nullopt;
     return Dictionary{{"UsedEvents", std::move(used)}};
   }
 

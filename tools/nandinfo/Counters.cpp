@@ -103,7 +103,9 @@ CommandResult counters(const Invocation& invocation) {
   std::vector<CounterEntry> dictionary = NANDInfo::counterDictionary();
   const std::vector<std::string>& names = invocation.arguments.names;
   const auto isCalled = [](const std::string& name) {
-    return [&name](const CounterEntry& entry) { return entry.name == name || entry.array == name; };
+    return [&name](const CounterEntry& entry) {
+      return entry.name == name || entry.array == name || entry.countersKey == name;
+    };
   };
   for (const std::string& name : names) {
     if (std::ranges::none_of(dictionary, isCalled(name))) {

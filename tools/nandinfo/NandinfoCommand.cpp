@@ -271,7 +271,8 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
               "of the controller (default: as many as the file has room for, if it is full)");
   }
   if (takes(kNames)) {
-    app.add_option("NAME", arguments.names, "a counter, an array or one of its elements");
+    app.add_option("NAME", arguments.names,
+                   "a counter, an array or one of its elements, a key of the counters service");
   }
   if (takes(kWindow)) addWindow(app, arguments);
   if (takes(kSteps)) addSteps(app, arguments);
