@@ -18,7 +18,6 @@ namespace {
 using NANDInfo::CounterEntry;
 using plist::Array;
 using plist::Dictionary;
-using plist::Value;
 
 // A text that ends in a number.
 struct Numbered {
