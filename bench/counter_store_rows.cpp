@@ -8,6 +8,7 @@
 
 #include "bench/Rows.h"
 #include "host/Host.h"
+#include "platform/PLHistory.h"
 #include "support/TemporaryFolder.h"
 
 namespace {

@@ -18,16 +18,18 @@
 #include "daemon/DataUsage.h"
 #include "daemon/Tasking.h"
 #include "host/Host.h"
+#include "platform/CountersService.h"
+#include "platform/SystemLog.h"
 #include "report/PLReport.h"
 
 namespace bench {
 
 namespace {
 
-using platform::Platform;
+using platform::AllServices;
 
 struct Day {
-  Platform& platform;
+  const AllServices& platform;
   morvend::DeviceContext& context;
   std::int32_t number;
 };
@@ -84,7 +86,7 @@ void printSteps(const ReportDevice& device) {
       host::Host host({.root = device.path(), .lowestLevel = platform::LogLevel::error});
       lap(kNumber);
       for (std::size_t step = 0; step < kNumber; ++step) {
-        kSteps[step].run({host.platform(), host.context(), device.yesterday()});
+        kSteps[step].run({host.services(), host.context(), device.yesterday()});
         lap(step);
       }
     }

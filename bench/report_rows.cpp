@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "bench/Rows.h"
+#include "platform/SystemLog.h"
 #include "report/Arithmetic.h"
 #include "report/PLConfig.h"
 #include "report/PrefixTable.h"

@@ -5,11 +5,17 @@
 #include "base/CivilDate.h"
 #include "daemon/DailyTelemetry.h"
 #include "daemon/Tasking.h"
+#include "platform/CountersService.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/LogSubmission.h"
+#include "platform/PreferenceStore.h"
+#include "platform/RunLock.h"
+#include "platform/ServitaLogs.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
 using platform::LogLevel;
-using platform::Platform;
 
 namespace {
 
@@ -21,61 +27,61 @@ struct Day {
   const ActivatedAppInfo* appInfo;
 };
 
-void writeReport(Platform& platform, DeviceContext& context, const Day& day) {
-  if (!platform.submission.DiagnosticLogSubmissionEnabled()) return;
-  report::PLReport(platform, context).writeLogForYesterday(day.number, day.appInfo);
+void writeReport(const Services& services, DeviceContext& context, const Day& day) {
+  if (!services.submission.DiagnosticLogSubmissionEnabled()) return;
+  report::PLReport(services.report, context).writeLogForYesterday(day.number, day.appInfo);
 }
 
 struct Step {
   const char* name;
-  void (*run)(Platform&, DeviceContext&, const Day&);
+  void (*run)(const Services&, DeviceContext&, const Day&);
 };
 
 // No step looks at what another one achieved.
 constexpr Step kDailySequence[] = {
-    {"counters checkpoint", [](Platform& platform, DeviceContext&,
-                               const Day&) { platform.counters.PLClientCheckpoint(); }},
+    {"counters checkpoint", [](const Services& services, DeviceContext&,
+                               const Day&) { services.counters.PLClientCheckpoint(); }},
     {"counters report", writeReport},
     {"telemetry",
-     [](Platform& platform, DeviceContext&, const Day&) { CollectDailyTelemetry(platform); }},
-    {"structured-log dump", [](Platform& platform, DeviceContext&,
-                               const Day&) { platform.faultwatch.dumpAllOldStructuredDataLogs(); }},
+     [](const Services& services, DeviceContext&, const Day&) { CollectDailyTelemetry(services); }},
+    {"structured-log dump", [](const Services& services, DeviceContext&,
+                               const Day&) { services.faultwatch.dumpAllOldStructuredDataLogs(); }},
     {"tasking",
-     [](Platform& platform, DeviceContext&, const Day&) { UpdateTaskingState(platform); }},
-    {"support-log roll-over", [](Platform& platform, DeviceContext&,
-                                 const Day&) { platform.servitaLogs.rollServitaLogs(); }},
+     [](const Services& services, DeviceContext&, const Day&) { UpdateTaskingState(services); }},
+    {"support-log roll-over", [](const Services& services, DeviceContext&,
+                                 const Day&) { services.servitaLogs.rollServitaLogs(); }},
 };
 
-void runSequence(Platform& platform, DeviceContext& context, const Day& day) {
-  platform.log.log(LogLevel::standard, "daily tasks for day %d", day.number);
+void runSequence(const Services& services, DeviceContext& context, const Day& day) {
+  services.log.log(LogLevel::standard, "daily tasks for day %d", day.number);
   for (const Step& step : kDailySequence) {
-    platform.log.log(LogLevel::debug, "daily step: %s", step.name);
-    step.run(platform, context, day);
+    services.log.log(LogLevel::debug, "daily step: %s", step.name);
+    step.run(services, context, day);
   }
 }
 
 }  // namespace
 
-void RunDailyTasksIfDue(Platform& platform, DeviceContext& context,
+void RunDailyTasksIfDue(const Services& services, DeviceContext& context,
                         const ActivatedAppInfo* appInfo) {
-  const std::scoped_lock lock(platform.runLock);
-  const std::int32_t yesterday = base::dayBefore(platform.counters.PLDaysSince1970());
+  const std::scoped_lock lock(services.runLock);
+  const std::int32_t yesterday = base::dayBefore(services.counters.PLDaysSince1970());
   const std::int64_t last =
-      platform.preferences.QNSPreferencesGetIntegerValue(kGateRecord, kDomain);
+      services.preferences.QNSPreferencesGetIntegerValue(kGateRecord, kDomain);
   if (last >= yesterday) {
-    platform.log.log(LogLevel::standard, "Day unchanged since last run");
+    services.log.log(LogLevel::standard, "Day unchanged since last run");
     return;
   }
-  runSequence(platform, context, {yesterday, appInfo});
+  runSequence(services, context, {yesterday, appInfo});
   const plist::Value record(yesterday);
-  platform.preferences.QNSPreferencesSetValue(kGateRecord, &record, kDomain);
-  platform.preferences.QNSPreferencesSynchronize(kDomain);
+  services.preferences.QNSPreferencesSetValue(kGateRecord, &record, kDomain);
+  services.preferences.QNSPreferencesSynchronize(kDomain);
 }
 
-void RunDailyTasks(Platform& platform, DeviceContext& context, std::int32_t day,
+void RunDailyTasks(const Services& services, DeviceContext& context, std::int32_t day,
                    const ActivatedAppInfo* appInfo) {
-  const std::scoped_lock lock(platform.runLock);
-  runSequence(platform, context, {day, appInfo});
+  const std::scoped_lock lock(services.runLock);
+  runSequence(services, context, {day, appInfo});
 }
 
 }  // namespace morvend

@@ -3,8 +3,8 @@
 
 #include <cstdint>
 
+#include "daemon/Services.h"
 #include "device/DeviceContext.h"
-#include "platform/Platform.h"
 #include "report/PLReport.h"
 
 namespace morvend {
@@ -15,12 +15,12 @@ using report::ActivatedAppInfo;
 // already run for yesterday or a later day; the record is written once the sequence is through.
 // `appInfo` may be null. Holds the run lock, so that of two processes one runs and the other finds
 // the gate closed.
-void RunDailyTasksIfDue(platform::Platform& platform, DeviceContext& context,
+void RunDailyTasksIfDue(const Services& services, DeviceContext& context,
                         const ActivatedAppInfo* appInfo);
 
 // Runs the daily sequence for a day, whatever the gate record says, and leaves the record alone.
 // Holds the run lock.
-void RunDailyTasks(platform::Platform& platform, DeviceContext& context, std::int32_t day,
+void RunDailyTasks(const Services& services, DeviceContext& context, std::int32_t day,
                    const ActivatedAppInfo* appInfo);
 
 }  // namespace morvend

@@ -7,11 +7,14 @@
 #include "NANDInfo/NANDInfo.h"
 #include "daemon/DataUsage.h"
 #include "daemon/EccEvents.h"
+#include "platform/CountersService.h"
+#include "platform/DeviceProperties.h"
+#include "platform/ReportingChannels.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
 using platform::LogLevel;
-using platform::Platform;
 using platform::ReportChannel;
 using platform::ScalarValue;
 using plist::Number;
@@ -22,24 +25,24 @@ constexpr std::uint64_t kReportedCategory = 0x100;
 
 std::int64_t mebibytes(std::optional<std::int64_t> bytes) { return bytes ? *bytes >> 20 : -1; }
 
-void CollectDiskUsage(Platform& platform) {
+void CollectDiskUsage(const Services& services) {
   const auto usage =
-      platform.deviceProperties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
-  platform.counters.PLClientSetValuesForScalarKeys(std::array{
+      services.deviceProperties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
+  services.counters.PLClientSetValuesForScalarKeys(std::array{
       ScalarValue{"com.norba.tarvenn.DiskUsageUserTotalBlocks", mebibytes(usage.totalDiskCapacity)},
       ScalarValue{"com.norba.tarvenn.DiskUsageUserBlocksFree",
                   mebibytes(usage.totalDataAvailable)}});
 }
 
-void CollectStorageHealth(Platform& platform) {
-  auto info = NANDInfo::CopyNANDInfoWithOptions(platform);
+void CollectStorageHealth(const Services& services) {
+  auto info = NANDInfo::CopyNANDInfoWithOptions(services.storage);
   if (!info) {
-    platform.log.log(LogLevel::standard, "failed to get NAND info dict");
+    services.log.log(LogLevel::standard, "failed to get NAND info dict");
     return;
   }
-  for (const auto& [key, value] : NANDInfo::CopyVMFreezerNANDInfo(platform)) info->set(key, value);
+  for (const auto& [key, value] : NANDInfo::CopyVMFreezerNANDInfo(services.storage)) info->set(key, value);
   if (const auto* error = info->find(NANDInfo::kNANDInfoErrorKey)) {
-    platform.log.log(LogLevel::standard, "error reading nand info, error %s with message %s",
+    services.log.log(LogLevel::standard, "error reading nand info, error %s with message %s",
                      description(*error).c_str(),
                      description(info->find(NANDInfo::kNANDInfoErrorMessageKey)).c_str());
     return;
@@ -48,16 +51,16 @@ void CollectStorageHealth(Platform& platform) {
   for (const auto& [key, value] : *info) {
     if (const auto* number = value.as<Number>()) values.push_back({key, number->int64Value()});
   }
-  platform.counters.PLClientSetValuesForScalarKeys(values);
+  services.counters.PLClientSetValuesForScalarKeys(values);
 }
 
-void CollectReportChannels(Platform& platform) {
-  auto channels = platform.reportingChannels.copyChannels(kReportedCategory);
+void CollectReportChannels(const Services& services) {
+  auto channels = services.reportingChannels.copyChannels(kReportedCategory);
   if (channels.empty()) return;
   std::erase_if(channels, [](const ReportChannel& channel) {
     return channel.format != platform::kSimpleChannelFormat;
   });
-  const auto subscription = platform.reportingChannels.subscribe(channels);
+  const auto subscription = services.reportingChannels.subscribe(channels);
   const auto samples = subscription ? subscription->createSamples() : std::nullopt;
   if (!samples) return;
   std::vector<std::string> keys;
@@ -68,30 +71,30 @@ void CollectReportChannels(Platform& platform) {
     keys.push_back("com.norba.velquist." + channel.name);
     values.push_back({keys.back(), value});
   }
-  platform.counters.PLClientSetValuesForScalarKeys(values);
+  services.counters.PLClientSetValuesForScalarKeys(values);
 }
 
 struct Collector {
   const char* name;
-  void (*collect)(Platform&);
+  void (*collect)(const Services&);
 };
 
 constexpr Collector kCollectors[] = {
     {"disk usage", CollectDiskUsage},
     {"storage log",
-     [](Platform& platform) { NANDInfo::DumpStorageStructuredLog(platform, false); }},
+     [](const Services& services) { NANDInfo::DumpStorageStructuredLog(services.storage, false); }},
     {"storage health", CollectStorageHealth},
     {"memory errors", CollectEccEvents},
-    {"data usage", [](Platform& platform) { CollectDataUsage(platform); }},
+    {"data usage", [](const Services& services) { CollectDataUsage(services); }},
     {"report channels", CollectReportChannels},
 };
 
 }  // namespace
 
-void CollectDailyTelemetry(Platform& platform) {
+void CollectDailyTelemetry(const Services& services) {
   for (const Collector& collector : kCollectors) {
-    platform.log.log(LogLevel::debug, "telemetry: %s", collector.name);
-    collector.collect(platform);
+    services.log.log(LogLevel::debug, "telemetry: %s", collector.name);
+    collector.collect(services);
   }
 }
 

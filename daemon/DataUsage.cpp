@@ -6,11 +6,14 @@
 
 #include "base/CivilDate.h"
 #include "daemon/DataUsageChanges.h"
+#include "platform/CountersService.h"
+#include "platform/NetworkUsage.h"
+#include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
 using platform::LogLevel;
-using platform::Platform;
 using plist::Array;
 using plist::Dictionary;
 
@@ -19,32 +22,32 @@ namespace {
 constexpr char kBaseline[] = "netUsageBaseline";
 constexpr char kDomain[] = "com.norba.quenset.morvend";
 
-void handleReply(const Platform& platform, const Array* records) {
-  const std::int32_t today = platform.counters.PLDaysSince1970();
-  const auto stored = platform.preferences.QNSPreferencesGetValue(kBaseline, kDomain);
+void handleReply(const Services& services, const Array* records) {
+  const std::int32_t today = services.counters.PLDaysSince1970();
+  const auto stored = services.preferences.QNSPreferencesGetValue(kBaseline, kDomain);
   const auto* baseline = stored ? stored->as<Dictionary>() : nullptr;
   DataUsageChanges changes = dataUsageChanges(
       baseline != nullptr ? *baseline : Dictionary(), records != nullptr ? *records : Array(),
-      platform.counters.PLDateFromDaysSince1970(base::dayBefore(today)));
+      services.counters.PLDateFromDaysSince1970(base::dayBefore(today)));
   std::vector<platform::ScalarValue> additions;
   for (const auto& [key, value] : changes.additions) additions.push_back({key, value});
-  platform.counters.PLClientAddValuesForScalarKeys(additions);
+  services.counters.PLClientAddValuesForScalarKeys(additions);
   const plist::Value value(std::move(changes.baseline));
-  platform.preferences.QNSPreferencesSetValue(kBaseline, &value, kDomain);
-  platform.preferences.QNSPreferencesSynchronize(kDomain);
+  services.preferences.QNSPreferencesSetValue(kBaseline, &value, kDomain);
+  services.preferences.QNSPreferencesSynchronize(kDomain);
 }
 
 }  // namespace
 
-void CollectDataUsage(Platform& platform, std::chrono::nanoseconds patience) {
+void CollectDataUsage(const Services& services, std::chrono::nanoseconds patience) {
   // Shared with the reply, which may come when this has returned.
   const auto done = std::make_shared<std::binary_semaphore>(0);
-  platform.networkUsage.queryAllProcesses([platform, done](const Array* records) {
-    handleReply(platform, records);
+  services.networkUsage.queryAllProcesses([services, done](const Array* records) {
+    handleReply(services, records);
     done->release();
   });
   if (!done->try_acquire_for(patience)) {
-    platform.log.log(LogLevel::standard, "Vexmor timed out, no datausage available");
+    services.log.log(LogLevel::standard, "Vexmor timed out, no datausage available");
   }
 }
 

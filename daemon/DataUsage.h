@@ -3,7 +3,7 @@
 
 #include <chrono>
 
-#include "platform/Platform.h"
+#include "daemon/Services.h"
 
 namespace morvend {
 
@@ -13,7 +13,7 @@ inline constexpr std::chrono::seconds kUsageServicePatience(10);
 // reply adds to today's counters and replaces the baseline: "netUsageBaseline" in the domain
 // "com.norba.quenset.morvend". A late one does so too, on the service's thread, while the process
 // lives; it holds its own references to the platform's services.
-void CollectDataUsage(platform::Platform& platform,
+void CollectDataUsage(const Services& services,
                       std::chrono::nanoseconds patience = kUsageServicePatience);
 
 }  // namespace morvend

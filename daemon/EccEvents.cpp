@@ -5,10 +5,12 @@
 #include <cerrno>
 
 #include "base/ByteReader.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/Kernel.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
@@ -35,21 +37,21 @@ Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> record) 
   return data;
 }
 
-void CollectEccEvents(Platform& platform) {
+void CollectEccEvents(const Services& services) {
   std::array<std::byte, kEccEventRecordSize> record{};
   // Each read is offered the length that the one before returned, in the same buffer.
   std::size_t length = record.size();
   for (int events = 0; events < kMostEventsPerRun; ++events) {
-    const auto read = platform.kernel.sysctlbyname(kNextEvent, std::span(record).first(length));
+    const auto read = services.kernel.sysctlbyname(kNextEvent, std::span(record).first(length));
     if (read.error != 0) {
       if (read.error != ENOENT && read.error != EBUSY) {
-        platform.log.log(platform::LogLevel::standard,
+        services.log.log(platform::LogLevel::standard,
                          "Unexpected errno (%d) reading ECC events from kernel", read.error);
       }
       return;
     }
     length = std::min(length, read.length);
-    platform.faultwatch.logStructuredData(kStructuredDataType, eccEventData(record));
+    services.faultwatch.logStructuredData(kStructuredDataType, eccEventData(record));
   }
 }
 

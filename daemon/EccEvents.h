@@ -4,7 +4,8 @@
 #include <cstddef>
 #include <span>
 
-#include "platform/Platform.h"
+#include "daemon/Services.h"
+#include "plist/Value.h"
 
 namespace morvend {
 
@@ -16,6 +17,6 @@ plist::Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> r
 
 // Logs the pending events, at most ten, as structured data of type 172. The rest stays for later
 // runs.
-void CollectEccEvents(platform::Platform& platform);
+void CollectEccEvents(const Services& services);
 
 }  // namespace morvend

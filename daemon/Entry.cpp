@@ -5,64 +5,66 @@
 #include "base/CivilDate.h"
 #include "daemon/DailyRun.h"
 #include "daemon/ServiceListener.h"
+#include "platform/CountersService.h"
+#include "platform/EventLoop.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
 using platform::EventLoop;
 using platform::LogLevel;
-using platform::Platform;
 
 namespace {
 
 constexpr char kServiceName[] = "com.norba.pellorand.morvend";
 constexpr double kIdleSeconds = 10.0;
 
-void serve(Platform& platform, DeviceContext& context) {
+void serve(const Services& services, DeviceContext& context) {
   ServiceState state;
-  const auto listener = platform.namedServices.listen(kServiceName);
+  const auto listener = services.namedServices.listen(kServiceName);
   if (listener != nullptr) {
     listener->start([&](const plist::Dictionary* message) {
-      HandleServiceMessage(platform, context, state, message);
+      HandleServiceMessage(services, context, state, message);
     });
   }
   auto result = EventLoop::RunResult::handledSource;
   while (result != EventLoop::RunResult::timedOut && result != EventLoop::RunResult::toldToEnd) {
-    result = platform.eventLoop.run(kIdleSeconds, true);
+    result = services.eventLoop.run(kIdleSeconds, true);
   }
   if (result == EventLoop::RunResult::toldToEnd) {
-    platform.log.log(LogLevel::standard, "told to end, so no longer waiting for messages");
+    services.log.log(LogLevel::standard, "told to end, so no longer waiting for messages");
   } else if (state.AwaitingAppInfo) {
-    platform.log.log(LogLevel::standard,
+    services.log.log(LogLevel::standard,
                      "never received requested AAI, so moving along without it");
-    RunDailyTasksIfDue(platform, context, nullptr);
+    RunDailyTasksIfDue(services, context, nullptr);
   }
 }
 
-void runOption(Platform& platform, DeviceContext& context, const char* argument) {
-  const std::int32_t today = platform.counters.PLDaysSince1970();
+void runOption(const Services& services, DeviceContext& context, const char* argument) {
+  const std::int32_t today = services.counters.PLDaysSince1970();
   const std::string_view option = argument;
   if (option == "-d") {
-    RunDailyTasksIfDue(platform, context, nullptr);
+    RunDailyTasksIfDue(services, context, nullptr);
   } else if (option == "-f") {
-    RunDailyTasks(platform, context, base::dayBefore(today), nullptr);
+    RunDailyTasks(services, context, base::dayBefore(today), nullptr);
   } else if (option == "-t") {
-    RunDailyTasks(platform, context, today, nullptr);
+    RunDailyTasks(services, context, today, nullptr);
   } else {
-    platform.log.log(LogLevel::standard, "Unknown arg: %s", argument);
+    services.log.log(LogLevel::standard, "Unknown arg: %s", argument);
   }
 }
 
 }  // namespace
 
-void RunProcess(Platform& platform, DeviceContext& context, int argumentCount,
+void RunProcess(const Services& services, DeviceContext& context, int argumentCount,
                 const char* const* arguments) {
-  platform.log.log(LogLevel::standard, "morvend started");
+  services.log.log(LogLevel::standard, "morvend started");
   if (argumentCount == 1) {
-    serve(platform, context);
+    serve(services, context);
   } else if (argumentCount >= 2) {
-    runOption(platform, context, arguments[1]);
+    runOption(services, context, arguments[1]);
   }
-  platform.log.log(LogLevel::standard, "morvend ended");
+  services.log.log(LogLevel::standard, "morvend ended");
 }
 
 }  // namespace morvend

@@ -1,8 +1,8 @@
 // The process: what morvend does between its start and its end.
 #pragma once
 
+#include "daemon/Services.h"
 #include "device/DeviceContext.h"
-#include "platform/Platform.h"
 
 namespace morvend {
 
@@ -10,7 +10,7 @@ namespace morvend {
 // seconds pass without one or the process is told to end, with "-d" runs the gate, with "-f" or
 // "-t" the daily sequence for yesterday or today. Everything that goes wrong is logged; the exit
 // status is 0 in every case.
-void RunProcess(platform::Platform& platform, DeviceContext& context, int argumentCount,
+void RunProcess(const Services& services, DeviceContext& context, int argumentCount,
                 const char* const* arguments);
 
 }  // namespace morvend

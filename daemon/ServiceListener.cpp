@@ -4,11 +4,12 @@
 
 #include "base/Text.h"
 #include "daemon/DailyRun.h"
+#include "platform/EventLoop.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
 using platform::LogLevel;
-using platform::Platform;
 using plist::Dictionary;
 using plist::Number;
 using plist::Value;
@@ -63,34 +64,34 @@ ActivatedAppInfo appInfoOf(const Dictionary& message) {
   return apps;
 }
 
-void handleDelivery(Platform& platform, DeviceContext& context, ServiceState& state,
+void handleDelivery(const Services& services, DeviceContext& context, ServiceState& state,
                     const Dictionary& message) {
   const ActivatedAppInfo apps = appInfoOf(message);
-  if (platform.log.shows(LogLevel::standard)) {
-    platform.log.log(LogLevel::standard, "morvend got %sAAI:\n%s",
+  if (services.log.shows(LogLevel::standard)) {
+    services.log.log(LogLevel::standard, "morvend got %sAAI:\n%s",
                      state.AwaitingAppInfo ? "requested" : "(unsolicited -- so ignoring) ",
                      plist::description(Value(apps)).c_str());
   }
   if (!state.AwaitingAppInfo) return;
-  RunDailyTasksIfDue(platform, context, &apps);
+  RunDailyTasksIfDue(services, context, &apps);
   state.AwaitingAppInfo = false;
 }
 
 }  // namespace
 
-void HandleServiceMessage(Platform& platform, DeviceContext& context, ServiceState& state,
+void HandleServiceMessage(const Services& services, DeviceContext& context, ServiceState& state,
                           const Dictionary* message) {
   if (message == nullptr) return;
   const std::int32_t operation = lowBits(integer(*message, "operation"));
-  if (operation == kDeliverAppInfo) return handleDelivery(platform, context, state, *message);
+  if (operation == kDeliverAppInfo) return handleDelivery(services, context, state, *message);
   if (state.firstMessageTaken) return;
   state.firstMessageTaken = true;
   if (operation == kRunForDay) {
-    RunDailyTasks(platform, context, lowBits(integer(*message, "value")), nullptr);
+    RunDailyTasks(services, context, lowBits(integer(*message, "value")), nullptr);
   } else if (operation == kWaitForAppInfo) {
     state.AwaitingAppInfo = true;
-    platform.notifications.postNotification("com.norba.pellorand.morvend.logging");
-    platform.log.log(LogLevel::standard,
+    services.notifications.postNotification("com.norba.pellorand.morvend.logging");
+    services.log.log(LogLevel::standard,
                      "notified of logging status, waiting for activate app info");
   }
 }

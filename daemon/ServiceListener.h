@@ -1,8 +1,8 @@
 // The messages of the named service "com.norba.pellorand.morvend".
 #pragma once
 
+#include "daemon/Services.h"
 #include "device/DeviceContext.h"
-#include "platform/Platform.h"
 
 namespace morvend {
 
@@ -16,7 +16,7 @@ struct ServiceState {
 // Operations: 0 announces app info; 1 runs the day in "value"; 2 delivers app info in "app_data",
 // which starts the gate if it was announced. Of all messages that aren't deliveries only the first
 // has an effect. No message is answered.
-void HandleServiceMessage(platform::Platform& platform, DeviceContext& context, ServiceState& state,
+void HandleServiceMessage(const Services& services, DeviceContext& context, ServiceState& state,
                           const plist::Dictionary* message);
 
 }  // namespace morvend

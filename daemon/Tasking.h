@@ -2,12 +2,12 @@
 // schedules, and the report of log types that are switched off.
 #pragma once
 
-#include "platform/Platform.h"
+#include "daemon/Services.h"
 
 namespace morvend {
 
 // The three in this order. Records lie in the preferences of "com.norba.pellorand.morvend":
 // "LastOSUpdate", "TaskingID", "TaskingOS", "TaskingDigest", "TaskingPayload".
-void UpdateTaskingState(platform::Platform& platform);
+void UpdateTaskingState(const Services& services);
 
 }  // namespace morvend

@@ -6,6 +6,7 @@
 #include "host/Host.h"
 #include "host/process/EndSignals.h"
 #include "host/process/StandardErrorLog.h"
+#include "platform/SystemLog.h"
 
 namespace {
 
@@ -16,9 +17,9 @@ std::string run(const host::HostOptions& options, int argc, char** argv) {
   host::Host host(options);
   if (const std::string problem = host.root().problem(); !problem.empty()) {
     // Said, and then a run like any other on a device that has nothing.
-    host.platform().log.log(LogLevel::error, "%s", problem.c_str());
+    host.services().log.log(LogLevel::error, "%s", problem.c_str());
   }
-  morvend::RunProcess(host.platform(), host.context(), argc, argv);
+  morvend::RunProcess(host.services(), host.context(), argc, argv);
   return host.unkept();
 }
 

@@ -10,7 +10,11 @@
 #include <optional>
 #include <string>
 
-#include "platform/Platform.h"
+#include "platform/DeviceProperties.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/FileSystem.h"
+#include "platform/LibraryLoader.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
@@ -19,9 +23,10 @@ class DeviceContext {
   DeviceContext(platform::DeviceProperties& properties, platform::FileSystem& files,
                 platform::LibraryLoader& libraries, platform::SystemLog& log)
       : properties_(properties), files_(files), libraries_(libraries), log_(log) {}
-  explicit DeviceContext(platform::Platform& platform)
-      : DeviceContext(platform.deviceProperties, platform.files, platform.libraries, platform.log) {
-  }
+  // Out of whatever has these services.
+  template <typename Source>
+  explicit DeviceContext(const Source& source)
+      : DeviceContext(source.deviceProperties, source.files, source.libraries, source.log) {}
   DeviceContext(const DeviceContext&) = delete;
   DeviceContext& operator=(const DeviceContext&) = delete;
 

@@ -25,8 +25,6 @@
 #include "host/recorded/PurgeableSpace.h"
 #include "host/recorded/ReportingChannels.h"
 #include "host/recorded/SystemVersion.h"
-#include "plist/MD5.h"
-#include "plist/PropertyList.h"
 
 namespace host {
 
@@ -40,8 +38,8 @@ HostOptions HostOptions::fromEnvironment() {
 }
 
 // In the order of construction: each service stands after those that it uses.
-struct Host::Services {
-  explicit Services(const HostOptions& options)
+struct Host::Assembly {
+  explicit Assembly(const HostOptions& options)
       : root(options.root),
         ownLog(options.lowestLevel),
         log(options.log != nullptr ? *options.log : ownLog),
@@ -90,30 +88,53 @@ struct Host::Services {
   RunLockFile runLock{root, log};
   recorded::NetworkUsage networkUsage{root, log};  // last: its replies use the others
 
-  platform::Platform platform{
-      log,          streams,      clock,         files,      counters,         counters,
-      preferences,  preferences,  preferences,   submission, *structuredLogs,  servitaLogs,
-      bus,          bus,          notifications, eventSink,  deviceProperties, systemVersion,
-      *kernel,      snapshots,    registry,      registry,   purgeableSpace,   reportingChannels,
-      networkUsage, applications, locale,        libraries,  runLock};
+  platform::AllServices all{.log = log,
+                            .streams = streams,
+                            .clock = clock,
+                            .files = files,
+                            .counters = counters,
+                            .history = counters,
+                            .preferences = preferences,
+                            .analyticsConfiguration = preferences,
+                            .privilegedPreferences = preferences,
+                            .submission = submission,
+                            .faultwatch = *structuredLogs,
+                            .servitaLogs = servitaLogs,
+                            .eventLoop = bus,
+                            .namedServices = bus,
+                            .notifications = notifications,
+                            .eventra = eventSink,
+                            .deviceProperties = deviceProperties,
+                            .systemVersion = systemVersion,
+                            .kernel = *kernel,
+                            .snapshots = snapshots,
+                            .registry = registry,
+                            .drivers = registry,
+                            .purgeableSpace = purgeableSpace,
+                            .reportingChannels = reportingChannels,
+                            .networkUsage = networkUsage,
+                            .applications = applications,
+                            .locale = locale,
+                            .libraries = libraries,
+                            .runLock = runLock};
 };
 
-Host::Host(const HostOptions& options) : services_(std::make_unique<Services>(options)) {
+Host::Host(const HostOptions& options) : assembly_(std::make_unique<Assembly>(options)) {
   // A reader of our output that goes away must not end a run.
   std::signal(SIGPIPE, SIG_IGN);
 }
 
 Host::~Host() = default;
 
-platform::Platform& Host::platform() { return services_->platform; }
-morvend::DeviceContext& Host::context() { return services_->context; }
-CounterStore& Host::counters() { return services_->counters; }
-const DeviceRoot& Host::root() const { return services_->root; }
+const platform::AllServices& Host::services() const { return assembly_->all; }
+morvend::DeviceContext& Host::context() { return assembly_->context; }
+CounterStore& Host::counters() { return assembly_->counters; }
+const DeviceRoot& Host::root() const { return assembly_->root; }
 
 std::string Host::unkept() {
-  if (std::string why = services_->preferences.flushAll(); !why.empty()) return why;
-  if (std::string why = services_->submission.unsubmitted(); !why.empty()) return why;
-  return services_->counters.unrecorded();
+  if (std::string why = assembly_->preferences.flushAll(); !why.empty()) return why;
+  if (std::string why = assembly_->submission.unsubmitted(); !why.empty()) return why;
+  return assembly_->counters.unrecorded();
 }
 
 }  // namespace host

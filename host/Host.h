@@ -9,7 +9,8 @@
 #include "host/PlayedRun.h"
 #include "host/counters/CounterStore.h"
 #include "host/files/DeviceRoot.h"
-#include "platform/Platform.h"
+#include "platform/AllServices.h"
+#include "platform/SystemLog.h"
 
 namespace host {
 
@@ -31,8 +32,8 @@ class Host {
   // event that was sent.
   ~Host();
 
-  // The services live as long as the host.
-  platform::Platform& platform();
+  // They live as long as the host.
+  const platform::AllServices& services() const;
   morvend::DeviceContext& context();  // says where the counters lie
   CounterStore& counters();
   const DeviceRoot& root() const;
@@ -42,8 +43,8 @@ class Host {
   std::string unkept();
 
  private:
-  struct Services;
-  std::unique_ptr<Services> services_;
+  struct Assembly;
+  std::unique_ptr<Assembly> assembly_;
 };
 
 }  // namespace host

@@ -10,6 +10,11 @@
 #include <vector>
 
 #include "base/Convert.h"
+#include "platform/Eventra.h"
+#include "platform/InstalledApplications.h"
+#include "platform/Kernel.h"
+#include "platform/LocaleService.h"
+#include "platform/SystemLog.h"
 #include "report/KernelCounters.h"
 #include "report/PLReport.h"
 
@@ -77,31 +82,31 @@ void PLReport::addInstalledAppInfo() {
   const auto* allOptions = scalarOptions(kAll);
   const auto* thirdPartyOptions = scalarOptions(kThirdParty);
   if (allOptions == nullptr && thirdPartyOptions == nullptr &&
-      !platform_.eventra.EventraIsEventUsed(kEvent)) {
+      !services_.eventra.EventraIsEventUsed(kEvent)) {
     return;
   }
   std::int64_t all = 0, thirdParty = 0;
-  platform_.applications.enumerateBundles([&](platform::InstalledApplications::BundleType type) {
+  services_.applications.enumerateBundles([&](platform::InstalledApplications::BundleType type) {
     ++all;
     if (type == platform::InstalledApplications::BundleType::user) ++thirdParty;
   });
   if (allOptions != nullptr) addScalar(all, kAll, *allOptions);
   if (thirdPartyOptions != nullptr) addScalar(thirdParty, kThirdParty, *thirdPartyOptions);
-  platform_.eventra.EventraSendEventLazy(kEvent, [all, thirdParty] {
+  services_.eventra.EventraSendEventLazy(kEvent, [all, thirdParty] {
     return plist::Dictionary{{"numThirdPartyApps", thirdParty}, {"numAllApps", all}};
   });
 }
 
 void PLReport::addMetadataKeys() {
-  const auto preferred = platform_.locale.preferredLanguages();
+  const auto preferred = services_.locale.preferredLanguages();
   const auto matches =
-      platform_.locale.bestMatch(platform_.locale.systemLocalizations(), preferred);
+      services_.locale.bestMatch(services_.locale.systemLocalizations(), preferred);
   auto firstOf = [](const std::vector<std::string>& languages) {
     return languages.empty() ? std::string("<unknown>") : languages.front();
   };
   metadataOutput_.set("PLUserInterfaceLanguage", firstOf(matches));
   metadataOutput_.set("PLPreferredUserInterfaceLanguage", firstOf(preferred));
-  if (const auto country = platform_.locale.countryCode()) {
+  if (const auto country = services_.locale.countryCode()) {
     metadataOutput_.set("PLUserSetRegionFormat", *country);
   }
 }
@@ -115,21 +120,21 @@ void PLReport::reportDatabaseSize() {
 
 void PLReport::reportCPUUptime() {
   addScalarForKey("com.norba.usage.cur_boot_session_cpu_uptime", [&]() -> std::int64_t {
-    const auto timebase = platform_.kernel.timebase();
+    const auto timebase = services_.kernel.timebase();
     if (!timebase || timebase->denominator == 0) {
-      platform_.log.log(LogLevel::error, "Couldn't retrieve mach_timebase_info");
+      services_.log.log(LogLevel::error, "Couldn't retrieve mach_timebase_info");
       return -1;
     }
     const double minutesPerTick = static_cast<double>(timebase->numerator) * 1e-9 /
                                   static_cast<double>(timebase->denominator) / 60;
     return saturatingCast<std::int64_t>(minutesPerTick *
-                                        static_cast<double>(platform_.kernel.absoluteTime()));
+                                        static_cast<double>(services_.kernel.absoluteTime()));
   });
 }
 
 // The gates are read whether or not a key is whitelisted; a key's own value only if it is.
 void PLReport::reportVMStats() {
-  platform::Kernel& kernel = platform_.kernel;
+  platform::Kernel& kernel = services_.kernel;
   auto add32 = [&](const char* key, const char* name) {
     addScalarForKey(key, [&] { return kernelValue32(kernel, name); });
   };

@@ -3,6 +3,9 @@
 #include <utility>
 
 #include "base/Text.h"
+#include "platform/FileSystem.h"
+#include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
 #include "plist/MD5.h"
 #include "plist/PropertyList.h"
 
@@ -28,12 +31,12 @@ std::string hexadecimal(const std::array<std::uint8_t, 16>& digest) {
 
 // Merges key groups; a later entry replaces an earlier one of the same key.
 struct PLConfig::Loader {
-  platform::Platform& platform;
+  const Services& services;
   PLConfig& config;
   OptionsTable scalarPrefixes{}, distributionPrefixes{};
 
   void skip(const std::string& what) {
-    platform.log.log(LogLevel::error, "Whitelist: skipping %s, it has the wrong type",
+    services.log.log(LogLevel::error, "Whitelist: skipping %s, it has the wrong type",
                      what.c_str());
   }
 
@@ -41,9 +44,9 @@ struct PLConfig::Loader {
     if (group == kInternalTesting && !config.isInternalDevice_) return false;
     bool found = false;
     const bool switchedOn =
-        platform.preferences.QNSPreferencesGetBooleanValue(group, kKeyGroupDomain, &found);
+        services.preferences.QNSPreferencesGetBooleanValue(group, kKeyGroupDomain, &found);
     if (config.isInternalDevice_ || switchedOn || !found) return true;
-    platform.log.log(LogLevel::standard, "keyGroup %s is disabled by tasking", group.c_str());
+    services.log.log(LogLevel::standard, "keyGroup %s is disabled by tasking", group.c_str());
     return false;
   }
 
@@ -80,24 +83,24 @@ struct PLConfig::Loader {
   }
 };
 
-std::unique_ptr<PLConfig> PLConfig::init(platform::Platform& platform,
+std::unique_ptr<PLConfig> PLConfig::init(const Services& services,
                                          morvend::DeviceContext& context) {
-  std::unique_ptr<PLConfig> config(new PLConfig(platform.log, context.PLIsInternalDevice()));
+  std::unique_ptr<PLConfig> config(new PLConfig(services.log, context.PLIsInternalDevice()));
   // One byte more than the codec takes, so that a longer file is refused, not cut.
-  const auto bytes = platform.files.readFile(kWhitelistPath, plist::kMaxSize + 1);
+  const auto bytes = services.files.readFile(kWhitelistPath, plist::kMaxSize + 1);
   if (!bytes) {
-    platform.log.log(LogLevel::error, "Couldn't load whitelist");
+    services.log.log(LogLevel::error, "Couldn't load whitelist");
     return nullptr;
   }
   config->configFileDigest_ = hexadecimal(plist::md5(*bytes));
   const auto parsed = plist::read(*bytes);
   const Dictionary* groups = parsed ? parsed->as<Dictionary>() : nullptr;
   if (groups == nullptr) {
-    platform.log.log(LogLevel::error, "Couldn't parse the contents of the config file. Error: %s",
+    services.log.log(LogLevel::error, "Couldn't parse the contents of the config file. Error: %s",
                      parsed ? "the top level is not a dictionary" : parsed.error.c_str());
     return nullptr;
   }
-  Loader{platform, *config}.load(*groups);
+  Loader{services, *config}.load(*groups);
   return config;
 }
 

@@ -9,9 +9,10 @@
 #include <string_view>
 
 #include "device/DeviceContext.h"
-#include "platform/Platform.h"
+#include "platform/SystemLog.h"
 #include "report/OptionsTable.h"
 #include "report/PrefixTable.h"
+#include "report/Services.h"
 
 namespace report {
 
@@ -19,8 +20,7 @@ class PLConfig {
  public:
   // Reads the whitelist; null, with a line in the log, when the file can't be read or parsed.
   // Entries of the wrong type are skipped, each with a line: their keys are not reported.
-  static std::unique_ptr<PLConfig> init(platform::Platform& platform,
-                                        morvend::DeviceContext& context);
+  static std::unique_ptr<PLConfig> init(const Services& services, morvend::DeviceContext& context);
 
   // The options that apply to a key: those of the key itself, else of the longest prefix with which
   // it begins, else, on an internal device, kUnnamed. Null when the key is not to be reported. The

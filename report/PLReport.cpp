@@ -5,6 +5,13 @@
 
 #include "base/CivilDate.h"
 #include "base/Text.h"
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+#include "platform/DeviceProperties.h"
+#include "platform/LogSubmission.h"
+#include "platform/PLHistory.h"
+#include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
 #include "plist/PropertyList.h"
 #include "report/Arithmetic.h"
 
@@ -22,18 +29,18 @@ constexpr std::int32_t kCrashLogVersion = 1;
 
 }  // namespace
 
-PLReport::PLReport(platform::Platform& platform, morvend::DeviceContext& context)
-    : platform_(platform), context_(context), config_(PLConfig::init(platform, context)) {}
+PLReport::PLReport(const Services& services, morvend::DeviceContext& context)
+    : services_(services), context_(context), config_(PLConfig::init(services, context)) {}
 
 void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) {
-  platform_.log.log(LogLevel::info, "writing pellorand log. yesterday=%d", day);
+  services_.log.log(LogLevel::info, "writing pellorand log. yesterday=%d", day);
   std::set<std::string, std::less<>> refused;  // as long as nothing is let through
   const auto refuse = [&](std::string_view key) {
     if (isEmpty()) refused.emplace(key);
   };
   bool unread = false;
   if (config_ != nullptr) {
-    const auto history = platform_.history.initWithDefaultPath();
+    const auto history = services_.history.initWithDefaultPath();
     const std::int32_t first = base::dayBefore(day);
     history->scalarsForKeyPrefix(
         "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
@@ -60,7 +67,7 @@ void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* ap
         : refused.empty()
             ? "no counter was recorded on that day or the day before"
             : base::format("the whitelist names none of the %zu counters", refused.size());
-    platform_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
+    services_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
   }
   serializeWithDate(day, appInfo);
 }
@@ -73,14 +80,14 @@ void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appIn
   reportCPUUptime();
   reportVMStats();
   if (!unnamed_.empty()) {
-    platform_.log.log(LogLevel::standard,
+    services_.log.log(LogLevel::standard,
                       "reporting %zu keys that no whitelist entry names: this is an internal build",
                       unnamed_.size());
   }
 
   const auto log = plist::writeXML(buildLog(day, appInfo));
   if (!log) {
-    platform_.log.log(LogLevel::error, "Could not create pellorand plist: %s", log.error.c_str());
+    services_.log.log(LogLevel::error, "Could not create pellorand plist: %s", log.error.c_str());
     return;
   }
   submit(*log);
@@ -91,7 +98,7 @@ Dictionary PLReport::buildLog(std::int32_t day, const ActivatedAppInfo* appInfo)
   const std::string digest = config_ != nullptr ? config_->configFileDigest() : std::string();
   config_.reset();
   auto preference = [&](const char* key, Value otherwise) {
-    return platform_.preferences.QNSPreferencesGetValue(key, kDomain)
+    return services_.preferences.QNSPreferencesGetValue(key, kDomain)
         .value_or(std::move(otherwise));
   };
   Value taskID = preference("TaskingID", "(no tasking id)");
@@ -100,8 +107,8 @@ Dictionary PLReport::buildLog(std::int32_t day, const ActivatedAppInfo* appInfo)
 
   Dictionary log;
   log.set("PLCrashLogVersion", kCrashLogVersion);
-  log.set("PLStartDate", platform_.counters.PLDateFromDaysSince1970(day));
-  log.set("PLLogCreationDate", platform_.clock.now());
+  log.set("PLStartDate", services_.counters.PLDateFromDaysSince1970(day));
+  log.set("PLLogCreationDate", services_.clock.now());
   log.set("PLMetadata", std::move(metadataOutput_));
   log.set("PLScalars", std::move(scalarsOutput_));
   log.set("PLDistributions", std::move(distributionsOutput_));
@@ -117,17 +124,17 @@ Dictionary PLReport::buildLog(std::int32_t day, const ActivatedAppInfo* appInfo)
 // The recorded version is updated whether or not the submission then succeeds.
 void PLReport::submit(const std::string& log) {
   Dictionary options;
-  const auto stored = platform_.preferences.QNSPreferencesGetValue(kLastOSVersion, kDomain);
-  const Value current = platform_.systemVersion.operatingSystemVersion();
+  const auto stored = services_.preferences.QNSPreferencesGetValue(kLastOSVersion, kDomain);
+  const Value current = services_.systemVersion.operatingSystemVersion();
   if (!stored || !(*stored == current)) {
-    platform_.preferences.QNSPreferencesSetValue(kLastOSVersion, &current, kDomain);
-    platform_.preferences.QNSPreferencesSynchronize(kDomain);
+    services_.preferences.QNSPreferencesSetValue(kLastOSVersion, &current, kDomain);
+    services_.preferences.QNSPreferencesSynchronize(kDomain);
     options.set("previous_os_version", stored.value_or("<unknown>"));
   }
-  const bool submitted = platform_.submission.QNSWriteLogForSubmission(
+  const bool submitted = services_.submission.QNSWriteLogForSubmission(
       "193", "log-pellorand", options.empty() ? nullptr : &options,
       [&](platform::LogHandle& handle) { handle.write(log); });
-  if (!submitted) platform_.log.log(LogLevel::error, "Failed to write pellorand log");
+  if (!submitted) services_.log.log(LogLevel::error, "Failed to write pellorand log");
 }
 
 bool PLReport::isEmpty() const {
@@ -161,11 +168,11 @@ void PLReport::computeAndAddDistribution(platform::PLHistoryDistributionEnumerat
   const int length = static_cast<int>(key.size());
   const Intervals* intervals = options.intervals ? &*options.intervals : nullptr;
   if (intervals != nullptr) {
-    platform_.log.log(LogLevel::debug, "Treating key %.*s as a histogram", length, key.data());
+    services_.log.log(LogLevel::debug, "Treating key %.*s as a histogram", length, key.data());
   }
   Distribution distribution(intervals);
   if (distribution.histogramFailed()) {
-    platform_.log.log(
+    services_.log.log(
         LogLevel::standard,
         "Couldn't allocate histCounts for key %.*s. Will not calculate histogram values", length,
         key.data());

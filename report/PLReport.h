@@ -10,8 +10,10 @@
 #include <string_view>
 
 #include "device/DeviceContext.h"
-#include "platform/Platform.h"
+
+#include "platform/PLHistory.h"
 #include "report/PLConfig.h"
+#include "report/Services.h"
 
 namespace report {
 
@@ -22,7 +24,7 @@ using ActivatedAppInfo = plist::Array;
 class PLReport {
  public:
   // Loads the whitelist. Without one nothing is whitelisted and no log will be written.
-  PLReport(platform::Platform& platform, morvend::DeviceContext& context);
+  PLReport(const Services& services, morvend::DeviceContext& context);
 
   // Fills the report from the history rows of the day (and of the day before it: a later day's row
   // replaces an earlier one's) and submits it. `day` is the day that is reported; `appInfo` may be
@@ -66,7 +68,7 @@ class PLReport {
   plist::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
   void submit(const std::string& log);
 
-  platform::Platform& platform_;
+  const Services services_;
   morvend::DeviceContext& context_;
   std::unique_ptr<PLConfig> config_;
   plist::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;

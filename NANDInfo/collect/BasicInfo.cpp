@@ -3,15 +3,17 @@
 #include <array>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/decode/Weeks.h"
 #include "base/CivilDate.h"
 #include "base/Convert.h"
-#include "platform/Platform.h"
+#include "platform/Clock.h"
+#include "platform/Kernel.h"
+#include "platform/SystemLog.h"
 
 namespace NANDInfo {
 
 using platform::LogLevel;
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
@@ -81,7 +83,7 @@ std::int64_t reported(const GenericParserCxt::Field& field) {
 
 }  // namespace
 
-Dictionary buildLegacyNANDInfoDict(Platform& platform, const LegacyNandInfoCxt& context,
+Dictionary buildLegacyNANDInfoDict(const Services& services, const LegacyNandInfoCxt& context,
                                    bool leavesOutVersions) {
   Dictionary dictionary;
   const auto set32 = [&](const char* key, std::uint32_t value) {
@@ -93,7 +95,7 @@ Dictionary buildLegacyNANDInfoDict(Platform& platform, const LegacyNandInfoCxt& 
   if (!leavesOutVersions) {
     set32(kNANDInfoExportVersionKey, context.exportVersion);
     set32(kNANDInfoDriverVersionKey, context.driverVersion);
-    dictionary.set(kNANDInfoDemoModeKey, std::int64_t{storeDemoMode(platform)});
+    dictionary.set(kNANDInfoDemoModeKey, std::int64_t{storeDemoMode(services)});
   }
   set32(kNANDInfoNumVirtualBlocksKey, context.numVirtualBlocks);
   set32(kNANDInfoPagesPerVirtualBlockKey, context.pagesPerVirtualBlock);
@@ -124,13 +126,13 @@ Dictionary buildLegacyNANDInfoDict(Platform& platform, const LegacyNandInfoCxt& 
   return dictionary;
 }
 
-std::optional<Dictionary> CopyNANDInfo(Platform& platform) {
+std::optional<Dictionary> CopyNANDInfo(const Services& services) {
   LegacyNandInfoCxt context;
   nand_exporter_t* exporter;
   Dictionary info;
-  if (load_nand_info(platform, exporter, &context)) {
-    info = buildLegacyNANDInfoDict(platform, context, false);
-    const Dictionary space = getSpacereapInfo(platform);
+  if (load_nand_info(services, exporter, &context)) {
+    info = buildLegacyNANDInfoDict(services, context, false);
+    const Dictionary space = getSpacereapInfo(services);
     if (const auto* value = space.find(kTLM_Spacereap_totalPurgeable)) {
       info.set(kNANDInfoSpacereapTotalPurgeableKey, *value);
     }
@@ -144,29 +146,29 @@ std::optional<Dictionary> CopyNANDInfo(Platform& platform) {
   return info;
 }
 
-std::optional<Dictionary> CopyNANDInfoWithOptions(Platform& platform, const Dictionary*) {
-  if (NandInfoShouldLogAllToEV(platform)) return Dictionary();
-  platform.log.log(LogLevel::standard,
+std::optional<Dictionary> CopyNANDInfoWithOptions(const Services& services, const Dictionary*) {
+  if (NandInfoShouldLogAllToEV(services)) return Dictionary();
+  services.log.log(LogLevel::standard,
                    "NANDInfo: CopyNANDInfoWithOptions: obtaining FTL data for PRND\n");
-  auto info = CopyNANDInfo(platform);
+  auto info = CopyNANDInfo(services);
   if (!info) {
     SetAPIErrorMessage("CopyNANDInfoWithOptions: Unable to get FTL Fields for PRND");
-    platform.log.log(LogLevel::standard,
+    services.log.log(LogLevel::standard,
                      "NANDInfo: CopyNANDInfoWithOptions: Unable to get FTL Fields for PRND\n");
   }
-  platform.log.log(LogLevel::standard,
+  services.log.log(LogLevel::standard,
                    "NANDInfo: CopyNANDInfoWithOptions: returning PRND dictionary\n");
   return info;
 }
 
-bool NandInfoShouldLogAllToEV(Platform& platform) {
+bool NandInfoShouldLogAllToEV(const Services& services) {
   std::array<std::byte, 100> session{};
-  if (platform.kernel.sysctlbyname("kern.bootsessionuuid", session).error != 0) return false;
+  if (services.kernel.sysctlbyname("kern.bootsessionuuid", session).error != 0) return false;
   const char first = static_cast<char>(session.front());
   std::int64_t digit = 0;
   if (first >= '0' && first <= '9') digit = first - '0';
   if (first >= 'A' && first <= 'F') digit = first - 'A' + 10;
-  const auto day = base::saturatingCast<std::int64_t>(platform.clock.now().secondsSince1970 /
+  const auto day = base::saturatingCast<std::int64_t>(services.clock.now().secondsSince1970 /
                                                       base::kSecondsPerDay);
   return (day & 1) == (digit & 1);
 }

@@ -3,13 +3,14 @@
 #include <algorithm>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/decode/Counters.h"
 #include "NANDInfo/decode/Weeks.h"
-#include "platform/Platform.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PurgeableSpace.h"
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
@@ -81,17 +82,17 @@ void addFTLFields(const Dictionary& ftl, Dictionary& derived) {
 
 }  // namespace
 
-std::int32_t storeDemoMode(Platform& platform) {
-  return platform.preferences.QNSPreferencesGetBooleanValue("StoreDemoMode",
+std::int32_t storeDemoMode(const Services& services) {
+  return services.preferences.QNSPreferencesGetBooleanValue("StoreDemoMode",
                                                             "com.norba.demo-settings")
              ? 1
              : 0;
 }
 
-Dictionary getSpacereapInfo(Platform& platform) {
+Dictionary getSpacereapInfo(const Services& services) {
   Dictionary info;
-  if (!platform.purgeableSpace.isPresent()) return info;
-  const auto answer = platform.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(
+  if (!services.purgeableSpace.isPresent()) return info;
+  const auto answer = services.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(
       {{"SPACEREAP_VOLUME", "/private/var"}});
   if (!answer) {
     SetAPIErrorMessage(
@@ -104,11 +105,11 @@ Dictionary getSpacereapInfo(Platform& platform) {
   return info;
 }
 
-Dictionary gatherZMCFTLOtherData(Platform& platform, const Dictionary* ftl) {
-  Dictionary derived = getSpacereapInfo(platform);
-  addEntries(CopyVMFreezerNANDInfo(platform), derived);
-  addEntries(GetDiskInfo(platform), derived);
-  derived.set(kTLM_storeDemoMode, storeDemoMode(platform));
+Dictionary gatherZMCFTLOtherData(const Services& services, const Dictionary* ftl) {
+  Dictionary derived = getSpacereapInfo(services);
+  addEntries(CopyVMFreezerNANDInfo(services), derived);
+  addEntries(GetDiskInfo(services), derived);
+  derived.set(kTLM_storeDemoMode, storeDemoMode(services));
   if (ftl != nullptr) {
     addFTLFields(*ftl, derived);
   } else {
@@ -117,14 +118,14 @@ Dictionary gatherZMCFTLOtherData(Platform& platform, const Dictionary* ftl) {
   return derived;
 }
 
-Dictionary gatherZMCOtherData(Platform& platform) {
+Dictionary gatherZMCOtherData(const Services& services) {
   Dictionary fields;
-  const auto ftl = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0);
+  const auto ftl = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0);
   if (!ftl) {
     SetAPIErrorMessage("gatherZMCOtherData: Unable to get FTL counters");
     return fields;
   }
-  const Dictionary derived = gatherZMCFTLOtherData(platform, &*ftl);
+  const Dictionary derived = gatherZMCFTLOtherData(services, &*ftl);
   for (const auto& [key, digits] : FTLStats4MSPStats()) copyIfPresent(derived, key, fields, key);
   return fields;
 }

@@ -4,7 +4,9 @@
 #include <optional>
 
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
+#include "platform/DeviceProperties.h"
+#include "platform/FileSystem.h"
 
 namespace NANDInfo {
 
@@ -28,8 +30,8 @@ struct Figures {
   std::uint64_t capacityGB = 0, userMB = 0, availableMB = 0, fullness = 0;
 };
 
-Figures ofFileSystem(platform::Platform& platform) {
-  const auto statistics = platform.files.statfs(kVolume);
+Figures ofFileSystem(const Services& services) {
+  const auto statistics = services.files.statfs(kVolume);
   if (!statistics) return {};
   const std::uint64_t total = statistics->blocks * statistics->blockSize;
   const std::uint64_t available = statistics->blocksAvailable * statistics->blockSize;
@@ -39,8 +41,8 @@ Figures ofFileSystem(platform::Platform& platform) {
           .fullness = usedShare(total, available)};
 }
 
-Figures ofDeviceProperties(platform::Platform& platform) {
-  const auto usage = platform.deviceProperties.diskUsage();
+Figures ofDeviceProperties(const Services& services) {
+  const auto usage = services.deviceProperties.diskUsage();
   if (!usage) return {};
   const std::uint64_t total = mebibytes(usage->totalDiskCapacity);
   return {.capacityGB = GetUserCapacityInGB(static_cast<std::uint32_t>(total)),
@@ -51,9 +53,9 @@ Figures ofDeviceProperties(platform::Platform& platform) {
 
 }  // namespace
 
-plist::Dictionary GetDiskInfo(platform::Platform& platform) {
-  Figures figures = ofFileSystem(platform);
-  if (figures.capacityGB == 0 || figures.fullness == 0) figures = ofDeviceProperties(platform);
+plist::Dictionary GetDiskInfo(const Services& services) {
+  Figures figures = ofFileSystem(services);
+  if (figures.capacityGB == 0 || figures.fullness == 0) figures = ofDeviceProperties(services);
   return {{kDiskInfo_TLM_DQ_AmountDataAvailable_MB, figures.availableMB},
           {kDiskInfo_TLM_DQ_Diskfullness_BP, figures.fullness},
           {kDiskInfo_TLM_DQ_Capacity_GB, figures.capacityGB},

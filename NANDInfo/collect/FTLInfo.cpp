@@ -5,17 +5,16 @@
 #include <new>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/controller/DriverHandles.h"
-#include "platform/Platform.h"
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 
-std::optional<Dictionary> gatherZMCFTLData(Platform& platform, FTLParser parser, FTLSource source,
-                                           std::uint32_t argument) {
-  const OpenExporter exporter(platform);
+std::optional<Dictionary> gatherZMCFTLData(const Services& services, FTLParser parser,
+                                           FTLSource source, std::uint32_t argument) {
+  const OpenExporter exporter(services);
   if (exporter.get() == nullptr) {
     SetAPIErrorMessage("gatherZMCFTLData: Could not get nand_exporter_t");
     return std::nullopt;
@@ -33,7 +32,7 @@ std::optional<Dictionary> gatherZMCFTLData(Platform& platform, FTLParser parser,
   }
   TunnelCommandBlock block{.argument = statistics ? 0 : argument};
   Buffer buffer;
-  if (!executeTunnelCommand(platform, exporter->io_connection, exporter.get(), getter(), block,
+  if (!executeTunnelCommand(services, exporter->io_connection, exporter.get(), getter(), block,
                             buffer)) {
     return std::nullopt;
   }
@@ -57,11 +56,11 @@ std::optional<Dictionary> gatherZMCFTLData(Platform& platform, FTLParser parser,
   return counters;
 }
 
-std::optional<Dictionary> CopyWhitelistedNANDFTLInfo(Platform& platform, bool round) {
+std::optional<Dictionary> CopyWhitelistedNANDFTLInfo(const Services& services, bool round) {
   Dictionary counters;
-  if (auto ftl = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0)) {
+  if (auto ftl = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0)) {
     counters = std::move(*ftl);
-    addEntries(gatherZMCFTLOtherData(platform, &counters), counters);
+    addEntries(gatherZMCFTLOtherData(services, &counters), counters);
   } else {
     SetAPIErrorMessage("CopyWhitelistedNANDFTLInfo: Unable to gather other FTL fields");
   }
@@ -71,11 +70,11 @@ std::optional<Dictionary> CopyWhitelistedNANDFTLInfo(Platform& platform, bool ro
   return result;
 }
 
-std::optional<Dictionary> CopyNANDFTLInfo(Platform& platform, bool statKeys, bool enabled) {
+std::optional<Dictionary> CopyNANDFTLInfo(const Services& services, bool statKeys, bool enabled) {
   if (!enabled) return std::nullopt;
   const auto parser = statKeys ? FTLParser::statKey : FTLParser::named;
   Dictionary result =
-      gatherZMCFTLData(platform, parser, FTLSource::statistics, 0).value_or(Dictionary());
+      gatherZMCFTLData(services, parser, FTLSource::statistics, 0).value_or(Dictionary());
   if (result.empty()) {
     SetAPIErrorMessage("CopyWhitelistedNANDFTLInfo: Unable to gather other stats magazine deltas");
   }

@@ -3,12 +3,11 @@
 #include <algorithm>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/decode/Counters.h"
-#include "platform/Platform.h"
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
@@ -53,8 +52,8 @@ std::int64_t hostReadErrors(const Dictionary& ftl) {
 }
 
 // The figures that a consumer gets; empty when there are none.
-Dictionary figures(Platform& platform, std::span<const NameRow> names) {
-  Dictionary health = gatherNANDHealthInfo(platform);
+Dictionary figures(const Services& services, std::span<const NameRow> names) {
+  Dictionary health = gatherNANDHealthInfo(services);
   if (health.empty()) SetAPIErrorMessage("CopyServitaNANDInfo: Unable to get health API fields");
   const NameTable table(names);
   return CreateFilteredDict(std::move(health), &table);
@@ -70,8 +69,8 @@ bool isRetirable(const Dictionary& health) {
 
 }  // namespace
 
-Dictionary gatherNANDHealthInfo(Platform& platform) {
-  const auto ftl = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0);
+Dictionary gatherNANDHealthInfo(const Services& services) {
+  const auto ftl = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0);
   if (!ftl) {
     SetAPIErrorMessage("gatherNANDHealthInfo: Unable to get FTL fields");
     return {};
@@ -85,19 +84,19 @@ Dictionary gatherNANDHealthInfo(Platform& platform) {
       {kNANDHealthInfoNumDieFailures, signed64(*ftl, "numDieFailures").value_or(-1)}};
 }
 
-Dictionary CopyServitaNANDInfo(Platform& platform) {
-  Dictionary info = figures(platform, kServitaFigures);
+Dictionary CopyServitaNANDInfo(const Services& services) {
+  Dictionary info = figures(services, kServitaFigures);
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary CopyInternalLabNANDInfo(Platform& platform) {
-  Dictionary info = figures(platform, kInternalLabFigures);
+Dictionary CopyInternalLabNANDInfo(const Services& services) {
+  Dictionary info = figures(services, kInternalLabFigures);
   info.set(kNANDHealthInfoIsNANDRetirable, std::int64_t{isRetirable(info)});
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary CopyOTANANDInfo(Platform& platform) { return figures(platform, kOTAFigures); }
+Dictionary CopyOTANANDInfo(const Services& services) { return figures(services, kOTAFigures); }
 
 }  // namespace NANDInfo

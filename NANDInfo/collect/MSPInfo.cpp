@@ -5,39 +5,38 @@
 #include <string>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/controller/DriverHandles.h"
-#include "platform/Platform.h"
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
 
 constexpr std::uint32_t kMostMSPs = 10;
 
-bool getNANDMSPBuffer(Platform& platform, const OpenExporter& exporter, std::uint32_t index,
+bool getNANDMSPBuffer(const Services& services, const OpenExporter& exporter, std::uint32_t index,
                       Buffer& buffer) {
   TunnelCommandBlock block{.argument = index};
-  return executeTunnelCommand(platform, exporter->io_connection, exporter.get(),
+  return executeTunnelCommand(services, exporter->io_connection, exporter.get(),
                               exporter->getMSPStatsSelectors(), block, buffer);
 }
 
 // The number of MSPs that answer.
-std::uint32_t countMSPs(Platform& platform, const OpenExporter& exporter) {
+std::uint32_t countMSPs(const Services& services, const OpenExporter& exporter) {
   std::uint32_t count = 0;
   for (Buffer buffer; count < kMostMSPs; ++count, buffer.clear()) {
-    if (!getNANDMSPBuffer(platform, exporter, count, buffer)) break;
+    if (!getNANDMSPBuffer(services, exporter, count, buffer)) break;
   }
   return count;
 }
 
 // All counters of each MSP under its index, as far as they could be read. The count is taken first:
 // a controller that stops answering in between is seen as such.
-Dictionary readMSPs(Platform& platform, const OpenExporter& exporter) {
+Dictionary readMSPs(const Services& services, const OpenExporter& exporter) {
   Dictionary msps;
-  const std::uint32_t count = countMSPs(platform, exporter);
+  const std::uint32_t count = countMSPs(services, exporter);
   if (count == 0) {
     SetAPIErrorMessage("CopyWhitelistedNANDMSPInfo: Unable to gather any NAND MSP fields");
     return msps;
@@ -49,7 +48,7 @@ Dictionary readMSPs(Platform& platform, const OpenExporter& exporter) {
   }
   for (std::uint32_t index = 0; index < count; ++index) {
     Buffer buffer;
-    if (!getNANDMSPBuffer(platform, exporter, index, buffer)) {
+    if (!getNANDMSPBuffer(services, exporter, index, buffer)) {
       SetAPIErrorMessage("gatherZMCMSPData: getNANDMSPBuffer tunnel command failed !");
       break;
     }
@@ -64,8 +63,8 @@ Dictionary readMSPs(Platform& platform, const OpenExporter& exporter) {
 }
 
 // All MSPs' counters; none when there is no controller with MSPs. Nothing is held when it returns.
-std::optional<Dictionary> gatherZMCMSPData(Platform& platform) {
-  const OpenExporter exporter(platform);
+std::optional<Dictionary> gatherZMCMSPData(const Services& services) {
+  const OpenExporter exporter(services);
   if (exporter.get() == nullptr) {
     SetAPIErrorMessage("gatherZMCMSPData: Could not get nand_exporter_t");
     return std::nullopt;
@@ -78,7 +77,7 @@ std::optional<Dictionary> gatherZMCMSPData(Platform& platform) {
     SetAPIErrorMessage("gatherZMCMSPData: No io_connection exist");
     return std::nullopt;
   }
-  return readMSPs(platform, exporter);
+  return readMSPs(services, exporter);
 }
 
 // The four parts of the firmware version, 16 bits each, the lowest first.
@@ -105,10 +104,10 @@ Dictionary reported(const Dictionary& counters, const Dictionary& shared, bool r
 
 }  // namespace
 
-Dictionary CopyWhitelistedNANDMSPInfo(Platform& platform, bool round) {
+Dictionary CopyWhitelistedNANDMSPInfo(const Services& services, bool round) {
   Dictionary result;
-  if (const auto msps = gatherZMCMSPData(platform)) {
-    const Dictionary shared = gatherZMCOtherData(platform);
+  if (const auto msps = gatherZMCMSPData(services)) {
+    const Dictionary shared = gatherZMCOtherData(services);
     for (const auto& [index, counters] : *msps) {
       result.set(index, reported(*counters.as<Dictionary>(), shared, round));
     }

@@ -11,15 +11,14 @@
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 using plist::Number;
 using plist::Value;
 
 namespace {
 
-std::optional<Dictionary> snapshot(Platform& platform, std::uint64_t hours) {
-  auto counters = gatherZMCFTLData(platform, FTLParser::named, FTLSource::readStatistics,
+std::optional<Dictionary> snapshot(const Services& services, std::uint64_t hours) {
+  auto counters = gatherZMCFTLData(services, FTLParser::named, FTLSource::readStatistics,
                                    static_cast<std::uint32_t>(hours));
   if (counters) addMagazineTimeStamp(*counters);
   return counters;
@@ -37,11 +36,11 @@ void addWindow(Dictionary& result, const Dictionary& newer, const Dictionary& ol
 
 }  // namespace
 
-Dictionary CopySMagNANDFTLInfo(Platform& platform, std::uint64_t hours, std::uint32_t deltaFlag,
-                               std::uint32_t mode) {
+Dictionary CopySMagNANDFTLInfo(const Services& services, std::uint64_t hours,
+                               std::uint32_t deltaFlag, std::uint32_t mode) {
   Dictionary result{{kNANDInfoIsStatMagSupported, std::int32_t{0}}};
-  const auto newer = snapshot(platform, 0);
-  const auto older = snapshot(platform, hours);
+  const auto newer = snapshot(services, 0);
+  const auto older = snapshot(services, hours);
   if (const Value* const supported = newer ? newer->find(kNANDInfoIsStatMagSupported) : nullptr) {
     result.set(kNANDInfoIsStatMagSupported, *supported);
   }
@@ -50,9 +49,9 @@ Dictionary CopySMagNANDFTLInfo(Platform& platform, std::uint64_t hours, std::uin
   } else if (older) {
     addEntries(*older, result);
   }
-  addEntries(gatherZMCFTLOtherData(platform, newer ? &*newer : nullptr), result);
+  addEntries(gatherZMCFTLOtherData(services, newer ? &*newer : nullptr), result);
 
-  const auto statistics = gatherZMCFTLData(platform, FTLParser::named, FTLSource::statistics, 0);
+  const auto statistics = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0);
   if (statistics && statistics->empty()) {
     SetAPIErrorMessage("CopySMagNANDFTLInfo: Unable to gather new delta fields");
   } else if (statistics) {
@@ -62,8 +61,8 @@ Dictionary CopySMagNANDFTLInfo(Platform& platform, std::uint64_t hours, std::uin
   return result;
 }
 
-Dictionary CopySMagNANDFTLCustomHistoryInfo(Platform& platform, std::uint32_t skips) {
-  auto newer = snapshot(platform, 0);
+Dictionary CopySMagNANDFTLCustomHistoryInfo(const Services& services, std::uint32_t skips) {
+  auto newer = snapshot(services, 0);
   const Number* const supported = newer ? newer->number(kNANDInfoIsStatMagSupported) : nullptr;
   if (supported != nullptr && !supported->boolValue()) {
     return {{kNANDInfoErrorMessageKey, GetAPIErrorMessage()}};
@@ -73,7 +72,7 @@ Dictionary CopySMagNANDFTLCustomHistoryInfo(Platform& platform, std::uint32_t sk
   Dictionary result;
   std::uint64_t hours = 0;
   for (const char* const key : kTLM_instantaneous_gc_wamp_array) {
-    auto older = snapshot(platform, hours += 4);
+    auto older = snapshot(services, hours += 4);
     result.set(key, newer && older ? instantaneousWriteAmplification(*newer, *older)
                                    : Value(std::int32_t{0}));
     newer = std::move(older);

@@ -1,7 +1,7 @@
 // The storage statistics: a few derived fields, and the EAN service's images.
 
 #include "NANDInfo/NANDInfo.h"
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
 
 namespace NANDInfo {
 
@@ -15,14 +15,14 @@ constexpr const char* kDerivedFields[] = {kTLM_formatWeeksSince2000, kTLM_DQ_Cap
 
 }  // namespace
 
-Dictionary CopyWhitelistedStorageStats(platform::Platform& platform, bool round) {
+Dictionary CopyWhitelistedStorageStats(const Services& services, bool round) {
   Dictionary statistics;
-  const Dictionary derived = gatherZMCOtherData(platform);
+  const Dictionary derived = gatherZMCOtherData(services);
   for (const char* key : kDerivedFields) {
     if (const auto* value = derived.find(key)) CopyDictionary(key, *value, statistics);
   }
   for (const EANQuery& query : EANQueries()) {
-    statistics.set(query.key, query.query(platform, query.code));
+    statistics.set(query.key, query.query(services, query.code));
   }
   Dictionary result = CreateFilteredDict_SigDig(std::move(statistics),
                                                 &WhitelistedStorageStats_SigDigDict(), round);

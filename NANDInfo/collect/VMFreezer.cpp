@@ -1,9 +1,10 @@
 // The writes of the kernel's swap-out thread.
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/SnapshotReader.h"
 #include "base/ByteReader.h"
-#include "platform/Platform.h"
+#include "platform/KernelSnapshots.h"
 
 namespace NANDInfo {
 
@@ -19,8 +20,8 @@ std::uint64_t bytesWritten(std::span<const std::byte> statistics) {
 
 }  // namespace
 
-plist::Dictionary CopyVMFreezerNANDInfo(platform::Platform& platform) {
-  const auto snapshot = platform.snapshots.capture(platform::KernelSnapshots::kChunkedData);
+plist::Dictionary CopyVMFreezerNANDInfo(const Services& services) {
+  const auto snapshot = services.snapshots.capture(platform::KernelSnapshots::kChunkedData);
   if (!snapshot) return {};
   const auto statistics = getIOStatsWithThreadnameFromKCData(*snapshot, "VM_swapout");
   if (!statistics) return {};

@@ -5,15 +5,16 @@
 #include <utility>
 
 #include "NANDInfo/Controller.h"
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
+#include "platform/DeviceRegistry.h"
 
 namespace NANDInfo {
 
 // An entry of the registry, or an iterator over it.
 class RegistryHandle {
  public:
-  RegistryHandle(platform::Platform& platform, platform::RegistryObject object)
-      : registry_(platform.registry), object_(object) {}
+  RegistryHandle(const Services& services, platform::RegistryObject object)
+      : registry_(services.registry), object_(object) {}
   RegistryHandle(const RegistryHandle&) = delete;
   RegistryHandle& operator=(const RegistryHandle&) = delete;
   ~RegistryHandle() {
@@ -33,8 +34,8 @@ class RegistryHandle {
 // A connection to a service, opened for the process's own task.
 class DriverHandle {
  public:
-  DriverHandle(platform::Platform& platform, platform::RegistryObject service)
-      : drivers_(platform.drivers), opened_(drivers_.DrvServiceOpen(service, 0)) {}
+  DriverHandle(const Services& services, platform::RegistryObject service)
+      : drivers_(services.drivers), opened_(drivers_.DrvServiceOpen(service, 0)) {}
   DriverHandle(const DriverHandle&) = delete;
   DriverHandle& operator=(const DriverHandle&) = delete;
   ~DriverHandle() { close(); }
@@ -61,20 +62,20 @@ class DriverHandle {
 // The record of the first driver that could be opened; null when there is none.
 class OpenExporter {
  public:
-  explicit OpenExporter(platform::Platform& platform) : platform_(platform) {
-    findNandExporterNew(platform, exporter_);
+  explicit OpenExporter(const Services& services) : services_(services) {
+    findNandExporterNew(services, exporter_);
   }
   OpenExporter(const OpenExporter&) = delete;
   OpenExporter& operator=(const OpenExporter&) = delete;
   ~OpenExporter() {
-    if (exporter_ != nullptr) ReleaseIOInterfaces(platform_, exporter_);
+    if (exporter_ != nullptr) ReleaseIOInterfaces(services_, exporter_);
   }
 
   const nand_exporter_t* get() const { return exporter_; }
   const nand_exporter_t* operator->() const { return exporter_; }
 
  private:
-  platform::Platform& platform_;
+  const Services services_;
   nand_exporter_t* exporter_;
 };
 

@@ -1,7 +1,9 @@
 #include "NANDInfo/EAN.h"
 
+#include "NANDInfo/Services.h"
 #include "NANDInfo/controller/DriverHandles.h"
-#include "platform/Platform.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/SystemLog.h"
 
 namespace NANDInfo {
 
@@ -23,22 +25,22 @@ char letter(std::uint32_t code, int place) {
 }
 
 // The service is found and opened anew for each query, so that no connection outlives one.
-std::uint64_t ask(platform::Platform& platform, const Method& method, std::uint32_t code) {
+std::uint64_t ask(const Services& services, const Method& method, std::uint32_t code) {
   const auto unavailable = [&]() -> std::uint64_t {
-    platform.log.log(
+    services.log.log(
         LogLevel::standard, "%s: Unable to get EAN Io service connection for key (%u): %c%c%c%c\n",
         method.query, code, letter(code, 0), letter(code, 1), letter(code, 2), letter(code, 3));
     return 0;
   };
-  const RegistryHandle service(platform, platform.registry.DrvGetMatchingService(kEANClassName));
+  const RegistryHandle service(services, services.registry.DrvGetMatchingService(kEANClassName));
   if (service.get() == 0) {
-    platform.log.log(LogLevel::standard, "getEANConnection: Couldn't find %s object\n",
+    services.log.log(LogLevel::standard, "getEANConnection: Couldn't find %s object\n",
                      kEANClassName);
     return unavailable();
   }
-  const DriverHandle connection(platform, service.get());
+  const DriverHandle connection(services, service.get());
   if (connection.status() != 0) {
-    platform.log.log(LogLevel::standard,
+    services.log.log(LogLevel::standard,
                      "getEANConnection: DrvServiceOpen on %s failed kernResult:%x\n", kEANClassName,
                      connection.status());
   }
@@ -46,10 +48,10 @@ std::uint64_t ask(platform::Platform& platform, const Method& method, std::uint3
 
   const std::uint64_t input = code;
   std::uint64_t output = 0;
-  const auto status = platform.drivers.DrvCallMethod(connection.get(), method.selector,
+  const auto status = services.drivers.DrvCallMethod(connection.get(), method.selector,
                                                      std::span(&input, 1), std::span(&output, 1));
   if (status != 0) {
-    platform.log.log(LogLevel::standard,
+    services.log.log(LogLevel::standard,
                      "%s: DrvCallMethod failed (key (%u): %c%c%c%c) kernResult:%x\n", method.call,
                      code, letter(code, 0), letter(code, 1), letter(code, 2), letter(code, 3),
                      status);
@@ -60,12 +62,12 @@ std::uint64_t ask(platform::Platform& platform, const Method& method, std::uint3
 
 }  // namespace
 
-std::uint64_t GetEANImageSize(platform::Platform& platform, std::uint32_t code) {
-  return ask(platform, kImageSize, code);
+std::uint64_t GetEANImageSize(const Services& services, std::uint32_t code) {
+  return ask(services, kImageSize, code);
 }
 
-std::uint64_t GetEANUpdateCount(platform::Platform& platform, std::uint32_t code) {
-  return ask(platform, kUpdateCount, code);
+std::uint64_t GetEANUpdateCount(const Services& services, std::uint32_t code) {
+  return ask(services, kUpdateCount, code);
 }
 
 }  // namespace NANDInfo

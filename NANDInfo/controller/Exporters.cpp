@@ -5,6 +5,7 @@
 
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/decode/ProcessState.h"
+#include "platform/DeviceRegistry.h"
 
 namespace NANDInfo {
 

@@ -8,8 +8,9 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"
+#include "NANDInfo/Services.h"
 #include "base/ByteReader.h"
-#include "platform/Platform.h"
+#include "platform/DeviceRegistry.h"
 
 namespace NANDInfo {
 
@@ -42,7 +43,7 @@ std::optional<Buffer> allocate(std::uint32_t size) {
 
 }  // namespace
 
-bool executeTunnelCommand(platform::Platform& platform, platform::DriverConnection connection,
+bool executeTunnelCommand(const Services& services, platform::DriverConnection connection,
                           const nand_exporter_t* exporter, const SelectorPair* selectors,
                           TunnelCommandBlock& block, Buffer& buffer) {
   block.inLength = 0;
@@ -65,7 +66,7 @@ bool executeTunnelCommand(platform::Platform& platform, platform::DriverConnecti
   block.opType = selectors->sizeOpType;
   block.sizeQuery = 1;
   std::array<std::byte, 4> announced{};
-  if (platform.drivers
+  if (services.drivers
           .DrvCallStructMethod(connection, exporter->sizeSelector, serialized(block), announced)
           .status != 0) {
     SetAPIErrorMessage(
@@ -81,7 +82,7 @@ bool executeTunnelCommand(platform::Platform& platform, platform::DriverConnecti
   }
   block.opType = selectors->dataOpType;
   block.sizeQuery = 0;
-  const auto answer = platform.drivers.DrvCallStructMethod(connection, exporter->dataSelector,
+  const auto answer = services.drivers.DrvCallStructMethod(connection, exporter->dataSelector,
                                                            serialized(block), *data);
   if (answer.status != 0) {
     SetAPIErrorMessage("executeTunnelCommand: DrvCallStructMethod failed while retrieving data");

@@ -5,7 +5,9 @@
 #include <optional>
 #include <string>
 
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
+#include "platform/StandardStreams.h"
+#include "platform/SystemLog.h"
 
 namespace NANDInfo {
 
@@ -21,7 +23,7 @@ Value valueAt(const void* pointer) {
 }
 
 // The number at the pointer; its absence is logged.
-std::optional<Value> numberAt(platform::Platform& platform, const void* pointer, NumberKind kind) {
+std::optional<Value> numberAt(const Services& services, const void* pointer, NumberKind kind) {
   if (pointer != nullptr) {
     switch (kind) {
       case NumberKind::signed8:
@@ -34,21 +36,21 @@ std::optional<Value> numberAt(platform::Platform& platform, const void* pointer,
         return valueAt<double, double>(pointer);
     }
   }
-  platform.log.log(platform::LogLevel::standard, "Failed to create Orvalix from value: %p",
+  services.log.log(platform::LogLevel::standard, "Failed to create Orvalix from value: %p",
                    pointer);
   return std::nullopt;
 }
 
 }  // namespace
 
-void setNumberValueForType(platform::Platform& platform, plist::Dictionary& dictionary,
+void setNumberValueForType(const Services& services, plist::Dictionary& dictionary,
                            std::string_view key, const void* value, NumberKind kind) {
-  if (auto number = numberAt(platform, value, kind)) dictionary.set(key, *number);
+  if (auto number = numberAt(services, value, kind)) dictionary.set(key, *number);
 }
 
-void appendNumberValueForType(platform::Platform& platform, plist::Array& array, const void* value,
+void appendNumberValueForType(const Services& services, plist::Array& array, const void* value,
                               NumberKind kind) {
-  if (auto number = numberAt(platform, value, kind)) array.push_back(*number);
+  if (auto number = numberAt(services, value, kind)) array.push_back(*number);
 }
 
 Value GetNumberFromDictionarySafe(const plist::Dictionary& dictionary, std::string_view key) {
@@ -69,7 +71,7 @@ void addEntries(const plist::Dictionary& entries, plist::Dictionary& target) {
   for (const auto& [key, value] : entries) CopyDictionary(key, value, target);
 }
 
-std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text) {
+std::uint8_t hexStringToByte(const Services& services, std::string_view text) {
   unsigned byte = 0;
   for (const char given : text.substr(0, 2)) {
     const char character = given >= 'A' && given <= 'Z' ? static_cast<char>(given + 32) : given;
@@ -79,18 +81,18 @@ std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text
     } else if (character >= 'a' && character <= 'f') {
       byte += static_cast<unsigned>(character - 'a' + 10);
     } else {
-      platform.streams.writeOutput(std::string("unrecognized hex character: ") + character);
+      services.streams.writeOutput(std::string("unrecognized hex character: ") + character);
     }
   }
   return static_cast<std::uint8_t>(byte);
 }
 
-std::uint32_t hexStringToInt32(platform::Platform& platform, std::string_view text) {
+std::uint32_t hexStringToInt32(const Services& services, std::string_view text) {
   text = text.substr(0, 8);
   std::uint32_t number = 0;
   // A lone digit at the end is the lowest byte by itself.
   for (; !text.empty(); text.remove_prefix(std::min<std::size_t>(text.size(), 2))) {
-    number |= std::uint32_t{hexStringToByte(platform, text)} << 8 * ((text.size() - 1) / 2);
+    number |= std::uint32_t{hexStringToByte(services, text)} << 8 * ((text.size() - 1) / 2);
   }
   return number;
 }

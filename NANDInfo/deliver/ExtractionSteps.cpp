@@ -10,15 +10,17 @@
 #include "NANDInfo/Extraction.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Magazine.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/controller/DriverHandles.h"
-#include "platform/Platform.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/Eventra.h"
+#include "platform/SystemLog.h"
 
 namespace NANDInfo {
 
 using platform::LogLevel;
-using platform::Platform;
 using plist::Dictionary;
 using plist::Number;
 
@@ -27,8 +29,8 @@ namespace {
 // A payload that the sink may still read while the step goes on.
 using Payload = std::shared_ptr<const Dictionary>;
 
-bool send(Platform& platform, const char* event, Payload payload) {
-  return EventraSendEventLazyWrapper(platform, event,
+bool send(const Services& services, const char* event, Payload payload) {
+  return EventraSendEventLazyWrapper(services, event,
                                      [payload = std::move(payload)] { return *payload; });
 }
 
@@ -37,21 +39,22 @@ Dictionary failure(const char* message) { return {{kNANDInfoErrorMessageKey, mes
 // The lines of one step, which begin with the name of the function that sends.
 class StepLog {
  public:
-  StepLog(Platform& platform, const char* function) : platform_(platform), function_(function) {}
+  StepLog(const Services& services, const char* function)
+      : services_(services), function_(function) {}
 
   void enabled(const char* event) const {
-    platform_.log.log(LogLevel::standard, "NANDInfo: %s: %s enabled=%d\n", function_, event,
-                      platform_.eventra.EventraIsEventUsed(event) ? 1 : 0);
+    services_.log.log(LogLevel::standard, "NANDInfo: %s: %s enabled=%d\n", function_, event,
+                      services_.eventra.EventraIsEventUsed(event) ? 1 : 0);
   }
   void outcome(bool sent, const char* what) const {
-    platform_.log.log(LogLevel::standard,
+    services_.log.log(LogLevel::standard,
                       sent ? "NANDInfo: %s: SUCCESS in logging %s using EventraSendEventLazy\n"
                            : "NANDInfo: %s: FAILED to log %s using EventraSendEventLazy\n",
                       function_, what);
   }
 
  private:
-  Platform& platform_;
+  const Services services_;
   const char* function_;
 };
 
@@ -59,15 +62,15 @@ struct Event {
   const char *name, *view;
 };
 
-Dictionary sendStatistics(Platform& platform, const char* function, const Dictionary& statistics,
-                          std::initializer_list<Event> events) {
-  const StepLog log(platform, function);
+Dictionary sendStatistics(const Services& services, const char* function,
+                          const Dictionary& statistics, std::initializer_list<Event> events) {
+  const StepLog log(services, function);
   Dictionary sent;
   for (const auto& [event, view] : events) {
     log.enabled(event);
     const auto payload = std::make_shared<const Dictionary>(
         CreateFilteredDict(statistics, EventraConfigDetails(event)));
-    const bool succeeds = send(platform, event, payload);
+    const bool succeeds = send(services, event, payload);
     log.outcome(succeeds, view);
     if (succeeds) addEntries(*payload, sent);
   }
@@ -76,10 +79,10 @@ Dictionary sendStatistics(Platform& platform, const char* function, const Dictio
 
 }  // namespace
 
-Dictionary createAndLogFTLStatFieldsToEventraForEvent(Platform& platform,
+Dictionary createAndLogFTLStatFieldsToEventraForEvent(const Services& services,
                                                       const std::optional<Dictionary>& ftl) {
   if (!ftl) return failure("Unable gather FTL fields to log to EV");
-  return sendStatistics(platform, "createAndLogFTLStatFieldsToEventraForEvent", *ftl,
+  return sendStatistics(services, "createAndLogFTLStatFieldsToEventraForEvent", *ftl,
                         {{kEventName_massStorage_NANDInfo_FTLCounters_1,
                           kViewName_massStorage_NANDInfo_FTLCounters_1},
                          {kEventName_massStorage_NANDInfo_FTLHistograms_1,
@@ -88,7 +91,7 @@ Dictionary createAndLogFTLStatFieldsToEventraForEvent(Platform& platform,
                           kViewName_massStorage_NANDInfo_FTLHistograms_2}});
 }
 
-Dictionary createAndLogMSPFieldsToEventraForEvent(Platform& platform,
+Dictionary createAndLogMSPFieldsToEventraForEvent(const Services& services,
                                                   std::optional<Dictionary> msps) {
   constexpr const char* kEvent = kEventName_massStorage_NANDInfo_MSPCounters_1;
   constexpr char kFunction[] = "createAndLogMSPFieldsToEventraForEvent";
@@ -96,7 +99,7 @@ Dictionary createAndLogMSPFieldsToEventraForEvent(Platform& platform,
   msps->remove(kTLM_APIErrorMessage);
   const std::size_t count = msps->size();
 
-  const StepLog log(platform, kFunction);
+  const StepLog log(services, kFunction);
   log.enabled(kEvent);
   Dictionary sent;
   for (const auto& [index, value] : *msps) {
@@ -107,7 +110,7 @@ Dictionary createAndLogMSPFieldsToEventraForEvent(Platform& platform,
     fields.set(kTLM_MSP_msp_index, index);
     fields.set(kTLM_MSP_total_nof_msps, std::uint64_t{count});
     const auto payload = std::make_shared<const Dictionary>(std::move(fields));
-    const bool succeeds = send(platform, kEvent, payload);
+    const bool succeeds = send(services, kEvent, payload);
     log.outcome(succeeds, kViewName_massStorage_NANDInfo_MSPCounters_1);
     if (succeeds) {
       sent.set(kTLM_MSP_msp_index, *payload);
@@ -115,43 +118,44 @@ Dictionary createAndLogMSPFieldsToEventraForEvent(Platform& platform,
       SetAPIErrorMessage("%s: EventraSendEventLazy failed to log to EV", kFunction);
     }
   }
-  platform.log.log(LogLevel::standard, "NANDInfo: %s: %s completed (total_nof_msps:%zu)\n",
+  services.log.log(LogLevel::standard, "NANDInfo: %s: %s completed (total_nof_msps:%zu)\n",
                    kFunction, kEvent, count);
   return sent;
 }
 
-Dictionary createAndLogStorageStatsToEventraForEvent(Platform& platform,
+Dictionary createAndLogStorageStatsToEventraForEvent(const Services& services,
                                                      const std::optional<Dictionary>& storage) {
   if (!storage) return failure("Unable gather Storage fields to log to EV");
-  return sendStatistics(platform, "createAndLogStorageStatsToEventraForEvent", *storage,
+  return sendStatistics(services, "createAndLogStorageStatsToEventraForEvent", *storage,
                         {{kEventName_massStorage_NANDInfo_StorageStats_1,
                           kViewName_massStorage_NANDInfo_StorageStats_1}});
 }
 
-Dictionary gatherNVRAMStats(Platform& platform) {
+Dictionary gatherNVRAMStats(const Services& services) {
   static constexpr struct {
     const char *property, *field;
   } kProperties[] = {{"CommonUsed", "commonused"},
                      {"SystemUsed", "systemused"},
                      {"Generation", "norwrites"},
                      {"Version", "version"}};
-  const RegistryHandle service(platform,
-                               platform.registry.DrvGetMatchingService("NvramDiagService"));
+  const RegistryHandle service(services,
+                               services.registry.DrvGetMatchingService("NvramDiagService"));
   if (service.get() == 0) return {};
   Dictionary statistics;
   for (const auto& [property, field] : kProperties) {
-    auto value = platform.registry.searchProperty(service.get(), property,
+    auto value = services.registry.searchProperty(service.get(), property,
                                                   platform::DeviceRegistry::Direction::children);
     if (value) statistics.set(field, *std::move(value));
   }
   if (!statistics.empty()) {
-    send(platform, kEventName_massStorage_NANDInfo_NORWrites,
+    send(services, kEventName_massStorage_NANDInfo_NORWrites,
          std::make_shared<const Dictionary>(statistics));
   }
   return statistics;
 }
 
-Dictionary createAndLogSMagFTLFieldsToEventraForEvent(Platform& platform, std::int32_t deltaType) {
+Dictionary createAndLogSMagFTLFieldsToEventraForEvent(const Services& services,
+                                                      std::int32_t deltaType) {
   static constexpr struct {
     const char* event;
     std::uint64_t hours;
@@ -160,22 +164,22 @@ Dictionary createAndLogSMagFTLFieldsToEventraForEvent(Platform& platform, std::i
                   {kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1, 168, false},
                   {kEventName_massStorage_NANDInfo_SM_Monthly_FTLCounters_1, 720, false}};
   if (deltaType < 0 || static_cast<std::size_t>(deltaType) >= std::size(kWindows)) {
-    platform.log.log(LogLevel::standard, "Unexpected SM delta type %d", deltaType);
+    services.log.log(LogLevel::standard, "Unexpected SM delta type %d", deltaType);
     return failure("Wrong SM delta type");
   }
   const auto& [event, hours, addsHistory] = kWindows[deltaType];
-  Dictionary window = CopySMagNANDFTLInfo(platform, hours, 1, kMagazineBoth);
+  Dictionary window = CopySMagNANDFTLInfo(services, hours, 1, kMagazineBoth);
   const Number* const supported = window.number(kNANDInfoIsStatMagSupported);
   if (supported == nullptr || !supported->boolValue()) {
     return failure("Stats Magazine not supported");
   }
 
-  const StepLog log(platform, "createAndLogSMagFTLFieldsToEventraForEvent");
+  const StepLog log(services, "createAndLogSMagFTLFieldsToEventraForEvent");
   log.enabled(event);
   window = CreateFilteredDict(std::move(window), EventraConfigDetails(event));
-  if (addsHistory) addEntries(CopySMagNANDFTLCustomHistoryInfo(platform, 0), window);
+  if (addsHistory) addEntries(CopySMagNANDFTLCustomHistoryInfo(services, 0), window);
   const auto payload = std::make_shared<const Dictionary>(std::move(window));
-  const bool succeeds = send(platform, event, payload);
+  const bool succeeds = send(services, event, payload);
   log.outcome(succeeds, event);
   return succeeds ? *payload : Dictionary();
 }

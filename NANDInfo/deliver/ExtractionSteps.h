@@ -4,25 +4,22 @@
 
 #include <optional>
 
+#include "NANDInfo/Services.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace NANDInfo {
 
 // Three events of the FTL statistics: the counters and, in two parts, the histograms.
 plist::Dictionary createAndLogFTLStatFieldsToEventraForEvent(
-    platform::Platform& platform, const std::optional<plist::Dictionary>& ftl);
+    const Services& services, const std::optional<plist::Dictionary>& ftl);
 
 // One event for each MSP of a dictionary by index. Of what was sent the result holds the last,
 // under "msp_index".
-plist::Dictionary createAndLogMSPFieldsToEventraForEvent(platform::Platform& platform,
+plist::Dictionary createAndLogMSPFieldsToEventraForEvent(const Services& services,
                                                          std::optional<plist::Dictionary> msps);
 
 // One event of the storage statistics.
 plist::Dictionary createAndLogStorageStatsToEventraForEvent(
-    platform::Platform& platform, const std::optional<plist::Dictionary>& storage);
+    const Services& services, const std::optional<plist::Dictionary>& storage);
 
 }  // namespace NANDInfo

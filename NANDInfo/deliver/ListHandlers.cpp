@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "NANDInfo/NANDLogWriter.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/decode/DefectsList.h"
@@ -14,11 +15,11 @@
 #include "NANDInfo/decode/ValidityList.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
 #include "base/Text.h"
-#include "platform/Platform.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/StandardStreams.h"
 
 namespace NANDInfo {
 
-using platform::Platform;
 using plist::Dictionary;
 
 namespace {
@@ -27,8 +28,8 @@ constexpr char kUnparsable[] = "data cannot be parsed";
 constexpr char kClassWithoutDefectModes[] = "ZMCStorage";
 
 // Writes the message, and is the handler's answer to it.
-bool refuse(Platform& platform, const std::string& message) {
-  platform.streams.writeError(message);
+bool refuse(const Services& services, const std::string& message) {
+  services.streams.writeError(message);
   return false;
 }
 
@@ -39,94 +40,95 @@ std::optional<std::int32_t> signed32(const Dictionary& dictionary, std::string_v
 }
 
 // The text of a characteristic; null, with a message, when it is missing or no text.
-const std::string* characteristic(Platform& platform, const Dictionary& device, const char* key) {
+const std::string* characteristic(const Services& services, const Dictionary& device,
+                                  const char* key) {
   const char* problem = device.find(key) != nullptr
                             ? "ERROR: %s is not stored as a OrvalstrTypeID\n"
                             : "ERROR: Could not determine the %s\n";
   const std::string* text = device.text(key);
-  if (text == nullptr) platform.streams.writeError(base::format(problem, key));
+  if (text == nullptr) services.streams.writeError(base::format(problem, key));
   return text;
 }
 
 }  // namespace
 
-std::uint64_t vendorCode(Platform& platform, std::string_view identifier) {
-  const auto high = hexStringToInt32(platform, identifier.substr(0, 4)) & 0xFFFF;
+std::uint64_t vendorCode(const Services& services, std::string_view identifier) {
+  const auto high = hexStringToInt32(services, identifier.substr(0, 4)) & 0xFFFF;
   const auto low =
-      hexStringToInt32(platform, identifier.substr(std::min<std::size_t>(4, identifier.size())));
+      hexStringToInt32(services, identifier.substr(std::min<std::size_t>(4, identifier.size())));
   return std::uint64_t{high} << 32 | (low & 0xFFFFFF00);
 }
 
-bool DumpValidityList(Platform& platform, std::span<const std::byte> list, const plist::Value&,
-                      std::string_view) {
+bool DumpValidityList(const Services& services, std::span<const std::byte> list,
+                      const plist::Value&, std::string_view) {
   if (!gNeedValidityList) return true;
   auto lists = parseValidityList(list);
-  if (!lists) return refuse(platform, kUnparsable);
+  if (!lists) return refuse(services, kUnparsable);
   Dictionary log{{"IntermediateWamp", gCurrentSysWamp}, {"UserWamp", gCurrentUserWamp}};
-  DumpNANDInfo(platform, log);
+  DumpNANDInfo(services, log);
   for (std::size_t i = 0; i < lists->size(); ++i) {
     if ((*lists)[i].empty()) continue;
     log.set(base::format("ValidityList[%d]", static_cast<int>(i)), std::move((*lists)[i]));
   }
-  NLW_WriteLog(platform, "165", &log);
+  NLW_WriteLog(services, "165", &log);
   return true;
 }
 
-bool DumpTelemetryList(Platform& platform, std::span<const std::byte> list,
+bool DumpTelemetryList(const Services& services, std::span<const std::byte> list,
                        const plist::Value& characteristics, std::string_view) {
   constexpr int kLongestChipId = 63;
   const auto* device = characteristics.as<Dictionary>();
   if (device == nullptr) {
-    return refuse(platform, "ERROR: Could not parse the Device Characteristics dictionary\n");
+    return refuse(services, "ERROR: Could not parse the Device Characteristics dictionary\n");
   }
-  const std::string* chipId = characteristic(platform, *device, "chip-id");
+  const std::string* chipId = characteristic(services, *device, "chip-id");
   if (chipId == nullptr) return false;
   if (chipId->size() > kLongestChipId) {
     return refuse(
-        platform,
+        services,
         base::format("ERROR: Unable to obtain %s as conversion from the UniChar contents of "
                      "Orvalstr failed, or the buffer of %d bytes is too small\n",
                      "chip-id", kLongestChipId + 1));
   }
-  const std::string* vendorId = characteristic(platform, *device, "manufacturer-id");
+  const std::string* vendorId = characteristic(services, *device, "manufacturer-id");
   if (vendorId == nullptr) return false;
-  const std::uint64_t vendor = vendorCode(platform, *vendorId);
+  const std::uint64_t vendor = vendorCode(services, *vendorId);
   const auto count = signed32(*device, "num-bus");
-  if (!count) return refuse(platform, "ERROR: could not determine the number of channels\n");
+  if (!count) return refuse(services, "ERROR: could not determine the number of channels\n");
   const auto channels = parseTelemetryList(list, *count);
   if (!channels) {
-    return refuse(platform, "ERROR: Attempting to parse beyond the bounds of the buffer\n");
+    return refuse(services, "ERROR: Attempting to parse beyond the bounds of the buffer\n");
   }
   const ChipKind chip = chipKind(*chipId);
   for (const TelemetryChannel& channel : *channels) {
-    platform.faultwatch.logStructuredData(
+    services.faultwatch.logStructuredData(
         kStorageLogType, telemetryLog(channel, chip, counterConverter(chip, vendor)));
   }
   return true;
 }
 
-bool DumpDefectsList(Platform& platform, std::span<const std::byte> list,
+bool DumpDefectsList(const Services& services, std::span<const std::byte> list,
                      const plist::Value& characteristics, std::string_view className) {
   const auto defects = DefectsList::parse(list);
-  if (!defects) return refuse(platform, kUnparsable);
+  if (!defects) return refuse(services, kUnparsable);
   Dictionary header{{"Factory Count", static_cast<std::int32_t>(defects->factoryCount())}};
   if (const auto* device = characteristics.as<Dictionary>()) {
     if (const auto descriptor = signed32(*device, "nand-device-desc")) {
       header.set("com.norba.NANDInfo.nandDesc", *descriptor);
     }
   }
-  platform.faultwatch.logStructuredData(kStorageLogType, header);
+  services.faultwatch.logStructuredData(kStorageLogType, header);
   for (std::size_t i = 0; i < defects->size(); ++i) {
     Defect defect = (*defects)[i];
     if (className != kClassWithoutDefectModes) {
       const auto offset = reasonOffset(defect.mode);
       if (!offset) {
-        platform.streams.writeError(
+        services.streams.writeError(
             base::format("Encountered unexpected defectMode: 0x%x", defect.mode));
       }
       defect.reason += offset.value_or(0);
     }
-    platform.faultwatch.logStructuredData(kStorageLogType, defectLog(defect));
+    services.faultwatch.logStructuredData(kStorageLogType, defectLog(defect));
   }
   return true;
 }

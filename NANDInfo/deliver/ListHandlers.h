@@ -9,15 +9,12 @@
 #include <span>
 #include <string_view>
 
+#include "NANDInfo/Services.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace NANDInfo {
 
-using ListHandler = bool(platform::Platform& platform, std::span<const std::byte> list,
+using ListHandler = bool(const Services& services, std::span<const std::byte> list,
                          const plist::Value& characteristics, std::string_view className);
 
 // The type of the structured-data logs.
@@ -32,7 +29,7 @@ ListHandler DumpTelemetryList;
 
 // The vendor that a "manufacturer-id" names: its first six bytes but the lowest, in the order in
 // which they are read.
-std::uint64_t vendorCode(platform::Platform& platform, std::string_view identifier);
+std::uint64_t vendorCode(const Services& services, std::string_view identifier);
 
 // A structured-data log for the list, and one for each defect.
 ListHandler DumpDefectsList;

@@ -11,17 +11,18 @@
 
 #include "NANDInfo/Collectors.h"
 #include "NANDInfo/Controller.h"
+#include "NANDInfo/Services.h"
 #include "NANDInfo/collect/WriteAmplification.h"
 #include "NANDInfo/controller/DriverHandles.h"
 #include "NANDInfo/deliver/ListHandlers.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
-#include "platform/Platform.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/PreferenceStore.h"
+#include "platform/StandardStreams.h"
 
 namespace NANDInfo {
-
-using platform::Platform;
 
 namespace {
 
@@ -48,12 +49,13 @@ struct ListRetrieval {
   std::uint32_t argument;
 };
 
-std::vector<ListRetrieval> retrievalsFrom(Platform& platform, const nand_exporter_t& exporter) {
+std::vector<ListRetrieval> retrievalsFrom(const Services& services,
+                                          const nand_exporter_t& exporter) {
   std::vector<ListRetrieval> retrievals;
   for (const ListRow& row : kLists) {
     const SelectorGetter getter = exporter.*row.slot;
     if (getter == nullptr) {
-      platform.streams.writeError(row.unsupported);
+      services.streams.writeError(row.unsupported);
       continue;
     }
     for (std::uint32_t argument = 0; argument < row.arguments; ++argument) {
@@ -100,17 +102,17 @@ struct Source {
 };
 
 // Fetches one list, `index` in the order of retrieval, and has it handled.
-bool retrieveList(Platform& platform, const Source& source, const ListRetrieval& retrieval,
+bool retrieveList(const Services& services, const Source& source, const ListRetrieval& retrieval,
                   int index) {
   const SelectorPair* selectors = retrieval.getSelectors();
   if (selectors == nullptr) return false;
   const std::uint32_t flags = source.flags | retrieval.argument << kArgumentShift;
   std::array<std::byte, 4> announced{};
-  const auto asked = platform.drivers.DrvCallStructMethod(
+  const auto asked = services.drivers.DrvCallStructMethod(
       source.connection, source.exporter.sizeSelector,
       commandBlock(selectors->sizeOpType, flags | kSizeQuery), announced);
   if (asked.status != 0) {
-    platform.streams.writeError(base::format(
+    services.streams.writeError(base::format(
         "DrvCallStructMethod failed with status 0x%x on selector index %d\n", asked.status, index));
     return true;
   }
@@ -118,88 +120,88 @@ bool retrieveList(Platform& platform, const Source& source, const ListRetrieval&
   if (size == 0) return true;
   const Pages pages = allocatePages(size);
   if (!pages) {
-    platform.streams.writeError(
+    services.streams.writeError(
         base::format("Could not malloc %zd bytes", static_cast<std::ptrdiff_t>(size)));
     return false;
   }
   const std::span list(pages.get(), size);
   const auto fetched =
-      platform.drivers.DrvCallStructMethod(source.connection, source.exporter.dataSelector,
+      services.drivers.DrvCallStructMethod(source.connection, source.exporter.dataSelector,
                                            commandBlock(selectors->dataOpType, flags), list);
   if (fetched.status != 0) {
-    platform.streams.writeError(base::format(
+    services.streams.writeError(base::format(
         "Could not retrieve data from driver for selector %u\n", selectors->dataOpType));
     return true;
   }
-  return retrieval.handler(platform, list, source.characteristics, source.exporter.className);
+  return retrieval.handler(services, list, source.characteristics, source.exporter.className);
 }
 
-bool retrieveLists(Platform& platform, const Source& source) {
+bool retrieveLists(const Services& services, const Source& source) {
   bool handled = true;
   int index = 0;
-  for (const ListRetrieval& retrieval : retrievalsFrom(platform, source.exporter)) {
-    if (!retrieveList(platform, source, retrieval, index++)) handled = false;
+  for (const ListRetrieval& retrieval : retrievalsFrom(services, source.exporter)) {
+    if (!retrieveList(services, source, retrieval, index++)) handled = false;
   }
   return handled;
 }
 
 // The legacy counters, handed to the user and released; nothing when they can't be had.
 template <typename User>
-void withLegacyCounters(Platform& platform, User use) {
+void withLegacyCounters(const Services& services, User use) {
   LegacyNandInfoCxt context;
   nand_exporter_t* exporter = nullptr;
-  if (!load_nand_info(platform, exporter, &context)) return;
+  if (!load_nand_info(services, exporter, &context)) return;
   use(context);
   if (exporter->releaseLegacy != nullptr) exporter->releaseLegacy(&context);
 }
 
-void decideOnValidityList(Platform& platform) {
+void decideOnValidityList(const Services& services) {
   WriteAmplification amplification;
-  withLegacyCounters(platform, [&](const LegacyNandInfoCxt& context) {
+  withLegacyCounters(services, [&](const LegacyNandInfoCxt& context) {
     amplification = writeAmplificationOf(context);
   });
   gCurrentUserWamp = amplification.user;
   gCurrentSysWamp = amplification.intermediate;
   gNeedValidityList =
-      isHighWriteAmplification(gCurrentUserWamp, platform.preferences.QNSPreferencesGetValue(
+      isHighWriteAmplification(gCurrentUserWamp, services.preferences.QNSPreferencesGetValue(
                                                      "userWAmp", "com.norba.NANDInfo")) ||
       gForceCollectionSet;
 }
 
 }  // namespace
 
-bool DumpStorageStructuredLog(Platform& platform, bool flag) {
-  decideOnValidityList(platform);
+bool DumpStorageStructuredLog(const Services& services, bool flag) {
+  decideOnValidityList(services);
 
   nand_exporter_t* exporter = nullptr;
-  const RegistryHandle service(platform, findNandExporter(platform, exporter));
+  const RegistryHandle service(services, findNandExporter(services, exporter));
   if (service.get() == 0) {
-    platform.streams.writeError("Could not get matching Regmora service for exporting classes\n");
+    services.streams.writeError("Could not get matching Regmora service for exporting classes\n");
     return false;
   }
-  DriverHandle connection(platform, service.get());
+  DriverHandle connection(services, service.get());
   if (connection.status() != 0 || connection.get() == 0) {
-    platform.streams.writeError("Could not get connection to service\n");
+    services.streams.writeError("Could not get connection to service\n");
     return false;
   }
-  const auto characteristics = platform.registry.searchProperty(
+  const auto characteristics = services.registry.searchProperty(
       service.get(), exporter->propertyKey, platform::DeviceRegistry::Direction::parents);
   bool handled = false;
   if (characteristics) {
     handled = retrieveLists(
-        platform, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0});
+        services, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0});
   } else {
-    platform.streams.writeError("failed to create dictionary");
+    services.streams.writeError("failed to create dictionary");
   }
   if (connection.close() != 0) {
-    platform.streams.writeError("Could not close connection to service\n");
+    services.streams.writeError("Could not close connection to service\n");
   }
   return handled;
 }
 
-void DumpNANDInfo(Platform& platform, plist::Dictionary& dictionary) {
-  withLegacyCounters(platform, [&](const LegacyNandInfoCxt& context) {
-    for (const auto& [key, value] : buildLegacyNANDInfoDict(platform, context, true)) {
+void DumpNANDInfo(const Services& services, plist::Dictionary& dictionary) {
+  withLegacyCounters(services, [&](const LegacyNandInfoCxt& context) {
+    for (const auto& [key, value] : buildLegacyNANDInfoDict(services, context, true)) {
       dictionary.set(key, value);
     }
   });

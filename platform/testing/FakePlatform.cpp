@@ -309,13 +309,35 @@ std::unique_ptr<ChannelSubscription> FakeReportingChannels::subscribe(
 }
 
 FakePlatform::FakePlatform(LogLevel lowest)
-    : log(lowest), platform{log,          streams,    clock,          files,
-                            counters,     history,    preferences,    preferences,
-                            preferences,  submission, housekeeping,   housekeeping,
-                            service,      service,    service,        eventra,
-                            device,       device,     kernel,         snapshots,
-                            registry,     registry,   purgeableSpace, reportingChannels,
-                            networkUsage, device,     device,         device,
-                            runLock} {}
+    : log(lowest),
+      platform{.log = log,
+               .streams = streams,
+               .clock = clock,
+               .files = files,
+               .counters = counters,
+               .history = history,
+               .preferences = preferences,
+               .analyticsConfiguration = preferences,
+               .privilegedPreferences = preferences,
+               .submission = submission,
+               .faultwatch = housekeeping,
+               .servitaLogs = housekeeping,
+               .eventLoop = service,
+               .namedServices = service,
+               .notifications = service,
+               .eventra = eventra,
+               .deviceProperties = device,
+               .systemVersion = device,
+               .kernel = kernel,
+               .snapshots = snapshots,
+               .registry = registry,
+               .drivers = registry,
+               .purgeableSpace = purgeableSpace,
+               .reportingChannels = reportingChannels,
+               .networkUsage = networkUsage,
+               .applications = device,
+               .locale = device,
+               .libraries = device,
+               .runLock = runLock} {}
 
 }  // namespace platform::fakes

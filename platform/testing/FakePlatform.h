@@ -13,7 +13,30 @@
 #include <utility>
 #include <vector>
 
-#include "platform/Platform.h"
+#include "platform/AllServices.h"
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+#include "platform/DeviceProperties.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/EventLoop.h"
+#include "platform/Eventra.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/FileSystem.h"
+#include "platform/InstalledApplications.h"
+#include "platform/Kernel.h"
+#include "platform/KernelSnapshots.h"
+#include "platform/LibraryLoader.h"
+#include "platform/LocaleService.h"
+#include "platform/LogSubmission.h"
+#include "platform/NetworkUsage.h"
+#include "platform/PLHistory.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PurgeableSpace.h"
+#include "platform/ReportingChannels.h"
+#include "platform/RunLock.h"
+#include "platform/ServitaLogs.h"
+#include "platform/StandardStreams.h"
+#include "platform/SystemLog.h"
 #include "platform/testing/FakeDeviceRegistry.h"
 #include "platform/testing/RecordingLog.h"
 
@@ -342,7 +365,7 @@ class FakePlatform {
   FakeReportingChannels reportingChannels;
   FakeNetworkUsage networkUsage;
   FakeRunLock runLock;
-  Platform platform;
+  AllServices platform;
 };
 
 }  // namespace platform::fakes

@@ -1,5 +1,29 @@
 #include "platform/testing/FaultInjector.h"
 
+#include "platform/Clock.h"
+#include "platform/CountersService.h"
+#include "platform/DeviceProperties.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/EventLoop.h"
+#include "platform/Eventra.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/FileSystem.h"
+#include "platform/InstalledApplications.h"
+#include "platform/Kernel.h"
+#include "platform/KernelSnapshots.h"
+#include "platform/LibraryLoader.h"
+#include "platform/LocaleService.h"
+#include "platform/LogSubmission.h"
+#include "platform/NetworkUsage.h"
+#include "platform/PLHistory.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PurgeableSpace.h"
+#include "platform/ReportingChannels.h"
+#include "platform/RunLock.h"
+#include "platform/ServitaLogs.h"
+#include "platform/StandardStreams.h"
+#include "platform/SystemLog.h"
+
 #include <cerrno>
 
 namespace platform::fakes {
@@ -95,8 +119,8 @@ struct Listeners : NamedServices {
 };
 
 struct Device : DeviceProperties, SystemVersion, LibraryLoader {
-  Device(Platform& i, Plan& p) : inner(i), plan(p) {}
-  Platform& inner;
+  Device(const AllServices& i, Plan& p) : inner(i), plan(p) {}
+  const AllServices& inner;
   Plan& plan;
   bool booleanProperty(std::string_view name) override {
     return !plan.fails() && inner.deviceProperties.booleanProperty(name);
@@ -146,7 +170,7 @@ struct KernelValues : Kernel {
 
 // A close that fails has closed all the same, any other call that fails was not made.
 struct Registry : DeviceRegistry, DriverConnections {
-  Registry(Platform& i, Plan& p) : registry(i.registry), drivers(i.drivers), plan(p) {}
+  Registry(const AllServices& i, Plan& p) : registry(i.registry), drivers(i.drivers), plan(p) {}
   static constexpr DriverStatus kInjected = 0x2BC;
   DeviceRegistry& registry;
   DriverConnections& drivers;
@@ -188,8 +212,8 @@ struct Registry : DeviceRegistry, DriverConnections {
 };
 
 struct Storage : KernelSnapshots, PurgeableSpace {
-  Storage(Platform& i, Plan& p) : inner(i), plan(p) {}
-  Platform& inner;
+  Storage(const AllServices& i, Plan& p) : inner(i), plan(p) {}
+  const AllServices& inner;
   Plan& plan;
   std::optional<std::vector<std::byte>> capture(std::uint32_t flags) override {
     return plan.fails() ? std::nullopt : inner.snapshots.capture(flags);
@@ -236,8 +260,8 @@ struct Channels : ReportingChannels {
 
 }  // namespace
 
-struct FaultInjector::Services {
-  explicit Services(Platform& inner)
+struct FaultInjector::Decorated {
+  explicit Decorated(const AllServices& inner)
       : files(inner.files, plan),
         history(inner.history, plan),
         preferences(inner.preferences, plan),
@@ -250,35 +274,35 @@ struct FaultInjector::Services {
         networkUsage(inner.networkUsage, plan),
         registry(inner, plan),
         storage(inner, plan),
-        platform{inner.log,
-                 inner.streams,
-                 inner.clock,
-                 files,
-                 inner.counters,
-                 history,
-                 preferences,
-                 inner.analyticsConfiguration,
-                 inner.privilegedPreferences,
-                 submission,
-                 inner.faultwatch,
-                 inner.servitaLogs,
-                 inner.eventLoop,
-                 namedServices,
-                 inner.notifications,
-                 eventra,
-                 device,
-                 device,
-                 kernel,
-                 storage,
-                 registry,
-                 registry,
-                 storage,
-                 reportingChannels,
-                 networkUsage,
-                 inner.applications,
-                 inner.locale,
-                 device,
-                 inner.runLock} {}
+        platform{.log = inner.log,
+                 .streams = inner.streams,
+                 .clock = inner.clock,
+                 .files = files,
+                 .counters = inner.counters,
+                 .history = history,
+                 .preferences = preferences,
+                 .analyticsConfiguration = inner.analyticsConfiguration,
+                 .privilegedPreferences = inner.privilegedPreferences,
+                 .submission = submission,
+                 .faultwatch = inner.faultwatch,
+                 .servitaLogs = inner.servitaLogs,
+                 .eventLoop = inner.eventLoop,
+                 .namedServices = namedServices,
+                 .notifications = inner.notifications,
+                 .eventra = eventra,
+                 .deviceProperties = device,
+                 .systemVersion = device,
+                 .kernel = kernel,
+                 .snapshots = storage,
+                 .registry = registry,
+                 .drivers = registry,
+                 .purgeableSpace = storage,
+                 .reportingChannels = reportingChannels,
+                 .networkUsage = networkUsage,
+                 .applications = inner.applications,
+                 .locale = inner.locale,
+                 .libraries = device,
+                 .runLock = inner.runLock} {}
 
   Plan plan;
   Files files;
@@ -293,16 +317,17 @@ struct FaultInjector::Services {
   Usage networkUsage;
   Registry registry;
   Storage storage;
-  Platform platform;
+  AllServices platform;
 };
 
-FaultInjector::FaultInjector(Platform& inner) : services_(std::make_unique<Services>(inner)) {}
+FaultInjector::FaultInjector(const AllServices& inner)
+    : decorated_(std::make_unique<Decorated>(inner)) {}
 FaultInjector::~FaultInjector() = default;
-Platform& FaultInjector::platform() { return services_->platform; }
-int FaultInjector::calls() const { return services_->plan.calls; }
+const AllServices& FaultInjector::platform() const { return decorated_->platform; }
+int FaultInjector::calls() const { return decorated_->plan.calls; }
 void FaultInjector::failAt(int call) {
-  services_->plan.calls = 0;
-  services_->plan.failing = call;
+  decorated_->plan.calls = 0;
+  decorated_->plan.failing = call;
 }
 
 }  // namespace platform::fakes

@@ -3,7 +3,7 @@
 
 #include <memory>
 
-#include "platform/Platform.h"
+#include "platform/AllServices.h"
 
 namespace platform::fakes {
 
@@ -13,10 +13,10 @@ namespace platform::fakes {
 // network usage (a reply without records). All other services are the inner platform's own.
 class FaultInjector {
  public:
-  explicit FaultInjector(Platform& inner);
+  explicit FaultInjector(const AllServices& inner);
   ~FaultInjector();
 
-  Platform& platform();
+  const AllServices& platform() const;
 
   // The number of calls that could have failed so far, and the one that does (1 is the first; 0:
   // none).
@@ -24,8 +24,8 @@ class FaultInjector {
   void failAt(int call);
 
  private:
-  struct Services;
-  std::unique_ptr<Services> services_;
+  struct Decorated;
+  std::unique_ptr<Decorated> decorated_;
 };
 
 }  // namespace platform::fakes

@@ -5,6 +5,8 @@
 #include <functional>
 
 #include "base/Text.h"
+#include "platform/DeviceProperties.h"
+#include "platform/FileSystem.h"
 #include "platform/testing/FaultInjector.h"
 #include "support/FreshErrors.h"
 #include "support/StorageDevice.h"
@@ -172,7 +174,7 @@ TEST(DiskInfo, FromTheFileSystemOrElseFromTheDevice) {
 TEST(Collectors, AnyCallMayFail) {
   const struct {
     const char* name;
-    std::function<Dictionary(platform::Platform& platform)> collect;
+    std::function<Dictionary(const platform::AllServices& platform)> collect;
     int calls;  // at least
   } rows[] = {
       {"CopyNANDInfo", [](auto& p) { return *CopyNANDInfo(p); }, 6},

@@ -7,6 +7,7 @@
 
 #include <functional>
 
+#include "platform/DeviceRegistry.h"
 #include "support/StorageDevice.h"
 
 namespace NANDInfo {

@@ -63,7 +63,7 @@ class NANDLogWriterTest : public ::testing::Test {
   std::optional<Value> lastLogged() { return fakes.preferences.mobile(kDomain, "SSLastLoggedAt"); }
 
   support::TestPlatform fakes;
-  platform::Platform& platform = fakes.platform;
+  const platform::AllServices& platform = fakes.platform;
 };
 
 TEST_F(NANDLogWriterTest, ALogSaysWhereItComesFrom) {

@@ -15,7 +15,7 @@ using plist::Array, plist::Dictionary, plist::Number, plist::Value;
 
 TEST(NumberValue, IsReadInItsKindFromAnyAddressAndItsAbsenceLogged) {
   support::TestPlatform fakes;
-  platform::Platform& platform = fakes.platform;
+  const platform::AllServices& platform = fakes.platform;
   std::array<std::uint8_t, 9> bytes;
   bytes.fill(0xFE);
   const void* const odd = bytes.data() + 1;

@@ -1,12 +1,15 @@
 // A program of somebody else's that loads the storage library.
 #include <NANDInfo/NANDInfo.h>
-#include <host/HostPlatform.h>
-#include <platform/Platform.h>
+#include <host/Library.h>
+#include <platform/CountersService.h>
+#include <platform/StandardStreams.h>
+#include <platform/SystemLog.h>
+#include "platform/SystemLog.h"
 
 int main() {
-  const auto platform = host::makeHostPlatform();
-  platform->log.log(platform::LogLevel::debug, "not shown");
-  platform->streams.writeOutput(description(plist::Value(NANDInfo::GetDiskInfo(*platform))) + "\n");
-  platform->counters.PLClientAddValueForScalarKey("consumer", 5);
-  if (host::PLIsInternalDevice()) platform->streams.writeOutput("internal\n");
+  const auto services = host::makeServices();
+  services->log.log(platform::LogLevel::debug, "not shown");
+  services->streams.writeOutput(description(plist::Value(NANDInfo::GetDiskInfo(*services))) + "\n");
+  services->counters.PLClientAddValueForScalarKey("consumer", 5);
+  if (host::PLIsInternalDevice()) services->streams.writeOutput("internal\n");
 }

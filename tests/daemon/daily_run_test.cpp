@@ -5,6 +5,7 @@
 #include <limits>
 
 #include "daemon/Entry.h"
+#include "platform/EventLoop.h"
 #include "support/TestPlatform.h"
 
 namespace morvend {

@@ -6,6 +6,8 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "daemon/EccEvents.h"
+#include "platform/DeviceProperties.h"
+#include "platform/ReportingChannels.h"
 #include "support/ControllerBuffers.h"
 #include "support/ControllerLists.h"
 #include "support/TestPlatform.h"

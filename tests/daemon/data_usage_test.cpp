@@ -7,6 +7,7 @@
 
 #include "daemon/DataUsageChanges.h"
 #include "host/Host.h"
+#include "platform/PLHistory.h"
 #include "plist/PropertyList.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
@@ -182,7 +183,7 @@ class DataUsageThreads : public ::testing::Test {
   std::int64_t recorded() {
     host::Host host({.root = folder.path()});
     std::int64_t sum = 0;
-    host.platform().history.initWithDefaultPath()->scalarsForKeyPrefix(
+    host.services().history.initWithDefaultPath()->scalarsForKeyPrefix(
         "", INT32_MIN, INT32_MAX,
         [&](std::string_view, std::int32_t, std::int64_t value, bool&) { sum += value; });
     return sum;
@@ -196,7 +197,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   answer(processes(kProcesses), 0);
   {
     host::Host host({.root = folder.path()});
-    platform::Platform& platform = host.platform();
+    const platform::AllServices& platform = host.services();
     CollectDataUsage(platform, std::chrono::nanoseconds(0));
     for (int i = 0; i < kOthers; ++i) {
       platform.counters.PLClientAddValueForScalarKey("other", 1);
@@ -219,7 +220,7 @@ TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
   EXPECT_EQ(kUsageServicePatience, std::chrono::seconds(10));
   answer(processes(2000), 0);
   host::Host host({.root = folder.path()});
-  CollectDataUsage(host.platform());
+  CollectDataUsage(host.services());
   const std::string file = folder.read("var/preferences/mobile/" + std::string(kDomain) + ".plist");
   EXPECT_NE(file.find("<key>1999</key>"), file.npos);
 }
@@ -230,7 +231,7 @@ TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
     answer(processes(2), comes ? 0 : std::numeric_limits<double>::infinity());
     for (int i = 0; i < 20; ++i) {
       host::Host host({.root = folder.path()});
-      CollectDataUsage(host.platform(), comes && i == 19 ? kUsageServicePatience
+      CollectDataUsage(host.services(), comes && i == 19 ? kUsageServicePatience
                                                          : std::chrono::microseconds(20 * i));
     }
     EXPECT_EQ(recorded(), comes ? 8 : 0);

@@ -7,6 +7,7 @@
 #include "base/Text.h"
 #include "host/Host.h"
 #include "host/process/SystemClock.h"
+#include "platform/PLHistory.h"
 #include "plist/PropertyList.h"
 #include "support/ControllerLists.h"
 #include "support/ControllerRoot.h"
@@ -209,7 +210,7 @@ Dictionary Device::expectedSections() const {
 Lines Device::rows(std::int32_t first, std::int32_t last) const {
   host::Host host({.root = root_->path()});
   Lines rows;
-  const auto history = host.platform().history.initWithDefaultPath();
+  const auto history = host.services().history.initWithDefaultPath();
   history->scalarsForKeyPrefix(
       "", first, last, [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
         rows.push_back(

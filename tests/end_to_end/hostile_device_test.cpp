@@ -21,7 +21,7 @@
 namespace end_to_end {
 namespace {
 
-using platform::Platform;
+using platform::AllServices;
 using plist::Data;
 
 std::ptrdiff_t entriesOf(const char* folder) {
@@ -32,8 +32,8 @@ std::ptrdiff_t entriesOf(const char* folder) {
 // platform may be wrapped.
 std::string runDay(
     const Device& device,
-    const std::function<void(Platform&, const std::function<void(Platform&)>&)>& wrap =
-        [](Platform& platform, const auto& run) { run(platform); }) {
+    const std::function<void(const AllServices&, const std::function<void(const AllServices&)>&)>&
+        wrap = [](const AllServices& platform, const auto& run) { run(platform); }) {
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent", 1);
   NANDInfo::ResetExporters();
   support::freshErrors();
@@ -42,7 +42,7 @@ std::string runDay(
   ::testing::internal::CaptureStderr();
   {
     host::Host host({.root = device.root().path()});
-    wrap(host.platform(), [](Platform& platform) {
+    wrap(host.services(), [](const AllServices& platform) {
       morvend::DeviceContext context(platform);
       const char* const arguments[] = {"morvend", "-d"};
       morvend::RunProcess(platform, context, 2, arguments);
@@ -153,7 +153,7 @@ TEST_F(HostileDevice, EndsTheDayWhicheverCallFails) {
   for (int failing = 0; failing <= calls; ++failing) {
     Device device;
     device.become(filled);
-    runDay(device, [&](Platform& platform, const auto& run) {
+    runDay(device, [&](const AllServices& platform, const auto& run) {
       platform::fakes::FaultInjector faults(platform);
       faults.failAt(failing);
       run(faults.platform());

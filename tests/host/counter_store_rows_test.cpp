@@ -6,6 +6,7 @@
 #include <limits>
 
 #include "counter_store_support.h"
+#include "platform/PLHistory.h"
 
 namespace {
 

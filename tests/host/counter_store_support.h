@@ -8,6 +8,7 @@
 #include "HostServices.h"
 #include "base/Text.h"
 #include "host/counters/CounterStore.h"
+#include "platform/PLHistory.h"
 
 namespace support {
 

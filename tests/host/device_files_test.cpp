@@ -26,6 +26,8 @@
 #include "host/recorded/ReportingChannels.h"
 #include "host/recorded/SystemVersion.h"
 #include "platform/FaultwatchSupport.h"
+#include "platform/InstalledApplications.h"
+#include "platform/PreferenceStore.h"
 #include "platform/testing/RecordingLog.h"
 #include "plist/MD5.h"
 #include "plist/PropertyList.h"

@@ -6,6 +6,7 @@
 #include "HostServices.h"
 #include "host/files/DeviceFileSystem.h"
 #include "host/recorded/DeviceRegistry.h"
+#include "platform/DeviceRegistry.h"
 #include "plist/PropertyList.h"
 
 namespace {

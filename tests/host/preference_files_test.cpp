@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include "HostServices.h"
+#include "platform/PreferenceStore.h"
 #include "plist/PropertyList.h"
 
 namespace host {

@@ -10,6 +10,7 @@
 #include "host/recorded/DeviceProperties.h"
 #include "host/recorded/KernelSnapshots.h"
 #include "host/recorded/PurgeableSpace.h"
+#include "platform/KernelSnapshots.h"
 #include "plist/PropertyList.h"
 
 namespace {

@@ -8,6 +8,7 @@
 #include "HostServices.h"
 #include "host/outbox/SpoolFolder.h"
 #include "host/preferences/PreferenceFiles.h"
+#include "platform/LogSubmission.h"
 
 namespace host {
 namespace {

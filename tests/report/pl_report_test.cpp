@@ -4,6 +4,8 @@
 
 #include <new>
 
+#include "platform/InstalledApplications.h"
+#include "platform/Kernel.h"
 #include "plist/PropertyList.h"
 #include "report/KernelCounters.h"
 #include "support/TestPlatform.h"

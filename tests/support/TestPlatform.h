@@ -3,6 +3,7 @@
 
 #include <string>
 
+#include "platform/SystemLog.h"
 #include "platform/testing/FakePlatform.h"
 #include "plist/PropertyList.h"
 

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "host/Host.h"
+#include "platform/CountersService.h"
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 #include "tools/demo/Rules.h"
@@ -59,7 +60,7 @@ TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
   host::Host host({.root = root.path()});
   for (const char* key : {"com.norba.NANDInfo.BandsPerInternalFlow3", "datausage.wifiInKB.a",
                           "com.norba.tarvenn.numAllInstalledApps", "host.loadavg.1m"}) {
-    host.counters().set(key, 1, host.platform().counters.PLDaysSince1970());
+    host.counters().set(key, 1, host.services().counters.PLDaysSince1970());
   }
   demo::Device device(root.path().string());
   const std::string text = demo::showLeft(device, false);

@@ -10,6 +10,7 @@
 #include "NANDInfo/decode/TelemetryList.h"
 #include "base/Text.h"
 #include "host/Host.h"
+#include "platform/PreferenceStore.h"
 #include "plist/JSON.h"
 #include "support/ControllerBuffers.h"
 #include "support/FreshErrors.h"
@@ -165,7 +166,7 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
     EXPECT_EQ(start, (kToday - 4.0 + static_cast<double>(i)) * 86400);
   }
   host::Host host({.root = folder / "a"});
-  EXPECT_EQ(host.platform().preferences.QNSPreferencesGetIntegerValue(
+  EXPECT_EQ(host.services().preferences.QNSPreferencesGetIntegerValue(
                 "LastCrashLogSerializationDateInDaysSince1970", "com.norba.pellorand.morvend"),
             kToday - 2);
 
@@ -259,7 +260,7 @@ TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
     ASSERT_EQ(Maker().make(folder.path(), {.today = kToday, .chip = chipNamed(row.name)}), "");
     {
       host::Host host({.root = folder.path()});
-      EXPECT_TRUE(NANDInfo::DumpStorageStructuredLog(host.platform(), false));
+      EXPECT_TRUE(NANDInfo::DumpStorageStructuredLog(host.services(), false));
     }
     std::string logs;
     for (const auto& file : fs::directory_iterator(folder / "var/spool/morvend/structured")) {

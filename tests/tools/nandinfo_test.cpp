@@ -7,6 +7,7 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "platform/DeviceRegistry.h"
 #include "plist/PropertyList.h"
 #include "support/CommandLine.h"
 #include "support/ControllerLists.h"

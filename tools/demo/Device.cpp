@@ -6,6 +6,7 @@
 #include <cstring>
 
 #include "host/files/Files.h"
+#include "platform/SystemLog.h"
 #include "plist/PropertyList.h"
 
 namespace demo {
@@ -29,7 +30,7 @@ Result<std::string> readHostFile(const std::string& path) {
 Device::Device(std::string root)
     : root_(std::move(root)),
       host_({.root = root_, .lowestLevel = platform::LogLevel::error}),
-      whitelist_(report::PLConfig::init(host_.platform(), host_.context())) {}
+      whitelist_(report::PLConfig::init(host_.services(), host_.context())) {}
 
 std::vector<std::string> Device::logs() {
   std::vector<std::string> paths;

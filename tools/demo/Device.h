@@ -9,8 +9,10 @@
 #include <string>
 #include <vector>
 
+#include "NANDInfo/Services.h"
 #include "base/Result.h"
 #include "host/Host.h"
+#include "platform/CountersService.h"
 #include "report/PLConfig.h"
 
 namespace demo {
@@ -52,7 +54,9 @@ class Device {
   std::optional<std::string> bytes(const std::string& path);
   std::optional<plist::Dictionary> propertyList(const std::string& path);
 
-  platform::Platform& platform() { return host_.platform(); }
+  NANDInfo::Services services() const { return host_.services(); }
+
+  std::int32_t today() const { return host_.services().counters.PLDaysSince1970(); }
 
   // The host's path of a path of the device.
   std::string pathOf(const std::string& path) const { return root_ + "/" + path; }

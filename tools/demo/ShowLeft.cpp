@@ -4,8 +4,8 @@
 #include <sstream>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/Services.h"
 #include "base/Text.h"
-#include "platform/Platform.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
@@ -139,7 +139,7 @@ class LeftText {
   }
 
   void addCounters() {
-    const std::int32_t today = device_.platform().counters.PLDaysSince1970();
+    const std::int32_t today = device_.today();
     struct Counter {
       std::string key;
       std::int64_t value;
@@ -170,7 +170,7 @@ class LeftText {
     }
     text_ += "\n" + heading(format("Counters that the telemetry set today: %zu", count));
     if (count > 0) text_ += table.text();
-    if (NANDInfo::NandInfoShouldLogAllToEV(device_.platform())) {
+    if (NANDInfo::NandInfoShouldLogAllToEV(device_.services())) {
       text_ += "  Today the storage counters go to the analytics sink instead.\n";
     }
   }
@@ -205,24 +205,24 @@ class LeftText {
   }
 
   void addHanded() {
-    platform::Platform& platform = device_.platform();
+    const NANDInfo::Services services = device_.services();
     text_ += "\n" + heading("What the storage library hands to its callers");
-    Dictionary msps = NANDInfo::CopyWhitelistedNANDMSPInfo(platform, true);
+    Dictionary msps = NANDInfo::CopyWhitelistedNANDMSPInfo(services, true);
     const Dictionary* firstMSP = msps.dictionary("0");
     const struct {
       const char* command;
       std::optional<Dictionary> result;
       const NANDInfo::NameTable* digits;
     } kResults[] = {
-        {"ftl --round", NANDInfo::CopyWhitelistedNANDFTLInfo(platform, true),
+        {"ftl --round", NANDInfo::CopyWhitelistedNANDFTLInfo(services, true),
          &NANDInfo::WhitelistedRawNANDFTLCounters_SigDigDict()},
         {"msp --round, each", firstMSP != nullptr ? std::optional(*firstMSP) : std::nullopt,
          &NANDInfo::WhitelistedRawNANDMSPCounters_SigDigDict()},
-        {"storage --round", NANDInfo::CopyWhitelistedStorageStats(platform, true),
+        {"storage --round", NANDInfo::CopyWhitelistedStorageStats(services, true),
          &NANDInfo::WhitelistedStorageStats_SigDigDict()},
-        {"health servita", NANDInfo::CopyServitaNANDInfo(platform), nullptr},
-        {"health lab", NANDInfo::CopyInternalLabNANDInfo(platform), nullptr},
-        {"health ota", NANDInfo::CopyOTANANDInfo(platform), nullptr},
+        {"health servita", NANDInfo::CopyServitaNANDInfo(services), nullptr},
+        {"health lab", NANDInfo::CopyInternalLabNANDInfo(services), nullptr},
+        {"health ota", NANDInfo::CopyOTANANDInfo(services), nullptr},
     };
     Table table({{"NANDINFO", Align::left}, {"VALUES", Align::right}, {"RULE", Align::left}});
     for (const auto& [command, result, digits] : kResults) {

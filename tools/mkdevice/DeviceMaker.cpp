@@ -119,7 +119,7 @@ std::string playDay(const MakingOptions& options, Sample sample, const SampleCou
              .lowestLevel = platform::LogLevel::error,
              .played = dailyRun(sample),
              .log = options.log});
-  morvend::RunDailyTasksIfDue(host.platform(), host.context(), nullptr);
+  morvend::RunDailyTasksIfDue(host.services(), host.context(), nullptr);
   std::string error = host.counters().apply(counters.ofDay(sample.today));
   if (error.empty()) error = host.counters().settle();
   if (!error.empty()) return error;

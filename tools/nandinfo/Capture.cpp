@@ -8,6 +8,13 @@
 
 #include "NANDInfo/Events.h"
 #include "NANDInfo/NANDInfo.h"
+#include "platform/Clock.h"
+#include "platform/DeviceProperties.h"
+#include "platform/Eventra.h"
+#include "platform/FileSystem.h"
+#include "platform/Kernel.h"
+#include "platform/KernelSnapshots.h"
+#include "platform/PurgeableSpace.h"
 #include "plist/JSON.h"
 #include "plist/PropertyList.h"
 #include "tools/nandinfo/CaptureFolder.h"
@@ -17,7 +24,6 @@ namespace nandinfo {
 
 namespace {
 
-using platform::Platform;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
@@ -36,7 +42,7 @@ Dictionary withoutMissing(
 class Capture {
  public:
   explicit Capture(const Invocation& invocation)
-      : invocation_(invocation), platform_(invocation.platform) {}
+      : invocation_(invocation), services_(invocation.services) {}
 
   CommandResult run() {
     if (std::string error = capture(); !error.empty()) return CommandResult::failure(error);
@@ -55,7 +61,7 @@ class Capture {
     if (std::string error = controller.run(); !error.empty()) return error;
     const std::pair<const char*, std::optional<Value>> files[] = {
         {"properties.plist", properties()},
-        {"system-version.plist", platform_.systemVersion.systemVersionDictionary()},
+        {"system-version.plist", services_.systemVersion.systemVersionDictionary()},
         {"kernel.plist", kernelValues()},
         {"purgeable-space.plist", purgeableSpace()},
         {"analytics.plist", analytics()},
@@ -69,7 +75,7 @@ class Capture {
       if (std::string error = folder_.write(name, *bytes); !error.empty()) return error;
     }
     if (const auto snapshot =
-            platform_.snapshots.capture(platform::KernelSnapshots::kChunkedData)) {
+            services_.snapshots.capture(platform::KernelSnapshots::kChunkedData)) {
       const std::string_view bytes(reinterpret_cast<const char*>(snapshot->data()),
                                    snapshot->size());
       if (std::string error = folder_.write("kernel-snapshot.bin", bytes); !error.empty()) {
@@ -77,7 +83,7 @@ class Capture {
       }
     }
     manifest_ = Dictionary{{"tool", "nandinfo " MORVEND_VERSION},
-                           {"time", platform_.clock.now()},
+                           {"time", services_.clock.now()},
                            {"class", controller.className},
                            {"redacted", invocation_.arguments.redact},
                            {"buffers", std::move(controller.buffers)},
@@ -90,7 +96,7 @@ class Capture {
   // What the commands read beside the controller; none of what the device has no answer for.
 
   Value properties() {
-    auto& device = platform_.deviceProperties;
+    auto& device = services_.deviceProperties;
     Dictionary properties;
     for (const char* const key : {"HardwareModel", "SystemIdentifier", "InverseDeviceID"}) {
       const bool identifies = std::string_view(key) != "HardwareModel";
@@ -103,7 +109,7 @@ class Capture {
                                      {"TotalDataAvailable", usage->totalDataAvailable},
                                      {"AmountDataAvailable", usage->amountDataAvailable}}));
     }
-    if (const auto volume = platform_.files.statfs("/private/var")) {
+    if (const auto volume = services_.files.statfs("/private/var")) {
       properties.set("FileSystem", Dictionary{{"BlockSize", volume->blockSize},
                                               {"Blocks", volume->blocks},
                                               {"BlocksAvailable", volume->blocksAvailable}});
@@ -114,7 +120,7 @@ class Capture {
   // The commands look at the boot session's first digit.
   std::optional<Value> kernelValues() {
     std::array<std::byte, 100> buffer{};
-    const auto read = platform_.kernel.sysctlbyname(kBootSession, buffer);
+    const auto read = services_.kernel.sysctlbyname(kBootSession, buffer);
     if (read.error == ENOENT) return std::nullopt;
     if (read.error != 0) {
       return Dictionary{{kBootSession, Dictionary{{"Error", std::int64_t{read.error}}}}};
@@ -128,8 +134,8 @@ class Capture {
   }
 
   std::optional<Value> purgeableSpace() {
-    if (!platform_.purgeableSpace.isPresent()) return std::nullopt;
-    const auto answer = platform_.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(
+    if (!services_.purgeableSpace.isPresent()) return std::nullopt;
+    const auto answer = services_.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(
         {{"SPACEREAP_VOLUME", "/private/var"}});
     // Anything but a dictionary is a service that doesn't answer.
     return answer ? Value(*answer) : Value(Array{});
@@ -137,20 +143,20 @@ class Capture {
 
   // Which of the library's events are used; none when all of them are.
   std::optional<Value> analytics() {
-    if (!platform_.eventra.offersLazySend()) return Dictionary{{"Available", false}};
+    if (!services_.eventra.offersLazySend()) return Dictionary{{"Available", false}};
     std::vector<std::string_view> events;
     for (const NANDInfo::EventView& event : NANDInfo::eventViews()) events.push_back(event.event);
     events.push_back(NANDInfo::kEventName_massStorage_NANDInfo_NORWrites);
     Array used;
     for (const std::string_view event : events) {
-      if (platform_.eventra.EventraIsEventUsed(event)) used.push_back(event);
+      if (services_.eventra.EventraIsEventUsed(event)) used.push_back(event);
     }
     if (used.size() == events.size()) return std::nullopt;
     return Dictionary{{"UsedEvents", std::move(used)}};
   }
 
   const Invocation& invocation_;
-  Platform& platform_;
+  const NANDInfo::Services services_;
   CaptureFolder folder_;
   Value manifest_ = Dictionary();
 };

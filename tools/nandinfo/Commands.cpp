@@ -22,23 +22,23 @@ CommandResult result(std::optional<Dictionary> dictionary) {
 CommandResult ftl(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
   return result(arguments.all
-                    ? NANDInfo::CopyNANDFTLInfo(invocation.platform, arguments.statKeys, true)
-                    : NANDInfo::CopyWhitelistedNANDFTLInfo(invocation.platform, arguments.round));
+                    ? NANDInfo::CopyNANDFTLInfo(invocation.services, arguments.statKeys, true)
+                    : NANDInfo::CopyWhitelistedNANDFTLInfo(invocation.services, arguments.round));
 }
 
 // The functions that take the platform alone, and those that round on demand.
 template <auto function>
 CommandResult call(const Invocation& invocation) {
-  return result(function(invocation.platform));
+  return result(function(invocation.services));
 }
 template <auto function>
 CommandResult callRounding(const Invocation& invocation) {
-  return result(function(invocation.platform, invocation.arguments.round));
+  return result(function(invocation.services, invocation.arguments.round));
 }
 // Without the statistics, the health is what the library says when it doesn't know.
 template <auto function>
 CommandResult health(const Invocation& invocation) {
-  Dictionary figures = function(invocation.platform);
+  Dictionary figures = function(invocation.services);
   if (figures.find(NANDInfo::kNANDHealthInfoMaxPercentUsed) == nullptr) return {};
   return result(std::move(figures));
 }
@@ -46,35 +46,35 @@ template <auto function>
 CommandResult callWithCode(const Invocation& invocation) {
   std::uint32_t code = 0;
   for (const char c : invocation.arguments.code) code = code << 8 | static_cast<unsigned char>(c);
-  return {function(invocation.platform, code), {}};
+  return {function(invocation.services, code), {}};
 }
 
 CommandResult daily(const Invocation& invocation) {
-  return result(NANDInfo::CopyNANDInfoWithOptions(invocation.platform));
+  return result(NANDInfo::CopyNANDInfoWithOptions(invocation.services));
 }
 
 CommandResult magazine(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
   return result(arguments.history
-                    ? NANDInfo::CopySMagNANDFTLCustomHistoryInfo(invocation.platform, 0)
-                    : NANDInfo::CopySMagNANDFTLInfo(invocation.platform, arguments.hours,
+                    ? NANDInfo::CopySMagNANDFTLCustomHistoryInfo(invocation.services, 0)
+                    : NANDInfo::CopySMagNANDFTLInfo(invocation.services, arguments.hours,
                                                     arguments.noDelta ? 0 : 1, arguments.mode));
 }
 
 CommandResult extract(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
   return result(NANDInfo::NandInfoExtractToEV_runAllSteps(
-      invocation.platform, nullptr, arguments.monthly ? NANDInfo::kAllowsMonthly : 0, true,
+      invocation.services, nullptr, arguments.monthly ? NANDInfo::kAllowsMonthly : 0, true,
       arguments.from));
 }
 
 CommandResult dump(const Invocation& invocation) {
-  const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.platform, false);
+  const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.services, false);
   return {handled, handled ? "" : "not every list was dumped"};
 }
 
 CommandResult recommendsDeletion(const Invocation& invocation) {
-  return {NANDInfo::NandRecommendsContentDeletion(invocation.platform), {}};
+  return {NANDInfo::NandRecommendsContentDeletion(invocation.services), {}};
 }
 
 constexpr Command kCommands[] = {

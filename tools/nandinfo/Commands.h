@@ -8,8 +8,9 @@
 #include <string_view>
 #include <vector>
 
+#include "NANDInfo/Services.h"
 #include "base/Result.h"
-#include "platform/Platform.h"
+#include "plist/Value.h"
 
 namespace nandinfo {
 
@@ -23,7 +24,7 @@ struct Arguments {
 };
 
 struct Invocation {
-  platform::Platform& platform;
+  const NANDInfo::Services& services;
   const Arguments& arguments;
   std::function<void(const std::string&)> progress;
 };

@@ -10,6 +10,7 @@
 #include "NANDInfo/controller/DriverHandles.h"
 #include "base/Text.h"
 #include "host/recorded/SimulatedDriver.h"
+#include "platform/DeviceRegistry.h"
 
 namespace nandinfo {
 
@@ -61,7 +62,7 @@ std::string ControllerCapture::run() {
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && exporter_ == nullptr; ++row) {
     const NANDInfo::RegistryHandle service(
-        platform_, platform_.registry.DrvGetMatchingService(row->className));
+        services_, services_.registry.DrvGetMatchingService(row->className));
     if (service.get() == 0) continue;
     if (std::string error = captureController(*row, service.get(), true); !error.empty()) {
       return error;
@@ -71,7 +72,7 @@ std::string ControllerCapture::run() {
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && entries.empty(); ++row) {
     const NANDInfo::RegistryHandle service(
-        platform_, NANDInfo::FindServiceUsingIterator(platform_, row->className));
+        services_, NANDInfo::FindServiceUsingIterator(services_, row->className));
     if (service.get() == 0) continue;
     if (std::string error = captureController(*row, service.get(), false); !error.empty()) {
       return error;
@@ -89,7 +90,7 @@ std::string ControllerCapture::captureController(const nand_exporter_t& exporter
                                                  bool registered) {
   Dictionary entry{{"Class", exporter.className}}, driver;
   if (!registered) entry.set("Registered", false);
-  NANDInfo::DriverHandle connection(platform_, service);
+  NANDInfo::DriverHandle connection(services_, service);
   if (connection.status() != 0 || connection.get() == 0) {
     leaveOut(exporter.className, "it can't be opened");
     driver.set("RefuseOpen", true);
@@ -191,13 +192,13 @@ platform::DriverConnections::CallResult ControllerCapture::tunnel(std::uint32_t 
   for (std::size_t i = 0; i < sizeof words; ++i) {
     block[i] = static_cast<std::byte>(words[i / 4] >> (i % 4 * 8) & 0xFF);
   }
-  return platform_.drivers.DrvCallStructMethod(connection_, method, block, output);
+  return services_.drivers.DrvCallStructMethod(connection_, method, block, output);
 }
 
 void ControllerCapture::captureRecommendation(Dictionary& driver) {
   if (exporter_->recommendDeletionSelector == NANDInfo::kNoSelector) return;
   std::array<std::byte, 4> output{};
-  const auto answer = platform_.drivers.DrvCallStructMethod(
+  const auto answer = services_.drivers.DrvCallStructMethod(
       connection_, exporter_->recommendDeletionSelector, {}, output);
   if (answer.status != 0) return leaveOut("deletion recommendation", statusText(answer.status));
   plist::Data bytes;
@@ -212,7 +213,7 @@ void ControllerCapture::captureCharacteristics(platform::RegistryObject service,
   // Those that a command reads. What else an entry tells of itself may identify it.
   constexpr std::string_view kRead[] = {"chip-id", "manufacturer-id", "num-bus",
                                         "nand-device-desc"};
-  auto found = platform_.registry.searchProperty(service, exporter_->propertyKey,
+  auto found = services_.registry.searchProperty(service, exporter_->propertyKey,
                                                  platform::DeviceRegistry::Direction::parents);
   if (!found) return leaveOut(exporter_->propertyKey, "the registry has no such property");
   if (invocation_.arguments.redact) {
@@ -230,10 +231,10 @@ void ControllerCapture::captureCharacteristics(platform::RegistryObject service,
 void ControllerCapture::captureEAN() {
   constexpr std::uint32_t kMethods[] = {3, 7};  // an image's size, and the number of its updates
   const NANDInfo::RegistryHandle service(
-      platform_, platform_.registry.DrvGetMatchingService(NANDInfo::kEANClassName));
+      services_, services_.registry.DrvGetMatchingService(NANDInfo::kEANClassName));
   if (service.get() == 0) return leaveOut(NANDInfo::kEANClassName, "the registry has none");
   Dictionary driver;
-  const NANDInfo::DriverHandle connection(platform_, service.get());
+  const NANDInfo::DriverHandle connection(services_, service.get());
   if (connection.status() != 0) {
     leaveOut(NANDInfo::kEANClassName, statusText(connection.status()));
     driver.set("RefuseOpen", true);
@@ -248,7 +249,7 @@ void ControllerCapture::captureEAN() {
         const std::uint64_t input[] = {code};
         std::uint64_t output[] = {0};
         const auto status =
-            platform_.drivers.DrvCallMethod(connection.get(), method, input, output);
+            services_.drivers.DrvCallMethod(connection.get(), method, input, output);
         if (status == 0) {
           scalars.set(key, output[0]);
         } else {
@@ -263,12 +264,12 @@ void ControllerCapture::captureEAN() {
 
 void ControllerCapture::captureNVRAM() {
   constexpr char kClass[] = "NvramDiagService";
-  const NANDInfo::RegistryHandle service(platform_,
-                                         platform_.registry.DrvGetMatchingService(kClass));
+  const NANDInfo::RegistryHandle service(services_,
+                                         services_.registry.DrvGetMatchingService(kClass));
   if (service.get() == 0) return leaveOut(kClass, "the registry has none");
   Dictionary properties;
   for (const char* const key : {"CommonUsed", "SystemUsed", "Generation", "Version"}) {
-    if (auto value = platform_.registry.searchProperty(
+    if (auto value = services_.registry.searchProperty(
             service.get(), key, platform::DeviceRegistry::Direction::children)) {
       properties.set(key, *std::move(value));
     }

@@ -7,6 +7,7 @@
 #include <string_view>
 
 #include "NANDInfo/Controller.h"
+#include "platform/DeviceRegistry.h"
 #include "tools/nandinfo/CaptureFolder.h"
 #include "tools/nandinfo/Commands.h"
 
@@ -17,7 +18,7 @@ namespace nandinfo {
 class ControllerCapture {
  public:
   ControllerCapture(const Invocation& invocation, CaptureFolder& folder)
-      : invocation_(invocation), platform_(invocation.platform), folder_(folder) {}
+      : invocation_(invocation), services_(invocation.services), folder_(folder) {}
 
   // Asks all that a command can ask. There must be a controller that can be opened.
   std::string run();
@@ -52,7 +53,7 @@ class ControllerCapture {
   void leaveOut(const BufferKind& kind, std::uint32_t argument, std::string reason);
 
   const Invocation& invocation_;
-  platform::Platform& platform_;
+  const NANDInfo::Services services_;
   CaptureFolder& folder_;
   const NANDInfo::nand_exporter_t* exporter_ = nullptr;  // the one that is asked
   platform::DriverConnection connection_ = 0;

@@ -6,6 +6,16 @@
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/controller/DriverHandles.h"
 #include "base/Text.h"
+#include "platform/Clock.h"
+#include "platform/DeviceProperties.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/FileSystem.h"
+#include "platform/Kernel.h"
+#include "platform/KernelSnapshots.h"
+#include "platform/LogSubmission.h"
+#include "platform/PreferenceStore.h"
+#include "platform/PurgeableSpace.h"
+#include "platform/SystemLog.h"
 
 namespace nandinfo {
 
@@ -40,46 +50,51 @@ bool asksForSize(std::span<const std::byte> input) {
   return input.size() > kFlags && (input[kFlags] & std::byte{1}) != std::byte{0};
 }
 
+// The library's services as it is to see them.
+struct Watched {
+  platform::SystemLog& log;
+  platform::StandardStreams& streams;
+  platform::Clock& clock;
+  platform::FileSystem& files;
+  platform::PreferenceStore& preferences;
+  platform::LogSubmission& submission;
+  platform::FaultwatchSupport& faultwatch;
+  platform::Eventra& eventra;
+  platform::DeviceProperties& deviceProperties;
+  platform::SystemVersion& systemVersion;
+  platform::Kernel& kernel;
+  platform::KernelSnapshots& snapshots;
+  platform::DeviceRegistry& registry;
+  platform::DriverConnections& drivers;
+  platform::PurgeableSpace& purgeableSpace;
+};
+
 }  // namespace
 
-ControllerWatch::ControllerWatch(platform::Platform& inner, DirectTexts texts)
+ControllerWatch::ControllerWatch(const NANDInfo::Services& inner, DirectTexts texts)
     : inner_(inner),
       directTexts_(texts),
-      platform_{inner.log,
-                *this,
-                inner.clock,
-                inner.files,
-                inner.counters,
-                inner.history,
-                inner.preferences,
-                inner.analyticsConfiguration,
-                inner.privilegedPreferences,
-                inner.submission,
-                inner.faultwatch,
-                inner.servitaLogs,
-                inner.eventLoop,
-                inner.namedServices,
-                inner.notifications,
-                *this,
-                inner.deviceProperties,
-                inner.systemVersion,
-                inner.kernel,
-                inner.snapshots,
-                *this,
-                *this,
-                inner.purgeableSpace,
-                inner.reportingChannels,
-                inner.networkUsage,
-                inner.applications,
-                inner.locale,
-                inner.libraries,
-                inner.runLock} {}
+      services_(Watched{.log = inner.log,
+                        .streams = *this,
+                        .clock = inner.clock,
+                        .files = inner.files,
+                        .preferences = inner.preferences,
+                        .submission = inner.submission,
+                        .faultwatch = inner.faultwatch,
+                        .eventra = *this,
+                        .deviceProperties = inner.deviceProperties,
+                        .systemVersion = inner.systemVersion,
+                        .kernel = inner.kernel,
+                        .snapshots = inner.snapshots,
+                        .registry = *this,
+                        .drivers = *this,
+                        .purgeableSpace = inner.purgeableSpace}) {}
 
 std::string ControllerWatch::problem() {
   if (!lookedUp_) {
     for (const auto& exporter : exporters()) {
-      NANDInfo::RegistryHandle(platform_,
-                               NANDInfo::FindServiceUsingIterator(platform_, exporter.className));
+      NANDInfo::RegistryHandle(services_,
+                               NANDInfo::FindServiceUsingIterator(services_, exporter.className));
     }
   }
   if (found_.empty()) {
@@ -88,8 +103,8 @@ std::string ControllerWatch::problem() {
   if (stage_ == Stage::nothing) {
     // The library knew that it needn't ask. Whether it could have, is seen by opening.
     const NANDInfo::RegistryHandle service(
-        platform_, NANDInfo::FindServiceUsingIterator(platform_, found_.c_str()));
-    const NANDInfo::DriverHandle connection(platform_, service.get());
+        services_, NANDInfo::FindServiceUsingIterator(services_, found_.c_str()));
+    const NANDInfo::DriverHandle connection(services_, service.get());
   }
   if (answered_ || stage_ == Stage::opened) return {};
   const std::string status =

@@ -8,7 +8,10 @@
 #include <utility>
 #include <vector>
 
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
+#include "platform/DeviceRegistry.h"
+#include "platform/Eventra.h"
+#include "platform/StandardStreams.h"
 
 namespace nandinfo {
 
@@ -19,10 +22,10 @@ class ControllerWatch : private platform::DeviceRegistry,
  public:
   // Keeps the texts that are written to standard error directly, or lets them pass.
   enum class DirectTexts { kept, passed };
-  ControllerWatch(platform::Platform& inner, DirectTexts texts);
+  ControllerWatch(const NANDInfo::Services& inner, DirectTexts texts);
 
-  // The inner platform, watched.
-  platform::Platform& platform() { return platform_; }
+  // The inner services, watched.
+  const NANDInfo::Services& services() { return services_; }
 
   // Why nothing that the library said can come from a controller: none is there, none can be
   // opened, or it answered no command. The empty text when one was asked and answered something, or
@@ -73,7 +76,7 @@ class ControllerWatch : private platform::DeviceRegistry,
 
   void noteLookUp(std::string_view className, platform::RegistryObject found);
 
-  platform::Platform& inner_;
+  const NANDInfo::Services inner_;
   const DirectTexts directTexts_;
   std::vector<std::string> texts_;
   std::vector<std::pair<std::string, PayloadProducer>> events_;  // that wait
@@ -83,7 +86,7 @@ class ControllerWatch : private platform::DeviceRegistry,
   std::set<platform::RegistryObject> controllers_;    // every handle that was given out
   std::set<platform::DriverConnection> connections_;  // to controllers
   platform::DriverStatus lastFailure_ = 0;            // of an opening or a command; 0: none so far
-  platform::Platform platform_;
+  const NANDInfo::Services services_;
 };
 
 }  // namespace nandinfo

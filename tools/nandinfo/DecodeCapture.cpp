@@ -67,7 +67,7 @@ struct Characteristics {
   std::uint32_t channels;  // 0 if it isn't known
 };
 
-Characteristics characteristicsOf(platform::Platform& platform,
+Characteristics characteristicsOf(const NANDInfo::Services& services,
                                   const CapturedController& controller) {
   static const Dictionary kNone;
   const Dictionary* properties = controller.entry->dictionary("Properties");
@@ -77,7 +77,7 @@ Characteristics characteristicsOf(platform::Platform& platform,
   const std::string *chip = device->text("chip-id"), *vendor = device->text("manufacturer-id");
   auto* const convert =
       NANDInfo::counterConverter(NANDInfo::chipKind(chip != nullptr ? *chip : ""),
-                                 vendor != nullptr ? NANDInfo::vendorCode(platform, *vendor) : 0);
+                                 vendor != nullptr ? NANDInfo::vendorCode(services, *vendor) : 0);
   const auto layouts = counterLayouts();
   const auto layout = std::find_if(layouts.begin(), layouts.end(),
                                    [&](const CounterLayout& row) { return row.parse == convert; });
@@ -116,7 +116,7 @@ bool parseKey(std::string_view key, std::uint32_t& opType, std::uint32_t& argume
 class Capture {
  public:
   explicit Capture(const Invocation& invocation)
-      : platform_(invocation.platform), folder_(invocation.arguments.folder) {}
+      : services_(invocation.services), folder_(invocation.arguments.folder) {}
 
   CommandResult decode() {
     if (!folder_.problem().empty()) {
@@ -171,7 +171,7 @@ class Capture {
   }
 
   void decodeBuffers(const CapturedController& controller) {
-    const Characteristics device = characteristicsOf(platform_, controller);
+    const Characteristics device = characteristicsOf(services_, controller);
     for (const auto& [key, value] :
          *controller.entry->dictionary("Driver")->dictionary("Buffers")) {
       std::uint32_t opType = 0, argument = 0;
@@ -220,7 +220,7 @@ class Capture {
     decoded_.set(name, std::move(decoded));
   }
 
-  platform::Platform& platform_;
+  const NANDInfo::Services services_;
   const host::DeviceRoot folder_;
   std::size_t left_ = NANDInfo::kLargestBuffer;  // bytes that may still be read
   std::size_t count_ = 0;                        // of decoded buffers

@@ -10,6 +10,7 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "base/Text.h"
+#include "platform/SystemLog.h"
 #include "plist/JSON.h"
 #include "tools/common/ClosestName.h"
 #include "tools/common/TerminalText.h"
@@ -123,9 +124,9 @@ class Run {
   Run(const CommandServices& services, const Command& command)
       : services_(services),
         command_(command),
-        watch_(services.platform, services.log != nullptr && services.log->isSystemLog()
-                                      ? ControllerWatch::DirectTexts::passed
-                                      : ControllerWatch::DirectTexts::kept) {}
+        watch_(services.storage, services.log != nullptr && services.log->isSystemLog()
+                                     ? ControllerWatch::DirectTexts::passed
+                                     : ControllerWatch::DirectTexts::kept) {}
 
   int run(const Arguments& arguments, Form form) {
     if (command_.needs != Needs::noDevice && !services_.rootProblem.empty()) {
@@ -153,7 +154,7 @@ class Run {
     if (services_.log != nullptr) services_.log->keep();
     Progress progress(services_);
     return command_.run(
-        {watch_.platform(), arguments, [&](const std::string& text) { progress.show(text); }});
+        {watch_.services(), arguments, [&](const std::string& text) { progress.show(text); }});
   }
 
   void say(const std::string& what) {

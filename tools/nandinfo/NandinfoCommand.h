@@ -5,13 +5,13 @@
 #include <ostream>
 #include <string>
 
-#include "platform/Platform.h"
+#include "NANDInfo/Services.h"
 #include "tools/common/CommandLog.h"
 
 namespace nandinfo {
 
 struct CommandServices {
-  platform::Platform& platform;
+  NANDInfo::Services storage;
   std::ostream& out;
   std::ostream& err;
   bool outIsTerminal = false;        // then results are tables for people, else JSON

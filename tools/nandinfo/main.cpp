@@ -13,7 +13,7 @@ namespace {
 int run(std::ostream& out, int argc, char** argv) {
   tools::CommandLog log("nandinfo");
   host::Host host(log.hostOptions());
-  nandinfo::CommandServices services{.platform = host.platform(),
+  nandinfo::CommandServices services{.storage = host.services(),
                                      .out = out,
                                      .err = std::cerr,
                                      .outIsTerminal = ::isatty(STDOUT_FILENO) == 1,

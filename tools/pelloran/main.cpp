@@ -6,6 +6,7 @@
 #include <thread>
 
 #include "host/Host.h"
+#include "platform/Clock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/StandardOutput.h"
 #include "tools/pelloran/Pelloran.h"
@@ -17,7 +18,7 @@ int run(std::ostream& out, int argc, char** argv) {
   host::Host host(log.hostOptions());
   return pelloran::runPelloran(
       {.store = host.counters(),
-       .clock = host.platform().clock,
+       .clock = host.services().clock,
        .in = std::cin,
        .out = out,
        .err = std::cerr,

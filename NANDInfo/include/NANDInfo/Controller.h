@@ -8,13 +8,10 @@
 #include <vector>
 
 #include "NANDInfo/Parsers.h"
+#include "NANDInfo/Services.h"
 #include "base/Exported.h"
 #include "platform/DeviceRegistry.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace MORVEND_EXPORTED NANDInfo {
 
@@ -76,28 +73,27 @@ struct TunnelCommandBlock {
 
 // The first entry that conforms to a class, from a walk of the whole service plane; the caller
 // releases it. 0 when there is none.
-platform::RegistryObject FindServiceUsingIterator(platform::Platform& platform,
-                                                  const char* className);
+platform::RegistryObject FindServiceUsingIterator(const Services& services, const char* className);
 
 // The service of the first known driver that is present, by matching, then by walking; the caller
 // releases it. 0 when none is; `exporter` is then the empty record.
-platform::RegistryObject findNandExporter(platform::Platform& platform, nand_exporter_t*& exporter);
+platform::RegistryObject findNandExporter(const Services& services, nand_exporter_t*& exporter);
 
 // The first known driver that matches and can be opened; its record then holds the connection and
 // the service, until ReleaseIOInterfaces. False when there is none (`exporter` is then null).
-bool findNandExporterNew(platform::Platform& platform, nand_exporter_t*& exporter);
-void ReleaseIOInterfaces(platform::Platform& platform, nand_exporter_t* exporter);
+bool findNandExporterNew(const Services& services, nand_exporter_t*& exporter);
+void ReleaseIOInterfaces(const Services& services, nand_exporter_t* exporter);
 
 // Fetches a buffer of a size that the driver announces: a size phase, then a data phase. True with
 // the bytes that the driver delivered; false with a message recorded. A failed size phase empties
 // the caller's buffer, any other failure leaves it as it was.
-bool executeTunnelCommand(platform::Platform& platform, platform::DriverConnection connection,
+bool executeTunnelCommand(const Services& services, platform::DriverConnection connection,
                           const nand_exporter_t* exporter, const SelectorPair* selectors,
                           TunnelCommandBlock& block, Buffer& buffer);
 
 // Fetches and parses the legacy statistics; `exporter` is what findNandExporter made of it. The
 // caller releases the context with the exporter's releaseLegacy.
-bool load_nand_info(platform::Platform& platform, nand_exporter_t*& exporter,
+bool load_nand_info(const Services& services, nand_exporter_t*& exporter,
                     LegacyNandInfoCxt* context);
 
 struct zmc_connection_t {
@@ -105,7 +101,7 @@ struct zmc_connection_t {
   platform::DriverConnection connection;
   nand_exporter_t* exporter;
 };
-bool openZMCConnection(platform::Platform& platform, zmc_connection_t& connection);
-void closeZMCConnection(platform::Platform& platform, zmc_connection_t& connection);
+bool openZMCConnection(const Services& services, zmc_connection_t& connection);
+void closeZMCConnection(const Services& services, zmc_connection_t& connection);
 
 }  // namespace NANDInfo

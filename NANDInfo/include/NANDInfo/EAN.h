@@ -4,24 +4,21 @@
 #include <cstdint>
 #include <span>
 
+#include "NANDInfo/Services.h"
 #include "base/Exported.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace MORVEND_EXPORTED NANDInfo {
 
 // The size of an image in bytes, and the number of its updates, by its four-character code (the
 // first character in the highest byte). 0 on any failure, with a line in the log.
-std::uint64_t GetEANImageSize(platform::Platform& platform, std::uint32_t code);
-std::uint64_t GetEANUpdateCount(platform::Platform& platform, std::uint32_t code);
+std::uint64_t GetEANImageSize(const Services& services, std::uint32_t code);
+std::uint64_t GetEANUpdateCount(const Services& services, std::uint32_t code);
 
 inline constexpr char kEANClassName[] = "NorbaNVMeEAN";
 
 struct EANQuery {
   const char* key;  // of the storage statistics
-  std::uint64_t (*query)(platform::Platform& platform, std::uint32_t code);
+  std::uint64_t (*query)(const Services& services, std::uint32_t code);
   std::uint32_t code;
 };
 

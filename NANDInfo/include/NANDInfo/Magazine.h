@@ -7,12 +7,9 @@
 
 #include <cstdint>
 
+#include "NANDInfo/Services.h"
 #include "base/Exported.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace MORVEND_EXPORTED NANDInfo {
 
@@ -25,13 +22,12 @@ inline constexpr std::uint32_t kMagazineBoth = 2;
 // time has passed, as they were then), the dynamic ones as they were then; with the derived fields
 // and the average P/E cycles of the window. With only the older snapshot, all that it holds. Depths
 // beyond 32 bits are cut to what the driver takes.
-plist::Dictionary CopySMagNANDFTLInfo(platform::Platform& platform, std::uint64_t hours,
+plist::Dictionary CopySMagNANDFTLInfo(const Services& services, std::uint64_t hours,
                                       std::uint32_t deltaFlag, std::uint32_t mode);
 
 // The write amplification of garbage collection in each of the last six windows of four hours, the
 // latest first: kTLM_instantaneous_gc_wamp_array. Nothing when `skips` is not zero; without a
 // magazine only an error message.
-plist::Dictionary CopySMagNANDFTLCustomHistoryInfo(platform::Platform& platform,
-                                                   std::uint32_t skips);
+plist::Dictionary CopySMagNANDFTLCustomHistoryInfo(const Services& services, std::uint32_t skips);
 
 }  // namespace NANDInfo

@@ -5,26 +5,23 @@
 #include <string>
 #include <string_view>
 
+#include "NANDInfo/Services.h"
 #include "base/Exported.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace MORVEND_EXPORTED NANDInfo {
 
 // Submits the values as the log "StorageStatus" of the given type, and notes the time as
 // "SSLastLoggedAt" in the process's preferences, however the submission went. Within seven days of
 // that time nothing is written, nor without values (null). Standard exceptions end in the log.
-void NLW_WriteLog(platform::Platform& platform, std::string_view logType,
+void NLW_WriteLog(const Services& services, std::string_view logType,
                   const plist::Dictionary* values);
 
 // The key under which the device's logs are filed, or "error".
-std::string GetFaultwatchKey(platform::Platform& platform);
+std::string GetFaultwatchKey(const Services& services);
 
 // Of the current date in UTC; months from 1 to 12.
-int GetCurrentMonthNumber(platform::Platform& platform);
-std::int64_t GetCurrentYear(platform::Platform& platform);
+int GetCurrentMonthNumber(const Services& services);
+std::int64_t GetCurrentYear(const Services& services);
 
 }  // namespace NANDInfo

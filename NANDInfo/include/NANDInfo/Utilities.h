@@ -5,12 +5,9 @@
 #include <cstdint>
 #include <string_view>
 
+#include "NANDInfo/Services.h"
 #include "base/Exported.h"
 #include "plist/Value.h"
-
-namespace platform {
-struct Platform;
-}
 
 namespace MORVEND_EXPORTED NANDInfo {
 
@@ -19,9 +16,9 @@ enum class NumberKind { signed8, signed32, signed64, float64 };
 
 // Sets, or appends, the number at the pointer. One that can't be had (a null pointer) is logged,
 // and the collection stays as it is.
-void setNumberValueForType(platform::Platform& platform, plist::Dictionary& dictionary,
+void setNumberValueForType(const Services& services, plist::Dictionary& dictionary,
                            std::string_view key, const void* value, NumberKind kind);
-void appendNumberValueForType(platform::Platform& platform, plist::Array& array, const void* value,
+void appendNumberValueForType(const Services& services, plist::Array& array, const void* value,
                               NumberKind kind);
 
 // The value of a key, or the number 0, or the text "empty".
@@ -36,7 +33,7 @@ void addEntries(const plist::Dictionary& entries, plist::Dictionary& target);
 
 // At most two, or eight, hexadecimal characters as a number. A character that isn't hexadecimal is
 // said on standard output and adds nothing.
-std::uint8_t hexStringToByte(platform::Platform& platform, std::string_view text);
-std::uint32_t hexStringToInt32(platform::Platform& platform, std::string_view text);
+std::uint8_t hexStringToByte(const Services& services, std::string_view text);
+std::uint32_t hexStringToInt32(const Services& services, std::string_view text);
 
 }  // namespace NANDInfo

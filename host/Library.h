@@ -1,19 +1,16 @@
-// The Linux host as a platform, for programs that load the storage library.
+// The Linux host, for programs that load the storage library.
 #pragma once
 
 #include <memory>
 
 #include "base/Exported.h"
-
-namespace platform {
-struct Platform;
-}
+#include "platform/AllServices.h"
 
 namespace MORVEND_EXPORTED host {
 
 // Every service over the device root that MORVEND_ROOT names ("/" without it); what was written is
 // on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
-std::shared_ptr<platform::Platform> makeHostPlatform();
+std::shared_ptr<const platform::AllServices> makeServices();
 
 // Whether that device is an internal (development) build. Asked once in the life of the process, by
 // whichever thread comes first; for a symbol look-up too, whence the plain name.

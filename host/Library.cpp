@@ -1,12 +1,12 @@
-#include "host/HostPlatform.h"
+#include "host/Library.h"
 
 #include "host/Host.h"
 
 namespace host {
 
-std::shared_ptr<platform::Platform> makeHostPlatform() {
+std::shared_ptr<const platform::AllServices> makeServices() {
   const auto host = std::make_shared<Host>();
-  return {host, &host->platform()};
+  return {host, &host->services()};
 }
 
 bool PLIsInternalDevice() {

@@ -1,0 +1,64 @@
+// What the storage library asks of the world outside, and nothing more. References: whoever makes
+// it keeps the services alive for as long.
+#pragma once
+
+#include "base/Exported.h"
+
+namespace platform {
+class Clock;
+class DeviceProperties;
+class DeviceRegistry;
+class DriverConnections;
+class Eventra;
+class FaultwatchSupport;
+class FileSystem;
+class Kernel;
+class KernelSnapshots;
+class LogSubmission;
+class PreferenceStore;
+class PurgeableSpace;
+class StandardStreams;
+class SystemLog;
+class SystemVersion;
+}  // namespace platform
+
+namespace MORVEND_EXPORTED NANDInfo {
+
+struct Services {
+  platform::SystemLog& log;
+  platform::StandardStreams& streams;
+  platform::Clock& clock;
+  platform::FileSystem& files;
+  platform::PreferenceStore& preferences;
+  platform::LogSubmission& submission;
+  platform::FaultwatchSupport& faultwatch;
+  platform::Eventra& eventra;
+  platform::DeviceProperties& deviceProperties;
+  platform::SystemVersion& systemVersion;
+  platform::Kernel& kernel;
+  platform::KernelSnapshots& snapshots;
+  platform::DeviceRegistry& registry;
+  platform::DriverConnections& drivers;
+  platform::PurgeableSpace& purgeableSpace;
+
+  // Each service under its name, out of whatever has them: a host, a test's fakes.
+  template <typename Source>
+  Services(const Source& source)
+      : log(source.log),
+        streams(source.streams),
+        clock(source.clock),
+        files(source.files),
+        preferences(source.preferences),
+        submission(source.submission),
+        faultwatch(source.faultwatch),
+        eventra(source.eventra),
+        deviceProperties(source.deviceProperties),
+        systemVersion(source.systemVersion),
+        kernel(source.kernel),
+        snapshots(source.snapshots),
+        registry(source.registry),
+        drivers(source.drivers),
+        purgeableSpace(source.purgeableSpace) {}
+};
+
+}  // namespace NANDInfo
