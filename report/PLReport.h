@@ -1,25 +1,20 @@
 // The daily counters report: yesterday's whitelisted counters, rounded, with what the report
 // collects itself, submitted as one property-list log.
+//
+// history rows → Sections, with the collectors' values → DailyLog → spool: each a value that the
+// next takes. A report itself changes no more once it is made.
 #pragma once
 
 #include <cstdint>
-#include <functional>
 #include <memory>
-#include <set>
-#include <string>
-#include <string_view>
 
 #include "device/DeviceContext.h"
-
-#include "platform/PLHistory.h"
+#include "report/DailyLog.h"
 #include "report/PLConfig.h"
+#include "report/Sections.h"
 #include "report/Services.h"
 
 namespace report {
-
-// Activated-app info: one dictionary ("bundle", "version", "orloID", "arch", "uuid") for each
-// application, as a client delivered it.
-using ActivatedAppInfo = plist::Array;
 
 class PLReport {
  public:
@@ -30,49 +25,23 @@ class PLReport {
   // replaces an earlier one's) and submits it. `day` is the day that is reported; `appInfo` may be
   // null, which is not the same as empty. Failures are logged, and why there is no report when no
   // counter is let through.
-  void writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo);
+  void writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) const;
 
-  // Runs the collectors, builds the log and submits it; does nothing at all when no counter has
-  // been added so far. Tells how many keys are in it that no whitelist entry names. Drops the
-  // whitelist.
-  void serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo);
+  // Runs the collectors over what the day's counters came to, builds the log and submits it; does
+  // nothing at all when no counter is in the sections. Tells how many keys are in it that no
+  // whitelist entry names.
+  void serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,
+                         Sections sections) const;
 
-  // Stores a scalar, rounded as its options ask, and returns what it stored.
-  std::int64_t addScalar(std::int64_t value, std::string_view key, const CounterOptions& options);
-
-  // The same for a value that is computed only if its key is whitelisted.
-  void addScalarForKey(std::string_view key, const std::function<std::int64_t()>& byExecutingBlock);
-
-  // Stores the statistics of the samples, and their histogram if the options hold intervals.
-  void computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
-                                 std::string_view key, const CounterOptions& options);
-
-  // The collectors, in the order in which they run; each reads its own source.
-  void addInstalledAppInfo();
-  void addMetadataKeys();
-  void reportDatabaseSize();
-  void reportCPUUptime();
-  void reportVMStats();
-
-  // What has been added so far. Scalars: int64; distributions: the five statistics; histograms:
-  // dictionaries of bucket label to count; metadata: texts.
-  const plist::Dictionary& scalarsOutput() const { return scalarsOutput_; }
-  const plist::Dictionary& distributionsOutput() const { return distributionsOutput_; }
-  const plist::Dictionary& histogramsOutput() const { return histogramsOutput_; }
-  const plist::Dictionary& metadataOutput() const { return metadataOutput_; }
+  // Empty sections, into which this report's whitelist lets values.
+  Sections emptySections() const { return {config_.get(), services_.log}; }
 
  private:
-  bool isEmpty() const;
-  const CounterOptions* scalarOptions(std::string_view key) const;
-  void noteOptions(std::string_view key, const CounterOptions& options);
-  plist::Dictionary buildLog(std::int32_t day, const ActivatedAppInfo* appInfo);
-  void submit(const std::string& log);
+  Sections sectionsOfDay(std::int32_t day) const;
 
   const Services services_;
   morvend::DeviceContext& context_;
-  std::unique_ptr<PLConfig> config_;
-  plist::Dictionary scalarsOutput_, distributionsOutput_, histogramsOutput_, metadataOutput_;
-  std::set<std::string, std::less<>> unnamed_;  // the keys that no whitelist entry names
+  const std::unique_ptr<const PLConfig> config_;
 };
 
 }  // namespace report

@@ -2,11 +2,13 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <new>
 
 #include "platform/InstalledApplications.h"
 #include "platform/Kernel.h"
 #include "plist/PropertyList.h"
+#include "report/Collectors.h"
 #include "report/KernelCounters.h"
 #include "support/TestPlatform.h"
 
@@ -63,15 +65,26 @@ class PLReportTest : public ::testing::Test {
   }
 
   // The report's own collectors, over a whitelist of these keys.
-  Dictionary collect(std::initializer_list<const char*> keys, void (PLReport::*collector)()) {
+  Dictionary collect(std::initializer_list<const char*> keys,
+                     const std::function<void(Sections&)>& collector) {
     platform.whitelistScalars(keys);
     morvend::DeviceContext context(platform.platform);
-    PLReport report(platform.platform, context);
-    (report.*collector)();
-    return report.scalarsOutput();
+    const PLReport report(platform.platform, context);
+    Sections sections = report.emptySections();
+    collector(sections);
+    return sections.scalars;
   }
 
   support::TestPlatform platform;
+  const std::function<void(Sections&)> applications = [this](Sections& s) {
+    addInstalledAppInfo(s, platform.device, platform.eventra);
+  };
+  const std::function<void(Sections&)> uptime = [this](Sections& s) {
+    reportCPUUptime(s, platform.kernel, platform.log);
+  };
+  const std::function<void(Sections&)> memory = [this](Sections& s) {
+    reportVMStats(s, platform.kernel);
+  };
 };
 
 TEST_F(PLReportTest, WritesTheWholeLog) {
@@ -210,13 +223,12 @@ TEST_F(PLReportTest, CountsApplicationsOnlyIfSomebodyWantsThem) {
   constexpr char kUser[] = "com.norba.tarvenn.numThirdPartyApps";
   platform.device.bundles = {Type::user, Type::system, Type::user};
   platform.eventra.everyEventIsUsed = false;
-  EXPECT_TRUE(collect({"other"}, &PLReport::addInstalledAppInfo).empty());
+  EXPECT_TRUE(collect({"other"}, applications).empty());
   EXPECT_EQ(platform.device.enumerations, 0);
-  EXPECT_EQ(collect({kUser}, &PLReport::addInstalledAppInfo),
-            (Dictionary{{kUser, std::int64_t{2}}}));
+  EXPECT_EQ(collect({kUser}, applications), (Dictionary{{kUser, std::int64_t{2}}}));
   EXPECT_TRUE(platform.eventra.events.empty());
   platform.eventra.everyEventIsUsed = true;
-  EXPECT_TRUE(collect({"other"}, &PLReport::addInstalledAppInfo).empty());
+  EXPECT_TRUE(collect({"other"}, applications).empty());
   ASSERT_EQ(platform.eventra.events.size(), 1u);
   EXPECT_EQ(platform.eventra.events[0].first, "com.norba.tarvenn.appInstalls");
   EXPECT_EQ(platform.eventra.events[0].second,
@@ -248,7 +260,7 @@ TEST_F(PLReportTest, TellsMinutesSinceBoot) {
   for (const auto& row : rows) {
     platform.kernel.ratio = row.ratio;
     platform.kernel.ticks = row.ticks;
-    const auto scalars = collect({kKey}, &PLReport::reportCPUUptime);
+    const auto scalars = collect({kKey}, uptime);
     const std::int64_t minutes = scalars.number(kKey)->int64Value();
     EXPECT_DOUBLE_EQ(static_cast<double>(minutes), static_cast<double>(row.minutes));
   }
@@ -367,7 +379,7 @@ TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
   for (const auto& row : rows) {
     platform.kernel.integers = row.kernel;
     const std::string key = std::string("com.norba.") + row.key;
-    const auto scalars = collect({key.c_str()}, &PLReport::reportVMStats);
+    const auto scalars = collect({key.c_str()}, memory);
     const auto* number = scalars.number(key);
     EXPECT_EQ(number ? std::optional(number->int64Value()) : std::nullopt, row.expected) << row.key;
   }
@@ -375,7 +387,7 @@ TEST_F(PLReportTest, ReportsMemoryStatisticsBehindTheirGates) {
 
 TEST_F(PLReportTest, ReadsGatesAlwaysAndValuesOnlyWhenWhitelisted) {
   for (const KernelCounter& row : kTagCheckCounters) platform.kernel.integers[row.name] = 1;
-  collect({"com.norba.kernel.vmtc_1_byte"}, &PLReport::reportVMStats);
+  collect({"com.norba.kernel.vmtc_1_byte"}, memory);
   EXPECT_EQ(platform.kernel.reads,
             (std::vector<std::string>{"vm.vmtc_total", "vm.vmtc_1_byte",
                                       "kern.memorystatus_freeze_pageouts",

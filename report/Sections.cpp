@@ -1,0 +1,60 @@
+#include "report/Sections.h"
+
+#include <utility>
+
+#include "report/Arithmetic.h"
+
+namespace report {
+
+using platform::LogLevel;
+
+void Sections::noteOptions(std::string_view key, const CounterOptions& options) {
+  if (&options == &PLConfig::kUnnamed) unnamed_.emplace(key);
+}
+
+const CounterOptions* Sections::scalarOptions(std::string_view key) const {
+  return whitelist_ != nullptr ? whitelist_->configOptionsForScalarKey(key) : nullptr;
+}
+
+std::int64_t Sections::addScalar(std::int64_t value, std::string_view key,
+                                 const CounterOptions& options) {
+  noteOptions(key, options);
+  const std::int64_t rounded = roundScalar(value, options);
+  scalars.set(key, rounded);
+  return rounded;
+}
+
+void Sections::addScalarForKey(std::string_view key,
+                               const std::function<std::int64_t()>& byExecutingBlock) {
+  if (const auto* options = scalarOptions(key)) addScalar(byExecutingBlock(), key, *options);
+}
+
+void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
+                                         std::string_view key, const CounterOptions& options) {
+  noteOptions(key, options);
+  const int length = static_cast<int>(key.size());
+  const Intervals* intervals = options.intervals ? &*options.intervals : nullptr;
+  if (intervals != nullptr) {
+    log_->log(LogLevel::debug, "Treating key %.*s as a histogram", length, key.data());
+  }
+  Distribution distribution(intervals);
+  if (distribution.histogramFailed()) {
+    log_->log(LogLevel::standard,
+              "Couldn't allocate histCounts for key %.*s. Will not calculate histogram values",
+              length, key.data());
+  }
+  for (auto block = samples.getNextValues(); !block.values.empty();
+       block = samples.getNextValues()) {
+    distribution.add(block.values);
+  }
+  if (intervals != nullptr && !distribution.histogramFailed()) {
+    if (auto histogram = distribution.histogram()) {
+      histograms.set(key, std::move(*histogram));
+    } else {
+      histograms.remove(key);
+    }
+  }
+  distributions.set(key, distribution.statistics());
+}
+
+}  // namespace report
