@@ -6,7 +6,7 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "tools/nandinfo/DecodedBuffer.h"
-#include "tools/nandinfo/Table.h"
+#include "tools/nandinfo/TableText.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   using namespace nandinfo;

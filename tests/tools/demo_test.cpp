@@ -5,7 +5,6 @@
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 #include "tools/demo/Rules.h"
-#include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
 
 namespace {
@@ -72,20 +71,6 @@ TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
         "1 records        nothing: raw, type 176", " 2  1 to 2  fixed list of the step",
         "health servita"}) {
     EXPECT_NE(text.find(line), std::string::npos) << line << "\nin\n" << text;
-  }
-}
-
-TEST(DemoScreen, KeepsToItsColumns) {
-  EXPECT_EQ(demo::elided("abcdefghij", 10), "abcdefghij");
-  EXPECT_EQ(demo::elided("abcdefghij", 7), "ab…ghij");
-  EXPECT_EQ(demo::elided("äöüäöüäöüä", 4), "ä…üä");
-  demo::Table table({{"KEY", demo::Table::Align::left}, {"N", demo::Table::Align::right}});
-  table.addRow({std::string(200, 'k'), "12345"});
-  table.addRow({"short", "1"});
-  for (std::istringstream lines(table.text()); !lines.eof();) {
-    std::string line;
-    std::getline(lines, line);
-    EXPECT_LE(line.size(), demo::screenWidth() + 2) << line;  // the ellipsis has three bytes
   }
 }
 

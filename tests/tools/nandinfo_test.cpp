@@ -17,7 +17,7 @@
 #include "support/TemporaryFolder.h"
 #include "tools/nandinfo/Commands.h"
 #include "tools/nandinfo/NandinfoCommand.h"
-#include "tools/nandinfo/Table.h"
+#include "tools/nandinfo/TableText.h"
 
 namespace {
 

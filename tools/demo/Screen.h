@@ -1,4 +1,4 @@
-// Text for people: tables, bars and headings, as wide as the terminal.
+// Text for people: bars and headings, as wide as the terminal.
 #pragma once
 
 #include <cstdint>
@@ -9,14 +9,14 @@
 
 namespace demo {
 
-// The columns of the terminal that standard output is; 80 where it is none.
+// The blanks before each line of a section.
+inline constexpr std::size_t kIndent = 2;
+
+// The columns of the terminal, neither few nor very many.
 std::size_t screenWidth();
 
 // A line that begins a section; bold on a terminal.
 std::string heading(std::string_view text);
-
-// Cuts the middle out of a text that is wider than `width` columns.
-std::string elided(std::string_view text, std::size_t width);
 
 // A key without the beginning that nearly all have: "~" stands for "com.norba".
 std::string shortKey(std::string_view key);
@@ -33,26 +33,5 @@ std::string skyline(std::span<const std::uint64_t> counts);
 
 // Up to `most` indices below `count`, evenly spread, ascending.
 std::vector<std::size_t> evenlySpread(std::size_t count, std::size_t most);
-
-// Rows in columns. The first column gives way when the screen is too narrow for all.
-class Table {
- public:
-  enum class Align { left, right };
-  struct Column {
-    const char* title;
-    Align align;
-  };
-
-  explicit Table(std::vector<Column> columns);
-
-  void addRow(std::vector<std::string> cells) { rows_.push_back(std::move(cells)); }
-
-  // The lines, each indented and ended; with the titles unless all of them are empty.
-  std::string text() const;
-
- private:
-  std::vector<Column> columns_;
-  std::vector<std::vector<std::string>> rows_;
-};
 
 }  // namespace demo

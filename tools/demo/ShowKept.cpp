@@ -1,4 +1,5 @@
 #include "base/Text.h"
+#include "tools/common/Table.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
 
@@ -8,7 +9,7 @@ using base::format;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
-using Align = Table::Align;
+using tools::Table;
 
 namespace {
 
@@ -26,7 +27,7 @@ std::string namesOf(Device& device, const std::string& folder) {
 
 // Each setting of the tasking that was applied, as it is in its file now.
 std::string settingsOf(Device& device, const Array& payload) {
-  Table table({{"", Align::left}, {"", Align::left}});
+  Table table({{}, {}}, kIndent);
   for (const Value& element : payload) {
     const auto* item = element.as<Dictionary>();
     const std::string* user = item != nullptr ? item->text("User") : nullptr;
@@ -57,7 +58,7 @@ std::string records(Device& device) {
   const auto preferences = device.propertyList(path);
   std::string shown = "  " + device.pathOf(path) + "\n";
   if (!preferences) return shown + "    (not there)\n";
-  Table table({{"", Align::left}, {"", Align::left}});
+  Table table({{}, {}}, kIndent);
   for (const auto& [key, value] : *preferences) {
     table.addRow({key, inShort(value)});
   }

@@ -6,6 +6,7 @@
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/Services.h"
 #include "base/Text.h"
+#include "tools/common/Table.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
@@ -15,6 +16,7 @@ namespace demo {
 
 using base::format;
 using plist::Dictionary;
+using tools::Table;
 using Align = Table::Align;
 
 namespace {
@@ -150,9 +152,10 @@ class LeftText {
       const auto rule = counterRule(key);
       if (rule) byRule[*rule].push_back({key, value, rules_.ofScalar(key)});
     }
-    Table table({{"KEY (~ is com.norba)", Align::left},
+    Table table({{"KEY (~ is com.norba)", Align::left, true},
                  {"VALUE", Align::right},
-                 {"IN THE DAY'S REPORT", Align::left}});
+                 {"IN THE DAY'S REPORT", Align::left}},
+                kIndent);
     std::size_t count = 0;
     for (auto& [rule, counters] : byRule) {
       const auto listed = static_cast<std::size_t>(
@@ -169,7 +172,7 @@ class LeftText {
       }
     }
     text_ += "\n" + heading(format("Counters that the telemetry set today: %zu", count));
-    if (count > 0) text_ += table.text();
+    if (count > 0) text_ += table.text(screenWidth());
     if (NANDInfo::NandInfoShouldLogAllToEV(device_.services())) {
       text_ += "  Today the storage counters go to the analytics sink instead.\n";
     }
@@ -193,15 +196,16 @@ class LeftText {
   void addEvents() {
     text_ += "\n" + heading("Analytics events (~~ is com.norba.massStorage.NANDInfo)") + "  " +
              device_.pathOf(kEvents) + "\n";
-    Table table({{"EVENT", Align::left},
+    Table table({{"EVENT", Align::left, true},
                  {"SENT", Align::right},
                  {"FIELDS", Align::right},
-                 {"LET THROUGH BY", Align::left}});
+                 {"LET THROUGH BY", Align::left}},
+                kIndent);
     for (const auto& [event, sent] :
          talliesOf(device_.bytes(kEvents).value_or(""), "event", "payload")) {
       table.addRow({shortEvent(event), std::to_string(sent.count), sent.range(), eventRule(event)});
     }
-    text_ += table.text();
+    text_ += table.text(screenWidth());
   }
 
   void addHanded() {
@@ -224,7 +228,8 @@ class LeftText {
         {"health lab", NANDInfo::CopyInternalLabNANDInfo(services), nullptr},
         {"health ota", NANDInfo::CopyOTANANDInfo(services), nullptr},
     };
-    Table table({{"NANDINFO", Align::left}, {"VALUES", Align::right}, {"RULE", Align::left}});
+    Table table({{"NANDINFO", Align::left}, {"VALUES", Align::right}, {"RULE", Align::left}},
+                kIndent);
     for (const auto& [command, result, digits] : kResults) {
       if (!result) continue;
       table.addRow({command, std::to_string(result->size()),

@@ -4,6 +4,7 @@
 
 #include "base/CivilDate.h"
 #include "base/Text.h"
+#include "tools/common/Table.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/Show.h"
@@ -15,6 +16,7 @@ using plist::Array;
 using plist::Date;
 using plist::Dictionary;
 using plist::Value;
+using tools::Table;
 using Align = Table::Align;
 
 namespace {
@@ -115,7 +117,7 @@ class LogText {
 
   void addHeader() {
     text_ += heading("Report of " + dayText(day_) + format(" (day %d)", day_));
-    Table table({{"", Align::left}, {"", Align::left}});
+    Table table({{}, {}}, kIndent);
     const auto add = [&table](const char* name, const std::string& value) {
       table.addRow({name, value});
     };
@@ -142,17 +144,18 @@ class LogText {
   void addRows(const char* title, const std::vector<const Scalar*>& scalars, std::size_t most) {
     if (scalars.empty()) return;
     text_ += format("\n  %s: %zu\n", title, scalars.size());
-    Table table({{"KEY", Align::left},
+    Table table({{"KEY", Align::left, true},
                  {"RECORDED", Align::right},
                  {"REPORTED", Align::right},
-                 {"ROUNDED TO", Align::left}});
+                 {"ROUNDED TO", Align::left}},
+                kIndent);
     const auto shown = evenlySpread(scalars.size(), atMost(most));
     for (const std::size_t i : shown) {
       const Scalar& scalar = *scalars[i];
       table.addRow({keyText(scalar.key, scalar.rule), scalar.recorded, scalar.reported,
                     scalar.rule ? roundingText(*scalar.rule->options) : "?"});
     }
-    text_ += table.text() + more(scalars.size(), shown.size());
+    text_ += table.text(screenWidth()) + more(scalars.size(), shown.size());
   }
 
   void addScalars() {
@@ -203,13 +206,14 @@ class LogText {
   void addDistributions() {
     const Dictionary& distributions = section("PLDistributions");
     const Dictionary& histograms = section("PLDistributionsHistogram");
-    Table table({{"KEY", Align::left},
+    Table table({{"KEY", Align::left, true},
                  {"N", Align::right},
                  {"MIN", Align::right},
                  {"MEAN", Align::right},
                  {"MAX", Align::right},
                  {"STD DEV", Align::right},
-                 {"SHAPE", Align::left}});
+                 {"SHAPE", Align::left}},
+                kIndent);
     std::vector<const Dictionary::Entry*> rows;
     for (const auto& entry : distributions) {
       const auto* statistics = entry.value.as<Array>();
@@ -235,7 +239,7 @@ class LogText {
     }
     text_ +=
         "\n" + heading("Distributions: " + std::to_string(rows.size()) + " reported" + keyNote());
-    if (!rows.empty()) text_ += table.text() + more(rows.size(), shown.size());
+    if (!rows.empty()) text_ += table.text(screenWidth()) + more(rows.size(), shown.size());
     addWithheld(recorded_.distributions, "PLDistributions",
                 [](const std::string& key) -> const std::string& { return key; });
   }
@@ -263,7 +267,7 @@ class LogText {
       const Dictionary& histogram = *histograms[i]->value.as<Dictionary>();
       const auto counts = countsOf(histogram);
       const std::uint64_t most = *std::max_element(counts.begin(), counts.end());
-      Table table({{"", Align::right}, {"", Align::right}, {"", Align::left}});
+      Table table({{"", Align::right}, {"", Align::right}, {"", Align::left}}, kIndent);
       std::size_t row = 0;
       for (const auto& [label, count] : histogram) {
         const double share =

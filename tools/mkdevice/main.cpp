@@ -13,6 +13,7 @@
 #include "base/CivilDate.h"
 #include "host/process/SystemClock.h"
 #include "tools/common/CommandLog.h"
+#include "tools/common/Terminal.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/SampleController.h"
 
@@ -77,20 +78,16 @@ int main(int argc, char** argv) {
     return kUsage;
   }
 
-  const bool terminal = ::isatty(STDERR_FILENO) == 1;
-  const char* const clearLine = terminal ? "\r\x1b[K" : "";
+  tools::Progress progress(std::cerr, ::isatty(STDERR_FILENO) == 1);
   options.sample.today = base::dayNumber(host::SystemClock().now().secondsSince1970);
-  const std::string error =
-      mkdevice::makeDevice(options, {.progress =
-                                         [&](const std::string& text) {
-                                           if (terminal)
-                                             std::cerr << clearLine << text << std::flush;
-                                         },
-                                     .warning =
-                                         [&](const std::string& text) {
-                                           std::cerr << clearLine << "mkdevice: " << text << '\n';
-                                         }});
-  std::cerr << clearLine;
+  const std::string error = mkdevice::makeDevice(
+      options, {.progress = [&](const std::string& text) { progress.show(text); },
+                .warning =
+                    [&](const std::string& text) {
+                      progress.clear();
+                      std::cerr << "mkdevice: " << text << '\n';
+                    }});
+  progress.clear();
   if (error.empty()) return kDone;
   std::cerr << "mkdevice: " << error << '\n';
   return kFailed;

@@ -13,11 +13,12 @@
 #include "platform/SystemLog.h"
 #include "plist/JSON.h"
 #include "tools/common/ClosestName.h"
+#include "tools/common/Terminal.h"
 #include "tools/common/TerminalText.h"
 #include "tools/nandinfo/Commands.h"
 #include "tools/nandinfo/ControllerWatch.h"
 #include "tools/nandinfo/DecodedBuffer.h"
-#include "tools/nandinfo/Table.h"
+#include "tools/nandinfo/TableText.h"
 
 namespace nandinfo {
 
@@ -48,25 +49,6 @@ constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
 
 struct Form {
   bool json = false, compact = false;
-};
-
-// One line on a terminal that is written over again and again.
-class Progress {
- public:
-  explicit Progress(const CommandServices& services)
-      : err_(services.err), shown_(services.errIsTerminal) {}
-  ~Progress() {
-    if (begun_) err_ << "\r\x1b[K" << std::flush;
-  }
-  void show(const std::string& text) {
-    if (!shown_) return;
-    begun_ = true;
-    err_ << "\r\x1b[K" << text << std::flush;
-  }
-
- private:
-  std::ostream& err_;
-  bool shown_, begun_ = false;
 };
 
 // Why the work failed, or none if it didn't: no result, one that is an error, one that holds
@@ -152,7 +134,7 @@ class Run {
  private:
   CommandResult resultOf(const Arguments& arguments) {
     if (services_.log != nullptr) services_.log->keep();
-    Progress progress(services_);
+    tools::Progress progress(services_.err, services_.errIsTerminal);
     return command_.run(
         {watch_.services(), arguments, [&](const std::string& text) { progress.show(text); }});
   }

@@ -13,6 +13,7 @@
 
 #include "base/Convert.h"
 #include "tools/common/ClosestName.h"
+#include "tools/common/Terminal.h"
 #include "tools/common/TerminalText.h"
 #include "tools/pelloran/Arguments.h"
 #include "tools/pelloran/ImportLine.h"
@@ -29,22 +30,6 @@ constexpr int kDone = 0, kFailed = 1, kUsage = 2;
 constexpr std::size_t kLongestLine = std::size_t{1} << 20;
 constexpr std::size_t kLinesBetweenProgress = 50000;
 constexpr double kLongestSampling = 366 * 86400.0;
-
-// One line on a terminal that is written over again and again.
-class Progress {
- public:
-  explicit Progress(const Environment& environment)
-      : err_(environment.err), shown_(environment.errIsTerminal) {}
-  ~Progress() { clear(); }
-  void show(const std::string& text) {
-    if (shown_) err_ << "\r\x1b[K" << text << std::flush;
-  }
-  void clear() { show(""); }
-
- private:
-  std::ostream& err_;
-  bool shown_;
-};
 
 // What the command line says, as text; each command looks at its own part.
 struct Arguments {
@@ -119,7 +104,7 @@ class Command {
     }
     const auto start = std::chrono::steady_clock::now();
     const auto readings = base::saturatingCast<std::int64_t>(lasting / every) + 1;
-    Progress progress(environment_);
+    tools::Progress progress(environment_.err, environment_.errIsTerminal);
     for (std::int64_t reading = 1; reading <= readings; ++reading) {
       if (const std::string error = record(readMachineFigures(environment_.figuresRoot));
           !error.empty()) {
@@ -160,7 +145,7 @@ class Command {
     std::vector<CounterChange> changes;
     std::string buffer(kLongestLine + 1, '\0');
     std::size_t number = 0;
-    Progress progress(environment_);
+    tools::Progress progress(environment_.err, environment_.errIsTerminal);
     const auto wrong = [&](const std::string& why) {
       progress.clear();
       return failed(place + std::to_string(number) + ": " + why);

@@ -1,7 +1,6 @@
 #include "tools/pelloran/Show.h"
 
 #include <algorithm>
-#include <array>
 #include <nlohmann/json.hpp>
 #include <ostream>
 #include <string>
@@ -10,6 +9,7 @@
 
 #include "base/CivilDate.h"
 #include "base/Text.h"
+#include "tools/common/Table.h"
 #include "tools/common/TerminalText.h"
 
 namespace pelloran {
@@ -38,9 +38,7 @@ std::vector<Row> rowsOf(platform::PLHistory& history, const Shown& shown, Scalar
       [&](std::string_view key, std::int32_t day, PLHistoryDistributionEnumerator& samples, bool&) {
         rows.push_back({day, std::string(key), distributionText(samples)});
       });
-  std::stable_sort(rows.begin(), rows.end(), [](const Row& a, const Row& b) {
-    return std::tie(a.day, a.key) < std::tie(b.day, b.key);
-  });
+  std::ranges::stable_sort(rows, {}, [](const Row& row) { return std::tie(row.day, row.key); });
   return rows;
 }
 
@@ -91,24 +89,12 @@ std::string dateText(std::int32_t day) {
 }  // namespace
 
 void showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
-  std::vector<std::array<std::string, 4>> lines = {{"DAY", "DATE", "KEY", "VALUE"}};
-  for (Row& row : rowsOf(history, shown, scalarText, summary)) {
-    lines.push_back({std::to_string(row.day), dateText(row.day), tools::printable(row.key),
-                     std::move(row.text)});
+  tools::Table table({{"DAY"}, {"DATE"}, {"KEY"}, {"VALUE"}});
+  auto rows = rowsOf(history, shown, scalarText, summary);
+  for (auto& [day, key, value] : rows) {
+    table.addRow({std::to_string(day), dateText(day), std::move(key), std::move(value)});
   }
-  if (lines.size() == 1) return;
-  std::array<std::size_t, 3> widths{};
-  for (const auto& line : lines) {
-    for (std::size_t i = 0; i < widths.size(); ++i) {
-      widths[i] = std::max(widths[i], tools::columnsOf(line[i]));
-    }
-  }
-  for (const auto& line : lines) {
-    for (std::size_t i = 0; i < widths.size(); ++i) {
-      out << line[i] << std::string(widths[i] - tools::columnsOf(line[i]) + 2, ' ');
-    }
-    out << line.back() << '\n';
-  }
+  if (!rows.empty()) out << table.text();
 }
 
 void showJsonLines(platform::PLHistory& history, const Shown& shown, std::ostream& out) {

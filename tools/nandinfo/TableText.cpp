@@ -1,4 +1,4 @@
-#include "tools/nandinfo/Table.h"
+#include "tools/nandinfo/TableText.h"
 
 #include <algorithm>
 #include <span>
@@ -9,6 +9,7 @@
 #include "base/Text.h"
 #include "base/Timestamp.h"
 #include "plist/JSON.h"
+#include "tools/common/Table.h"
 #include "tools/common/TerminalText.h"
 
 namespace nandinfo {
@@ -19,8 +20,6 @@ using plist::Array;
 using plist::Dictionary;
 using plist::Number;
 using plist::Value;
-using tools::columnsOf;
-using tools::cutToColumns;
 using tools::printable;
 
 struct Cell {
@@ -42,62 +41,38 @@ Cell cellOf(const Value& value) {
     if (number->type() == Number::Type::boolean) return {number->boolValue() ? "true" : "false"};
     return {grouped(number->text()), true};
   }
-  if (const auto* text = value.as<std::string>()) return {printable(*text)};
+  if (const auto* text = value.as<std::string>()) return {*text};
   if (const auto* date = value.as<plist::Date>()) {
     Cell cell;
     base::appendTimestamp(cell.text, date->secondsSince1970);
     return cell;
   }
-  std::string json;
-  plist::appendJSON(json, value);
-  return {printable(json)};
+  Cell json;
+  plist::appendJSON(json.text, value);
+  return json;
 }
 
-// Rows in columns, two blanks apart. Numbers end below each other, however wide the texts among
-// them are.
-class Grid {
- public:
-  void add(Row row) {
-    columns_.resize(std::max(columns_.size(), row.size()));
+// The table of the rows. Numbers end below each other, however wide the texts among them are.
+tools::Table tableOf(std::vector<Row> rows) {
+  std::vector<std::size_t> numbers;  // how wide those of each column are
+  for (const Row& row : rows) {
+    numbers.resize(std::max(numbers.size(), row.size()));
     for (std::size_t i = 0; i < row.size(); ++i) {
-      const std::size_t width = columnsOf(row[i].text);
-      columns_[i].width = std::max(columns_[i].width, width);
-      if (row[i].right) columns_[i].numbers = std::max(columns_[i].numbers, width);
-    }
-    rows_.push_back(std::move(row));
-  }
-
-  std::size_t width() const {
-    std::size_t width = 0;
-    for (const Column& column : columns_) width += column.width + (width > 0 ? 2 : 0);
-    return width;
-  }
-
-  // Lines wider than `most` columns are cut.
-  void appendTo(std::string& out, std::size_t most = std::string::npos) const {
-    for (const Row& row : rows_) {
-      std::string line;
-      std::size_t end = 0;  // of the columns so far
-      for (std::size_t i = 0; i < row.size(); ++i) {
-        const auto& [text, right] = row[i];
-        if (right) line.append(columns_[i].numbers - columnsOf(text), ' ');
-        line += text;
-        end += columns_[i].width + 2;
-        line.append(end - columnsOf(line), ' ');
-      }
-      line.resize(line.find_last_not_of(' ') + 1);
-      out += cutToColumns(std::move(line), most) + '\n';
+      if (row[i].right) numbers[i] = std::max(numbers[i], row[i].text.size());
     }
   }
-
- private:
-  struct Column {
-    std::size_t width = 0, numbers = 0;  // of all cells, of the numbers among them
-  };
-
-  std::vector<Row> rows_;
-  std::vector<Column> columns_;
-};
+  tools::Table table{std::vector<tools::Table::Column>(numbers.size())};
+  for (Row& row : rows) {
+    std::vector<std::string> cells;
+    for (std::size_t i = 0; i < row.size(); ++i) {
+      auto& [text, right] = row[i];
+      if (right) text.insert(0, numbers[i] - text.size(), ' ');
+      cells.push_back(std::move(text));
+    }
+    table.addRow(std::move(cells));
+  }
+  return table;
+}
 
 template <typename Content>
 bool holdsOnly(const Array& array) {
@@ -126,46 +101,41 @@ void appendRecords(std::string& out, const Array& array, std::size_t width) {
   std::vector<const Dictionary*> records;
   for (const Value& value : array) records.push_back(value.as<Dictionary>());
   const auto keys = keysOf(records);
-  Grid grid;
-  Row titles;
-  for (const auto key : keys) titles.push_back({printable(key)});
-  grid.add(titles);
+  std::vector<Row> rows(1);
+  for (const auto key : keys) rows.front().push_back({std::string(key)});
   for (const Dictionary* record : records) {
-    Row row;
+    Row& row = rows.emplace_back();
     for (const auto key : keys) row.push_back(cellOf(*record, key));
-    grid.add(std::move(row));
   }
-  grid.appendTo(out, width);
+  out += tableOf(std::move(rows)).text(width);
 }
 
 // Eight numbers to a row, after the index of the first.
 void appendNumbers(std::string& out, const Array& array) {
-  Grid grid;
+  std::vector<Row> rows;
   for (std::size_t i = 0; i < array.size();) {
-    Row row{{std::to_string(i) + ":", true}};
+    Row& row = rows.emplace_back(1, Cell{std::to_string(i) + ":", true});
     for (std::size_t end = std::min(array.size(), i + 8); i < end; ++i) {
       row.push_back(cellOf(array[i]));
     }
-    grid.add(std::move(row));
   }
-  grid.appendTo(out);
+  out += tableOf(std::move(rows)).text();
 }
 
 void appendArray(std::string& out, const Array& array, std::size_t width) {
   if (array.empty()) return;
   if (holdsOnly<Dictionary>(array)) return appendRecords(out, array, width);
   if (holdsOnly<Number>(array)) return appendNumbers(out, array);
-  Grid grid;
+  std::vector<Row> rows;
   for (const Value& value : array) {
-    Row row;
+    Row& row = rows.emplace_back();
     if (const Array* cells = value.as<Array>()) {
       for (const Value& cell : *cells) row.push_back(cellOf(cell));
     } else {
       row.push_back(cellOf(value));
     }
-    grid.add(std::move(row));
   }
-  grid.appendTo(out);
+  out += tableOf(std::move(rows)).text();
 }
 
 struct Nested {
@@ -174,37 +144,36 @@ struct Nested {
 };
 
 // A column for each dictionary; a lone one has no title.
-Grid sideBySide(std::span<const Nested> columns) {
+tools::Table sideBySide(std::span<const Nested> columns) {
   std::vector<const Dictionary*> dictionaries;
   Row titles(1);
   for (const auto& [title, dictionary] : columns) {
     dictionaries.push_back(dictionary);
     titles.push_back({title, true});
   }
-  Grid grid;
-  if (columns.size() > 1) grid.add(std::move(titles));
+  std::vector<Row> rows;
+  if (columns.size() > 1) rows.push_back(std::move(titles));
   for (const auto key : keysOf(dictionaries)) {
-    Row row{{printable(key)}};
+    Row& row = rows.emplace_back(1, Cell{std::string(key)});
     for (const Dictionary* dictionary : dictionaries) row.push_back(cellOf(*dictionary, key));
-    grid.add(std::move(row));
   }
-  return grid;
+  return tableOf(std::move(rows));
 }
 
 // As many as `width` allows side by side, then the next ones.
 void appendNested(std::string& out, std::span<const Nested> rest, std::size_t width) {
   while (!rest.empty()) {
     std::size_t count = 1;
-    Grid grid = sideBySide(rest.first(1));
+    tools::Table table = sideBySide(rest.first(1));
     while (count < rest.size()) {
-      Grid wider = sideBySide(rest.first(count + 1));
+      tools::Table wider = sideBySide(rest.first(count + 1));
       if (wider.width() > width) break;
-      grid = std::move(wider);
+      table = std::move(wider);
       ++count;
     }
     if (!out.empty()) out += '\n';
     if (count == 1) out += rest.front().title + ":\n";
-    grid.appendTo(out);
+    out += table.text();
     rest = rest.subspan(count);
   }
 }
@@ -220,7 +189,7 @@ bool isFlat(const Dictionary& dictionary) {
 // `title` names what the dictionary is a part of, for the titles of its own parts.
 void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_t width,
                       const std::string& title = {}) {
-  Grid scalars;
+  std::vector<Row> scalars;
   std::vector<Nested> nested, deeper;
   std::vector<std::pair<std::string, const Array*>> arrays;
   for (const auto& [key, value] : dictionary) {
@@ -229,10 +198,10 @@ void appendDictionary(std::string& out, const Dictionary& dictionary, std::size_
     } else if (const auto* array = value.as<Array>(); array != nullptr && !array->empty()) {
       arrays.emplace_back(printable(key), array);
     } else {
-      scalars.add({{printable(key)}, cellOf(value)});
+      scalars.push_back({{key}, cellOf(value)});
     }
   }
-  scalars.appendTo(out);
+  out += tableOf(std::move(scalars)).text();
   appendNested(out, nested, width);
   for (const auto& [key, array] : arrays) {
     if (!out.empty()) out += '\n';
@@ -255,7 +224,7 @@ std::string tableText(const Value& value, std::size_t width) {
   } else if (const auto* array = value.as<Array>()) {
     appendArray(out, *array, width);
   } else {
-    out = cellOf(value).text + '\n';
+    out = printable(cellOf(value).text) + '\n';
   }
   return out;
 }
