@@ -57,7 +57,11 @@ constexpr struct {
        }
        day.platform.counters.PLClientSetValuesForScalarKeys(values);
      }},
-    {"data usage", [](const Day& day) { morvend::CollectDataUsage(day.platform); }},
+    {"data usage",
+     [](const Day& day) {
+       morvend::CollectDataUsage(day.platform.networkUsage, day.platform.counters,
+                                 day.platform.preferences, day.platform.log);
+     }},
     {"structured-log dump",
      [](const Day& day) { day.platform.faultwatch.dumpAllOldStructuredDataLogs(); }},
     {"tasking", [](const Day& day) { morvend::UpdateTaskingState(day.platform); }},

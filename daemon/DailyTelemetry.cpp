@@ -25,42 +25,43 @@ constexpr std::uint64_t kReportedCategory = 0x100;
 
 std::int64_t mebibytes(std::optional<std::int64_t> bytes) { return bytes ? *bytes >> 20 : -1; }
 
-void CollectDiskUsage(const Services& services) {
-  const auto usage =
-      services.deviceProperties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
-  services.counters.PLClientSetValuesForScalarKeys(std::array{
+void CollectDiskUsage(platform::DeviceProperties& properties, platform::CountersService& counters) {
+  const auto usage = properties.diskUsage().value_or(platform::DeviceProperties::DiskUsage());
+  counters.PLClientSetValuesForScalarKeys(std::array{
       ScalarValue{"com.norba.tarvenn.DiskUsageUserTotalBlocks", mebibytes(usage.totalDiskCapacity)},
       ScalarValue{"com.norba.tarvenn.DiskUsageUserBlocksFree",
                   mebibytes(usage.totalDataAvailable)}});
 }
 
-void CollectStorageHealth(const Services& services) {
-  auto info = NANDInfo::CopyNANDInfoWithOptions(services.storage);
+void CollectStorageHealth(const NANDInfo::Services& storage, platform::CountersService& counters,
+                          platform::SystemLog& log) {
+  auto info = NANDInfo::CopyNANDInfoWithOptions(storage);
   if (!info) {
-    services.log.log(LogLevel::standard, "failed to get NAND info dict");
+    log.log(LogLevel::standard, "failed to get NAND info dict");
     return;
   }
-  for (const auto& [key, value] : NANDInfo::CopyVMFreezerNANDInfo(services.storage)) info->set(key, value);
+  for (const auto& [key, value] : NANDInfo::CopyVMFreezerNANDInfo(storage)) info->set(key, value);
   if (const auto* error = info->find(NANDInfo::kNANDInfoErrorKey)) {
-    services.log.log(LogLevel::standard, "error reading nand info, error %s with message %s",
-                     description(*error).c_str(),
-                     description(info->find(NANDInfo::kNANDInfoErrorMessageKey)).c_str());
+    log.log(LogLevel::standard, "error reading nand info, error %s with message %s",
+            description(*error).c_str(),
+            description(info->find(NANDInfo::kNANDInfoErrorMessageKey)).c_str());
     return;
   }
   std::vector<ScalarValue> values;
   for (const auto& [key, value] : *info) {
     if (const auto* number = value.as<Number>()) values.push_back({key, number->int64Value()});
   }
-  services.counters.PLClientSetValuesForScalarKeys(values);
+  counters.PLClientSetValuesForScalarKeys(values);
 }
 
-void CollectReportChannels(const Services& services) {
-  auto channels = services.reportingChannels.copyChannels(kReportedCategory);
+void CollectReportChannels(platform::ReportingChannels& facility,
+                           platform::CountersService& counters) {
+  auto channels = facility.copyChannels(kReportedCategory);
   if (channels.empty()) return;
   std::erase_if(channels, [](const ReportChannel& channel) {
     return channel.format != platform::kSimpleChannelFormat;
   });
-  const auto subscription = services.reportingChannels.subscribe(channels);
+  const auto subscription = facility.subscribe(channels);
   const auto samples = subscription ? subscription->createSamples() : std::nullopt;
   if (!samples) return;
   std::vector<std::string> keys;
@@ -71,7 +72,7 @@ void CollectReportChannels(const Services& services) {
     keys.push_back("com.norba.velquist." + channel.name);
     values.push_back({keys.back(), value});
   }
-  services.counters.PLClientSetValuesForScalarKeys(values);
+  counters.PLClientSetValuesForScalarKeys(values);
 }
 
 struct Collector {
@@ -80,13 +81,29 @@ struct Collector {
 };
 
 constexpr Collector kCollectors[] = {
-    {"disk usage", CollectDiskUsage},
+    {"disk usage",
+     [](const Services& services) {
+       CollectDiskUsage(services.deviceProperties, services.counters);
+     }},
     {"storage log",
      [](const Services& services) { NANDInfo::DumpStorageStructuredLog(services.storage, false); }},
-    {"storage health", CollectStorageHealth},
-    {"memory errors", CollectEccEvents},
-    {"data usage", [](const Services& services) { CollectDataUsage(services); }},
-    {"report channels", CollectReportChannels},
+    {"storage health",
+     [](const Services& services) {
+       CollectStorageHealth(services.storage, services.counters, services.log);
+     }},
+    {"memory errors",
+     [](const Services& services) {
+       CollectEccEvents(services.kernel, services.faultwatch, services.log);
+     }},
+    {"data usage",
+     [](const Services& services) {
+       CollectDataUsage(services.networkUsage, services.counters, services.preferences,
+                        services.log);
+     }},
+    {"report channels",
+     [](const Services& services) {
+       CollectReportChannels(services.reportingChannels, services.counters);
+     }},
 };
 
 }  // namespace

@@ -3,7 +3,10 @@
 
 #include <chrono>
 
-#include "daemon/Services.h"
+#include "platform/CountersService.h"
+#include "platform/NetworkUsage.h"
+#include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
 
 namespace morvend {
 
@@ -12,8 +15,9 @@ inline constexpr std::chrono::seconds kUsageServicePatience(10);
 // Asks the usage service and waits for its reply to be dealt with, for at most `patience`. The
 // reply adds to today's counters and replaces the baseline: "netUsageBaseline" in the domain
 // "com.norba.quenset.morvend". A late one does so too, on the service's thread, while the process
-// lives; it holds its own references to the platform's services.
-void CollectDataUsage(const Services& services,
+// lives; counters and preferences are all that it uses, and must live as long as the service.
+void CollectDataUsage(platform::NetworkUsage& networkUsage, platform::CountersService& counters,
+                      platform::PreferenceStore& preferences, platform::SystemLog& log,
                       std::chrono::nanoseconds patience = kUsageServicePatience);
 
 }  // namespace morvend

@@ -5,9 +5,6 @@
 #include <cerrno>
 
 #include "base/ByteReader.h"
-#include "platform/FaultwatchSupport.h"
-#include "platform/Kernel.h"
-#include "platform/SystemLog.h"
 
 namespace morvend {
 
@@ -37,21 +34,22 @@ Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> record) 
   return data;
 }
 
-void CollectEccEvents(const Services& services) {
+void CollectEccEvents(platform::Kernel& kernel, platform::FaultwatchSupport& faultwatch,
+                      platform::SystemLog& log) {
   std::array<std::byte, kEccEventRecordSize> record{};
   // Each read is offered the length that the one before returned, in the same buffer.
   std::size_t length = record.size();
   for (int events = 0; events < kMostEventsPerRun; ++events) {
-    const auto read = services.kernel.sysctlbyname(kNextEvent, std::span(record).first(length));
+    const auto read = kernel.sysctlbyname(kNextEvent, std::span(record).first(length));
     if (read.error != 0) {
       if (read.error != ENOENT && read.error != EBUSY) {
-        services.log.log(platform::LogLevel::standard,
-                         "Unexpected errno (%d) reading ECC events from kernel", read.error);
+        log.log(platform::LogLevel::standard,
+                "Unexpected errno (%d) reading ECC events from kernel", read.error);
       }
       return;
     }
     length = std::min(length, read.length);
-    services.faultwatch.logStructuredData(kStructuredDataType, eccEventData(record));
+    faultwatch.logStructuredData(kStructuredDataType, eccEventData(record));
   }
 }
 

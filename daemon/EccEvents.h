@@ -4,7 +4,9 @@
 #include <cstddef>
 #include <span>
 
-#include "daemon/Services.h"
+#include "platform/FaultwatchSupport.h"
+#include "platform/Kernel.h"
+#include "platform/SystemLog.h"
 #include "plist/Value.h"
 
 namespace morvend {
@@ -17,6 +19,7 @@ plist::Dictionary eccEventData(std::span<const std::byte, kEccEventRecordSize> r
 
 // Logs the pending events, at most ten, as structured data of type 172. The rest stays for later
 // runs.
-void CollectEccEvents(const Services& services);
+void CollectEccEvents(platform::Kernel& kernel, platform::FaultwatchSupport& faultwatch,
+                      platform::SystemLog& log);
 
 }  // namespace morvend

@@ -44,23 +44,24 @@ std::optional<std::string> operatingSystemBuild(platform::SystemVersion& systemV
   return build != nullptr ? std::optional(*build) : std::nullopt;
 }
 
-void recordOSChange(const Services& services, const std::optional<std::string>& build) {
-  const std::int32_t today = services.counters.PLDaysSince1970();
-  const auto last = record(services.preferences, "LastOSUpdate");
+void recordOSChange(platform::CountersService& counters, platform::PreferenceStore& preferences,
+                    platform::SystemLog& log, const std::optional<std::string>& build) {
+  const std::int32_t today = counters.PLDaysSince1970();
+  const auto last = record(preferences, "LastOSUpdate");
   const auto* lastUpdate = contentOf<Dictionary>(last);
   const Value* lastVersion = lastUpdate != nullptr ? lastUpdate->find("version") : nullptr;
   if (!build || (lastVersion != nullptr && *lastVersion == Value(*build))) return;
-  services.log.log(LogLevel::standard, "OS change since last run (%s -> %s)",
-                   description(lastVersion).c_str(), build->c_str());
+  log.log(LogLevel::standard, "OS change since last run (%s -> %s)",
+          description(lastVersion).c_str(), build->c_str());
   const Value update(Dictionary{{"version", *build}, {"day", today}});
-  setRecord(services.preferences, "LastOSUpdate", &update);
+  setRecord(preferences, "LastOSUpdate", &update);
 }
 
 // The domains that one tasking step touched, in the order in which it did.
 class DomainSet {
  public:
   void add(const std::string& domain) {
-    if (std::find(domains_.begin(), domains_.end(), domain) == domains_.end()) {
+    if (std::ranges::find(domains_, domain) == domains_.end()) {
       domains_.push_back(domain);
     }
   }
@@ -148,10 +149,11 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
   services.notifications.postNotification("com.norba.da.tasking_changed");
 }
 
-void reportDisabledLogs(const Services& services) {
-  const auto blocklist = services.analyticsConfiguration.logBlocklist();
+void reportDisabledLogs(platform::AnalyticsConfiguration& configuration,
+                        platform::PreferenceStore& preferences, platform::Eventra& eventra) {
+  const auto blocklist = configuration.logBlocklist();
   std::set<std::string> bugTypes(blocklist.begin(), blocklist.end());
-  const auto disabled = services.preferences.QNSPreferencesGetValue("disabledLogs", "com.norba.da");
+  const auto disabled = preferences.QNSPreferencesGetValue("disabledLogs", "com.norba.da");
   if (const auto* array = contentOf<Array>(disabled)) {
     bugTypes.clear();
     for (const Value& element : *array) {
@@ -159,7 +161,7 @@ void reportDisabledLogs(const Services& services) {
     }
   }
   for (const std::string& bugType : bugTypes) {
-    services.eventra.EventraSendEventLazy("com.norba.quenset.disabledLogs", [bugType] {
+    eventra.EventraSendEventLazy("com.norba.quenset.disabledLogs", [bugType] {
       return Dictionary{{"bugType", bugType}};
     });
   }
@@ -169,9 +171,9 @@ void reportDisabledLogs(const Services& services) {
 
 void UpdateTaskingState(const Services& services) {
   const auto build = operatingSystemBuild(services.systemVersion);
-  recordOSChange(services, build);
+  recordOSChange(services.counters, services.preferences, services.log, build);
   applyScheduledTasking(services, build);
-  reportDisabledLogs(services);
+  reportDisabledLogs(services.analyticsConfiguration, services.preferences, services.eventra);
 }
 
 }  // namespace morvend

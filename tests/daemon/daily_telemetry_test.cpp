@@ -43,7 +43,7 @@ struct DailyTelemetryTest : ::testing::Test {
   }
   Lines structuredLogs() {
     platform.journal.clear();
-    CollectEccEvents(platform.platform);
+    CollectEccEvents(platform.kernel, platform.housekeeping, platform.log);
     return platform.journal;
   }
 

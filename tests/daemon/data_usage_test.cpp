@@ -7,6 +7,7 @@
 
 #include "daemon/DataUsageChanges.h"
 #include "host/Host.h"
+#include "platform/AllServices.h"
 #include "platform/PLHistory.h"
 #include "plist/PropertyList.h"
 #include "support/TemporaryFolder.h"
@@ -14,6 +15,11 @@
 
 namespace morvend {
 namespace {
+
+void collect(const platform::AllServices& all,
+             std::chrono::nanoseconds patience = kUsageServicePatience) {
+  CollectDataUsage(all.networkUsage, all.counters, all.preferences, all.log, patience);
+}
 
 using plist::Array;
 using plist::Date;
@@ -140,7 +146,7 @@ TEST(DataUsageStep, ReplacesTheBaselineWhateverTheReply) {
     device.counters.today = 20000;
     device.preferences.setMobile(kDomain, kBaseline, row.stored);
     device.networkUsage.records = row.reply;
-    CollectDataUsage(device.platform);
+    collect(device.platform);
     EXPECT_EQ(device.counters.records, row.records);
     EXPECT_EQ(device.preferences.mobile(kDomain, kBaseline), Value(row.baseline));
     ASSERT_EQ(device.journal.size(), 2u);
@@ -153,7 +159,7 @@ TEST(DataUsageStep, GoesOnWithoutAReplyAndDealsWithALateOne) {
   support::TestPlatform device;
   device.counters.today = 20000;
   device.networkUsage.repliesAtOnce = false;
-  CollectDataUsage(device.platform, std::chrono::nanoseconds(1));
+  collect(device.platform, std::chrono::nanoseconds(1));
   EXPECT_EQ(device.log.lines(), Lines{"default: Vexmor timed out, no datausage available"});
   EXPECT_TRUE(device.journal.empty());
   const Array records{bundle(kToday, {4096})};
@@ -198,7 +204,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
   {
     host::Host host({.root = folder.path()});
     const platform::AllServices& platform = host.services();
-    CollectDataUsage(platform, std::chrono::nanoseconds(0));
+    collect(platform, std::chrono::nanoseconds(0));
     for (int i = 0; i < kOthers; ++i) {
       platform.counters.PLClientAddValueForScalarKey("other", 1);
       const Value value(i);
@@ -207,7 +213,7 @@ TEST_F(DataUsageThreads, AReplyRunsBesideTheRestOfTheDay) {
       if (i % 20 == 0) platform.counters.PLClientCheckpoint();
     }
     // Replies come in the order of the queries, so that this one's end is the end of both.
-    CollectDataUsage(platform);
+    collect(platform);
     const auto baseline = platform.preferences.QNSPreferencesGetValue(kBaseline, kDomain);
     EXPECT_EQ(baseline->as<Dictionary>()->size(), static_cast<std::size_t>(kProcesses));
   }
@@ -220,7 +226,7 @@ TEST_F(DataUsageThreads, TheStepWaitsForAllThatAReplyDoes) {
   EXPECT_EQ(kUsageServicePatience, std::chrono::seconds(10));
   answer(processes(2000), 0);
   host::Host host({.root = folder.path()});
-  CollectDataUsage(host.services());
+  collect(host.services());
   const std::string file = folder.read("var/preferences/mobile/" + std::string(kDomain) + ".plist");
   EXPECT_NE(file.find("<key>1999</key>"), file.npos);
 }
@@ -231,8 +237,8 @@ TEST_F(DataUsageThreads, AReplyIsWholeOrNotAtAll) {
     answer(processes(2), comes ? 0 : std::numeric_limits<double>::infinity());
     for (int i = 0; i < 20; ++i) {
       host::Host host({.root = folder.path()});
-      CollectDataUsage(host.services(), comes && i == 19 ? kUsageServicePatience
-                                                         : std::chrono::microseconds(20 * i));
+      collect(host.services(),
+              comes && i == 19 ? kUsageServicePatience : std::chrono::microseconds(20 * i));
     }
     EXPECT_EQ(recorded(), comes ? 8 : 0);
   }
