@@ -22,9 +22,7 @@ constexpr std::int32_t kDeliverAppInfo = 2;
 
 std::int64_t integer(const Dictionary& message, const char* key) {
   const Number* number = message.number(key);
-  const bool isInteger =
-      number != nullptr && !number->isReal() && number->type() != Number::Type::boolean;
-  return isInteger ? number->int64Value() : 0;
+  return number != nullptr && !number->isReal() ? number->int64Value() : 0;
 }
 
 std::int32_t lowBits(std::int64_t value) {

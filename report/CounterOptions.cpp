@@ -18,14 +18,9 @@ Intervals::Intervals(std::vector<Number> bounds) : bounds_(std::move(bounds)), a
 
 namespace {
 
-const Number* asNumber(const Value& value) {
-  const auto* number = value.as<Number>();
-  return number != nullptr && number->type() != Number::Type::boolean ? number : nullptr;
-}
-
 bool readUnsigned(const Value* value, std::optional<std::uint64_t>& option) {
   if (value == nullptr) return true;
-  const Number* number = asNumber(*value);
+  const Number* number = value->as<Number>();
   if (number == nullptr) return false;
   if (number->type() != Number::Type::uint64 && !(number->doubleValue() >= 0)) return false;
   option = number->uint64Value();
@@ -39,7 +34,7 @@ bool readIntervals(const Value* value, std::optional<Intervals>& option) {
   std::vector<Number> bounds;
   bounds.reserve(array->size());
   for (const Value& element : *array) {
-    const Number* number = asNumber(element);
+    const Number* number = element.as<Number>();
     if (number == nullptr) return false;
     bounds.push_back(*number);
   }

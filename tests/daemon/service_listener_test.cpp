@@ -85,6 +85,7 @@ TEST_F(ServiceTest, ActsOnMessagesAsTheHandshakeSays) {
       {{Dictionary{}, delivery}, {kWaiting, kRequested, kSequence}, 1},
       {{Dictionary{{"operation", "2"}}, delivery}, {kWaiting, kRequested, kSequence}, 1},
       {{Dictionary{{"operation", 1}, {"value", 2.0}}}, {"daily tasks for day 0"}, 0},
+      {{Dictionary{{"operation", true}, {"value", 7}}}, {"daily tasks for day 7"}, 0},
       // Only the low 32 bits count.
       {{Dictionary{{"operation", ~std::uint64_t{0} - 0xfffffffe}}}, {"daily tasks for day 0"}, 0},
       {{run(0x7'0000'0000 - 1)}, {"daily tasks for day -1"}, 0},

@@ -123,7 +123,7 @@ TEST_F(PLConfigTest, SkipsEntriesOfTheWrongTypeAndKeepsTheRest) {
                                       {"not.a.dictionary", 5},
                                       {"text.interval", Dictionary{{"bucket_interval", "10"}}},
                                       {"negative", bucket(-1)},
-                                      {"boolean", Dictionary{{"sig_fig", true}}},
+                                      {"boolean", Dictionary{{"bucket_interval", true}}},
                                       {"intervals", Dictionary{{"intervals", 5}}},
                                       {"bounds", Dictionary{{"intervals", Array{Value(1), "2"}}}},
                                       {"real", Dictionary{{"bucket_interval", 20.0}}},
@@ -133,10 +133,10 @@ TEST_F(PLConfigTest, SkipsEntriesOfTheWrongTypeAndKeepsTheRest) {
   ASSERT_NE(config, nullptr);
   EXPECT_EQ(interval(config->configOptionsForScalarKey("good")), 5);
   EXPECT_EQ(interval(config->configOptionsForScalarKey("real")), 20);
+  EXPECT_EQ(interval(config->configOptionsForScalarKey("boolean")), 1);
   EXPECT_EQ(interval(config->configOptionsForScalarKey("empty")), 0);
   EXPECT_EQ(config->configOptionsForScalarKey("large")->bucketInterval, ~std::uint64_t{0});
-  for (const char* key :
-       {"not.a.dictionary", "text.interval", "negative", "boolean", "intervals", "bounds"}) {
+  for (const char* key : {"not.a.dictionary", "text.interval", "negative", "intervals", "bounds"}) {
     EXPECT_EQ(config->configOptionsForScalarKey(key), nullptr) << key;
     EXPECT_EQ(platform.log.count(std::string("error: Whitelist: skipping Group/ScalarKeys/") + key),
               1);

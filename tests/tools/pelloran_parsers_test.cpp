@@ -51,7 +51,7 @@ TEST(PelloranImportLine, AnythingElseIsRefusedWithAReason) {
        {"", R"(, "value": 1} x)", R"(, "value": 1, "push": "k")", R"(, "set": "k", "value": 1)",
         R"(, "value": 1, "value": 2)", R"(, "value": 1, "more": 2)"}},
       {R"({"set": "k", "value": )",
-       {R"({"value": 1})", "true", R"("1")", "1.5", "9223372036854775808", "-1e19"}},
+       {R"({"value": 1})", "null", R"("1")", "1.5", "9223372036854775808", "-1e19"}},
       {R"({"push": "k", "value": )", {"1e999", "NaN"}},
       {R"({"value": 1, "push": )",
        {"5", R"("")", R"("\u0000")", R"("\ud800")", "\"\xff\"", '"' + longest + '"'}},

@@ -32,7 +32,7 @@ class Fields : public nlohmann::json_sax<nlohmann::json> {
   bool start_array(std::size_t) override { return wrongType(); }
   bool end_array() override { return true; }
   bool null() override { return wrongType(); }
-  bool boolean(bool) override { return wrongType(); }
+  bool boolean(bool b) override { return take(std::int64_t{b}); }
   bool binary(binary_t&) override { return wrongType(); }
   bool number_integer(number_integer_t number) override { return take(number); }
   bool number_unsigned(number_unsigned_t number) override {
