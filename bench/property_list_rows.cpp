@@ -142,7 +142,7 @@ void addPropertyListRows(Table& table) {
   const Report report = sampleReport();
   const Value value = valueOf(report);
   const std::string document = appended(report);
-  if (plist::writeXML(value).value != document) {
+  if (*plist::writeXML(value) != document) {
     std::fprintf(stderr, "the yardstick writes another property list\n");
     std::abort();
   }

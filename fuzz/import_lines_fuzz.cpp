@@ -10,7 +10,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   const std::string_view line(reinterpret_cast<const char*>(bytes), size);
   const auto parsed = pelloran::parseImportLine(line, {20000, 3600});
   if (!parsed) {
-    if (parsed.error.empty()) std::abort();
+    if (parsed.error().text.empty()) std::abort();
     return 0;
   }
   if (!pelloran::keyProblem(parsed->key).empty()) std::abort();

@@ -32,11 +32,11 @@ class Reader {
     std::optional<Value> value;
     if (readTrailer()) value = object(top_, 0);
     if (!value) {
-      return base::Result<Value>::failure(
-          base::format("binary property list, offset %llu: %s",
-                       static_cast<unsigned long long>(errorOffset_), error_.c_str()));
+      return base::Error{base::format("binary property list, offset %llu: %s",
+                                      static_cast<unsigned long long>(errorOffset_),
+                                      error_.c_str())};
     }
-    return base::Result<Value>::success(std::move(*value));
+    return std::move(*value);
   }
 
  private:

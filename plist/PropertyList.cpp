@@ -7,10 +7,10 @@
 namespace plist {
 
 base::Result<Value> read(std::string_view bytes) {
-  if (bytes.empty()) return base::Result<Value>::failure("the property list is empty");
+  if (bytes.empty()) return base::Error{"the property list is empty"};
   if (bytes.size() > kMaxSize) {
-    return base::Result<Value>::failure(
-        base::format("the property list has %zu bytes, more than %zu", bytes.size(), kMaxSize));
+    return base::Error{
+        base::format("the property list has %zu bytes, more than %zu", bytes.size(), kMaxSize)};
   }
   return bytes.starts_with("bplist") ? readBinary(bytes) : readXML(bytes);
 }

@@ -123,14 +123,14 @@ class Reader {
   }
 
   base::Result<Value> read(std::string_view bytes) {
-    if (parser_ == nullptr) return base::Result<Value>::failure("XML property list: out of memory");
+    if (parser_ == nullptr) return base::Error{"XML property list: out of memory"};
     const XML_Status status =
         XML_Parse(parser_.get(), bytes.data(), static_cast<int>(bytes.size()), XML_TRUE);
     if (status != XML_STATUS_OK && error_.empty()) {
       fail(XML_ErrorString(XML_GetErrorCode(parser_.get())));
     }
-    if (!error_.empty()) return base::Result<Value>::failure(std::move(error_));
-    return base::Result<Value>::success(std::move(*root_));
+    if (!error_.empty()) return base::Error{std::move(error_)};
+    return std::move(*root_);
   }
 
  private:

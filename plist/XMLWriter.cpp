@@ -162,11 +162,11 @@ base::Result<std::string> writeXML(const Value& value) {
       "<plist version=\"1.0\">\n";
   writer.write(value, 0);
   if (writer.tooDeep) {
-    return base::Result<std::string>::failure(
-        base::format("the value is nested deeper than %d arrays and dictionaries", kMaxDepth));
+    return base::Error{
+        base::format("the value is nested deeper than %d arrays and dictionaries", kMaxDepth)};
   }
   writer.out += "</plist>\n";
-  return base::Result<std::string>::success(std::move(writer.out));
+  return std::move(writer.out);
 }
 
 }  // namespace plist

@@ -97,7 +97,7 @@ std::unique_ptr<PLConfig> PLConfig::init(const Services& services,
   const Dictionary* groups = parsed ? parsed->as<Dictionary>() : nullptr;
   if (groups == nullptr) {
     services.log.log(LogLevel::error, "Couldn't parse the contents of the config file. Error: %s",
-                     parsed ? "the top level is not a dictionary" : parsed.error.c_str());
+                     parsed ? "the top level is not a dictionary" : parsed.error().text.c_str());
     return nullptr;
   }
   Loader{services, *config}.load(*groups);

@@ -82,7 +82,8 @@ void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appIn
                              config_ != nullptr ? config_->configFileDigest() : std::string());
   const auto log = plist::writeXML(buildLog(std::move(header), std::move(sections), appInfo));
   if (!log) {
-    services_.log.log(LogLevel::error, "Could not create pellorand plist: %s", log.error.c_str());
+    services_.log.log(LogLevel::error, "Could not create pellorand plist: %s",
+                      log.error().text.c_str());
     return;
   }
   submitLog(services_, *log);

@@ -24,13 +24,11 @@ std::optional<plist::Value> DeviceFile::load() const {
     return std::nullopt;
   }
   // One byte more, for the codec to see that the file is too long.
-  const base::Result<std::string> bytes = readRegularFile(file.get(), plist::kMaxSize + 1);
-  base::Result<plist::Value> content =
-      bytes ? plist::read(*bytes) : base::Result<plist::Value>::failure(bytes.error);
+  auto content = readRegularFile(file.get(), plist::kMaxSize + 1).and_then(plist::read);
   if (!content)
     log_.log(platform::LogLevel::error, "%s: %s", root_.hostPath(path_).c_str(),
-             content.error.c_str());
-  return std::move(content.value);
+             content.error().text.c_str());
+  return std::move(content).orNone();
 }
 
 }  // namespace host

@@ -42,7 +42,7 @@ std::optional<platform::FileSystem::Statistics> DeviceFileSystem::statfs(std::st
 }
 
 std::optional<std::string> DeviceFileSystem::readFile(std::string_view path, std::size_t maximum) {
-  return root_.readFile(path, maximum).value;
+  return root_.readFile(path, maximum).orNone();
 }
 
 }  // namespace host

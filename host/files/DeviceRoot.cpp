@@ -76,7 +76,7 @@ FileDescriptor DeviceRoot::openForStatus(std::string_view path) const {
 
 base::Result<std::string> DeviceRoot::readFile(std::string_view path, std::size_t maximum) const {
   const FileDescriptor file = openForReading(path);
-  if (!file) return base::Result<std::string>::failure(std::strerror(errno));
+  if (!file) return base::Error{std::strerror(errno)};
   return readRegularFile(file.get(), maximum);
 }
 

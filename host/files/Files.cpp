@@ -51,20 +51,20 @@ const char* errorText(int error) {
 
 base::Result<std::string> readRegularFile(int file, std::size_t maximum) {
   struct stat status;
-  if (::fstat(file, &status) != 0) return base::Result<std::string>::failure(std::strerror(errno));
-  if (!S_ISREG(status.st_mode)) return base::Result<std::string>::failure(errorText(EINVAL));
+  if (::fstat(file, &status) != 0) return base::Error{std::strerror(errno)};
+  if (!S_ISREG(status.st_mode)) return base::Error{errorText(EINVAL)};
   std::string bytes;
   bytes.resize(std::min(maximum, static_cast<std::size_t>(status.st_size)));
   std::size_t filled = 0;
   while (filled < bytes.size()) {
     const ssize_t got = ::read(file, bytes.data() + filled, bytes.size() - filled);
     if (got < 0 && errno == EINTR) continue;
-    if (got < 0) return base::Result<std::string>::failure(std::strerror(errno));
+    if (got < 0) return base::Error{std::strerror(errno)};
     if (got == 0) break;
     filled += static_cast<std::size_t>(got);
   }
   bytes.resize(filled);
-  return base::Result<std::string>::success(std::move(bytes));
+  return bytes;
 }
 
 int namesInFolder(int folder, std::vector<std::string>& names) {

@@ -29,13 +29,12 @@ const EventSink::Configuration& EventSink::configuration() {
   std::call_once(configured_, [this] {
     const FileDescriptor file = root_.openForReading(kConfiguration);
     if (!file && errno == ENOENT) return;
-    const auto bytes = file ? readRegularFile(file.get(), plist::kMaxSize + 1)
-                            : base::Result<std::string>::failure(errorText(errno));
-    const auto value =
-        bytes ? plist::read(*bytes) : base::Result<plist::Value>::failure(bytes.error);
+    auto bytes =
+        file ? readRegularFile(file.get(), plist::kMaxSize + 1) : base::Error{errorText(errno)};
+    const auto value = std::move(bytes).and_then(plist::read);
     if (!value) {
       log_.log(platform::LogLevel::error, "Could not read %s: %s",
-               root_.hostPath(kConfiguration).c_str(), value.error.c_str());
+               root_.hostPath(kConfiguration).c_str(), value.error().text.c_str());
       return;
     }
     const auto* entries = value->as<plist::Dictionary>();

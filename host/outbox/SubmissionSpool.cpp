@@ -98,7 +98,7 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
   std::optional<std::string> optionsText;
   if (options != nullptr) {
     auto text = plist::writeXML(*options);
-    if (!text) return fail(text.error.c_str());
+    if (!text) return fail(text.error().text.c_str());
     optionsText = std::move(*text);
   }
   SpoolFolder spool(root_, log_);

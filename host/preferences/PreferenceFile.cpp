@@ -90,9 +90,9 @@ void PreferenceFile::load(bool evenIfUnchanged) {
     return fail(State::broken, "larger than 16 MiB");
   }
   const auto bytes = readRegularFile(file.get(), plist::kMaxSize);
-  if (!bytes) return fail(State::unreadable, bytes.error);
+  if (!bytes) return fail(State::unreadable, bytes.error().text);
   auto value = plist::read(*bytes);
-  if (!value) return fail(State::broken, value.error);
+  if (!value) return fail(State::broken, value.error().text);
   auto* dictionary = value->as<plist::Dictionary>();
   if (dictionary == nullptr) return fail(State::broken, "the top level is not a dictionary");
   state_ = State::whole;
@@ -141,7 +141,7 @@ std::string PreferenceFile::merge(const Edit& edit) {
   // Compared as they are written: values of two types may be equal.
   const auto before = plist::writeXML(stored_);
   const auto after = plist::writeXML(std::move(merged));
-  if (!after) return after.error;
+  if (!after) return after.error().text;
   if (before && *before == *after) return {};
   if (after->size() > plist::kMaxSize) return "it would be larger than 16 MiB";
 

@@ -126,10 +126,10 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
   for (const std::string& name : names) {
     if (name == kRejected) continue;
     const FileDescriptor file = root_.openForReading(kEventsFolder + ("/" + name));
-    const auto bytes = file ? readRegularFile(file.get(), kEventSize + 1)
-                            : base::Result<std::string>::failure(errorText(errno));
+    const auto bytes =
+        file ? readRegularFile(file.get(), kEventSize + 1) : base::Error{errorText(errno)};
     if (!bytes) {
-      say(name, bytes.error);
+      say(name, bytes.error().text);
       continue;
     }
     if (bytes->size() > kEventSize) {

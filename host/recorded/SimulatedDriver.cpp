@@ -117,7 +117,7 @@ std::optional<std::size_t> DriverFiles::read(const std::string& name, std::span<
   if (!isBelowDevice(name)) return std::nullopt;
   const auto bytes = root_.readFile("device/" + name, output.size());
   if (bytes) return deliver(bytes->data(), bytes->size(), output).outputSize;
-  say(name, bytes.error.c_str());
+  say(name, bytes.error().text.c_str());
   return std::nullopt;
 }
 

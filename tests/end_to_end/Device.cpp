@@ -141,7 +141,7 @@ void Device::writePropertyList(const std::string& path, const Value& value) cons
 }
 
 std::optional<Value> Device::readPropertyList(const std::string& path) const {
-  return plist::read(root_->read(path)).value;
+  return plist::read(root_->read(path)).orNone();
 }
 
 std::optional<Value> Device::record(const std::string& key) const {

@@ -58,7 +58,7 @@ TEST(PropertyListXML, ReadsEveryForm) {
                plist::Dictionary{{"a", "later"}, {"", plist::Array{}}}},
        }) {
     const base::Result<plist::Value> result = read(document(row.content));
-    ASSERT_TRUE(result) << row.content << ": " << result.error;
+    ASSERT_TRUE(result) << row.content << ": " << result.error().text;
     EXPECT_TRUE(*result == row.value) << row.content << ": " << plist::description(*result);
     EXPECT_EQ(result->variant().index(), row.value.variant().index()) << row.content;
   }
@@ -103,9 +103,10 @@ TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
   for (const std::string& bad : all) {
     const base::Result<plist::Value> result = read(document(std::string("<!-- -->\n") + bad));
     EXPECT_FALSE(result) << bad;
-    EXPECT_TRUE(result.error.starts_with("XML property list, line ")) << bad << result.error;
+    EXPECT_TRUE(result.error().text.starts_with("XML property list, line "))
+        << bad << result.error().text;
   }
-  EXPECT_EQ(read("<plist>\n <string>a</string>\n <sting/></plist>").error,
+  EXPECT_EQ(read("<plist>\n <string>a</string>\n <sting/></plist>").error().text,
             "XML property list, line 3, column 2: the element is no property-list value");
   for (const char* whole : {"<dict/>", "<html><true/></html>", "plist", "<plist><true/></plist>x",
                             "<?xml version=\"1.0\" encoding=\"klingon\"?><plist><true/></plist>"}) {
@@ -232,15 +233,15 @@ TEST(PropertyListXML, AwkwardValuesComeBackEqual) {
        plist::Array{plist::Data{}, plist::Data{255}, plist::Data{1, 254}, plist::Data(100, 77)}}};
   const std::string text = *write(value);
   const base::Result<plist::Value> again = read(text);
-  ASSERT_TRUE(again) << again.error << "\n" << text;
+  ASSERT_TRUE(again) << again.error().text << "\n" << text;
   EXPECT_TRUE(*again == value) << text;
   EXPECT_EQ(*write(*again), text);
 }
 
 TEST(PropertyListCodec, RefusesNothingAndTooMuch) {
-  EXPECT_EQ(read("").error, "the property list is empty");
+  EXPECT_EQ(read("").error().text, "the property list is empty");
   const std::string tooMuch(plist::kMaxSize + 1, ' ');
-  EXPECT_EQ(read(tooMuch).error, "the property list has 16777217 bytes, more than 16777216");
+  EXPECT_EQ(read(tooMuch).error().text, "the property list has 16777217 bytes, more than 16777216");
 }
 
 }  // namespace

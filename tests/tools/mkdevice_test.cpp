@@ -109,7 +109,7 @@ TEST(Mkdevice, ItsReportHoldsWhatTheWhitelistNamesAndNothingElse) {
   demo::Device device(folder / "root");
   ASSERT_EQ(device.logs().size(), 3U);
   const auto log = device.readLog(device.logs().back());
-  ASSERT_TRUE(log) << log.error;
+  ASSERT_TRUE(log) << log.error().text;
   const auto& scalars = *log->content.dictionary("PLScalars");
   const auto& distributions = *log->content.dictionary("PLDistributions");
 

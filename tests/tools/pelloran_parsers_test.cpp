@@ -31,7 +31,7 @@ TEST(PelloranImportLine, NumbersKeepTheirValueAndMissingFieldsMeanNow) {
   };
   for (const auto& row : cases) {
     const auto parsed = pelloran::parseImportLine(row.line, kNow);
-    ASSERT_TRUE(parsed) << row.line << ": " << parsed.error;
+    ASSERT_TRUE(parsed) << row.line << ": " << parsed.error().text;
     EXPECT_EQ(parsed->key, "k");
     EXPECT_EQ(parsed->change.kind, row.kind) << row.line;
     EXPECT_EQ(parsed->change.amount, row.amount) << row.line;
@@ -63,7 +63,7 @@ TEST(PelloranImportLine, AnythingElseIsRefusedWithAReason) {
   for (const auto& line : lines) {
     const auto parsed = pelloran::parseImportLine(line, kNow);
     EXPECT_FALSE(parsed) << line.substr(0, 80);
-    EXPECT_FALSE(parsed.error.empty()) << line.substr(0, 80);
+    EXPECT_FALSE(parsed.error().text.empty()) << line.substr(0, 80);
   }
 }
 

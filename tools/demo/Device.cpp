@@ -11,6 +11,7 @@
 
 namespace demo {
 
+using base::Error;
 using base::Result;
 using host::FileDescriptor;
 using plist::Dictionary;
@@ -21,7 +22,7 @@ constexpr std::size_t kLargestFile = std::size_t{64} << 20;
 
 Result<std::string> readHostFile(const std::string& path) {
   const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
-  if (!file) return Result<std::string>::failure(std::strerror(errno));
+  if (!file) return Error{std::strerror(errno)};
   return host::readRegularFile(file.get(), kLargestFile);
 }
 
@@ -42,15 +43,12 @@ std::vector<std::string> Device::logs() {
 }
 
 Result<SubmittedLog> Device::readLog(const std::string& path) {
-  const auto failure = [&](const std::string& why) {
-    return Result<SubmittedLog>::failure(path + ": " + why);
-  };
   const auto bytes = readHostFile(path);
-  if (!bytes) return failure(bytes.error);
+  if (!bytes) return bytes.error().at(path);
   auto parsed = plist::read(*bytes);
-  if (!parsed) return failure(parsed.error);
+  if (!parsed) return parsed.error().at(path);
   auto* content = parsed->as<Dictionary>();
-  if (content == nullptr) return failure("not a dictionary");
+  if (content == nullptr) return Error{"not a dictionary"}.at(path);
   SubmittedLog log{path, bytes->size(), std::move(*content), std::nullopt};
   if (const auto beside = readHostFile(path + kOptions)) {
     const auto options = plist::read(*beside);
@@ -59,7 +57,7 @@ Result<SubmittedLog> Device::readLog(const std::string& path) {
         dictionary != nullptr ? dictionary->text("previous_os_version") : nullptr;
     if (version != nullptr) log.previousVersion = *version;
   }
-  return Result<SubmittedLog>::success(std::move(log));
+  return log;
 }
 
 Recorded Device::recorded(std::int32_t firstDay, std::int32_t lastDay) {
@@ -84,7 +82,7 @@ std::vector<std::string> Device::namesIn(const std::string& folder) {
 }
 
 std::optional<std::string> Device::bytes(const std::string& path) {
-  return host_.root().readFile(path, kLargestFile).value;
+  return host_.root().readFile(path, kLargestFile).orNone();
 }
 
 std::optional<Dictionary> Device::propertyList(const std::string& path) {

@@ -28,7 +28,7 @@ int runShow(const std::string& root, std::vector<std::string> logs,
   if (logs.empty()) return failed(root + ": no report was submitted");
   for (const std::string& path : logs) {
     const auto log = device.readLog(path);
-    if (!log) return failed(log.error);
+    if (!log) return failed(log.error().text);
     if (&path != &logs.front()) std::cout << '\n';
     std::cout << demo::showLog(device, *log, options) << std::flush;
   }

@@ -65,7 +65,7 @@ std::string writeFiles(Host& host, const std::vector<SampleFile>& files) {
       error = writeFile(host, file.path, *text);
     } else {
       const auto xml = plist::writeXML(file.content);
-      error = xml ? writeFile(host, file.path, *xml) : located(file.path, xml.error.c_str());
+      error = xml ? writeFile(host, file.path, *xml) : located(file.path, xml.error().text.c_str());
     }
     if (!error.empty()) return error;
   }
@@ -80,7 +80,7 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
     return {};
   }
   const auto bytes = host::readRegularFile(file.get(), kLargestModule);
-  return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error.c_str());
+  return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error().text.c_str());
 }
 
 std::string makeRoot(const MakingOptions& options, const Sample& first,

@@ -45,9 +45,9 @@ class Capture {
       : invocation_(invocation), services_(invocation.services) {}
 
   CommandResult run() {
-    if (std::string error = capture(); !error.empty()) return CommandResult::failure(error);
+    if (std::string error = capture(); !error.empty()) return base::Error{error};
     folder_.finish();
-    return CommandResult::success(std::move(manifest_));
+    return std::move(manifest_);
   }
 
  private:
@@ -71,7 +71,7 @@ class Capture {
     for (const auto& [name, content] : files) {
       if (!content) continue;
       const auto bytes = plist::writeXML(*content);
-      if (!bytes) return invocation_.arguments.folder + "/" + name + ": " + bytes.error;
+      if (!bytes) return invocation_.arguments.folder + "/" + name + ": " + bytes.error().text;
       if (std::string error = folder_.write(name, *bytes); !error.empty()) return error;
     }
     if (const auto snapshot =

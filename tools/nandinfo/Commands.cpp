@@ -16,7 +16,7 @@ using plist::Dictionary;
 using plist::Value;
 
 CommandResult result(std::optional<Dictionary> dictionary) {
-  return {dictionary ? std::optional<Value>(*std::move(dictionary)) : std::nullopt, {}};
+  return dictionary ? Value(*std::move(dictionary)) : CommandResult();
 }
 
 CommandResult ftl(const Invocation& invocation) {
@@ -46,7 +46,7 @@ template <auto function>
 CommandResult callWithCode(const Invocation& invocation) {
   std::uint32_t code = 0;
   for (const char c : invocation.arguments.code) code = code << 8 | static_cast<unsigned char>(c);
-  return {function(invocation.services, code), {}};
+  return Value(function(invocation.services, code));
 }
 
 CommandResult daily(const Invocation& invocation) {
@@ -70,11 +70,12 @@ CommandResult extract(const Invocation& invocation) {
 
 CommandResult dump(const Invocation& invocation) {
   const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.services, false);
-  return {handled, handled ? "" : "not every list was dumped"};
+  if (!handled) return {Value(false), base::Error{"not every list was dumped"}};
+  return Value(true);
 }
 
 CommandResult recommendsDeletion(const Invocation& invocation) {
-  return {NANDInfo::NandRecommendsContentDeletion(invocation.services), {}};
+  return Value(NANDInfo::NandRecommendsContentDeletion(invocation.services));
 }
 
 constexpr Command kCommands[] = {

@@ -3,9 +3,11 @@
 
 #include <cstdint>
 #include <functional>
+#include <optional>
 #include <span>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "NANDInfo/Services.h"
@@ -29,9 +31,17 @@ struct Invocation {
   std::function<void(const std::string&)> progress;
 };
 
-// What a command came to: a value to print, or none; with an error when the command knows better
-// than the library why the work failed.
-using CommandResult = base::Result<plist::Value>;
+// What a command came to: a value to print, or none; and why the work failed, where the command
+// knows better than the library.
+struct [[nodiscard]] CommandResult {
+  CommandResult() = default;
+  CommandResult(plist::Value shown, std::optional<base::Error> failure = {})
+      : value(std::move(shown)), error(std::move(failure)) {}
+  CommandResult(base::Error failure) : error(std::move(failure)) {}
+
+  std::optional<plist::Value> value;
+  std::optional<base::Error> error;
+};
 
 // The parts of the command line that a command takes.
 enum Takes : std::uint16_t {

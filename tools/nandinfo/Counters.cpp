@@ -108,7 +108,7 @@ CommandResult counters(const Invocation& invocation) {
   };
   for (const std::string& name : names) {
     if (std::ranges::none_of(dictionary, isCalled(name))) {
-      return CommandResult::failure(unknown(name, dictionary));
+      return base::Error{unknown(name, dictionary)};
     }
   }
   if (!names.empty()) {
@@ -126,7 +126,7 @@ CommandResult counters(const Invocation& invocation) {
     rows.push_back(rowOf(rest.first(count)));
     rest = rest.subspan(count);
   }
-  return CommandResult::success(std::move(rows));
+  return plist::Value(std::move(rows));
 }
 
 }  // namespace nandinfo

@@ -17,15 +17,14 @@ namespace nandinfo {
 
 namespace {
 
+using base::Error;
 using plist::Array;
 using FileBytes = std::vector<std::byte>;
 
 // Of a file of any kind that can be read to its end.
 base::Result<FileBytes> readInput(const std::string& path) {
   constexpr std::size_t kStep = std::size_t{1} << 16;
-  const auto failed = [&path](const char* why) {
-    return base::Result<FileBytes>::failure(path + ": " + why);
-  };
+  const auto failed = [&path](const char* why) { return Error{why}.at(path); };
   const host::FileDescriptor file(path == "-" ? ::dup(STDIN_FILENO)
                                               : ::open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (!file) return failed(std::strerror(errno));
@@ -38,7 +37,7 @@ base::Result<FileBytes> readInput(const std::string& path) {
     bytes.resize(filled + static_cast<std::size_t>(std::max<ssize_t>(got, 0)));
     if (got < 0 && error == EINTR) continue;
     if (got < 0) return failed(std::strerror(error));
-    if (got == 0) return base::Result<FileBytes>::success(std::move(bytes));
+    if (got == 0) return bytes;
     if (bytes.size() > NANDInfo::kLargestBuffer) return failed("longer than 16 MiB");
   }
 }
@@ -46,16 +45,16 @@ base::Result<FileBytes> readInput(const std::string& path) {
 // What has been read; a failed one says which file it is about.
 CommandResult outcome(const std::string& path, plist::Dictionary decoded) {
   const std::string* error = decoded.text("error");
-  std::string why = decoded.number("ok")->boolValue() ? "" : path + ": ";
-  if (!why.empty()) why += *error != "NA" ? *error : "nothing in it can be decoded";
-  return {std::move(decoded), std::move(why)};
+  if (decoded.number("ok")->boolValue()) return plist::Value(std::move(decoded));
+  Error why{*error != "NA" ? *error : "nothing in it can be decoded"};
+  return {plist::Value(std::move(decoded)), why.at(path)};
 }
 
 template <auto decode>
 CommandResult decodeFile(const Invocation& invocation) {
   const std::string& path = invocation.arguments.file;
   const auto bytes = readInput(path);
-  return bytes ? outcome(path, decode(*bytes)) : CommandResult::failure(bytes.error);
+  return bytes ? outcome(path, decode(*bytes)) : bytes.error();
 }
 
 }  // namespace
@@ -81,7 +80,7 @@ CommandResult decodeSnapshot(const Invocation& invocation) {
 CommandResult decodeTelemetry(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
   const auto bytes = readInput(arguments.file);
-  if (!bytes) return CommandResult::failure(bytes.error);
+  if (!bytes) return bytes.error();
   return outcome(arguments.file, decodedTelemetry(*bytes, *findCounterLayout(arguments.layout),
                                                   arguments.channels));
 }
@@ -90,21 +89,20 @@ CommandResult decodeCounters(const Invocation& invocation) {
   const Arguments& arguments = invocation.arguments;
   const CounterLayout* layout = findCounterLayout(arguments.layout);
   auto bytes = readInput(arguments.file);
-  if (!bytes) return CommandResult::failure(bytes.error);
+  if (!bytes) return bytes.error();
   if (const std::string why = whyNot(BufferKind::counters, *bytes); !why.empty()) {
-    return CommandResult::failure(arguments.file + ": " + why);
+    return Error{why}.at(arguments.file);
   }
   if (bytes->size() < layout->words * sizeof(std::uint32_t)) {
-    return CommandResult::failure(base::format("%s: %zu bytes, but the layout %s reads %zu",
-                                               arguments.file.c_str(), bytes->size(), layout->name,
-                                               layout->words * sizeof(std::uint32_t)));
+    return Error{base::format("%s: %zu bytes, but the layout %s reads %zu", arguments.file.c_str(),
+                              bytes->size(), layout->name, layout->words * sizeof(std::uint32_t))};
   }
   bytes->resize(NANDInfo::kCounterBlockSize);
   NANDInfo::NandCountersRecord record{};
   layout->parse(std::span<const std::byte>(*bytes).first<NANDInfo::kCounterBlockSize>(), record);
   Array words;
   for (const std::uint32_t word : record) words.push_back(std::uint64_t{word});
-  return CommandResult::success(std::move(words));
+  return plist::Value(std::move(words));
 }
 
 }  // namespace nandinfo

@@ -18,6 +18,7 @@ namespace nandinfo {
 
 namespace {
 
+using base::Error;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
@@ -120,16 +121,17 @@ class Capture {
 
   CommandResult decode() {
     if (!folder_.problem().empty()) {
-      return CommandResult::failure(folder_.problem("the folder"));
+      return Error{folder_.problem("the folder")};
     }
     constexpr char kRegistry[] = "registry.plist";
     const auto bytes = read(kRegistry);
-    if (!bytes) return failed(kRegistry, bytes.error);
+    if (!bytes) return bytes.error().at(folder_.hostPath(kRegistry));
     const auto registry = plist::read(*bytes);
-    if (!registry) return failed(kRegistry, registry.error);
+    if (!registry) return registry.error().at(folder_.hostPath(kRegistry));
     const auto* top = registry->as<Dictionary>();
     const auto controller = top != nullptr ? findController(*top) : std::nullopt;
-    if (!controller) return failed(kRegistry, "it has no controller with buffers");
+    if (!controller)
+      return Error{"it has no controller with buffers"}.at(folder_.hostPath(kRegistry));
     decoded_ = {{"ok", true}, {"class", controller->className}};
     decodeBuffers(*controller);
     decodeSnapshotOfKernel();
@@ -137,20 +139,16 @@ class Capture {
     decoded_.set("ok", why_.empty() && count_ > 0);
     if (why_.empty() && count_ == 0) why_ = "no buffer in it can be decoded";
     decoded_.set("error", why_.empty() ? "NA" : why_);
-    return {std::move(decoded_), why_.empty() ? "" : folder_.path() + ": " + why_};
+    if (why_.empty()) return Value(std::move(decoded_));
+    return {Value(std::move(decoded_)), Error{why_}.at(folder_.path())};
   }
 
  private:
-  CommandResult failed(const char* name, const std::string& why) const {
-    return CommandResult::failure(folder_.hostPath(name) + ": " + why);
-  }
-
   // A file of the capture, as long as all of them together aren't too long.
   base::Result<std::string> read(const std::string& name) {
-    using Result = base::Result<std::string>;
     auto bytes = folder_.readFile(name, left_ + 1);
     if (!bytes) return bytes;
-    if (bytes->size() > left_) return Result::failure("the capture is longer than 16 MiB");
+    if (bytes->size() > left_) return Error{"the capture is longer than 16 MiB"};
     left_ -= bytes->size();
     return bytes;
   }
@@ -167,7 +165,7 @@ class Capture {
     }
     if (file != nullptr) return read(*file);
     if (data == nullptr) return std::nullopt;
-    return base::Result<std::string>::success(std::string(data->begin(), data->end()));
+    return std::string(data->begin(), data->end());
   }
 
   void decodeBuffers(const CapturedController& controller) {
@@ -189,7 +187,7 @@ class Capture {
       const auto bytes = answer(value);
       if (!bytes) continue;
       if (!*bytes) {
-        note(name, (*bytes).error);
+        note(name, bytes->error().text);
       } else if (!(**bytes).empty()) {  // nothing was delivered, and that was the answer
         add(name, opType == kTelemetry
                       ? decodedTelemetry(spanOf(**bytes), *device.layout, device.channels)
@@ -203,7 +201,7 @@ class Capture {
     const std::string file = std::string(kName) + ".bin";
     if (!folder_.openForStatus(file)) return;
     const auto bytes = read(file);
-    if (!bytes) return note(kName, bytes.error);
+    if (!bytes) return note(kName, bytes.error().text);
     add(kName, decodedSnapshot(spanOf(*bytes)));
   }
 

@@ -58,9 +58,9 @@ std::optional<std::string> failure(const CommandResult& result) {
     const std::string message = NANDInfo::GetAPIErrorMessage();
     return message == "NA" ? otherwise : message;
   };
-  if (!result.error.empty()) return result.error;
-  if (!result) return messageOr("there is no result");
-  const auto* dictionary = result->as<Dictionary>();
+  if (result.error) return result.error->text;
+  if (!result.value) return messageOr("there is no result");
+  const auto* dictionary = result.value->as<Dictionary>();
   if (dictionary == nullptr) return std::nullopt;
   if (dictionary->find(NANDInfo::kNANDInfoErrorKey) != nullptr) {
     return messageOr(description(dictionary->find(NANDInfo::kNANDInfoErrorMessageKey)));
@@ -79,19 +79,20 @@ bool isEmpty(const Value& value) {
 std::string shown(const CommandServices& services, const Command& command, Form form,
                   const CommandResult& result) {
   if (services.outIsTerminal && !form.json && !form.compact) {
-    if (!result) return {};
-    const auto* records = result->as<Array>();
+    if (!result.value) return {};
+    const Value& value = *result.value;
+    const auto* records = value.as<Array>();
     const bool isLone = records != nullptr && records->size() == 1;  // it stands upright
-    if (!isEmpty(*result)) return tableText(isLone ? records->front() : *result, services.width);
+    if (!isEmpty(value)) return tableText(isLone ? records->front() : value, services.width);
     return command.empty != nullptr ? base::format("(%s)\n", command.empty) : "(nothing)\n";
   }
   std::string json;
-  if (!result) {
+  if (!result.value) {
     json = "null";
   } else if (form.compact) {
-    plist::appendJSON(json, *result);
+    plist::appendJSON(json, *result.value);
   } else {
-    plist::appendIndentedJSON(json, *result);
+    plist::appendIndentedJSON(json, *result.value);
   }
   return tools::printableJSON(std::move(json)) + '\n';
 }

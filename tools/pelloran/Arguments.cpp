@@ -12,6 +12,7 @@
 
 namespace pelloran {
 
+using base::Error;
 using base::Result;
 
 namespace {
@@ -48,50 +49,48 @@ std::string keyProblem(std::string_view key) {
 }
 
 Result<std::int32_t> parseDay(std::string_view text, std::int32_t today) {
-  if (text == "today") return Result<std::int32_t>::success(today);
-  if (text == "yesterday") return Result<std::int32_t>::success(base::dayBefore(today));
+  if (text == "today") return today;
+  if (text == "yesterday") return base::dayBefore(today);
   std::int64_t day = 0;
   if (parsed(text, day)) return dayOf(day);
   const auto midnight = base::secondsFromTimestamp(std::string(text) + "T00:00:00Z");
   if (midnight && *midnight >= 0) return dayOf(base::dayNumber(*midnight));
-  return Result<std::int32_t>::failure(
-      quoted(text) + " is not a day: a day number, a date as 2026-11-22, today or yesterday");
+  return Error{quoted(text) +
+               " is not a day: a day number, a date as 2026-11-22, today or yesterday"};
 }
 
 Result<std::int64_t> parseInteger(std::string_view text) {
   std::int64_t value = 0;
-  if (parsed(text, value)) return Result<std::int64_t>::success(value);
-  return Result<std::int64_t>::failure(quoted(text) + " is not an integer of 64 bits");
+  if (parsed(text, value)) return value;
+  return Error{quoted(text) + " is not an integer of 64 bits"};
 }
 
 Result<double> parseReal(std::string_view text) {
   double value = 0;
-  if (parsed(text, value) && std::isfinite(value)) return Result<double>::success(value);
-  return Result<double>::failure(quoted(text) + " is not a finite number");
+  if (parsed(text, value) && std::isfinite(value)) return value;
+  return Error{quoted(text) + " is not a finite number"};
 }
 
 Result<std::int64_t> integral(double value) {
   const double above = std::ldexp(1.0, 63);
   if (std::trunc(value) != value || value < -above || value >= above) {
-    return Result<std::int64_t>::failure(base::doubleText(value) + " is not an integer of 64 bits");
+    return Error{base::doubleText(value) + " is not an integer of 64 bits"};
   }
-  return Result<std::int64_t>::success(base::saturatingCast<std::int64_t>(value));
+  return base::saturatingCast<std::int64_t>(value);
 }
 
 Result<std::int32_t> secondInDay(std::int64_t second) {
   if (second >= 0 && second < base::kSecondsPerDay) {
-    return Result<std::int32_t>::success(static_cast<std::int32_t>(second));
+    return static_cast<std::int32_t>(second);
   }
-  return Result<std::int32_t>::failure(std::to_string(second) +
-                                       " is not a second within a day, 0 to 86399");
+  return Error{std::to_string(second) + " is not a second within a day, 0 to 86399"};
 }
 
 Result<std::int32_t> dayOf(std::int64_t number) {
   if (number >= 0 && number <= std::numeric_limits<std::int32_t>::max()) {
-    return Result<std::int32_t>::success(static_cast<std::int32_t>(number));
+    return static_cast<std::int32_t>(number);
   }
-  return Result<std::int32_t>::failure(std::to_string(number) +
-                                       " is not a day number, 0 to 2147483647");
+  return Error{std::to_string(number) + " is not a day number, 0 to 2147483647"};
 }
 
 }  // namespace pelloran

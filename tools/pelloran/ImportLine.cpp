@@ -11,6 +11,7 @@
 
 namespace pelloran {
 
+using base::Error;
 using base::Result;
 using host::CounterChange;
 
@@ -93,36 +94,29 @@ class Fields : public nlohmann::json_sax<nlohmann::json> {
   Scalar* taken_ = nullptr;
 };
 
-template <typename T>
-Result<T> failure(std::string_view field, const std::string& why) {
-  return Result<T>::failure(std::string("\"").append(field).append("\": ").append(why));
-}
-
 Result<std::int64_t> integerFrom(const Scalar& scalar) {
   if (const auto* integer = std::get_if<std::int64_t>(&scalar)) {
-    return Result<std::int64_t>::success(*integer);
+    return *integer;
   }
   if (const auto* real = std::get_if<double>(&scalar)) return integral(*real);
-  return Result<std::int64_t>::failure("not a number");
+  return Error{"not a number"};
 }
 
 Result<double> realFrom(const Scalar& scalar) {
   if (const auto* integer = std::get_if<std::int64_t>(&scalar)) {
-    return Result<double>::success(static_cast<double>(*integer));
+    return static_cast<double>(*integer);
   }
-  if (const auto* real = std::get_if<double>(&scalar)) return Result<double>::success(*real);
-  return Result<double>::failure("not a number");
+  if (const auto* real = std::get_if<double>(&scalar)) return *real;
+  return Error{"not a number"};
 }
 
 Result<std::int32_t> dayFrom(const Scalar& scalar, std::int32_t today) {
   if (const auto* text = std::get_if<std::string>(&scalar)) return parseDay(*text, today);
-  const auto number = integerFrom(scalar);
-  return number ? dayOf(*number) : Result<std::int32_t>::failure(number.error);
+  return integerFrom(scalar).and_then(dayOf);
 }
 
 Result<std::int32_t> secondsFrom(const Scalar& scalar) {
-  const auto number = integerFrom(scalar);
-  return number ? secondInDay(*number) : Result<std::int32_t>::failure(number.error);
+  return integerFrom(scalar).and_then(secondInDay);
 }
 
 }  // namespace
@@ -133,37 +127,36 @@ Moment momentOf(plist::Date now) {
 }
 
 Result<ImportLine> parseImportLine(std::string_view line, Moment now) {
-  using Parsed = Result<ImportLine>;
   Fields fields;
   if (!nlohmann::json::sax_parse(line.begin(), line.end(), &fields)) {
-    return Parsed::failure(fields.error);
+    return Error{fields.error};
   }
-  if (!fields.kind) return Parsed::failure("there is none of set, add and push");
+  if (!fields.kind) return Error{"there is none of set, add and push"};
   auto* key = std::get_if<std::string>(&fields.target);
-  if (key == nullptr) return Parsed::failure("the key is not a text");
-  if (auto problem = keyProblem(*key); !problem.empty()) return Parsed::failure(std::move(problem));
+  if (key == nullptr) return Error{"the key is not a text"};
+  if (auto problem = keyProblem(*key); !problem.empty()) return Error{std::move(problem)};
 
   CounterChange change{.kind = *fields.kind, .key = {}, .day = now.day, .seconds = now.second};
   if (change.kind == CounterChange::Kind::push) {
     const auto sample = realFrom(fields.value);
-    if (!sample) return failure<ImportLine>("value", sample.error);
+    if (!sample) return sample.error().at("\"value\"");
     change.sample = *sample;
   } else {
     const auto amount = integerFrom(fields.value);
-    if (!amount) return failure<ImportLine>("value", amount.error);
+    if (!amount) return amount.error().at("\"value\"");
     change.amount = *amount;
   }
   if (fields.day.index() != 0) {
     const auto day = dayFrom(fields.day, now.day);
-    if (!day) return failure<ImportLine>("day", day.error);
+    if (!day) return day.error().at("\"day\"");
     change.day = *day;
   }
   if (fields.seconds.index() != 0) {
     const auto seconds = secondsFrom(fields.seconds);
-    if (!seconds) return failure<ImportLine>("seconds", seconds.error);
+    if (!seconds) return seconds.error().at("\"seconds\"");
     change.seconds = *seconds;
   }
-  return Parsed::success({std::move(*key), change});
+  return ImportLine{std::move(*key), change};
 }
 
 }  // namespace pelloran

@@ -131,7 +131,7 @@ class Command {
   template <typename From, typename To>
   bool given(const base::Result<From>& result, To& value) {
     if (!result) {
-      usage(result.error);
+      usage(result.error().text);
       return false;
     }
     value = *result;
@@ -160,7 +160,7 @@ class Command {
       const std::string_view line(buffer.data(), length);
       if (line.find_first_not_of(" \t\r") == std::string_view::npos) continue;
       auto parsed = parseImportLine(line, now_);
-      if (!parsed) return wrong(parsed.error);
+      if (!parsed) return wrong(parsed.error().text);
       parsed->change.key = *keys.insert(std::move(parsed->key)).first;
       changes.push_back(parsed->change);
       if (number % kLinesBetweenProgress == 0)
