@@ -22,7 +22,7 @@ class PelloranCommand : public testing::Test {
     std::ostringstream outStream, errStream;
     waits = 0;
     const int status = pelloran::runPelloran(
-        {here.store, here.clock, in, outStream, errStream, terminal, figures.path().string(),
+        {here.store, here.clock, in, outStream, errStream, terminal, [this] { return figures; },
          [this](std::chrono::steady_clock::time_point) { ++waits; }},
         static_cast<int>(argv.size()), argv.data());
     out = outStream.str();
@@ -30,7 +30,8 @@ class PelloranCommand : public testing::Test {
     return status;
   }
 
-  support::TemporaryFolder folder, figures;
+  support::TemporaryFolder folder;
+  host::machine::MachineFigures figures;
   support::StoreFixture here{folder.path()};
   std::string out, err;
   bool terminal = false;
@@ -148,19 +149,15 @@ TEST_F(PelloranCommand, AFailedReadOrWriteEndsWithOne) {
 
 TEST_F(PelloranCommand, EachReadingOfTheMachineIsRecordedOnce) {
   EXPECT_EQ(run({"sample"}), 1);
-  figures.write("proc/vmstat", "pgfault 100\n");
-  figures.write("proc/loadavg", "0.25 0.5 1.00 1/80 11206\n");
-  figures.write("sys/class/thermal/thermal_zone3/temp", "-1500\n");
+  figures = {{{"host.vmstat.pgfault", 100}}, {{"host.loadavg.1m", 0.25}, {"host.a", -1.5}}};
   terminal = true;
   EXPECT_EQ(run({"sample", "--every", "0.5", "--for", "1"}), 0) << err;
   EXPECT_EQ(waits, 2);
   EXPECT_NE(err.find("reading 2 of 3"), std::string::npos) << err;
   EXPECT_TRUE(err.ends_with("\r\x1b[K")) << err;
   EXPECT_EQ(here.rows(),
-            (Lines{"20000 host.vmstat.pgfault 100", "20000 host.loadavg.15m 3600:1 3600:1 3600:1",
-                   "20000 host.loadavg.1m 3600:0.25 3600:0.25 3600:0.25",
-                   "20000 host.loadavg.5m 3600:0.5 3600:0.5 3600:0.5",
-                   "20000 host.thermal.3.celsius 3600:-1.5 3600:-1.5 3600:-1.5"}));
+            (Lines{"20000 host.vmstat.pgfault 100", "20000 host.a 3600:-1.5 3600:-1.5 3600:-1.5",
+                   "20000 host.loadavg.1m 3600:0.25 3600:0.25 3600:0.25"}));
 }
 
 }  // namespace

@@ -1,8 +1,6 @@
 #include <gtest/gtest.h>
 
-#include "base/Text.h"
 #include "tools/pelloran/ImportLine.h"
-#include "tools/pelloran/MachineFigures.h"
 
 namespace {
 
@@ -65,64 +63,6 @@ TEST(PelloranImportLine, AnythingElseIsRefusedWithAReason) {
     EXPECT_FALSE(parsed) << line.substr(0, 80);
     EXPECT_FALSE(parsed.error().text.empty()) << line.substr(0, 80);
   }
-}
-
-std::string text(const pelloran::MachineFigures& figures) {
-  std::string lines;
-  for (const auto& [key, count] : figures.counts) lines += key + " " + std::to_string(count) + "\n";
-  for (const auto& [key, value] : figures.measurements) {
-    lines += key + " ~" + base::doubleText(value) + "\n";
-  }
-  return lines;
-}
-
-TEST(PelloranMachineFigures, SoundLinesAreReadAndOthersSkipped) {
-  pelloran::MachineFigures figures;
-  parseVmstat(
-      "pgfault 12\nnr_free_pages 5\npswpin\npgpgin -1\noom_kill 1x\n\n"
-      "pswpout 99999999999999999999999\npgmajfault 7",
-      figures);
-  EXPECT_EQ(text(figures),
-            "host.vmstat.pgfault 12\nhost.vmstat.pswpout 9223372036854775807\n"
-            "host.vmstat.pgmajfault 7\n");
-  figures = {};
-  parseMeminfo("MemTotal: 9 kB\nMemFree:  123 kB\nDirty 5 kB\nSlab:\nCached: 7", figures);
-  EXPECT_EQ(text(figures), "host.meminfo.MemFree ~123\nhost.meminfo.Cached ~7\n");
-  figures = {};
-  parseLoadavg("0.5 nan 2.25 1/2 3", figures);
-  EXPECT_EQ(text(figures), "host.loadavg.1m ~0.5\nhost.loadavg.15m ~2.25\n");
-  figures = {};
-  parsePressure("io", "some avg10=1.50 avg60=2 total=77\nfull avg10=inf total=-1\nall avg10=1\n",
-                figures);
-  EXPECT_EQ(text(figures), "host.pressure.io.some.total 77\nhost.pressure.io.some.avg10 ~1.5\n");
-  figures = {};
-  parseTemperature("0", "45500\n", figures);
-  parseTemperature("1", "hot\n", figures);
-  parseTemperature("2", "", figures);
-  EXPECT_EQ(text(figures), "host.thermal.0.celsius ~45.5\n");
-}
-
-TEST(PelloranMachineFigures, OnlyWholeDisksAreCounted) {
-  const auto disksOf = [](std::initializer_list<const char*> names) {
-    std::string lines = "   8 0 cut 1 2 3\n";
-    for (const char* name : names) {
-      lines += base::format("   8       0 %s 1 2 3 4 5 6 7 8 0 9 10 11\n", name);
-    }
-    pelloran::MachineFigures figures;
-    pelloran::parseDiskstats(lines, figures);
-    std::string disks;
-    for (const auto& [key, count] : figures.counts) {
-      if (key.ends_with(".sectors_written") && count == 7) {
-        disks += key.substr(10, key.size() - 10 - 16) + " ";
-      }
-    }
-    return disks;
-  };
-  EXPECT_EQ(disksOf({"sda", "sda1", "sda12", "sdaa", "sdaa1", "loop0", "ram1", "zram0"}),
-            "sda sdaa ");
-  EXPECT_EQ(disksOf({"nvme0n1p1", "nvme0n1", "nvme0n10", "mmcblk0", "mmcblk0p2"}),
-            "nvme0n1 nvme0n10 mmcblk0 ");
-  EXPECT_EQ(disksOf({"md1", "md12", "dm-1", "dm-10"}), "md1 md12 dm-1 dm-10 ");
 }
 
 }  // namespace

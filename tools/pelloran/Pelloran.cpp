@@ -17,7 +17,6 @@
 #include "tools/common/TerminalText.h"
 #include "tools/pelloran/Arguments.h"
 #include "tools/pelloran/ImportLine.h"
-#include "tools/pelloran/MachineFigures.h"
 #include "tools/pelloran/Show.h"
 
 namespace pelloran {
@@ -106,8 +105,7 @@ class Command {
     const auto readings = base::saturatingCast<std::int64_t>(lasting / every) + 1;
     tools::Progress progress(environment_.err, environment_.errIsTerminal);
     for (std::int64_t reading = 1; reading <= readings; ++reading) {
-      if (const std::string error = record(readMachineFigures(environment_.figuresRoot));
-          !error.empty()) {
+      if (const std::string error = record(environment_.figures()); !error.empty()) {
         progress.clear();
         return failed(error);
       }
@@ -175,7 +173,7 @@ class Command {
     return outcome(error);
   }
 
-  std::string record(const MachineFigures& figures) {
+  std::string record(const host::machine::MachineFigures& figures) {
     const Moment now = momentOf(environment_.clock.now());
     std::vector<CounterChange> changes;
     for (const auto& [key, count] : figures.counts) {

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "host/counters/CounterStore.h"
+#include "host/machine/MachineFigures.h"
 #include "platform/Clock.h"
 
 namespace pelloran {
@@ -17,8 +18,8 @@ struct Environment {
   std::istream& in;
   std::ostream& out;
   std::ostream& err;
-  bool errIsTerminal;       // then long work shows its progress there
-  std::string figuresRoot;  // below which proc and sys lie; "/" for this machine
+  bool errIsTerminal;  // then long work shows its progress there
+  std::function<host::machine::MachineFigures()> figures;  // of this machine
   std::function<void(std::chrono::steady_clock::time_point)> waitUntil;
   std::string rootProblem = {};  // why the device root can't be used, if it can't
 };

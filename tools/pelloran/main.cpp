@@ -23,7 +23,7 @@ int run(std::ostream& out, int argc, char** argv) {
        .out = out,
        .err = std::cerr,
        .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
-       .figuresRoot = "/",
+       .figures = host::machine::readMachineFigures,
        .waitUntil = [](auto moment) { std::this_thread::sleep_until(moment); },
        .rootProblem = host.root().problem()},
       argc, argv);

@@ -1,19 +1,27 @@
-#include "tools/pelloran/MachineFigures.h"
+#include "host/machine/MachineFigures.h"
+
+#include <libproc2/diskstats.h>
+#include <libproc2/meminfo.h>
+#include <libproc2/misc.h>
 
 #include <algorithm>
-#include <array>
 #include <charconv>
 #include <cmath>
 #include <filesystem>
 #include <fstream>
+#include <initializer_list>
+#include <iterator>
 #include <limits>
+#include <memory>
 #include <optional>
+#include <string_view>
+#include <system_error>
 
-namespace pelloran {
+namespace host::machine {
 
 namespace {
 
-constexpr std::size_t kLongestFile = std::size_t{1} << 20;
+constexpr std::size_t kMaxFileSize = std::size_t{1} << 20;
 
 constexpr std::string_view kVmstatEvents[] = {"pgpgin",
                                               "pgpgout",
@@ -45,15 +53,28 @@ constexpr std::string_view kVmstatEvents[] = {"pgpgin",
                                               "drop_pagecache",
                                               "drop_slab"};
 
-constexpr std::string_view kMeminfoAmounts[] = {
-    "MemFree", "MemAvailable", "Buffers",   "Cached", "SwapCached", "Active", "Inactive",
-    "Dirty",   "Writeback",    "AnonPages", "Mapped", "Shmem",      "Slab",   "SwapFree"};
+constexpr struct {
+  meminfo_item item;
+  std::string_view name;
+} kMeminfoAmounts[] = {
+    {MEMINFO_MEM_FREE, "MemFree"},        {MEMINFO_MEM_AVAILABLE, "MemAvailable"},
+    {MEMINFO_MEM_BUFFERS, "Buffers"},     {MEMINFO_MEM_CACHED, "Cached"},
+    {MEMINFO_SWAP_CACHED, "SwapCached"},  {MEMINFO_MEM_ACTIVE, "Active"},
+    {MEMINFO_MEM_INACTIVE, "Inactive"},   {MEMINFO_MEM_DIRTY, "Dirty"},
+    {MEMINFO_MEM_WRITEBACK, "Writeback"}, {MEMINFO_MEM_ANON, "AnonPages"},
+    {MEMINFO_MEM_MAPPED, "Mapped"},       {MEMINFO_MEM_SHARED, "Shmem"},
+    {MEMINFO_MEM_SLAB, "Slab"},           {MEMINFO_SWAP_FREE, "SwapFree"}};
 
-// The columns of a disk behind its name.
-constexpr std::string_view kDiskCounts[] = {"reads",           "",                        // merged
-                                            "sectors_read",    "read_ms",  "writes", "",  // merged
-                                            "sectors_written", "write_ms", "",  // in progress
-                                            "busy_ms"};
+constexpr struct {
+  diskstats_item item;
+  std::string_view name;
+} kDiskCounts[] = {{DISKSTATS_READS, "reads"},
+                   {DISKSTATS_READ_SECTORS, "sectors_read"},
+                   {DISKSTATS_READ_TIME, "read_ms"},
+                   {DISKSTATS_WRITES, "writes"},
+                   {DISKSTATS_WRITE_SECTORS, "sectors_written"},
+                   {DISKSTATS_WRITE_TIME, "write_ms"},
+                   {DISKSTATS_IO_TIME, "busy_ms"}};
 
 // Takes what stands before the separator, and the separator, off the text's front.
 std::string_view take(std::string_view& text, char separator) {
@@ -96,24 +117,8 @@ std::optional<double> measurement(std::string_view word) {
   return value;
 }
 
-template <typename Table>
-bool isIn(const Table& table, std::string_view name) {
-  return std::find(std::begin(table), std::end(table), name) != std::end(table);
-}
-
 bool isNumber(std::string_view text) {
   return !text.empty() && text.find_first_not_of("0123456789") == std::string_view::npos;
-}
-
-// sda1 is a partition of sda, nvme0n1p1 one of nvme0n1.
-bool isPartition(std::string_view name, std::string_view disk) {
-  if (disk.empty() || !name.starts_with(disk)) return false;
-  std::string_view rest = name.substr(disk.size());
-  if (isNumber(disk.substr(disk.size() - 1))) {
-    if (!rest.starts_with('p')) return false;
-    rest.remove_prefix(1);
-  }
-  return isNumber(rest);
 }
 
 std::string key(std::initializer_list<std::string_view> parts) {
@@ -124,76 +129,75 @@ std::string key(std::initializer_list<std::string_view> parts) {
 
 std::string fileText(const std::filesystem::path& path) {
   std::ifstream file(path, std::ios::binary);
-  std::string text(kLongestFile, '\0');
+  std::string text(kMaxFileSize, '\0');
   file.read(text.data(), static_cast<std::streamsize>(text.size()));
   text.resize(static_cast<std::size_t>(file.gcount()));
   return text;
 }
 
-}  // namespace
+// Ends what libproc2 has read.
+template <auto unref>
+struct Unref {
+  template <typename Info>
+  void operator()(Info* info) const {
+    unref(&info);
+  }
+};
 
-void parseVmstat(std::string_view text, MachineFigures& figures) {
+void addDisks(MachineFigures& figures) {
+  diskstats_info* info = nullptr;
+  if (procps_diskstats_new(&info) < 0) return;
+  const std::unique_ptr<diskstats_info, Unref<procps_diskstats_unref>> owned(info);
+  std::vector<diskstats_item> items = {DISKSTATS_NAME, DISKSTATS_TYPE};
+  for (const auto& row : kDiskCounts) items.push_back(row.item);
+  const auto* reaped = procps_diskstats_reap(info, items.data(), static_cast<int>(items.size()));
+  if (reaped == nullptr) return;
+  for (int i = 0; i < reaped->total; ++i) {
+    const diskstats_result* value = reaped->stacks[i]->head;  // one for each item
+    const std::string_view disk = value++->result.str;
+    const bool isWhole = value++->result.s_int == DISKSTATS_TYPE_DISK;
+    const bool isMemory =
+        disk.starts_with("loop") || disk.starts_with("ram") || disk.starts_with("zram");
+    if (!isWhole || isMemory) continue;
+    for (const auto& row : kDiskCounts) {
+      const std::uint64_t count = std::min<std::uint64_t>(value++->result.ul_int, INT64_MAX);
+      figures.counts.emplace_back(key({"disk", disk, row.name}), static_cast<std::int64_t>(count));
+    }
+  }
+}
+
+void addMemory(MachineFigures& figures) {
+  meminfo_info* info = nullptr;
+  if (procps_meminfo_new(&info) < 0) return;
+  const std::unique_ptr<meminfo_info, Unref<procps_meminfo_unref>> owned(info);
+  for (const auto& [item, name] : kMeminfoAmounts) {
+    const meminfo_result* amount = procps_meminfo_get(info, item);
+    if (amount == nullptr) continue;
+    figures.measurements.emplace_back(key({"meminfo", name}),
+                                      static_cast<double>(amount->result.ul_int));
+  }
+}
+
+void addLoad(MachineFigures& figures) {
+  double one = 0, five = 0, fifteen = 0;
+  if (procps_loadavg(&one, &five, &fifteen) < 0) return;
+  figures.measurements.insert(
+      figures.measurements.end(),
+      {{"host.loadavg.1m", one}, {"host.loadavg.5m", five}, {"host.loadavg.15m", fifteen}});
+}
+
+void addVmstat(std::string_view text, MachineFigures& figures) {
   while (!text.empty()) {
     std::string_view line = take(text, '\n');
     const std::string_view name = takeWord(line);
     const auto value = count(takeWord(line));
-    if (value && isIn(kVmstatEvents, name)) {
+    if (value && std::ranges::find(kVmstatEvents, name) != std::end(kVmstatEvents)) {
       figures.counts.emplace_back(key({"vmstat", name}), *value);
     }
   }
 }
 
-void parseDiskstats(std::string_view text, MachineFigures& figures) {
-  struct Disk {
-    std::string_view name;
-    std::array<std::optional<std::int64_t>, std::size(kDiskCounts)> counts;
-  };
-  std::vector<Disk> disks;
-  while (!text.empty()) {
-    std::string_view line = take(text, '\n');
-    takeWord(line);  // major and minor number
-    takeWord(line);
-    Disk disk{takeWord(line), {}};
-    for (auto& value : disk.counts) value = count(takeWord(line));
-    const bool counted = disk.counts.back().has_value();
-    const bool memory = disk.name.starts_with("loop") || disk.name.starts_with("ram") ||
-                        disk.name.starts_with("zram");
-    if (counted && !memory) disks.push_back(disk);
-  }
-  for (const Disk& disk : disks) {
-    if (std::any_of(disks.begin(), disks.end(),
-                    [&](const Disk& other) { return isPartition(disk.name, other.name); })) {
-      continue;
-    }
-    for (std::size_t i = 0; i < disk.counts.size(); ++i) {
-      if (!kDiskCounts[i].empty() && disk.counts[i]) {
-        figures.counts.emplace_back(key({"disk", disk.name, kDiskCounts[i]}), *disk.counts[i]);
-      }
-    }
-  }
-}
-
-void parseMeminfo(std::string_view text, MachineFigures& figures) {
-  while (!text.empty()) {
-    std::string_view line = take(text, '\n');
-    const std::string_view name = take(line, ':');
-    const auto value = count(takeWord(line));
-    if (value && isIn(kMeminfoAmounts, name)) {
-      figures.measurements.emplace_back(key({"meminfo", name}), static_cast<double>(*value));
-    }
-  }
-}
-
-void parseLoadavg(std::string_view text, MachineFigures& figures) {
-  std::string_view line = take(text, '\n');
-  for (const std::string_view name : {"1m", "5m", "15m"}) {
-    if (const auto value = measurement(takeWord(line))) {
-      figures.measurements.emplace_back(key({"loadavg", name}), *value);
-    }
-  }
-}
-
-void parsePressure(std::string_view resource, std::string_view text, MachineFigures& figures) {
+void addPressure(std::string_view resource, std::string_view text, MachineFigures& figures) {
   while (!text.empty()) {
     std::string_view line = take(text, '\n');
     const std::string_view share = takeWord(line);
@@ -213,33 +217,39 @@ void parsePressure(std::string_view resource, std::string_view text, MachineFigu
   }
 }
 
-void parseTemperature(std::string_view zone, std::string_view text, MachineFigures& figures) {
+void addTemperature(std::string_view zone, std::string_view text, MachineFigures& figures) {
   if (const auto thousandths = integer(take(text, '\n'))) {
     figures.measurements.emplace_back(key({"thermal", zone, "celsius"}),
                                       static_cast<double>(*thousandths) / 1000);
   }
 }
 
-MachineFigures readMachineFigures(const std::string& root) {
+}  // namespace
+
+void addFiguresOfFiles(const std::string& root, MachineFigures& figures) {
   const std::filesystem::path proc = std::filesystem::path(root) / "proc";
-  MachineFigures figures;
-  parseVmstat(fileText(proc / "vmstat"), figures);
-  parseDiskstats(fileText(proc / "diskstats"), figures);
-  parseMeminfo(fileText(proc / "meminfo"), figures);
-  parseLoadavg(fileText(proc / "loadavg"), figures);
+  addVmstat(fileText(proc / "vmstat"), figures);
   for (const char* resource : {"cpu", "io", "memory"}) {
-    parsePressure(resource, fileText(proc / "pressure" / resource), figures);
+    addPressure(resource, fileText(proc / "pressure" / resource), figures);
   }
-  constexpr std::string_view prefix = "thermal_zone";
+  constexpr std::string_view kPrefix = "thermal_zone";
   std::error_code error;
   std::filesystem::directory_iterator zone(
       std::filesystem::path(root) / "sys" / "class" / "thermal", error);
   for (; !error && zone != std::filesystem::directory_iterator(); zone.increment(error)) {
     const std::string name = zone->path().filename().string();
-    if (!name.starts_with(prefix) || !isNumber(name.substr(prefix.size()))) continue;
-    parseTemperature(name.substr(prefix.size()), fileText(zone->path() / "temp"), figures);
+    if (!name.starts_with(kPrefix) || !isNumber(name.substr(kPrefix.size()))) continue;
+    addTemperature(name.substr(kPrefix.size()), fileText(zone->path() / "temp"), figures);
   }
+}
+
+MachineFigures readMachineFigures() {
+  MachineFigures figures;
+  addFiguresOfFiles("/", figures);
+  addDisks(figures);
+  addMemory(figures);
+  addLoad(figures);
   return figures;
 }
 
-}  // namespace pelloran
+}  // namespace host::machine
