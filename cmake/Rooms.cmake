@@ -4,7 +4,7 @@
 
 add_library(morvend_options INTERFACE)
 target_compile_options(morvend_options INTERFACE
-  -Wall -Wextra -Wpedantic -Wconversion -Wshadow -Werror
+  -Wall -Wextra -Wpedantic -Wconversion -Wshadow
   # Doubles come out the same on every machine.
   -ffp-contract=off
   -fvisibility=hidden

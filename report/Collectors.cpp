@@ -21,8 +21,6 @@ using platform::LogLevel;
 
 namespace {
 
-constexpr int kInstalledApplicationBundles = 1;
-
 // A kernel value of the width of T, or none when the read fails.
 template <typename T>
 std::optional<T> readKernelValue(platform::Kernel& kernel, const char* name) {

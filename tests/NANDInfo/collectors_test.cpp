@@ -196,7 +196,7 @@ TEST(Collectors, AnyCallMayFail) {
   for (const char* const controller : {kQRT3, kZMCStorage}) {
     StorageDevice device(controller);
     device.setStatistics({{"hostWrites", {7}}, {"mspBootBlockCountPerMsp", {4}}});
-    for (const std::uint32_t msp : {0, 1}) {
+    for (const std::uint32_t msp : {0U, 1U}) {
       device.registry.alwaysTunnels(9, 221, msp, support::records({{0x1000, 4, {1234567}}}));
     }
     device.registry.standing["5"] = device.registry.announce(1);

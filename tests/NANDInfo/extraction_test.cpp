@@ -28,7 +28,7 @@ constexpr std::string_view kPrefix = "com.norba.massStorage.NANDInfo.";
 struct FullDevice : StorageDevice {
   FullDevice() : StorageDevice(support::kQRT3) {
     setCounters({"magazineFWVersion", {1, 2, 3}});
-    for (const std::uint32_t msp : {0, 1}) {
+    for (const std::uint32_t msp : {0U, 1U}) {
       registry.alwaysTunnels(9, 221, msp, support::records({{0x1000, 4, {msp + 12345}}}));
     }
     registry.add(
@@ -39,7 +39,7 @@ struct FullDevice : StorageDevice {
 
   void setCounters(const support::FTLFields::value_type& version) {
     setStatistics({version, {"hostWrites", {1234567891}}, {"vcurve", std::vector<u64>(32, 1)}});
-    for (const std::uint32_t hours : {0, 4, 8, 12, 16, 20, 24, 168, 720}) {
+    for (const std::uint32_t hours : {0U, 4U, 8U, 12U, 16U, 20U, 24U, 168U, 720U}) {
       setSnapshot(hours, {version,
                           {"magazineInstanceMeta", {(u64{4000000} - hours * 3600) << 24}},
                           {"hostWrites", {5000 - hours}},

@@ -183,7 +183,7 @@ TEST(Magazine, WalksSixWindowsOfFourHours) {
   EXPECT_EQ(CopySMagNANDFTLCustomHistoryInfo(device.platform, 1), Dictionary());
   device.setSnapshot(0, snapshotAt(kDay, {}, false));
   support::freshErrors();
-  for (const std::uint32_t skips : {0, 1}) {
+  for (const std::uint32_t skips : {0U, 1U}) {
     EXPECT_EQ(CopySMagNANDFTLCustomHistoryInfo(device.platform, skips),
               (Dictionary{{kNANDInfoErrorMessageKey, "Stat Magazine not supported"}}));
   }

@@ -166,7 +166,7 @@ TEST(TelemetryList, ChannelsAreConvertedAsChipAndVendorSay) {
 TEST(DefectsList, HoldsTheRecordsThatAreClaimedAndFit) {
   Bytes bytes = support::defectsList(
       7, {{0xABCD1234, 1, 2, 3, 0x80000000, 5, 0xFFFFFFF6, 2}, {0, 9, 9, 9, 9, 9, 9, 9}});
-  for (const std::size_t count : {0, 1, 3}) {
+  for (const unsigned count : {0U, 1U, 3U}) {
     bytes[8] = static_cast<std::byte>(count);
     EXPECT_EQ(DefectsList::parse(bytes)->size(), std::min<std::size_t>(count, 2));
   }

@@ -25,7 +25,7 @@ constexpr char kNextEvent[] = "kern.next_ecc_event";
 // An event of which every data entry is its index, plus one.
 support::Bytes event(std::uint8_t id, std::uint8_t count) {
   support::Bytes bytes;
-  support::put(bytes, id | count << 8 | 0xFFFF0000U, 8);
+  support::put(bytes, id | std::uint32_t{count} << 8 | 0xFFFF0000U, 8);
   for (std::uint64_t i = 1; i <= 8; ++i) support::put(bytes, i, 8);
   return bytes;
 }
@@ -85,7 +85,7 @@ TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReports
   EXPECT_EQ(platform.log.count(kFailure), 1);
 
   addController();
-  for (const std::uint32_t method : {8, 9}) {
+  for (const std::uint32_t method : {8U, 9U}) {
     platform.registry.alwaysTunnels(method, 13, 0, support::words({support::header(1, 1), 7}));
   }
   Dictionary info = *NANDInfo::CopyNANDInfo(platform.platform);
@@ -102,7 +102,9 @@ TEST_F(DailyTelemetryTest, StorageHealthIsEveryNumberOfTheLibraryUnlessItReports
   // The day's dump of the lists sends no flag of its own beside the size query and the argument.
   Lines listCommands;
   for (const auto& input : platform.registry.inputs) {
-    const auto word = [&input](int i) { return std::to_string(std::to_integer<int>(input[i])); };
+    const auto word = [&input](std::size_t i) {
+      return std::to_string(std::to_integer<int>(input[i]));
+    };
     if (word(0) == "15" || word(0) == "17") listCommands.push_back(word(0) + "/" + word(4));
   }
   EXPECT_EQ(listCommands, (Lines{"17/1", "17/5", "17/9", "15/1"}));

@@ -25,8 +25,9 @@ inline Bytes ftlBuffer(const FTLFields& fields) {
   std::vector<std::uint64_t> all;
   for (const auto& [name, values] : fields) {
     const auto table = NANDInfo::FTLKeyTable();
-    const auto row = std::find_if(table.begin(), table.end(),
-                                  [&](const NANDInfo::FTLKey& key) { return name == key.name; });
+    const auto row =
+        std::find_if(table.begin(), table.end(),
+                     [wanted = name](const NANDInfo::FTLKey& key) { return wanted == key.name; });
     all.push_back(header(row->key, static_cast<std::uint32_t>(values.size())));
     all.insert(all.end(), values.begin(), values.end());
   }
@@ -51,7 +52,7 @@ struct StorageDevice : TestPlatform {
 
  private:
   void setBuffer(std::uint32_t opType, std::uint32_t argument, const FTLFields& fields) {
-    for (const std::uint32_t method : {8, 9}) {
+    for (const std::uint32_t method : {8U, 9U}) {
       registry.alwaysTunnels(method, opType, argument, ftlBuffer(fields));
     }
   }
