@@ -19,6 +19,7 @@
 #include "daemon/Tasking.h"
 #include "host/Host.h"
 #include "platform/CountersService.h"
+#include "platform/ServitaLogs.h"
 #include "platform/SystemLog.h"
 #include "report/PLReport.h"
 

@@ -187,7 +187,7 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
 
 using Fields = std::map<std::string, std::uint64_t>;
 
-Fields statisticsOf(const Sample& sample, unsigned hoursAgo) {
+Fields statisticsOf(const Sample& sample, int hoursAgo) {
   support::freshErrors();
   NANDInfo::GenericParserCxt context;
   const std::string bytes = ftlStatistics(Wear(sample, hoursAgo));
@@ -231,10 +231,11 @@ TEST(MkdeviceController, ItsCountersAgreeWithEachOtherAndOnlyGrow) {
     }
     const std::uint64_t formatted = newer.at("utilFormatTime");
     EXPECT_TRUE(formatted > 1'600'000'000 && formatted < newer.at("wallTime")) << formatted;
-    for (const unsigned hours : {4U, 24U, 168U, 720U}) {
+    for (const int hours : {4, 24, 168, 720}) {
       const Fields older = statisticsOf(sample, hours);
       EXPECT_LT(older.at("gcWrites"), newer.at("gcWrites"));
-      EXPECT_EQ(older.at("magazineInstanceMeta") >> 24, kToday * 86400ull - hours * 3600ull);
+      EXPECT_EQ(older.at("magazineInstanceMeta") >> 24,
+                kToday * 86400ull - static_cast<unsigned>(hours) * 3600ull);
       for (const auto& [name, value] : older) {
         EXPECT_TRUE(value <= newer.at(name) || name.starts_with("vcurve_")) << name;
       }

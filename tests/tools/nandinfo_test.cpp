@@ -398,7 +398,7 @@ TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
 TEST_F(Nandinfo, HandsItsOptionsOn) {
   device.registry.add({.className = support::kQRT3});
   device.setStatistics({{"hostWrites", {5000}}});
-  for (const std::uint32_t hours : {0, 4, 8, 12, 16, 20, 24, 168, 720}) {
+  for (const std::uint32_t hours : {0U, 4U, 8U, 12U, 16U, 20U, 24U, 168U, 720U}) {
     device.setSnapshot(hours,
                        {{"magazineFWVersion", {1, 2, 3}},
                         {"magazineInstanceMeta", {(std::uint64_t{4000000} - hours * 3600) << 24}},
