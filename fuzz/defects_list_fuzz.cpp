@@ -5,7 +5,7 @@
 #include <cstring>
 #include <span>
 
-#include "NANDInfo/decode/DefectsList.h"
+#include "NANDInfo/DefectsList.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   const auto list = NANDInfo::DefectsList::parse(std::as_bytes(std::span(bytes, size)));

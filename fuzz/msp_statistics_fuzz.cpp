@@ -1,10 +1,9 @@
 // MSP statistics.
 
-#include "CounterParser.h"
-#include "NANDInfo/Parsers.h"
+#include "CounterDecoder.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const auto bytes = std::as_bytes(std::span(data, size));
-  fuzz::checkCounterParser(NANDInfo::ZMCMSPParseBufferToCxt, bytes, 4);
+  fuzz::checkDecoder(NANDInfo::decodeMSP, bytes, 4);
   return 0;
 }

@@ -4,7 +4,7 @@
 #include <cstring>
 #include <span>
 
-#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/TelemetryList.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   constexpr std::uint64_t kVendors[] = {0x4582603A5700, 0x458260DE5700, 0xAD8252232100, 0};

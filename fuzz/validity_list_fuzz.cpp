@@ -4,7 +4,7 @@
 #include <cstring>
 #include <span>
 
-#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/ValidityList.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   const auto lists = NANDInfo::parseValidityList(std::as_bytes(std::span(bytes, size)));

@@ -11,12 +11,13 @@
 
 namespace NANDInfo {
 
-// The counter's low 32 bits as a signed number; none when the dictionary doesn't have it.
+// The number's low 32 bits as a signed number (a boolean is 0 or 1, a real is cut to a whole number
+// before); none when the dictionary doesn't have it.
 inline std::optional<std::int32_t> signed32(const plist::Dictionary& counters,
                                             std::string_view name) {
   const plist::Number* number = counters.number(name);
   if (number == nullptr) return std::nullopt;
-  return static_cast<std::int32_t>(static_cast<std::uint32_t>(number->uint64Value()));
+  return static_cast<std::int32_t>(static_cast<std::uint32_t>(number->int64Value()));
 }
 
 // The counter as a signed number; none when the dictionary doesn't have it.

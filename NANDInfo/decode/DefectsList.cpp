@@ -1,4 +1,4 @@
-#include "NANDInfo/decode/DefectsList.h"
+#include "NANDInfo/DefectsList.h"
 
 #include <algorithm>
 #include <array>

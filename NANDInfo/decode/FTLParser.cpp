@@ -1,11 +1,12 @@
+#include "NANDInfo/CounterDecoders.h"
+
 #include <algorithm>
 #include <array>
 #include <charconv>
 #include <string_view>
 
-#include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/KeyTables.h"
-#include "NANDInfo/Parsers.h"
+#include "NANDInfo/decode/Complaint.h"
 #include "NANDInfo/decode/FTLRecord.h"
 
 namespace NANDInfo {
@@ -54,73 +55,76 @@ class Name {
   char* end_ = text_.data();
 };
 
-// The number of values that count as added; none ends the parse.
+// Appends a record's fields. The number of values that count as added; none ends the decoding.
 using Added = std::optional<std::uint32_t>;
+using Add = Added(GenericParserCxt* context, const Record& record, Complaint& complaint);
 
-Added addUnderKey(GenericParserCxt* context, const Record& record) {
+Added addUnderKey(GenericParserCxt* context, const Record& record, Complaint& complaint) {
   Name name;
   name.append("Stat_").append(record.key).append(record.count > 1 ? "_" : "");
   if (!AddMultipleFieldsToGenericContext(context, name, record.values, kFTLValueSize,
                                          record.count)) {
-    SetAPIErrorMessage("ZMCFTLParseBufferToCxt %u: Cannot add %u elements to context", record.key,
-                       record.count);
+    complaint.say("ZMCFTLParseBufferToCxt %u: Cannot add %u elements to context", record.key,
+                  record.count);
     return std::nullopt;
   }
   return record.count;
 }
 
-Added addSingle(GenericParserCxt* context, const Record& record, const FTLKey& row) {
+Added addSingle(GenericParserCxt* context, const Record& record, const FTLKey& row,
+                Complaint& complaint) {
   if (!AddMultipleFieldsToGenericContext(context, row.name, record.values, kFTLValueSize, 1)) {
-    SetAPIErrorMessage("ZMCFTLParseBufferToCxt: %s(%u) cannot add 1 element to context", row.name,
-                       record.key);
+    complaint.say("ZMCFTLParseBufferToCxt: %s(%u) cannot add 1 element to context", row.name,
+                  record.key);
   }
   return 1;
 }
 
-Added addArray(GenericParserCxt* context, const Record& record, const FTLKey& row) {
+Added addArray(GenericParserCxt* context, const Record& record, const FTLKey& row,
+               Complaint& complaint) {
   const std::uint32_t configured = row.elements;
   if (record.count != configured) {
-    SetAPIErrorMessage("ZMCFTLParseBufferToCxt: %s(%u): (#%u) cfg elements != (%u) buffer elements",
-                       row.name, record.key, configured, record.count);
+    complaint.say("ZMCFTLParseBufferToCxt: %s(%u): (#%u) cfg elements != (%u) buffer elements",
+                  row.name, record.key, configured, record.count);
   }
   const std::uint32_t count = std::min(record.count, configured);
   Name name;
   name.append(row.name).append("_");
   if (!AddMultipleFieldsToGenericContext(context, name, record.values, kFTLValueSize, count)) {
-    SetAPIErrorMessage("ZMCFTLParseBufferToCxt: %s(%u): Cannot add %u elements to context",
-                       row.name, record.key, configured);
+    complaint.say("ZMCFTLParseBufferToCxt: %s(%u): Cannot add %u elements to context", row.name,
+                  record.key, configured);
     return std::nullopt;
   }
   return count;
 }
 
-Added addUnderName(GenericParserCxt* context, const Record& record) {
+Added addUnderName(GenericParserCxt* context, const Record& record, Complaint& complaint) {
   const FTLKey* row = findFTLKey(record.key);
-  if (row == nullptr) return addUnderKey(context, record);
-  return row->elements == 1 ? addSingle(context, record, *row) : addArray(context, record, *row);
+  if (row == nullptr) return addUnderKey(context, record, complaint);
+  return row->elements == 1 ? addSingle(context, record, *row, complaint)
+                            : addArray(context, record, *row, complaint);
 }
 
-std::uint32_t parse(GenericParserCxt* context, std::span<const std::byte> buffer,
-                    Added (*add)(GenericParserCxt* context, const Record& record)) {
+Decoded decode(std::span<const std::byte> buffer, GenericParserCxt* context, Add* add) {
   base::ByteReader words(buffer);
   std::uint32_t total = 0;
+  Complaint complaint;
   while (const auto record = nextRecord(words)) {
-    const Added added = add(context, *record);
+    const Added added = add(context, *record, complaint);
     if (!added) break;
     total += *added;
   }
-  return total;
+  return {total, complaint.text()};
 }
 
 }  // namespace
 
-std::uint32_t ZMCFTLParseBufferToCxt(GenericParserCxt* context, std::span<const std::byte> buffer) {
-  return parse(context, buffer, addUnderName);
+Decoded decodeFTL(std::span<const std::byte> buffer, GenericParserCxt* context) {
+  return decode(buffer, context, addUnderName);
 }
 
-std::uint32_t ZMCFTLParseStatKeyBufferToCxt(GenericParserCxt* context,
-                                            std::span<const std::byte> buffer) {
-  return parse(context, buffer, addUnderKey);
+Decoded decodeFTLByKey(std::span<const std::byte> buffer, GenericParserCxt* context) {
+  return decode(buffer, context, addUnderKey);
 }
 
 }  // namespace NANDInfo

@@ -1,7 +1,8 @@
+#include "NANDInfo/CounterDecoders.h"
+
 #include <algorithm>
 
 #include "NANDInfo/KeyTables.h"
-#include "NANDInfo/Parsers.h"
 #include "NANDInfo/decode/FTLRecord.h"
 
 namespace NANDInfo {
@@ -70,33 +71,26 @@ void addArray(LegacyNandInfoCxt& context, const FTLKey& row, std::span<const std
 
 }  // namespace
 
-bool ZMCParseBufferToCxt(LegacyNandInfoCxt* context, std::span<const std::byte> buffer) {
-  if (context == nullptr) return false;
-  context->driverVersion = 0xFFFFFFFF;
+bool decodeLegacy(std::span<const std::byte> buffer, LegacyNandInfoCxt& context) {
+  context.driverVersion = 0xFFFFFFFF;
   base::ByteReader words(buffer);
   bool hasHeader = false;
   while (const auto header = readFTLHeader(words)) {
     hasHeader = true;
     const auto values = takeFTLValues(words, *header);
     if (header->key > kLargestFTLKey || !values) {
-      context->exportVersion = 0;
+      context.exportVersion = 0;
       return false;
     }
     const FTLKey* row = findFTLKey(header->key);
     if (row == nullptr || header->count == 0) continue;
     if (row->elements == 1) {
-      addSingle(*context, *row, valueAt(*values, 0));
+      addSingle(context, *row, valueAt(*values, 0));
     } else {
-      addArray(*context, *row, *values, std::min<std::uint32_t>(header->count, row->elements));
+      addArray(context, *row, *values, std::min<std::uint32_t>(header->count, row->elements));
     }
   }
   return hasHeader;
-}
-
-void ZMCReleaseContext(LegacyNandInfoCxt* context) {
-  if (context == nullptr) return;
-  context->fields.release();
-  *context = LegacyNandInfoCxt{.fields = std::move(context->fields)};
 }
 
 }  // namespace NANDInfo

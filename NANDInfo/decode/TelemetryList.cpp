@@ -1,9 +1,10 @@
-#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/TelemetryList.h"
 
 #include <algorithm>
 #include <iterator>
 #include <string>
 
+#include "NANDInfo/decode/Hex.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
 
@@ -79,6 +80,14 @@ ChipKind chipKind(std::string_view chipIdentifier) {
   if (chipIdentifier == "QM7") return ChipKind::QM7;
   if (chipIdentifier == "QM8") return ChipKind::QM8;
   return ChipKind::other;
+}
+
+Vendor vendorOf(std::string_view manufacturerIdentifier) {
+  const HexNumber high = hexNumber(manufacturerIdentifier.substr(0, 4));
+  const HexNumber low = hexNumber(
+      manufacturerIdentifier.substr(std::min<std::size_t>(4, manufacturerIdentifier.size())));
+  return {std::uint64_t{high.value & 0xFFFF} << 32 | (low.value & 0xFFFFFF00),
+          high.complaint + low.complaint};
 }
 
 CounterConverter* counterConverter(ChipKind chip, std::uint64_t vendor) {

@@ -1,11 +1,10 @@
 #include "NANDInfo/Utilities.h"
 
-#include <algorithm>
 #include <cstring>
 #include <optional>
-#include <string>
 
 #include "NANDInfo/Services.h"
+#include "NANDInfo/decode/Hex.h"
 #include "platform/StandardStreams.h"
 #include "platform/SystemLog.h"
 
@@ -72,29 +71,15 @@ void addEntries(const plist::Dictionary& entries, plist::Dictionary& target) {
 }
 
 std::uint8_t hexStringToByte(const Services& services, std::string_view text) {
-  unsigned byte = 0;
-  for (const char given : text.substr(0, 2)) {
-    const char character = given >= 'A' && given <= 'Z' ? static_cast<char>(given + 32) : given;
-    byte *= 16;
-    if (character >= '0' && character <= '9') {
-      byte += static_cast<unsigned>(character - '0');
-    } else if (character >= 'a' && character <= 'f') {
-      byte += static_cast<unsigned>(character - 'a' + 10);
-    } else {
-      services.streams.writeOutput(std::string("unrecognized hex character: ") + character);
-    }
-  }
-  return static_cast<std::uint8_t>(byte);
+  const HexNumber byte = hexByte(text);
+  services.streams.writeOutput(byte.complaint);
+  return static_cast<std::uint8_t>(byte.value);
 }
 
 std::uint32_t hexStringToInt32(const Services& services, std::string_view text) {
-  text = text.substr(0, 8);
-  std::uint32_t number = 0;
-  // A lone digit at the end is the lowest byte by itself.
-  for (; !text.empty(); text.remove_prefix(std::min<std::size_t>(text.size(), 2))) {
-    number |= std::uint32_t{hexStringToByte(services, text)} << 8 * ((text.size() - 1) / 2);
-  }
-  return number;
+  const HexNumber number = hexNumber(text);
+  services.streams.writeOutput(number.complaint);
+  return number.value;
 }
 
 }  // namespace NANDInfo

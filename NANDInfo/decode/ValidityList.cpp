@@ -1,4 +1,4 @@
-#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/ValidityList.h"
 
 #include <cstdint>
 

@@ -1,18 +1,17 @@
 #include "NANDInfo/deliver/ListHandlers.h"
 
-#include <algorithm>
 #include <cstdint>
 #include <optional>
 #include <string>
 #include <utility>
 
+#include "NANDInfo/DefectsList.h"
 #include "NANDInfo/NANDLogWriter.h"
 #include "NANDInfo/Services.h"
 #include "NANDInfo/StructuredLogs.h"
-#include "NANDInfo/Utilities.h"
-#include "NANDInfo/decode/DefectsList.h"
-#include "NANDInfo/decode/TelemetryList.h"
-#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
+#include "NANDInfo/decode/Counters.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
 #include "base/Text.h"
 #include "platform/FaultwatchSupport.h"
@@ -33,12 +32,6 @@ bool refuse(const Services& services, const std::string& message) {
   return false;
 }
 
-std::optional<std::int32_t> signed32(const Dictionary& dictionary, std::string_view key) {
-  const plist::Number* number = dictionary.number(key);
-  if (number == nullptr) return std::nullopt;
-  return static_cast<std::int32_t>(number->int64Value());
-}
-
 // The text of a characteristic; null, with a message, when it is missing or no text.
 const std::string* characteristic(const Services& services, const Dictionary& device,
                                   const char* key) {
@@ -51,13 +44,6 @@ const std::string* characteristic(const Services& services, const Dictionary& de
 }
 
 }  // namespace
-
-std::uint64_t vendorCode(const Services& services, std::string_view identifier) {
-  const auto high = hexStringToInt32(services, identifier.substr(0, 4)) & 0xFFFF;
-  const auto low =
-      hexStringToInt32(services, identifier.substr(std::min<std::size_t>(4, identifier.size())));
-  return std::uint64_t{high} << 32 | (low & 0xFFFFFF00);
-}
 
 bool DumpValidityList(const Services& services, std::span<const std::byte> list,
                       const plist::Value&, std::string_view) {
@@ -92,7 +78,8 @@ bool DumpTelemetryList(const Services& services, std::span<const std::byte> list
   }
   const std::string* vendorId = characteristic(services, *device, "manufacturer-id");
   if (vendorId == nullptr) return false;
-  const std::uint64_t vendor = vendorCode(services, *vendorId);
+  const Vendor vendor = vendorOf(*vendorId);
+  services.streams.writeOutput(vendor.complaint);
   const auto count = signed32(*device, "num-bus");
   if (!count) return refuse(services, "ERROR: could not determine the number of channels\n");
   const auto channels = parseTelemetryList(list, *count);
@@ -102,7 +89,7 @@ bool DumpTelemetryList(const Services& services, std::span<const std::byte> list
   const ChipKind chip = chipKind(*chipId);
   for (const TelemetryChannel& channel : *channels) {
     services.faultwatch.logStructuredData(
-        kStorageLogType, telemetryLog(channel, chip, counterConverter(chip, vendor)));
+        kStorageLogType, telemetryLog(channel, chip, counterConverter(chip, vendor.code)));
   }
   return true;
 }

@@ -27,10 +27,6 @@ ListHandler DumpValidityList;
 // A structured-data log for each channel.
 ListHandler DumpTelemetryList;
 
-// The vendor that a "manufacturer-id" names: its first six bytes but the lowest, in the order in
-// which they are read.
-std::uint64_t vendorCode(const Services& services, std::string_view identifier);
-
 // A structured-data log for the list, and one for each defect.
 ListHandler DumpDefectsList;
 

@@ -11,10 +11,10 @@
 #include <limits>
 #include <string>
 
+#include "NANDInfo/DefectsList.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
 #include "NANDInfo/collect/WriteAmplification.h"
-#include "NANDInfo/decode/DefectsList.h"
-#include "NANDInfo/decode/TelemetryList.h"
-#include "NANDInfo/decode/ValidityList.h"
 #include "NANDInfo/deliver/ListHandlers.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
 #include "support/ControllerLists.h"

@@ -7,7 +7,7 @@
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
 #include "NANDInfo/StructuredLogs.h"
-#include "NANDInfo/decode/TelemetryList.h"
+#include "NANDInfo/TelemetryList.h"
 #include "base/Text.h"
 #include "host/Host.h"
 #include "platform/PreferenceStore.h"

@@ -4,11 +4,10 @@
 #include <optional>
 #include <string_view>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/decode/DefectsList.h"
-#include "NANDInfo/decode/ProcessState.h"
-#include "NANDInfo/decode/TelemetryList.h"
-#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/DefectsList.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
 #include "base/UTF8.h"
@@ -47,20 +46,19 @@ bool isPropertyList(Bytes bytes) {
          (isText(bytes) && text.substr(0, 1024).find("<plist") != std::string_view::npos);
 }
 
-// What a parser makes of the bytes without any complaint.
-template <auto parse>
-std::optional<GenericParserCxt> parsedWithoutComplaint(Bytes bytes) {
-  const NANDInfo::APIErrorScope errors;
+// What a decoder makes of the bytes without any complaint.
+template <auto decode>
+std::optional<GenericParserCxt> decodedWithoutComplaint(Bytes bytes) {
   GenericParserCxt fields;
-  const bool parsed =
-      parse(&fields, bytes) > 0 && NANDInfo::GetAPIErrorMessage() == std::string_view("NA");
-  return parsed ? std::optional(std::move(fields)) : std::nullopt;
+  const NANDInfo::Decoded decoded = decode(bytes, &fields);
+  const bool whole = decoded.values > 0 && decoded.complaint.empty();
+  return whole ? std::optional(std::move(fields)) : std::nullopt;
 }
 
 // Most fields have a name of their own, and the fields take up the bytes.
 bool isFTLStatistics(Bytes bytes) {
   constexpr std::size_t kLargestField = 16;  // a header and one value
-  const auto fields = parsedWithoutComplaint<NANDInfo::ZMCFTLParseBufferToCxt>(bytes);
+  const auto fields = decodedWithoutComplaint<NANDInfo::decodeFTL>(bytes);
   if (!fields || fields->size() * kLargestField < bytes.size()) return false;
   std::size_t named = 0;
   for (std::size_t i = 0; i < fields->size(); ++i) {
@@ -71,7 +69,7 @@ bool isFTLStatistics(Bytes bytes) {
 
 bool isMSPStatistics(Bytes bytes) {
   constexpr std::size_t kLargestField = 12;
-  const auto fields = parsedWithoutComplaint<NANDInfo::ZMCMSPParseBufferToCxt>(bytes);
+  const auto fields = decodedWithoutComplaint<NANDInfo::decodeMSP>(bytes);
   return fields && fields->size() * kLargestField >= bytes.size();
 }
 

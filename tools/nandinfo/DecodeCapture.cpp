@@ -7,10 +7,10 @@
 #include <string_view>
 
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/decode/TelemetryList.h"
-#include "NANDInfo/deliver/ListHandlers.h"
+#include "NANDInfo/TelemetryList.h"
 #include "base/Text.h"
 #include "host/files/DeviceRoot.h"
+#include "platform/StandardStreams.h"
 #include "plist/PropertyList.h"
 #include "tools/nandinfo/DecodedBuffer.h"
 
@@ -76,9 +76,10 @@ Characteristics characteristicsOf(const NANDInfo::Services& services,
       properties != nullptr ? properties->dictionary(controller.propertyKey) : nullptr;
   if (device == nullptr) device = &kNone;
   const std::string *chip = device->text("chip-id"), *vendor = device->text("manufacturer-id");
+  const auto maker = vendor != nullptr ? NANDInfo::vendorOf(*vendor) : NANDInfo::Vendor();
+  services.streams.writeOutput(maker.complaint);
   auto* const convert =
-      NANDInfo::counterConverter(NANDInfo::chipKind(chip != nullptr ? *chip : ""),
-                                 vendor != nullptr ? NANDInfo::vendorCode(services, *vendor) : 0);
+      NANDInfo::counterConverter(NANDInfo::chipKind(chip != nullptr ? *chip : ""), maker.code);
   const auto layouts = counterLayouts();
   const auto layout = std::find_if(layouts.begin(), layouts.end(),
                                    [&](const CounterLayout& row) { return row.parse == convert; });

@@ -6,12 +6,11 @@
 #include <utility>
 #include <vector>
 
-#include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/DefectsList.h"
 #include "NANDInfo/SnapshotReader.h"
-#include "NANDInfo/decode/DefectsList.h"
-#include "NANDInfo/decode/ProcessState.h"
-#include "NANDInfo/decode/TelemetryList.h"
-#include "NANDInfo/decode/ValidityList.h"
+#include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/ValidityList.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
 #include "tools/nandinfo/BufferKind.h"
@@ -37,23 +36,22 @@ Dictionary whole(const Dictionary& content, bool ok, const std::string& error) {
 
 Dictionary refused(const std::string& why) { return whole({{"fields", Array{}}}, false, why); }
 
-Dictionary withFields(const GenericParserCxt& context, bool ok) {
+Dictionary withFields(const GenericParserCxt& context, bool ok, const std::string& complaint) {
   Array fields;
   fields.reserve(context.size());
   for (std::size_t i = 0; i < context.size(); ++i) {
     const GenericParserCxt::Field field = context[i];
     fields.push_back(Array{Value(field.name), Value(field.value)});
   }
-  return whole({{"fields", std::move(fields)}}, ok, NANDInfo::GetAPIErrorMessage());
+  return whole({{"fields", std::move(fields)}}, ok, complaint.empty() ? "NA" : complaint);
 }
 
-template <auto parse>
-Dictionary parsed(BufferKind kind, Bytes bytes) {
+template <auto decode>
+Dictionary decoded(BufferKind kind, Bytes bytes) {
   if (const std::string why = whyNot(kind, bytes); !why.empty()) return refused(why);
   GenericParserCxt context;
-  const NANDInfo::APIErrorScope errors;
-  const bool ok = parse(&context, bytes) > 0;
-  return withFields(context, ok);
+  const NANDInfo::Decoded outcome = decode(bytes, &context);
+  return withFields(context, outcome.values > 0, outcome.complaint);
 }
 
 std::string typeName(std::uint32_t type) {
@@ -109,23 +107,22 @@ constexpr CounterLayout kLayouts[] = {
 }  // namespace
 
 Dictionary decodedFTL(Bytes bytes) {
-  return parsed<NANDInfo::ZMCFTLParseBufferToCxt>(BufferKind::FTLStatistics, bytes);
+  return decoded<NANDInfo::decodeFTL>(BufferKind::FTLStatistics, bytes);
 }
 
 Dictionary decodedFTLStat(Bytes bytes) {
-  return parsed<NANDInfo::ZMCFTLParseStatKeyBufferToCxt>(BufferKind::FTLStatistics, bytes);
+  return decoded<NANDInfo::decodeFTLByKey>(BufferKind::FTLStatistics, bytes);
 }
 
 Dictionary decodedMSP(Bytes bytes) {
-  return parsed<NANDInfo::ZMCMSPParseBufferToCxt>(BufferKind::MSPStatistics, bytes);
+  return decoded<NANDInfo::decodeMSP>(BufferKind::MSPStatistics, bytes);
 }
 
 Dictionary decodedLegacy(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::FTLStatistics, bytes); !why.empty()) return refused(why);
   NANDInfo::LegacyNandInfoCxt context;
-  const NANDInfo::APIErrorScope errors;
-  const bool ok = NANDInfo::ZMCParseBufferToCxt(&context, bytes);
-  return withFields(context.fields, ok);
+  const bool ok = NANDInfo::decodeLegacy(bytes, context);
+  return withFields(context.fields, ok, {});
 }
 
 Dictionary decodedValidity(Bytes bytes) {

@@ -6,13 +6,15 @@
 #include <cstdint>
 #include <optional>
 #include <span>
+#include <string>
 #include <string_view>
 #include <vector>
 
 #include "NANDInfo/CounterRecords.h"
+#include "base/Exported.h"
 #include "plist/Value.h"
 
-namespace NANDInfo {
+namespace MORVEND_EXPORTED NANDInfo {
 
 inline constexpr std::size_t kTelemetrySummarySize = 32;
 
@@ -28,6 +30,14 @@ std::optional<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const 
 
 enum class ChipKind : std::uint8_t { other, QM7, QM8 };
 ChipKind chipKind(std::string_view chipIdentifier);
+
+// The chips' maker, of which the list's reader is told by a "manufacturer-id": its first six bytes
+// but the lowest, in the order in which they are read.
+struct Vendor {
+  std::uint64_t code = 0;
+  std::string complaint;  // of characters that aren't hexadecimal, for standard output
+};
+Vendor vendorOf(std::string_view manufacturerIdentifier);
 
 // The converter of the counter blocks; the vendor (48 bits) tells only on other chips.
 using CounterConverter = void(CounterBlock block, NandCountersRecord& record);

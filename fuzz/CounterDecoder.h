@@ -1,4 +1,4 @@
-// What holds of every parser of counter buffers, whatever the bytes.
+// What holds of every decoder of counter buffers, whatever the bytes.
 #pragma once
 
 #include <cstddef>
@@ -11,9 +11,8 @@
 #include <utility>
 #include <vector>
 
-#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/CounterDecoders.h"
 #include "NANDInfo/GenericParserContext.h"
-#include "NANDInfo/decode/ProcessState.h"
 
 namespace fuzz {
 
@@ -41,15 +40,14 @@ inline bool isSubsequence(const Fields& some, const Fields& all) {
   return true;
 }
 
-// Parses twice, and once more with little memory, and returns the fields. Elements are at least
+// Decodes twice, and once more with little memory, and returns the fields. Elements are at least
 // `narrowest` bytes wide.
-template <typename Parse>
-Fields checkCounterParser(Parse parse, std::span<const std::byte> bytes, std::size_t narrowest) {
+template <typename Decode>
+Fields checkDecoder(Decode decode, std::span<const std::byte> bytes, std::size_t narrowest) {
   const auto run = [&](std::pmr::memory_resource* memory) {
-    const NANDInfo::APIErrorScope errors;
     NANDInfo::GenericParserCxt context(memory);
-    const std::uint32_t total = parse(&context, bytes);
-    return std::tuple(total, fieldsOf(context), std::string(NANDInfo::GetAPIErrorMessage()));
+    const NANDInfo::Decoded decoded = decode(bytes, &context);
+    return std::tuple(decoded.values, fieldsOf(context), decoded.complaint);
   };
   const auto [total, fields, message] = run(std::pmr::new_delete_resource());
   require(fields.size() <= bytes.size() / narrowest);

@@ -10,9 +10,10 @@
 #include <optional>
 #include <span>
 
+#include "base/Exported.h"
 #include "plist/Value.h"
 
-namespace NANDInfo {
+namespace MORVEND_EXPORTED NANDInfo {
 
 using ValidityLists = std::array<plist::Array, 16>;
 

@@ -9,9 +9,10 @@
 #include <optional>
 #include <span>
 
+#include "base/Exported.h"
 #include "plist/Value.h"
 
-namespace NANDInfo {
+namespace MORVEND_EXPORTED NANDInfo {
 
 struct Defect {
   std::uint16_t bus, CE;
