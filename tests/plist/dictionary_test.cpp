@@ -5,13 +5,13 @@
 
 #include "plist/Value.h"
 
-namespace platform {
+namespace plist {
 namespace {
 
 // The growth of the index, removals, replacements and copies, beside a plain list of pairs.
 TEST(Dictionary, KeepsOrderAndFindsEveryKeyWhateverIsDoneToIt) {
   std::mt19937 random(1);
-  plist::Dictionary dictionary;
+  Dictionary dictionary;
   std::vector<std::pair<std::string, std::int64_t>> expected;
   for (std::int64_t step = 0; step < 4000; ++step) {
     const std::string key(1 + random() % 12, static_cast<char>('a' + random() % 26));
@@ -19,19 +19,19 @@ TEST(Dictionary, KeepsOrderAndFindsEveryKeyWhateverIsDoneToIt) {
                                     [&](const auto& entry) { return entry.first == key; });
     if (random() % 200 == 0) {
       const std::int64_t dropped = step % 3;
-      dictionary.keepIf([&](std::string_view, plist::Value& value) {
-        const std::int64_t number = value.as<plist::Number>()->int64Value();
+      dictionary.keepIf([&](std::string_view, Value& value) {
+        const std::int64_t number = value.as<Number>()->int64Value();
         value = number + 1;
         return number % 3 != dropped;
       });
       std::erase_if(expected, [&](const auto& entry) { return entry.second % 3 == dropped; });
       for (auto& entry : expected) ++entry.second;
-      dictionary = plist::Dictionary(dictionary);
+      dictionary = Dictionary(dictionary);
     } else if (random() % 4 == 0) {
       EXPECT_EQ(dictionary.remove(key), found != expected.end());
       if (found != expected.end()) expected.erase(found);
     } else {
-      EXPECT_EQ(dictionary.set(key, step), plist::Value(step));
+      EXPECT_EQ(dictionary.set(key, step), Value(step));
       if (found != expected.end()) {
         found->second = step;
       } else {
@@ -39,7 +39,7 @@ TEST(Dictionary, KeepsOrderAndFindsEveryKeyWhateverIsDoneToIt) {
       }
     }
     ASSERT_EQ(dictionary.size(), expected.size());
-    const plist::Number* number = dictionary.number(key);
+    const Number* number = dictionary.number(key);
     ASSERT_EQ(number != nullptr, std::any_of(expected.begin(), expected.end(),
                                              [&](const auto& e) { return e.first == key; }));
   }
@@ -47,18 +47,18 @@ TEST(Dictionary, KeepsOrderAndFindsEveryKeyWhateverIsDoneToIt) {
   std::size_t i = 0;
   for (const auto& [key, value] : dictionary) {
     EXPECT_EQ(key, expected[i].first);
-    EXPECT_EQ(value, plist::Value(expected[i].second));
+    EXPECT_EQ(value, Value(expected[i].second));
     ++i;
   }
 }
 
 TEST(Dictionary, EqualityIgnoresOrderAndNothingElse) {
-  const plist::Dictionary ab{{"a", 1}, {"b", 2}}, ba{{"b", 2}, {"a", 1}};
+  const Dictionary ab{{"a", 1}, {"b", 2}}, ba{{"b", 2}, {"a", 1}};
   EXPECT_EQ(ab, ba);
-  EXPECT_FALSE(ab == (plist::Dictionary{{"a", 1}, {"b", 3}}));
-  EXPECT_FALSE(ab == (plist::Dictionary{{"a", 1}, {"c", 2}}));
-  EXPECT_FALSE(ab == (plist::Dictionary{{"a", 1}}));
+  EXPECT_FALSE(ab == (Dictionary{{"a", 1}, {"b", 3}}));
+  EXPECT_FALSE(ab == (Dictionary{{"a", 1}, {"c", 2}}));
+  EXPECT_FALSE(ab == (Dictionary{{"a", 1}}));
 }
 
 }  // namespace
-}  // namespace platform
+}  // namespace plist

@@ -10,10 +10,17 @@
 namespace host {
 namespace {
 
+using plist::Array;
+using plist::Data;
+using plist::Date;
+using plist::Dictionary;
+using plist::Number;
+using plist::Value;
+
 using support::BinaryPropertyList;
 using namespace std::string_view_literals;
 
-base::Result<plist::Value> readObject(std::string_view object) {
+base::Result<Value> readObject(std::string_view object) {
   BinaryPropertyList list;
   const std::size_t top = list.object(object);
   return plist::readBinary(list.finish(top));
@@ -23,7 +30,7 @@ TEST(PropertyListBinary, ReadsEveryObject) {
   const double infinity = std::numeric_limits<double>::infinity();
   struct Row {
     std::string_view object;
-    plist::Value value;
+    Value value;
   };
   for (const Row& row : {
            Row{"\x08"sv, false},
@@ -37,8 +44,8 @@ TEST(PropertyListBinary, ReadsEveryObject) {
            Row{"\x14\xFF\xFF\xFF\xFF\xFF\xFF\xFF\xFF\x80\0\0\0\0\0\0\0"sv, INT64_MIN},
            Row{"\x22\x3F\0\0\0"sv, 0.5f},
            Row{"\x23\xFF\xF0\0\0\0\0\0\0"sv, -infinity},
-           Row{"\x33\0\0\0\0\0\0\0\0"sv, plist::Date{978307200}},
-           Row{"\x42\0\xFF"sv, plist::Data{0, 255}},
+           Row{"\x33\0\0\0\0\0\0\0\0"sv, Date{978307200}},
+           Row{"\x42\0\xFF"sv, Data{0, 255}},
            Row{"\x52hi"sv, "hi"},
            Row{"\x5F\x10\x10zero123456789abcdef"sv.substr(0, 19), "zero123456789abc"},
            Row{"\x5F\x11\0\x01z"sv, "z"},
@@ -51,18 +58,17 @@ TEST(PropertyListBinary, ReadsEveryObject) {
            Row{"\x61\xD8\x3D"sv, "\xEF\xBF\xBD"},
            Row{"\x53\x01\t\x7F"sv, "\xEF\xBF\xBD\t\x7F"},
            Row{"\x62\0\x1F\xFF\xFF"sv, "\xEF\xBF\xBD\xEF\xBF\xBD"},
-           Row{"\xA0"sv, plist::Array{}},
-           Row{"\xD0"sv, plist::Dictionary{}},
+           Row{"\xA0"sv, Array{}},
+           Row{"\xD0"sv, Dictionary{}},
        }) {
-    const base::Result<plist::Value> result = readObject(row.object);
+    const base::Result<Value> result = readObject(row.object);
     ASSERT_TRUE(result) << plist::description(row.value) << ": " << result.error().text;
     EXPECT_TRUE(*result == row.value)
         << plist::description(*result) << " " << plist::description(row.value);
     EXPECT_EQ(result->variant().index(), row.value.variant().index());
   }
-  EXPECT_EQ(readObject("\x22\x3F\0\0\0"sv)->as<plist::Number>()->type(),
-            plist::Number::Type::float32);
-  EXPECT_EQ(readObject("\x10\x01"sv)->as<plist::Number>()->type(), plist::Number::Type::int64);
+  EXPECT_EQ(readObject("\x22\x3F\0\0\0"sv)->as<Number>()->type(), Number::Type::float32);
+  EXPECT_EQ(readObject("\x10\x01"sv)->as<Number>()->type(), Number::Type::int64);
 }
 
 TEST(PropertyListBinary, RefusesOtherObjectsAndSaysWhereAndWhy) {
@@ -88,7 +94,7 @@ TEST(PropertyListBinary, RefusesOtherObjectsAndSaysWhereAndWhy) {
         "\xDF\x13\x40\0\0\0\0\0\0\0"sv, "\xAF\x12\x7F\xFF\xFF\xFF"sv, "\xA1\0"sv, "\xD1\0\0\0"sv}}};
   for (const auto& [why, objects] : refused) {
     for (const std::string_view object : objects) {
-      const base::Result<plist::Value> result = readObject(object);
+      const base::Result<Value> result = readObject(object);
       EXPECT_FALSE(result) << plist::description(*result);
       EXPECT_TRUE(
           result.error().text.starts_with(std::string("binary property list, offset 8: ") + why))
@@ -104,7 +110,7 @@ TEST(PropertyListBinary, AcceptsEveryWidthOfReferences) {
     BinaryPropertyList list(width);
     const std::size_t one = list.add(1), text = list.add("t");
     const std::size_t top = list.container(0xD, {text, one});
-    EXPECT_EQ(*plist::readBinary(list.finish(top)), plist::Value(plist::Dictionary{{"t", 1}}));
+    EXPECT_EQ(*plist::readBinary(list.finish(top)), Value(Dictionary{{"t", 1}}));
   }
 }
 
@@ -114,9 +120,8 @@ TEST(PropertyListBinary, KeysAreTextsAndTheLaterCounts) {
   const std::size_t twice = list.container(0xD, {key, key, one, two});
   const std::size_t asWritten = list.container(0xD, {list.add("\x01"), list.add("\xFF"), one, two});
   const std::size_t wrong = list.container(0xD, {one, key});
-  EXPECT_EQ(*plist::readBinary(list.finish(twice)), plist::Value(plist::Dictionary{{"k", 2}}));
-  EXPECT_EQ(*plist::readBinary(list.finish(asWritten)),
-            plist::Value(plist::Dictionary{{"\xEF\xBF\xBD", 2}}));
+  EXPECT_EQ(*plist::readBinary(list.finish(twice)), Value(Dictionary{{"k", 2}}));
+  EXPECT_EQ(*plist::readBinary(list.finish(asWritten)), Value(Dictionary{{"\xEF\xBF\xBD", 2}}));
   EXPECT_FALSE(plist::readBinary(list.finish(wrong)));
 }
 
@@ -153,9 +158,9 @@ TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
   }
   EXPECT_EQ(errorOf(laughs, top), "too many objects");
   const std::string text(1 << 20, 'x');
-  const plist::Data data(text.begin(), text.end());
+  const Data data(text.begin(), text.end());
   for (const auto& [kind, large] :
-       {std::pair<unsigned, plist::Value>{0xA, text}, {0xA, data}, {0xD, text}}) {
+       {std::pair<unsigned, Value>{0xA, text}, {0xA, data}, {0xD, text}}) {
     BinaryPropertyList list;
     const std::vector<std::size_t> many(100, list.add(large));
     EXPECT_EQ(errorOf(list, list.container(kind, many)), "too much text and data");
@@ -164,10 +169,10 @@ TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
 
 // Lying trailers, counts, offsets and references: each byte in turn gets other values.
 TEST(PropertyListBinary, SurvivesCutsAndAlterations) {
-  const plist::Value value = plist::Dictionary{
-      {"array", plist::Array{1, 0.5, "text that is longer than fifteen bytes", plist::Array{true}}},
-      {"data", plist::Data(20)},
-      {"date", plist::Date{0}}};
+  const Value value =
+      Dictionary{{"array", Array{1, 0.5, "text that is longer than fifteen bytes", Array{true}}},
+                 {"data", Data(20)},
+                 {"date", Date{0}}};
   const std::string whole = BinaryPropertyList::of(value);
   ASSERT_EQ(*plist::read(whole), value);
   for (std::size_t length = 6; length < whole.size(); ++length) {
@@ -178,7 +183,7 @@ TEST(PropertyListBinary, SurvivesCutsAndAlterations) {
     for (const int byte : {0x00, 0x01, 0x0F, 0x10, 0x7F, 0x80, 0xA1, 0xD1, 0xFF}) {
       std::string altered = whole;
       altered[i] = static_cast<char>(byte);
-      const base::Result<plist::Value> result = plist::read(altered);
+      const base::Result<Value> result = plist::read(altered);
       EXPECT_TRUE(!result || plist::read(*plist::writeXML(*result))) << i;
     }
   }

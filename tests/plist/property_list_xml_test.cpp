@@ -9,17 +9,24 @@
 namespace host {
 namespace {
 
+using plist::Array;
+using plist::Data;
+using plist::Date;
+using plist::Dictionary;
+using plist::Number;
+using plist::Value;
+
 std::string document(std::string_view content) {
   return "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<plist version=\"1.0\">" +
          std::string(content) + "</plist>\n";
 }
 
-base::Result<plist::Value> read(std::string_view bytes) { return plist::read(bytes); }
-base::Result<std::string> write(const plist::Value& value) { return plist::writeXML(value); }
+base::Result<Value> read(std::string_view bytes) { return plist::read(bytes); }
+base::Result<std::string> write(const Value& value) { return plist::writeXML(value); }
 
-plist::Value nested(int depth) {
-  plist::Value value = plist::Array();
-  for (int i = 1; i < depth; ++i) value = plist::Array{std::move(value)};
+Value nested(int depth) {
+  Value value = Array();
+  for (int i = 1; i < depth; ++i) value = Array{std::move(value)};
   return value;
 }
 
@@ -27,7 +34,7 @@ TEST(PropertyListXML, ReadsEveryForm) {
   const double infinity = std::numeric_limits<double>::infinity();
   struct Row {
     const char* content;
-    plist::Value value;
+    Value value;
   };
   for (const Row& row : {
            Row{"<true/>", true},
@@ -46,26 +53,24 @@ TEST(PropertyListXML, ReadsEveryForm) {
            Row{"<string/>", ""},
            Row{"<string> a&amp;&lt;&#65;&#x20AC;<!-- - --><![CDATA[<b>]]>\r\n</string>",
                " a&<A\xE2\x82\xAC<b>\n"},
-           Row{"<date>2026-11-22T04:00:00Z</date>", plist::Date{1795320000}},
-           Row{"<date>-0001-12-31T23:59:59Z</date>", plist::Date{-62167219201}},
-           Row{"<date>12000-02-29T00:00:00Z</date>", plist::Date{316521302400}},
-           Row{"<data/>", plist::Data{}},
-           Row{"<data>\n\tAA EC\n\tAwQ=\n</data>", plist::Data{0, 1, 2, 3, 4}},
-           Row{"<array> <array/>\n<dict/> </array>",
-               plist::Array{plist::Array{}, plist::Dictionary{}}},
+           Row{"<date>2026-11-22T04:00:00Z</date>", Date{1795320000}},
+           Row{"<date>-0001-12-31T23:59:59Z</date>", Date{-62167219201}},
+           Row{"<date>12000-02-29T00:00:00Z</date>", Date{316521302400}},
+           Row{"<data/>", Data{}},
+           Row{"<data>\n\tAA EC\n\tAwQ=\n</data>", Data{0, 1, 2, 3, 4}},
+           Row{"<array> <array/>\n<dict/> </array>", Array{Array{}, Dictionary{}}},
            Row{"<dict><key>a</key><integer>1</integer><key/><array/>"
                "<key>a</key><string>later</string></dict>",
-               plist::Dictionary{{"a", "later"}, {"", plist::Array{}}}},
+               Dictionary{{"a", "later"}, {"", Array{}}}},
        }) {
-    const base::Result<plist::Value> result = read(document(row.content));
+    const base::Result<Value> result = read(document(row.content));
     ASSERT_TRUE(result) << row.content << ": " << result.error().text;
     EXPECT_TRUE(*result == row.value) << row.content << ": " << plist::description(*result);
     EXPECT_EQ(result->variant().index(), row.value.variant().index()) << row.content;
   }
-  EXPECT_EQ(read(document("<integer>5</integer>"))->as<plist::Number>()->type(),
-            plist::Number::Type::int64);
-  EXPECT_EQ(read(document("<true/>"))->as<plist::Number>()->type(), plist::Number::Type::boolean);
-  EXPECT_TRUE(std::isnan(read(document("<real>NaN</real>"))->as<plist::Number>()->doubleValue()));
+  EXPECT_EQ(read(document("<integer>5</integer>"))->as<Number>()->type(), Number::Type::int64);
+  EXPECT_EQ(read(document("<true/>"))->as<Number>()->type(), Number::Type::boolean);
+  EXPECT_TRUE(std::isnan(read(document("<real>NaN</real>"))->as<Number>()->doubleValue()));
 }
 
 TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
@@ -101,7 +106,7 @@ TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
     for (const std::string content : bad) all.push_back(open + content + close);
   }
   for (const std::string& bad : all) {
-    const base::Result<plist::Value> result = read(document(std::string("<!-- -->\n") + bad));
+    const base::Result<Value> result = read(document(std::string("<!-- -->\n") + bad));
     EXPECT_FALSE(result) << bad;
     EXPECT_TRUE(result.error().text.starts_with("XML property list, line "))
         << bad << result.error().text;
@@ -116,7 +121,7 @@ TEST(PropertyListXML, RefusesEverythingElseAndSaysWhere) {
 
 TEST(PropertyListXML, IgnoresADoctypeButTakesNothingFromIt) {
   const std::string outside = "<!DOCTYPE plist SYSTEM \"file:///etc/passwd\">";
-  EXPECT_EQ(*read(outside + "<plist><string>&lt;</string></plist>"), plist::Value("<"));
+  EXPECT_EQ(*read(outside + "<plist><string>&lt;</string></plist>"), Value("<"));
   for (const std::string& hostile : {
            outside + "<plist><string>&outside;</string></plist>",
            outside + "<plist>&outside;<true/></plist>",
@@ -131,10 +136,10 @@ TEST(PropertyListXML, IgnoresADoctypeButTakesNothingFromIt) {
 TEST(PropertyListXML, ReadsOtherEncodings) {
   std::string wide = "\xFF\xFE";
   for (const char c : std::string("<plist><string>\xE4</string></plist>")) wide += {c, '\0'};
-  EXPECT_EQ(*read(wide), plist::Value("\xC3\xA4"));
+  EXPECT_EQ(*read(wide), Value("\xC3\xA4"));
   EXPECT_EQ(*read("<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?>"
                   "<plist><string>\xE4</string></plist>"),
-            plist::Value("\xC3\xA4"));
+            Value("\xC3\xA4"));
 }
 
 TEST(PropertyListXML, DepthIsLimitedBothWays) {
@@ -152,20 +157,18 @@ TEST(PropertyListXML, DepthIsLimitedBothWays) {
 }
 
 TEST(PropertyListXML, ACutDocumentIsNeverAValue) {
-  const std::string whole =
-      *write(plist::Dictionary{{"a", plist::Array{1, "\xE2\x82\xAC", plist::Data{1}}}});
+  const std::string whole = *write(Dictionary{{"a", Array{1, "\xE2\x82\xAC", Data{1}}}});
   for (std::size_t length = 0; length + 1 < whole.size(); ++length) {
     EXPECT_FALSE(read(std::string_view(whole).substr(0, length))) << length;
   }
 }
 
 TEST(PropertyListXML, WritesThisAndNothingElse) {
-  const plist::Value value = plist::Dictionary{
-      {"z", plist::Array{}},
-      {"a&b", plist::Dictionary{}},
-      {"list",
-       plist::Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, -0.0, -NAN, 0.5f, true, false,
-                    plist::Date{0.9}, plist::Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
+  const Value value = Dictionary{
+      {"z", Array{}},
+      {"a&b", Dictionary{}},
+      {"list", Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, -0.0, -NAN, 0.5f, true, false,
+                     Date{0.9}, Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
   };
   EXPECT_EQ(*write(value),
             "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
@@ -214,25 +217,22 @@ TEST(PropertyListXML, WhatCantBeTextIsReplaced) {
            Row{"\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80",
                "\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80"},
        }) {
-    EXPECT_EQ(*read(*write(row.bytes)), plist::Value(row.text)) << row.text;
-    EXPECT_EQ(*write(plist::Dictionary{{row.bytes, 1}, {row.text, 2}}),
-              *write(plist::Dictionary{{row.text, 2}}));
+    EXPECT_EQ(*read(*write(row.bytes)), Value(row.text)) << row.text;
+    EXPECT_EQ(*write(Dictionary{{row.bytes, 1}, {row.text, 2}}), *write(Dictionary{{row.text, 2}}));
   }
 }
 
 TEST(PropertyListXML, AwkwardValuesComeBackEqual) {
   using Limits = std::numeric_limits<double>;
   const std::string awkward = " ]]>&amp;&#13;<!--\r\n\t\x7F\xC2\x85\xF0\x9F\x98\x80\"\\ ";
-  const plist::Value value = plist::Dictionary{
+  const Value value = Dictionary{
       {awkward, awkward},
-      {"numbers", plist::Array{INT64_MIN, UINT64_MAX, -0.0, Limits::max(), Limits::denorm_min(),
-                               1e16, 0x1p63, 0.1f, 1.0 / 7, -Limits::infinity()}},
-      {"dates", plist::Array{plist::Date{-3e13}, plist::Date{-62167219201}, plist::Date{-1},
-                             plist::Date{951782400}, plist::Date{3e13}}},
-      {"data",
-       plist::Array{plist::Data{}, plist::Data{255}, plist::Data{1, 254}, plist::Data(100, 77)}}};
+      {"numbers", Array{INT64_MIN, UINT64_MAX, -0.0, Limits::max(), Limits::denorm_min(), 1e16,
+                        0x1p63, 0.1f, 1.0 / 7, -Limits::infinity()}},
+      {"dates", Array{Date{-3e13}, Date{-62167219201}, Date{-1}, Date{951782400}, Date{3e13}}},
+      {"data", Array{Data{}, Data{255}, Data{1, 254}, Data(100, 77)}}};
   const std::string text = *write(value);
-  const base::Result<plist::Value> again = read(text);
+  const base::Result<Value> again = read(text);
   ASSERT_TRUE(again) << again.error().text << "\n" << text;
   EXPECT_TRUE(*again == value) << text;
   EXPECT_EQ(*write(*again), text);

@@ -7,7 +7,7 @@
 #include "base/Text.h"
 #include "plist/Value.h"
 
-namespace platform {
+namespace plist {
 namespace {
 
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
@@ -15,14 +15,12 @@ constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 
 // A value is made from exactly the types that it can hold: nothing else compiles.
 template <typename T>
-constexpr bool kHolds =
-    std::is_convertible_v<T, plist::Value>&& std::is_constructible_v<plist::Number, T>;
+constexpr bool kHolds = std::is_convertible_v<T, Value>&& std::is_constructible_v<Number, T>;
 static_assert(kHolds<std::int32_t> && kHolds<std::int64_t> && kHolds<std::uint64_t> &&
               kHolds<float> && kHolds<double> && kHolds<bool>);
 template <typename T>
-constexpr bool kRefuses =
-    !std::is_constructible_v<plist::Value, T> && !std::is_constructible_v<plist::Number, T>;
-static_assert(kRefuses<const plist::Value*> && kRefuses<plist::Dictionary*> && kRefuses<void*> &&
+constexpr bool kRefuses = !std::is_constructible_v<Value, T> && !std::is_constructible_v<Number, T>;
+static_assert(kRefuses<const Value*> && kRefuses<Dictionary*> && kRefuses<void*> &&
               kRefuses<std::nullptr_t> && kRefuses<char> && kRefuses<unsigned> &&
               kRefuses<std::uint16_t> && kRefuses<long double>);
 
@@ -49,79 +47,76 @@ TEST(SaturatingCast, HoldsAtTheEdgesWhereADoubleCantNameTheLimit) {
     EXPECT_EQ(base::saturatingCast<std::int32_t>(row.from), row.as32) << row.from;
     EXPECT_EQ(base::saturatingCast<std::int64_t>(row.from), row.as64) << row.from;
     EXPECT_EQ(base::saturatingCast<std::uint64_t>(row.from), row.asUnsigned) << row.from;
-    EXPECT_EQ(plist::Number(row.from).int64Value(), row.as64);
-    EXPECT_EQ(plist::Number(row.from).uint64Value(), row.asUnsigned);
+    EXPECT_EQ(Number(row.from).int64Value(), row.as64);
+    EXPECT_EQ(Number(row.from).uint64Value(), row.asUnsigned);
   }
 }
 
 TEST(Number, IsTrueUnlessItIsZero) {
-  EXPECT_TRUE(plist::Number(0.25).boolValue());
-  EXPECT_FALSE(plist::Number(-0.0).boolValue());
-  EXPECT_TRUE(plist::Number(std::int64_t{1} << 40).boolValue());
+  EXPECT_TRUE(Number(0.25).boolValue());
+  EXPECT_FALSE(Number(-0.0).boolValue());
+  EXPECT_TRUE(Number(std::int64_t{1} << 40).boolValue());
 }
 
 // Each group stands for one number, no two groups for the same.
 TEST(Number, IsEqualByTheNumberWhateverItsType) {
-  const std::vector<std::vector<plist::Number>> groups = {
-      {plist::Number(0), plist::Number(std::uint64_t{0}), plist::Number(0.0), plist::Number(-0.0f),
-       plist::Number(false)},
-      {plist::Number(1), plist::Number(std::int64_t{1}), plist::Number(1.0f), plist::Number(true)},
-      {plist::Number(-1), plist::Number(std::int64_t{-1}), plist::Number(-1.0)},
-      {plist::Number(UINT64_MAX)},
-      {plist::Number(0x1p64)},
-      {plist::Number(INT64_MAX), plist::Number(std::uint64_t{INT64_MAX})},
-      {plist::Number(0x1p63), plist::Number(std::uint64_t{1} << 63)},
-      {plist::Number(INT64_MIN), plist::Number(-0x1p63)},
-      {plist::Number(std::int64_t{1} << 53), plist::Number(0x1p53)},
-      {plist::Number((std::int64_t{1} << 53) + 1)},
-      {plist::Number(0.5), plist::Number(0.5f)},
+  const std::vector<std::vector<Number>> groups = {
+      {Number(0), Number(std::uint64_t{0}), Number(0.0), Number(-0.0f), Number(false)},
+      {Number(1), Number(std::int64_t{1}), Number(1.0f), Number(true)},
+      {Number(-1), Number(std::int64_t{-1}), Number(-1.0)},
+      {Number(UINT64_MAX)},
+      {Number(0x1p64)},
+      {Number(INT64_MAX), Number(std::uint64_t{INT64_MAX})},
+      {Number(0x1p63), Number(std::uint64_t{1} << 63)},
+      {Number(INT64_MIN), Number(-0x1p63)},
+      {Number(std::int64_t{1} << 53), Number(0x1p53)},
+      {Number((std::int64_t{1} << 53) + 1)},
+      {Number(0.5), Number(0.5f)},
   };
   for (std::size_t i = 0; i < groups.size(); ++i) {
     for (std::size_t j = 0; j < groups.size(); ++j) {
-      for (const plist::Number& a : groups[i]) {
-        for (const plist::Number& b : groups[j])
-          EXPECT_EQ(a == b, i == j) << a.text() << " " << b.text();
+      for (const Number& a : groups[i]) {
+        for (const Number& b : groups[j]) EXPECT_EQ(a == b, i == j) << a.text() << " " << b.text();
       }
     }
   }
-  EXPECT_FALSE(plist::Number(kNaN) == plist::Number(kNaN));
-  EXPECT_FALSE(plist::Number(kNaN) == plist::Number(0));
+  EXPECT_FALSE(Number(kNaN) == Number(kNaN));
+  EXPECT_FALSE(Number(kNaN) == Number(0));
 }
 
 TEST(Number, TextHasNoPointWhenIntegral) {
   struct Row {
-    plist::Number number;
+    Number number;
     const char* text;
   };
   for (const Row& row : {
-           Row{plist::Number(INT64_MIN), "-9223372036854775808"},
-           Row{plist::Number(UINT64_MAX), "18446744073709551615"},
-           Row{plist::Number(1e15), "1000000000000000"},
-           Row{plist::Number(1e16), "1e+16"},
-           Row{plist::Number(1.0 / 3), "0.3333333333333333"},
-           Row{plist::Number(0.1f), "0.1000000014901161"},
-           Row{plist::Number(-kInfinity), "-inf"},
-           Row{plist::Number(-kNaN), "nan"},
+           Row{Number(INT64_MIN), "-9223372036854775808"},
+           Row{Number(UINT64_MAX), "18446744073709551615"},
+           Row{Number(1e15), "1000000000000000"},
+           Row{Number(1e16), "1e+16"},
+           Row{Number(1.0 / 3), "0.3333333333333333"},
+           Row{Number(0.1f), "0.1000000014901161"},
+           Row{Number(-kInfinity), "-inf"},
+           Row{Number(-kNaN), "nan"},
        }) {
     EXPECT_EQ(row.number.text(), row.text);
   }
 }
 
 TEST(Description, ShowsTextsAsTheyAreAndContainersAsListings) {
-  EXPECT_EQ(plist::description(plist::Value("two words\n")), "two words\n");
-  EXPECT_EQ(plist::description(plist::Value(2.5)), "2.5");
-  EXPECT_EQ(plist::description(plist::Array{}), "(\n)");
-  EXPECT_EQ(plist::description(static_cast<const plist::Value*>(nullptr)), "(null)");
-  EXPECT_EQ(plist::description(std::optional<std::string>()), "(null)");
-  EXPECT_EQ(plist::description(std::optional<std::string>("x")), "x");
-  const plist::Value value = plist::Dictionary{
+  EXPECT_EQ(description(Value("two words\n")), "two words\n");
+  EXPECT_EQ(description(Value(2.5)), "2.5");
+  EXPECT_EQ(description(Array{}), "(\n)");
+  EXPECT_EQ(description(static_cast<const Value*>(nullptr)), "(null)");
+  EXPECT_EQ(description(std::optional<std::string>()), "(null)");
+  EXPECT_EQ(description(std::optional<std::string>("x")), "x");
+  const Value value = Dictionary{
       {"plain.key", "word"},
       {"two words", "say \"hi\"\n\x01\\"},
       {"", ""},
-      {"list",
-       plist::Array{1, true, plist::Dictionary{{"date", plist::Date{0}}}, plist::Data{1, 2, 3}}},
+      {"list", Array{1, true, Dictionary{{"date", Date{0}}}, Data{1, 2, 3}}},
   };
-  EXPECT_EQ(plist::description(value), R"({
+  EXPECT_EQ(description(value), R"({
     plain.key = word;
     "two words" = "say \"hi\"\n\x01\\";
     "" = "";
@@ -144,4 +139,4 @@ TEST(Text, FormatsBeyondItsFixedBuffer) {
 }
 
 }  // namespace
-}  // namespace platform
+}  // namespace plist
