@@ -5,7 +5,7 @@
 #include "support/TemporaryFolder.h"
 #include "support/TestPlatform.h"
 #include "tools/demo/Rules.h"
-#include "tools/demo/Show.h"
+#include "tools/demo/ShowLeft.h"
 
 namespace {
 

@@ -19,7 +19,10 @@
 #include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/Sample.h"
+#include "tools/mkdevice/SampleCounters.h"
 #include "tools/mkdevice/SampleController.h"
+#include "tools/mkdevice/SampleDay.h"
+#include "tools/mkdevice/SampleFiles.h"
 #include "tools/mkdevice/SampleUsage.h"
 #include "tools/mkdevice/Vocabulary.h"
 

@@ -30,10 +30,10 @@ std::size_t distance(std::string_view a, std::string_view b) {
 }  // namespace
 
 std::string_view closestName(std::string_view typed, std::span<const std::string_view> names) {
-  constexpr std::size_t kLongest = 64, kFarthest = 2;
+  constexpr std::size_t kMaxLength = 64, kMaxDistance = 2;
   std::string_view closest;
-  std::size_t least = std::min(kFarthest + 1, typed.size());  // not every letter
-  if (typed.size() > kLongest) return {};
+  std::size_t least = std::min(kMaxDistance + 1, typed.size());  // not every letter
+  if (typed.size() > kMaxLength) return {};
   for (const std::string_view name : names) {
     const std::size_t apart = distance(typed, name);
     if (apart >= least) continue;

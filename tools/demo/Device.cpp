@@ -18,12 +18,12 @@ using plist::Dictionary;
 
 namespace {
 
-constexpr std::size_t kLargestFile = std::size_t{64} << 20;
+constexpr std::size_t kMaxFileSize = std::size_t{64} << 20;
 
 Result<std::string> readHostFile(const std::string& path) {
   const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
   if (!file) return Error{std::strerror(errno)};
-  return host::readRegularFile(file.get(), kLargestFile);
+  return host::readRegularFile(file.get(), kMaxFileSize);
 }
 
 }  // namespace
@@ -82,7 +82,7 @@ std::vector<std::string> Device::namesIn(const std::string& folder) {
 }
 
 std::optional<std::string> Device::bytes(const std::string& path) {
-  return host_.root().readFile(path, kLargestFile).orNone();
+  return host_.root().readFile(path, kMaxFileSize).orNone();
 }
 
 std::optional<Dictionary> Device::propertyList(const std::string& path) {

@@ -1,7 +1,8 @@
+#include "tools/demo/ShowKept.h"
+
 #include "base/Text.h"
 #include "tools/common/Table.h"
 #include "tools/demo/Screen.h"
-#include "tools/demo/Show.h"
 
 namespace demo {
 

@@ -1,3 +1,5 @@
+#include "tools/demo/ShowLeft.h"
+
 #include <algorithm>
 #include <map>
 #include <nlohmann/json.hpp>
@@ -9,7 +11,6 @@
 #include "tools/common/Table.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
-#include "tools/demo/Show.h"
 #include "tools/demo/TelemetryRules.h"
 
 namespace demo {
@@ -23,7 +24,7 @@ namespace {
 
 constexpr char kStructured[] = "var/spool/morvend/structured";
 constexpr char kEvents[] = "var/spool/morvend/events.jsonl";
-constexpr std::size_t kMostCountersOfRule = 4;
+constexpr std::size_t kMaxCountersOfRule = 4;
 
 // How many there are of something, and the least and the largest number of one.
 struct Tally {
@@ -165,7 +166,7 @@ class LeftText {
       table.addRow(
           {rule.step + ", by " + rule.rule, "", format("%zu of %zu", listed, counters.size())});
       count += counters.size();
-      if (!all_ && counters.size() > kMostCountersOfRule) counters.resize(kMostCountersOfRule);
+      if (!all_ && counters.size() > kMaxCountersOfRule) counters.resize(kMaxCountersOfRule);
       for (const auto& [key, value, entry] : counters) {
         table.addRow({"  " + shortKey(key), std::to_string(value),
                       entry ? roundingText(*entry->options) : "withheld"});

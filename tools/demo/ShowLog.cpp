@@ -1,3 +1,5 @@
+#include "tools/demo/ShowLog.h"
+
 #include <algorithm>
 #include <array>
 #include <cmath>
@@ -7,7 +9,6 @@
 #include "tools/common/Table.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
-#include "tools/demo/Show.h"
 
 namespace demo {
 
@@ -21,8 +22,8 @@ using Align = Table::Align;
 
 namespace {
 
-constexpr std::size_t kMostOwnRows = 6, kMostPrefixRows = 5, kMostCollectedRows = 4;
-constexpr std::size_t kMostDistributions = 8, kMostHistograms = 1, kMostNames = 8;
+constexpr std::size_t kMaxOwnRows = 6, kMaxPrefixRows = 5, kMaxCollectedRows = 4;
+constexpr std::size_t kMaxDistributions = 8, kMaxHistograms = 1, kMaxNames = 8;
 constexpr std::size_t kAll = SIZE_MAX;
 
 // The key; in brackets the prefix that let it through.
@@ -175,10 +176,10 @@ class LogText {
       part.push_back(&scalar);
     }
     text_ += "\n" + heading("Scalars: " + std::to_string(scalars.size()) + " reported" + keyNote());
-    addRows("recorded, and whitelisted by their own key", own, kMostOwnRows);
+    addRows("recorded, and whitelisted by their own key", own, kMaxOwnRows);
     addRows("recorded, and whitelisted by the prefix in brackets", byPrefix,
-            atMost(kMostPrefixRows));
-    addRows("collected by the report itself", collected, kMostCollectedRows);
+            atMost(kMaxPrefixRows));
+    addRows("collected by the report itself", collected, kMaxCollectedRows);
     addWithheld(recorded_.scalars, "PLScalars",
                 [](const auto& entry) -> const std::string& { return entry.first; });
   }
@@ -196,7 +197,7 @@ class LogText {
       if (isAskedFor(key) && reported.find(key) == nullptr) withheld.push_back(shortKey(key));
     }
     if (withheld.empty()) return;
-    for (const std::size_t i : evenlySpread(withheld.size(), atMost(kMostNames))) {
+    for (const std::size_t i : evenlySpread(withheld.size(), atMost(kMaxNames))) {
       shown.push_back(withheld[i]);
     }
     text_ += format("\n  recorded, and withheld by the whitelist: %zu\n", withheld.size());
@@ -222,7 +223,7 @@ class LogText {
       }
     }
     if (rows.empty() && !options_.prefix.empty()) return;
-    const auto shown = evenlySpread(rows.size(), atMost(kMostDistributions));
+    const auto shown = evenlySpread(rows.size(), atMost(kMaxDistributions));
     for (const std::size_t i : shown) {
       std::array<double, 5> statistics{};
       const Array& values = *rows[i]->value.as<Array>();
@@ -261,7 +262,7 @@ class LogText {
       }
     }
     if (histograms.empty()) return;
-    const auto shown = evenlySpread(histograms.size(), atMost(kMostHistograms));
+    const auto shown = evenlySpread(histograms.size(), atMost(kMaxHistograms));
     text_ += "\n" + heading("Histograms: " + std::to_string(histograms.size()) + " reported");
     for (const std::size_t i : shown) {
       const Dictionary& histogram = *histograms[i]->value.as<Dictionary>();

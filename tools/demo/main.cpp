@@ -4,7 +4,9 @@
 #include <iostream>
 
 #include "tools/demo/Delivery.h"
-#include "tools/demo/Show.h"
+#include "tools/demo/ShowKept.h"
+#include "tools/demo/ShowLeft.h"
+#include "tools/demo/ShowLog.h"
 
 namespace {
 

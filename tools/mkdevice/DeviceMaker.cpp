@@ -18,6 +18,9 @@
 #include "host/outbox/RandomUUID.h"
 #include "plist/PropertyList.h"
 #include "tools/mkdevice/Random.h"
+#include "tools/mkdevice/SampleCounters.h"
+#include "tools/mkdevice/SampleDay.h"
+#include "tools/mkdevice/SampleFiles.h"
 #include "tools/mkdevice/Wear.h"
 
 namespace mkdevice {
@@ -30,7 +33,7 @@ namespace {
 
 constexpr char kModulePath[] =
     "System/Library/PrivateFrameworks/FaultwatchSupport.framework/FaultwatchSupport";
-constexpr std::size_t kLargestModule = std::size_t{64} << 20;
+constexpr std::size_t kMaxModuleSize = std::size_t{64} << 20;
 
 std::string located(const fs::path& place, const char* what) {
   return place.string() + ": " + what;
@@ -79,7 +82,7 @@ std::string copyModule(const Host& host, const std::string& module, const Listen
                      "; the device will lack its crash-reporting support library");
     return {};
   }
-  const auto bytes = host::readRegularFile(file.get(), kLargestModule);
+  const auto bytes = host::readRegularFile(file.get(), kMaxModuleSize);
   return bytes ? writeFile(host, kModulePath, *bytes) : located(module, bytes.error().text.c_str());
 }
 

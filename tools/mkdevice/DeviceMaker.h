@@ -9,12 +9,12 @@
 
 namespace mkdevice {
 
-inline constexpr int kMostDays = 60;
+inline constexpr int kMaxDays = 60;
 
 struct MakingOptions {
   std::string folder;  // of the host; missing parents are made
   Sample sample;
-  int days = 0;        // so many before `sample.today` are played, at most kMostDays
+  int days = 0;        // so many before `sample.today` are played, at most kMaxDays
   std::string module;  // of the host: the crash-reporting support library for the device
   platform::SystemLog* log = nullptr;  // of the device's services; else errors on standard error
 };

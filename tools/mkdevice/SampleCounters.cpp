@@ -1,10 +1,11 @@
+#include "tools/mkdevice/SampleCounters.h"
+
 #include <algorithm>
 #include <cmath>
 
 #include "base/CivilDate.h"
 #include "base/Convert.h"
 #include "tools/mkdevice/Random.h"
-#include "tools/mkdevice/Sample.h"
 #include "tools/mkdevice/Vocabulary.h"
 
 namespace mkdevice {

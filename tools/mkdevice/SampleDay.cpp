@@ -1,9 +1,10 @@
+#include "tools/mkdevice/SampleDay.h"
+
 #include "base/CivilDate.h"
 #include "base/Text.h"
 #include "base/Timestamp.h"
 #include "tools/mkdevice/BufferWriter.h"
 #include "tools/mkdevice/Random.h"
-#include "tools/mkdevice/Sample.h"
 #include "tools/mkdevice/SampleController.h"
 #include "tools/mkdevice/SampleUsage.h"
 #include "tools/mkdevice/Wear.h"

@@ -1,10 +1,12 @@
+#include "tools/mkdevice/SampleFiles.h"
+
 #include "NANDInfo/Events.h"
 #include "base/CivilDate.h"
 #include "base/Text.h"
 #include "base/Timestamp.h"
 #include "plist/JSON.h"
 #include "tools/mkdevice/Random.h"
-#include "tools/mkdevice/Sample.h"
+#include "tools/mkdevice/Whitelist.h"
 
 namespace mkdevice {
 

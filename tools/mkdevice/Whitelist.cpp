@@ -1,6 +1,8 @@
+#include "tools/mkdevice/Whitelist.h"
+
 #include <cmath>
 
-#include "tools/mkdevice/Sample.h"
+#include "tools/mkdevice/SampleCounters.h"
 #include "tools/mkdevice/Vocabulary.h"
 
 namespace mkdevice {

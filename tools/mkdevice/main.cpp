@@ -54,10 +54,10 @@ int main(int argc, char** argv) {
                    : "'" + text + "' is no number from 0 to 2^64 - 1";
       });
   app.add_option("--scale", options.sample.scale, "so many times the usual counters; default: 1")
-      ->check(CLI::Range(1, mkdevice::kLargestScale));
+      ->check(CLI::Range(1, mkdevice::kMaxScale));
   app.add_option("--days", options.days,
                  "so many days up to yesterday are played, each with its daily run; default: 0")
-      ->check(CLI::Range(0, mkdevice::kMostDays));
+      ->check(CLI::Range(0, mkdevice::kMaxDays));
   app.add_option_function<std::string>(
          "--controller",
          [&](const std::string& name) {

@@ -27,7 +27,7 @@ std::string_view textOf(Bytes bytes) {
 
 // UTF-8 without control characters but those of a text file. The first part of a file is enough.
 bool isText(Bytes bytes) {
-  constexpr std::size_t kLooked = 4096, kLongestCharacter = 4;
+  constexpr std::size_t kLooked = 4096, kMaxCharacterSize = 4;
   std::string_view text = textOf(bytes);
   const std::size_t rest = text.size() > kLooked ? text.size() - kLooked : 0;
   while (text.size() > rest) {
@@ -37,7 +37,7 @@ bool isText(Bytes bytes) {
     if (length == 0 || control) return false;
     text.remove_prefix(length);
   }
-  return bytes.size() >= kLongestCharacter;
+  return bytes.size() >= kMaxCharacterSize;
 }
 
 bool isPropertyList(Bytes bytes) {
@@ -57,9 +57,9 @@ std::optional<GenericParserCxt> decodedWithoutComplaint(Bytes bytes) {
 
 // Most fields have a name of their own, and the fields take up the bytes.
 bool isFTLStatistics(Bytes bytes) {
-  constexpr std::size_t kLargestField = 16;  // a header and one value
+  constexpr std::size_t kMaxFieldSize = 16;  // a header and one value
   const auto fields = decodedWithoutComplaint<NANDInfo::decodeFTL>(bytes);
-  if (!fields || fields->size() * kLargestField < bytes.size()) return false;
+  if (!fields || fields->size() * kMaxFieldSize < bytes.size()) return false;
   std::size_t named = 0;
   for (std::size_t i = 0; i < fields->size(); ++i) {
     if (!std::string_view((*fields)[i].name).starts_with("Stat_")) ++named;
@@ -68,9 +68,9 @@ bool isFTLStatistics(Bytes bytes) {
 }
 
 bool isMSPStatistics(Bytes bytes) {
-  constexpr std::size_t kLargestField = 12;
+  constexpr std::size_t kMaxFieldSize = 12;
   const auto fields = decodedWithoutComplaint<NANDInfo::decodeMSP>(bytes);
-  return fields && fields->size() * kLargestField >= bytes.size();
+  return fields && fields->size() * kMaxFieldSize >= bytes.size();
 }
 
 bool isSnapshot(Bytes bytes) {

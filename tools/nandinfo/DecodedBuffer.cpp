@@ -71,7 +71,7 @@ std::string typeName(std::uint32_t type) {
 
 // One row for each type in the order of their first items; what comes after so many types is one.
 Array summedItems(Bytes snapshot) {
-  constexpr std::size_t kMostTypes = 100;
+  constexpr std::size_t kMaxTypes = 100;
   struct Sum {
     std::string type;
     std::uint64_t count = 0, bytes = 0;
@@ -82,9 +82,9 @@ Array summedItems(Bytes snapshot) {
   while (const auto item = items.next()) {
     auto place =
         static_cast<std::size_t>(std::find(types.begin(), types.end(), item->type) - types.begin());
-    if (place == types.size() && place < kMostTypes) types.push_back(item->type);
+    if (place == types.size() && place < kMaxTypes) types.push_back(item->type);
     if (place == sums.size()) {
-      sums.push_back({place < kMostTypes ? typeName(item->type) : "others"});
+      sums.push_back({place < kMaxTypes ? typeName(item->type) : "others"});
     }
     ++sums[place].count;
     sums[place].bytes += item->payload.size();
@@ -162,9 +162,9 @@ Dictionary decodedSnapshot(Bytes bytes) {
   Array fields;
   constexpr char kThread[] = "VM_swapout";
   if (const auto statistics = NANDInfo::getIOStatsWithThreadnameFromKCData(bytes, kThread)) {
-    constexpr int kMostCounters = 64;
+    constexpr int kMaxCounters = 64;
     base::ByteReader reader(*statistics);
-    for (int i = 0; i < kMostCounters; ++i) {
+    for (int i = 0; i < kMaxCounters; ++i) {
       const auto counter = reader.read<std::uint64_t>();
       if (!counter) break;
       fields.push_back(Array{base::format("%s[%d]", kThread, i), *counter});

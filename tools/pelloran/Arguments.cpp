@@ -17,7 +17,7 @@ using base::Result;
 
 namespace {
 
-constexpr std::size_t kLongestKey = 1024;
+constexpr std::size_t kMaxKeySize = 1024;
 
 std::string quoted(std::string_view text) { return std::string("'").append(text).append("'"); }
 
@@ -40,8 +40,8 @@ bool isUTF8(std::string_view text) {
 
 std::string keyProblem(std::string_view key) {
   if (key.empty()) return "the key is empty";
-  if (key.size() > kLongestKey) {
-    return base::format("the key has %zu bytes, more than %zu", key.size(), kLongestKey);
+  if (key.size() > kMaxKeySize) {
+    return base::format("the key has %zu bytes, more than %zu", key.size(), kMaxKeySize);
   }
   if (key.find('\0') != std::string_view::npos) return "the key holds a NUL";
   if (!isUTF8(key)) return "the key is not UTF-8";

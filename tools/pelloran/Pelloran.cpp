@@ -26,9 +26,9 @@ namespace {
 using host::CounterChange;
 
 constexpr int kDone = 0, kFailed = 1, kUsage = 2;
-constexpr std::size_t kLongestLine = std::size_t{1} << 20;
+constexpr std::size_t kMaxLineSize = std::size_t{1} << 20;
 constexpr std::size_t kLinesBetweenProgress = 50000;
-constexpr double kLongestSampling = 366 * 86400.0;
+constexpr double kMaxSampling = 366 * 86400.0;
 
 // What the command line says, as text; each command looks at its own part.
 struct Arguments {
@@ -97,7 +97,7 @@ class Command {
     if (arguments_.every) {
       if (!given(parseReal(*arguments_.every), every)) return kUsage;
       if (!given(parseReal(*arguments_.lasting), lasting)) return kUsage;
-      if (every < 0.1 || lasting < 0 || lasting > kLongestSampling) {
+      if (every < 0.1 || lasting < 0 || lasting > kMaxSampling) {
         return usage("--every takes 0.1 seconds or more, --for up to a year");
       }
     }
@@ -141,7 +141,7 @@ class Command {
   int import(std::istream& in, const std::string& place) {
     std::unordered_set<std::string> keys;
     std::vector<CounterChange> changes;
-    std::string buffer(kLongestLine + 1, '\0');
+    std::string buffer(kMaxLineSize + 1, '\0');
     std::size_t number = 0;
     tools::Progress progress(environment_.err, environment_.errIsTerminal);
     const auto wrong = [&](const std::string& why) {
