@@ -1,19 +1,23 @@
-// The basic dictionary: the legacy statistics under the counters service's keys.
+#include "NANDInfo/collect/BasicInfo.h"
 
 #include <array>
+#include <cstdint>
+#include <string_view>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Utilities.h"
+#include "NANDInfo/Whitelists.h"
+#include "NANDInfo/collect/DerivedFields.h"
+#include "NANDInfo/collect/DeviceFields.h"
 #include "NANDInfo/decode/Weeks.h"
 #include "base/CivilDate.h"
 #include "base/Convert.h"
 #include "platform/Clock.h"
 #include "platform/Kernel.h"
-#include "platform/SystemLog.h"
 
 namespace NANDInfo {
 
-using platform::LogLevel;
 using plist::Dictionary;
 
 namespace {
@@ -83,8 +87,7 @@ std::int64_t reported(const GenericParserCxt::Field& field) {
 
 }  // namespace
 
-Dictionary buildLegacyNANDInfoDict(const Services& services, const LegacyNandInfoCxt& context,
-                                   bool leavesOutVersions) {
+Dictionary legacyInfo(const LegacyNandInfoCxt& context, std::optional<std::int32_t> demoMode) {
   Dictionary dictionary;
   const auto set32 = [&](const char* key, std::uint32_t value) {
     dictionary.set(key, static_cast<std::int32_t>(value));
@@ -92,10 +95,10 @@ Dictionary buildLegacyNANDInfoDict(const Services& services, const LegacyNandInf
   const auto set64 = [&](const char* key, std::uint64_t value) {
     dictionary.set(key, bits(value));
   };
-  if (!leavesOutVersions) {
+  if (demoMode) {
     set32(kNANDInfoExportVersionKey, context.exportVersion);
     set32(kNANDInfoDriverVersionKey, context.driverVersion);
-    dictionary.set(kNANDInfoDemoModeKey, std::int64_t{storeDemoMode(services)});
+    dictionary.set(kNANDInfoDemoModeKey, std::int64_t{*demoMode});
   }
   set32(kNANDInfoNumVirtualBlocksKey, context.numVirtualBlocks);
   set32(kNANDInfoPagesPerVirtualBlockKey, context.pagesPerVirtualBlock);
@@ -126,51 +129,39 @@ Dictionary buildLegacyNANDInfoDict(const Services& services, const LegacyNandInf
   return dictionary;
 }
 
-std::optional<Dictionary> CopyNANDInfo(const Services& services) {
+base::Result<LegacyNandInfoCxt> readLegacyStatistics(const Services& services) {
   LegacyNandInfoCxt context;
-  nand_exporter_t* exporter;
-  Dictionary info;
-  if (load_nand_info(services, exporter, &context)) {
-    info = buildLegacyNANDInfoDict(services, context, false);
-    const Dictionary space = getSpacereapInfo(services);
-    if (const auto* value = space.find(kTLM_Spacereap_totalPurgeable)) {
-      info.set(kNANDInfoSpacereapTotalPurgeableKey, *value);
-    }
-    if (const auto* value = space.find(kTLM_Spacereap_totalNonPurgeable)) {
-      info.set(kNANDInfoSpacereapTotalNonPurgeableKey, *value);
-    }
-  } else {
-    info = {{kNANDInfoErrorKey, "1"}, {kNANDInfoErrorMessageKey, "Unable to parse buffer"}};
+  nand_exporter_t* exporter = nullptr;
+  if (!load_nand_info(services, exporter, &context)) return base::Error{"Unable to parse buffer"};
+  return context;
+}
+
+Dictionary basicInfo(const Services& services) {
+  const auto context = readLegacyStatistics(services);
+  if (!context) {
+    return {{kNANDInfoErrorKey, "1"}, {kNANDInfoErrorMessageKey, context.error().text}};
   }
-  if (exporter->releaseLegacy != nullptr) exporter->releaseLegacy(&context);
+  Dictionary info = legacyInfo(*context, storeDemoMode(services.preferences));
+  const Dictionary space = purgeableSpace(services.purgeableSpace);
+  copyIfPresent(space, kTLM_Spacereap_totalPurgeable, info, kNANDInfoSpacereapTotalPurgeableKey);
+  copyIfPresent(space, kTLM_Spacereap_totalNonPurgeable, info,
+                kNANDInfoSpacereapTotalNonPurgeableKey);
   return info;
 }
 
-std::optional<Dictionary> CopyNANDInfoWithOptions(const Services& services, const Dictionary*) {
-  if (NandInfoShouldLogAllToEV(services)) return Dictionary();
-  services.log.log(LogLevel::standard,
-                   "NANDInfo: CopyNANDInfoWithOptions: obtaining FTL data for PRND\n");
-  auto info = CopyNANDInfo(services);
-  if (!info) {
-    SetAPIErrorMessage("CopyNANDInfoWithOptions: Unable to get FTL Fields for PRND");
-    services.log.log(LogLevel::standard,
-                     "NANDInfo: CopyNANDInfoWithOptions: Unable to get FTL Fields for PRND\n");
-  }
-  services.log.log(LogLevel::standard,
-                   "NANDInfo: CopyNANDInfoWithOptions: returning PRND dictionary\n");
-  return info;
-}
-
-bool NandInfoShouldLogAllToEV(const Services& services) {
-  std::array<std::byte, 100> session{};
-  if (services.kernel.sysctlbyname("kern.bootsessionuuid", session).error != 0) return false;
-  const char first = static_cast<char>(session.front());
+bool belongsToSink(char session, plist::Date today) {
   std::int64_t digit = 0;
-  if (first >= '0' && first <= '9') digit = first - '0';
-  if (first >= 'A' && first <= 'F') digit = first - 'A' + 10;
-  const auto day = base::saturatingCast<std::int64_t>(services.clock.now().secondsSince1970 /
-                                                      base::kSecondsPerDay);
+  if (session >= '0' && session <= '9') digit = session - '0';
+  if (session >= 'A' && session <= 'F') digit = session - 'A' + 10;
+  const auto day =
+      base::saturatingCast<std::int64_t>(today.secondsSince1970 / base::kSecondsPerDay);
   return (day & 1) == (digit & 1);
+}
+
+bool belongsToSink(platform::Kernel& kernel, platform::Clock& clock) {
+  std::array<std::byte, 100> session{};
+  if (kernel.sysctlbyname("kern.bootsessionuuid", session).error != 0) return false;
+  return belongsToSink(static_cast<char>(session.front()), clock.now());
 }
 
 }  // namespace NANDInfo

@@ -1,26 +1,19 @@
-// The fields that are derived from the FTL statistics, and those that go with them.
+#include "NANDInfo/collect/DerivedFields.h"
 
 #include <algorithm>
+#include <cstdint>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Utilities.h"
+#include "NANDInfo/Whitelists.h"
 #include "NANDInfo/decode/Counters.h"
 #include "NANDInfo/decode/Weeks.h"
-#include "platform/PreferenceStore.h"
-#include "platform/PurgeableSpace.h"
 
 namespace NANDInfo {
 
 using plist::Dictionary;
 
 namespace {
-
-constexpr char kSpacereapError[] = "com.norba.NANDInfo.Spacereap.Error";
-
-void copyIfPresent(const Dictionary& from, std::string_view key, Dictionary& to,
-                   std::string_view newKey) {
-  if (const auto* value = from.find(key)) CopyDictionary(newKey, *value, to);
-}
 
 std::int64_t counter(const Dictionary& ftl, std::string_view array, std::uint64_t index) {
   return signed32(ftl, indexed(array, index)).value_or(0);
@@ -60,7 +53,10 @@ void addBootBlockFailures(const Dictionary& ftl, std::uint64_t blocksPerMSP, Dic
   }
 }
 
-void addFTLFields(const Dictionary& ftl, Dictionary& derived) {
+}  // namespace
+
+Dictionary derivedFields(const Dictionary& ftl) {
+  Dictionary derived;
   const auto userStart = signed32(ftl, "userPartitionStart");
   const auto intermediateStart = signed32(ftl, "intermediatePartitionStart");
   if (userStart && intermediateStart) {
@@ -78,56 +74,18 @@ void addFTLFields(const Dictionary& ftl, Dictionary& derived) {
   if (const auto* blocksPerMSP = ftl.number("mspBootBlockCountPerMsp")) {
     addBootBlockFailures(ftl, blocksPerMSP->uint64Value(), derived);
   }
-}
-
-}  // namespace
-
-std::int32_t storeDemoMode(const Services& services) {
-  return services.preferences.QNSPreferencesGetBooleanValue("StoreDemoMode",
-                                                            "com.norba.demo-settings")
-             ? 1
-             : 0;
-}
-
-Dictionary getSpacereapInfo(const Services& services) {
-  Dictionary info;
-  if (!services.purgeableSpace.isPresent()) return info;
-  const auto answer = services.purgeableSpace.SpacereapCopyItemizedPurgeableSpaceWithInfo(
-      {{"SPACEREAP_VOLUME", "/private/var"}});
-  if (!answer) {
-    SetAPIErrorMessage(
-        "getSpacereapInfo: unable to get output from SpacereapCopyItemizedPurgeableSpaceWithInfo");
-    return info;
-  }
-  if (answer->find(kSpacereapError) != nullptr) return info;
-  copyIfPresent(*answer, "SPACEREAP_TOTAL_AVAILABLE", info, kTLM_Spacereap_totalPurgeable);
-  copyIfPresent(*answer, "SPACEREAP_NONPURGEABLE_AMOUNT", info, kTLM_Spacereap_totalNonPurgeable);
-  return info;
-}
-
-Dictionary gatherZMCFTLOtherData(const Services& services, const Dictionary* ftl) {
-  Dictionary derived = getSpacereapInfo(services);
-  addEntries(CopyVMFreezerNANDInfo(services), derived);
-  addEntries(GetDiskInfo(services), derived);
-  derived.set(kTLM_storeDemoMode, storeDemoMode(services));
-  if (ftl != nullptr) {
-    addFTLFields(*ftl, derived);
-  } else {
-    SetAPIErrorMessage("gatherZMCFTLOtherData: ftlDict is NULL");
-  }
   return derived;
 }
 
-Dictionary gatherZMCOtherData(const Services& services) {
+Dictionary sharedFields(const Dictionary& derived) {
   Dictionary fields;
-  const auto ftl = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0);
-  if (!ftl) {
-    SetAPIErrorMessage("gatherZMCOtherData: Unable to get FTL counters");
-    return fields;
-  }
-  const Dictionary derived = gatherZMCFTLOtherData(services, &*ftl);
   for (const auto& [key, digits] : FTLStats4MSPStats()) copyIfPresent(derived, key, fields, key);
   return fields;
+}
+
+void copyIfPresent(const Dictionary& from, std::string_view key, Dictionary& to,
+                   std::string_view newKey) {
+  if (const auto* value = from.find(key)) CopyDictionary(newKey, *value, to);
 }
 
 }  // namespace NANDInfo

@@ -1,10 +1,11 @@
-// The user data volume: its size, and how full it is.
+#include "NANDInfo/collect/DiskInfo.h"
 
 #include <algorithm>
+#include <cstdint>
 #include <optional>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Whitelists.h"
 #include "platform/DeviceProperties.h"
 #include "platform/FileSystem.h"
 
@@ -30,8 +31,8 @@ struct Figures {
   std::uint64_t capacityGB = 0, userMB = 0, availableMB = 0, fullness = 0;
 };
 
-Figures ofFileSystem(const Services& services) {
-  const auto statistics = services.files.statfs(kVolume);
+Figures ofFileSystem(platform::FileSystem& files) {
+  const auto statistics = files.statfs(kVolume);
   if (!statistics) return {};
   const std::uint64_t total = statistics->blocks * statistics->blockSize;
   const std::uint64_t available = statistics->blocksAvailable * statistics->blockSize;
@@ -41,8 +42,8 @@ Figures ofFileSystem(const Services& services) {
           .fullness = usedShare(total, available)};
 }
 
-Figures ofDeviceProperties(const Services& services) {
-  const auto usage = services.deviceProperties.diskUsage();
+Figures ofDevice(platform::DeviceProperties& properties) {
+  const auto usage = properties.diskUsage();
   if (!usage) return {};
   const std::uint64_t total = mebibytes(usage->totalDiskCapacity);
   return {.capacityGB = GetUserCapacityInGB(static_cast<std::uint32_t>(total)),
@@ -53,9 +54,9 @@ Figures ofDeviceProperties(const Services& services) {
 
 }  // namespace
 
-plist::Dictionary GetDiskInfo(const Services& services) {
-  Figures figures = ofFileSystem(services);
-  if (figures.capacityGB == 0 || figures.fullness == 0) figures = ofDeviceProperties(services);
+plist::Dictionary diskInfo(platform::FileSystem& files, platform::DeviceProperties& properties) {
+  Figures figures = ofFileSystem(files);
+  if (figures.capacityGB == 0 || figures.fullness == 0) figures = ofDevice(properties);
   return {{kDiskInfo_TLM_DQ_AmountDataAvailable_MB, figures.availableMB},
           {kDiskInfo_TLM_DQ_Diskfullness_BP, figures.fullness},
           {kDiskInfo_TLM_DQ_Capacity_GB, figures.capacityGB},

@@ -1,9 +1,14 @@
-// The health figures, and who gets which of them.
+#include "NANDInfo/collect/HealthInfo.h"
 
 #include <algorithm>
+#include <cstdint>
+#include <span>
+#include <utility>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Whitelists.h"
+#include "NANDInfo/collect/FTLStatistics.h"
 #include "NANDInfo/decode/Counters.h"
 
 namespace NANDInfo {
@@ -51,14 +56,6 @@ std::int64_t hostReadErrors(const Dictionary& ftl) {
   return std::max<std::int64_t>(errors, 0);
 }
 
-// The figures that a consumer gets; empty when there are none.
-Dictionary figures(const Services& services, std::span<const NameRow> names) {
-  Dictionary health = gatherNANDHealthInfo(services);
-  if (health.empty()) SetAPIErrorMessage("CopyServitaNANDInfo: Unable to get health API fields");
-  const NameTable table(names);
-  return CreateFilteredDict(std::move(health), &table);
-}
-
 bool isRetirable(const Dictionary& health) {
   const auto* spare = health.number(kNANDHealthInfoSpareAvailablePercent);
   const auto* used = health.number(kNANDHealthInfoMaxPercentUsed);
@@ -67,36 +64,44 @@ bool isRetirable(const Dictionary& health) {
   return s >= 0 && u >= 0 && (s < 100 || u >= 100);
 }
 
-}  // namespace
-
-Dictionary gatherNANDHealthInfo(const Services& services) {
-  const auto ftl = gatherZMCFTLData(services, FTLParser::named, FTLSource::statistics, 0);
-  if (!ftl) {
-    SetAPIErrorMessage("gatherNANDHealthInfo: Unable to get FTL fields");
-    return {};
-  }
-  return {
-      {kNANDHealthInfoMaxPercentUsed, maxPercentUsed(*ftl)},
-      {kNANDHealthInfoMaxE2EErrors, maxE2EErrors(*ftl)},
-      {kNANDHealthInfoHostReadErrors, hostReadErrors(*ftl)},
-      {kNANDHealthInfoNumGrownBadBlocks, signed64(*ftl, "numGrownBad").value_or(-1)},
-      {kNANDHealthInfoSpareAvailablePercent, signed64(*ftl, "spareAvailablePercent").value_or(-1)},
-      {kNANDHealthInfoNumDieFailures, signed64(*ftl, "numDieFailures").value_or(-1)}};
+// The figures that a consumer gets; empty when there are none.
+Dictionary figuresFor(const Services& services, std::span<const NameRow> names) {
+  Dictionary health = healthInfo(services);
+  if (health.empty()) SetAPIErrorMessage("CopyServitaNANDInfo: Unable to get health API fields");
+  const NameTable table(names);
+  return CreateFilteredDict(std::move(health), &table);
 }
 
-Dictionary CopyServitaNANDInfo(const Services& services) {
-  Dictionary info = figures(services, kServitaFigures);
+}  // namespace
+
+Dictionary healthFigures(const Dictionary& ftl) {
+  return {
+      {kNANDHealthInfoMaxPercentUsed, maxPercentUsed(ftl)},
+      {kNANDHealthInfoMaxE2EErrors, maxE2EErrors(ftl)},
+      {kNANDHealthInfoHostReadErrors, hostReadErrors(ftl)},
+      {kNANDHealthInfoNumGrownBadBlocks, signed64(ftl, "numGrownBad").value_or(-1)},
+      {kNANDHealthInfoSpareAvailablePercent, signed64(ftl, "spareAvailablePercent").value_or(-1)},
+      {kNANDHealthInfoNumDieFailures, signed64(ftl, "numDieFailures").value_or(-1)}};
+}
+
+Dictionary healthInfo(const Services& services) {
+  const auto ftl = ftlStatistics(services, "gatherNANDHealthInfo: Unable to get FTL fields");
+  return ftl ? healthFigures(*ftl) : Dictionary();
+}
+
+Dictionary servitaInfo(const Services& services) {
+  Dictionary info = figuresFor(services, kServitaFigures);
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary CopyInternalLabNANDInfo(const Services& services) {
-  Dictionary info = figures(services, kInternalLabFigures);
+Dictionary internalLabInfo(const Services& services) {
+  Dictionary info = figuresFor(services, kInternalLabFigures);
   info.set(kNANDHealthInfoIsNANDRetirable, std::int64_t{isRetirable(info)});
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary CopyOTANANDInfo(const Services& services) { return figures(services, kOTAFigures); }
+Dictionary otaInfo(const Services& services) { return figuresFor(services, kOTAFigures); }
 
 }  // namespace NANDInfo

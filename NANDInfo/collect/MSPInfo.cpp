@@ -1,20 +1,28 @@
-// The statistics of each media storage processor.
+#include "NANDInfo/collect/MSPInfo.h"
 
+#include <cstdint>
 #include <memory>
 #include <new>
 #include <string>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/GenericParserContext.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Utilities.h"
+#include "NANDInfo/Whitelists.h"
+#include "NANDInfo/collect/FTLInfo.h"
+#include "NANDInfo/collect/Recorded.h"
 #include "NANDInfo/controller/DriverHandles.h"
 
 namespace NANDInfo {
 
+using base::Error;
 using plist::Dictionary;
 
 namespace {
 
-constexpr std::uint32_t kMostMSPs = 10;
+constexpr std::uint32_t kMaxMSPs = 10;
 
 bool getNANDMSPBuffer(const Services& services, const OpenExporter& exporter, std::uint32_t index,
                       Buffer& buffer) {
@@ -26,7 +34,7 @@ bool getNANDMSPBuffer(const Services& services, const OpenExporter& exporter, st
 // The number of MSPs that answer.
 std::uint32_t countMSPs(const Services& services, const OpenExporter& exporter) {
   std::uint32_t count = 0;
-  for (Buffer buffer; count < kMostMSPs; ++count, buffer.clear()) {
+  for (Buffer buffer; count < kMaxMSPs; ++count, buffer.clear()) {
     if (!getNANDMSPBuffer(services, exporter, count, buffer)) break;
   }
   return count;
@@ -62,24 +70,6 @@ Dictionary readMSPs(const Services& services, const OpenExporter& exporter) {
   return msps;
 }
 
-// All MSPs' counters; none when there is no controller with MSPs. Nothing is held when it returns.
-std::optional<Dictionary> gatherZMCMSPData(const Services& services) {
-  const OpenExporter exporter(services);
-  if (exporter.get() == nullptr) {
-    SetAPIErrorMessage("gatherZMCMSPData: Could not get nand_exporter_t");
-    return std::nullopt;
-  }
-  if (exporter->getMSPStatsSelectors == nullptr || exporter->parseMSP == nullptr) {
-    SetAPIErrorMessage("gatherZMCMSPData: Controller does not support MSP data");
-    return std::nullopt;
-  }
-  if (exporter->io_connection == 0) {
-    SetAPIErrorMessage("gatherZMCMSPData: No io_connection exist");
-    return std::nullopt;
-  }
-  return readMSPs(services, exporter);
-}
-
 // The four parts of the firmware version, 16 bits each, the lowest first.
 Dictionary firmwareVersion(const Dictionary& counters) {
   const auto* identifier = counters.number(kTLM_MSP_fw_version_identifier);
@@ -93,8 +83,19 @@ Dictionary firmwareVersion(const Dictionary& counters) {
           {kTLM_MSP_fw_version_identifier_3, part(3)}};
 }
 
-// An MSP's whitelisted counters, with the fields that all MSPs share.
-Dictionary reported(const Dictionary& counters, const Dictionary& shared, bool round) {
+}  // namespace
+
+base::Result<Dictionary> readMSPStatistics(const Services& services) {
+  const OpenExporter exporter(services);
+  if (exporter.get() == nullptr) return Error{"gatherZMCMSPData: Could not get nand_exporter_t"};
+  if (exporter->getMSPStatsSelectors == nullptr || exporter->parseMSP == nullptr) {
+    return Error{"gatherZMCMSPData: Controller does not support MSP data"};
+  }
+  if (exporter->io_connection == 0) return Error{"gatherZMCMSPData: No io_connection exist"};
+  return readMSPs(services, exporter);
+}
+
+Dictionary reportedMSP(const Dictionary& counters, const Dictionary& shared, bool round) {
   Dictionary msp =
       CreateFilteredDict_SigDig(counters, &WhitelistedRawNANDMSPCounters_SigDigDict(), round);
   addEntries(shared, msp);
@@ -102,20 +103,17 @@ Dictionary reported(const Dictionary& counters, const Dictionary& shared, bool r
   return msp;
 }
 
-}  // namespace
-
-Dictionary CopyWhitelistedNANDMSPInfo(const Services& services, bool round) {
-  Dictionary result;
-  if (const auto msps = gatherZMCMSPData(services)) {
-    const Dictionary shared = gatherZMCOtherData(services);
+Dictionary whitelistedMSPInfo(const Services& services, bool round) {
+  Dictionary info;
+  if (const auto msps = recorded(readMSPStatistics(services),
+                                 "CopyWhitelistedNANDMSPInfo: Unable to gather MSP fields")) {
+    const Dictionary shared = fieldsAlong(services);
     for (const auto& [index, counters] : *msps) {
-      result.set(index, reported(*counters.as<Dictionary>(), shared, round));
+      info.set(index, reportedMSP(*counters.as<Dictionary>(), shared, round));
     }
-  } else {
-    SetAPIErrorMessage("CopyWhitelistedNANDMSPInfo: Unable to gather MSP fields");
   }
-  result.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
-  return result;
+  info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
+  return info;
 }
 
 }  // namespace NANDInfo

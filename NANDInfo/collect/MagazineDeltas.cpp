@@ -37,23 +37,28 @@ std::optional<double> magazineDeltaDays(const Dictionary& newer, const Dictionar
   return static_cast<double>(later->int64Value() - earlier->int64Value()) / 86400.0;
 }
 
-Dictionary magazineDeltas(const Dictionary& newer, const Dictionary& older, bool differences,
-                          std::uint32_t mode) {
+base::Result<Dictionary> magazineWindow(const Dictionary& newer, const Dictionary& older,
+                                        bool differences, std::uint32_t mode) {
+  const auto days = magazineDeltaDays(newer, older);
+  if (!days) {
+    return base::Error{"CopyWhitelistedNANDFTLInfo: Unable to gather other stats magazine deltas"};
+  }
+  const bool subtracts = differences && *days > 0.0;
   const bool accumulating = mode == kMagazineAccumulating || mode == kMagazineBoth;
   const bool dynamic = mode == kMagazineDynamic || mode == kMagazineBoth;
   const NameTable& accumulated = PrivacyApprovedSMagNANDFTLCounters_Accum();
   const NameTable& current = PrivacyApprovedSMagNANDFTLCounters_Dynamic();
-  Dictionary deltas;
+  Dictionary window{{kTLM_SM_deltaDays, *days}};
   for (const auto& [key, value] : older) {
     const Number* const now = newer.number(key);
     const Number* const then = value.as<Number>();
     if (now == nullptr || then == nullptr) continue;
     if (accumulating && accumulated.contains(key)) {
-      deltas.set(key, differences ? now->doubleValue() - then->doubleValue() : then->doubleValue());
+      window.set(key, subtracts ? now->doubleValue() - then->doubleValue() : then->doubleValue());
     }
-    if (dynamic && current.contains(key)) deltas.set(key, value);
+    if (dynamic && current.contains(key)) window.set(key, value);
   }
-  return deltas;
+  return window;
 }
 
 void setAveragePECycles(Dictionary& window, const Dictionary& statistics) {

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <optional>
 
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
@@ -16,11 +17,12 @@ void addMagazineTimeStamp(plist::Dictionary& snapshot);
 std::optional<double> magazineDeltaDays(const plist::Dictionary& newer,
                                         const plist::Dictionary& older);
 
-// The counters that both snapshots have, in the order of the older: accumulating ones as doubles
-// (the difference, or the older's value), dynamic ones as the older has them; `mode` is that of
-// CopySMagNANDFTLInfo.
-plist::Dictionary magazineDeltas(const plist::Dictionary& newer, const plist::Dictionary& older,
-                                 bool differences, std::uint32_t mode);
+// The days between two snapshots and the counters that both have, in the order of the older:
+// accumulating ones as doubles (the difference if it is wanted and time has passed, else the
+// older's value), dynamic ones as the older has them; `mode` is that of CopySMagNANDFTLInfo.
+base::Result<plist::Dictionary> magazineWindow(const plist::Dictionary& newer,
+                                               const plist::Dictionary& older, bool differences,
+                                               std::uint32_t mode);
 
 // Sets the average P/E cycles of a window, from its erases and the partitions' sizes; each only
 // when all that it takes is there.

@@ -1,7 +1,13 @@
-// The storage statistics: a few derived fields, and the EAN service's images.
+#include "NANDInfo/collect/StorageStats.h"
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include <utility>
+
+#include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/EAN.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Whitelists.h"
+#include "NANDInfo/collect/DerivedFields.h"
+#include "NANDInfo/collect/FTLInfo.h"
 
 namespace NANDInfo {
 
@@ -15,19 +21,17 @@ constexpr const char* kDerivedFields[] = {kTLM_formatWeeksSince2000, kTLM_DQ_Cap
 
 }  // namespace
 
-Dictionary CopyWhitelistedStorageStats(const Services& services, bool round) {
+Dictionary storageStats(const Services& services, bool round) {
   Dictionary statistics;
-  const Dictionary derived = gatherZMCOtherData(services);
-  for (const char* key : kDerivedFields) {
-    if (const auto* value = derived.find(key)) CopyDictionary(key, *value, statistics);
-  }
+  const Dictionary derived = fieldsAlong(services);
+  for (const char* key : kDerivedFields) copyIfPresent(derived, key, statistics, key);
   for (const EANQuery& query : EANQueries()) {
     statistics.set(query.key, query.query(services, query.code));
   }
-  Dictionary result = CreateFilteredDict_SigDig(std::move(statistics),
-                                                &WhitelistedStorageStats_SigDigDict(), round);
-  result.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
-  return result;
+  Dictionary info = CreateFilteredDict_SigDig(std::move(statistics),
+                                              &WhitelistedStorageStats_SigDigDict(), round);
+  info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
+  return info;
 }
 
 }  // namespace NANDInfo

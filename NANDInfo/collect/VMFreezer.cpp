@@ -1,7 +1,10 @@
-// The writes of the kernel's swap-out thread.
+#include "NANDInfo/collect/VMFreezer.h"
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include <cstddef>
+#include <cstdint>
+#include <span>
+
+#include "NANDInfo/Keys.h"
 #include "NANDInfo/SnapshotReader.h"
 #include "base/ByteReader.h"
 #include "platform/KernelSnapshots.h"
@@ -20,8 +23,8 @@ std::uint64_t bytesWritten(std::span<const std::byte> statistics) {
 
 }  // namespace
 
-plist::Dictionary CopyVMFreezerNANDInfo(const Services& services) {
-  const auto snapshot = services.snapshots.capture(platform::KernelSnapshots::kChunkedData);
+plist::Dictionary swapOutInfo(platform::KernelSnapshots& snapshots) {
+  const auto snapshot = snapshots.capture(platform::KernelSnapshots::kChunkedData);
   if (!snapshot) return {};
   const auto statistics = getIOStatsWithThreadnameFromKCData(*snapshot, "VM_swapout");
   if (!statistics) return {};

@@ -1,8 +1,11 @@
-#include "NANDInfo/Extraction.h"
+#include "NANDInfo/deliver/Extraction.h"
 
 #include "NANDInfo/APIErrorMessage.h"
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/Keys.h"
+#include "NANDInfo/Utilities.h"
+#include "NANDInfo/collect/FTLInfo.h"
+#include "NANDInfo/collect/MSPInfo.h"
+#include "NANDInfo/collect/StorageStats.h"
 #include "NANDInfo/deliver/ExtractionSteps.h"
 #include "platform/Eventra.h"
 #include "platform/SystemLog.h"
@@ -24,55 +27,26 @@ constexpr char kRunStep[] = "NANDInfo: NandInfoExtractToEV_runStep";
 const ExtractionStep kEV_Extraction_Step_Names[] = {
     {"FTL big view",
      [](const Services& services) {
-       return createAndLogFTLStatFieldsToEventraForEvent(
-           services, CopyWhitelistedNANDFTLInfo(services, false));
+       return sendFTLStatistics(services.log, services.eventra,
+                                whitelistedFTLInfo(services, false));
      }},
     {"MSP stats",
      [](const Services& services) {
-       return createAndLogMSPFieldsToEventraForEvent(services,
-                                                     CopyWhitelistedNANDMSPInfo(services, false));
+       return sendMSPStatistics(services.log, services.eventra,
+                                whitelistedMSPInfo(services, false));
      }},
     {"storage stats",
      [](const Services& services) {
-       return createAndLogStorageStatsToEventraForEvent(
-           services, CopyWhitelistedStorageStats(services, false));
+       return sendStorageStats(services.log, services.eventra, storageStats(services, false));
      }},
-    {"NVRAM stat", gatherNVRAMStats},
-    {"FTL statsMag daily",
-     [](const Services& services) {
-       return createAndLogSMagFTLFieldsToEventraForEvent(services, 0);
-     }},
-    {"FTL statsMag weekly",
-     [](const Services& services) {
-       return createAndLogSMagFTLFieldsToEventraForEvent(services, 1);
-     }},
-    {"FTL statsMag monthly",
-     [](const Services& services) {
-       return createAndLogSMagFTLFieldsToEventraForEvent(services, 2);
-     }},
+    {"NVRAM stat", sendNVRAMStatistics},
+    {"FTL statsMag daily", [](const Services& services) { return sendMagazine(services, 0); }},
+    {"FTL statsMag weekly", [](const Services& services) { return sendMagazine(services, 1); }},
+    {"FTL statsMag monthly", [](const Services& services) { return sendMagazine(services, 2); }},
     {"FTL counters", nullptr},
 };
 
-std::optional<Dictionary> NandInfoExtractToEV_runAllSteps(const Services& services,
-                                                          const plist::Value* /*context*/,
-                                                          std::uint32_t flags, bool wantsSummary,
-                                                          std::uint64_t firstStep) {
-  Dictionary summary;
-  for (auto step = static_cast<std::uint32_t>(firstStep); step < kLastStep; ++step) {
-    if (step == kMonthlyStep && (flags & kAllowsMonthly) == 0) {
-      services.log.log(LogLevel::standard, "Skipping Stats Mag Monthly Delta");
-      break;
-    }
-    const auto sent = NandInfoExtractToEV_runStep(services, step);
-    if (wantsSummary && sent) addEntries(*sent, summary);
-  }
-  if (!wantsSummary) return std::nullopt;
-  summary.set(kNANDInfoErrorMessageKey, GetAPIErrorMessage());
-  return summary;
-}
-
-std::optional<Dictionary> NandInfoExtractToEV_runStep(const Services& services,
-                                                      std::uint32_t step) {
+std::optional<Dictionary> runExtractionStep(const Services& services, std::uint32_t step) {
   if (!services.eventra.offersLazySend()) {
     return Dictionary{{kNANDInfoErrorMessageKey, "Unable call EV API EventraSendEventLazy"}};
   }
@@ -93,9 +67,16 @@ std::optional<Dictionary> NandInfoExtractToEV_runStep(const Services& services,
   return sent;
 }
 
-bool EventraSendEventLazyWrapper(const Services& services, std::string_view event,
-                                 platform::Eventra::PayloadProducer producer) {
-  return services.eventra.EventraSendEventLazy(event, std::move(producer));
+Dictionary runExtraction(const Services& services, std::uint32_t firstStep, bool allowsMonthly) {
+  Dictionary all;
+  for (std::uint32_t step = firstStep; step < kLastStep; ++step) {
+    if (step == kMonthlyStep && !allowsMonthly) {
+      services.log.log(LogLevel::standard, "Skipping Stats Mag Monthly Delta");
+      break;
+    }
+    if (const auto sent = runExtractionStep(services, step)) addEntries(*sent, all);
+  }
+  return all;
 }
 
 }  // namespace NANDInfo

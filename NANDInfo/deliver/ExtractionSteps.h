@@ -1,8 +1,7 @@
-// The steps of the extraction that send what a collector made of the controller's statistics. Each
-// returns what was sent; only an error message when the collector has nothing.
+// What the steps of the extraction send of what the collectors made. Each returns what was sent.
 #pragma once
 
-#include <optional>
+#include <cstdint>
 
 #include "NANDInfo/Services.h"
 #include "plist/Value.h"
@@ -10,16 +9,25 @@
 namespace NANDInfo {
 
 // Three events of the FTL statistics: the counters and, in two parts, the histograms.
-plist::Dictionary createAndLogFTLStatFieldsToEventraForEvent(
-    const Services& services, const std::optional<plist::Dictionary>& ftl);
+plist::Dictionary sendFTLStatistics(platform::SystemLog& log, platform::Eventra& eventra,
+                                    const plist::Dictionary& ftl);
 
-// One event for each MSP of a dictionary by index. Of what was sent the result holds the last,
-// under "msp_index".
-plist::Dictionary createAndLogMSPFieldsToEventraForEvent(const Services& services,
-                                                         std::optional<plist::Dictionary> msps);
+// One event for each MSP of a dictionary by index; the process's message in it is none. Of what was
+// sent the result holds the last, under "msp_index". An event that the sink doesn't take is also
+// recorded as the process's message.
+plist::Dictionary sendMSPStatistics(platform::SystemLog& log, platform::Eventra& eventra,
+                                    plist::Dictionary msps);
 
 // One event of the storage statistics.
-plist::Dictionary createAndLogStorageStatsToEventraForEvent(
-    const Services& services, const std::optional<plist::Dictionary>& storage);
+plist::Dictionary sendStorageStats(platform::SystemLog& log, platform::Eventra& eventra,
+                                   const plist::Dictionary& storage);
+
+// How full the boot variables' memory is and how often it was written: what there was to send, even
+// if the sink didn't take it; empty without that memory's service.
+plist::Dictionary sendNVRAMStatistics(const Services& services);
+
+// The stats magazine's counters of the last day (0), week (1) or month (2); an error message for
+// another type or without a magazine.
+plist::Dictionary sendMagazine(const Services& services, std::int32_t deltaType);
 
 }  // namespace NANDInfo

@@ -1,123 +1,139 @@
 #include "NANDInfo/deliver/ListHandlers.h"
 
-#include <cstdint>
 #include <optional>
 #include <string>
 #include <utility>
 
 #include "NANDInfo/DefectsList.h"
-#include "NANDInfo/NANDLogWriter.h"
-#include "NANDInfo/Services.h"
-#include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/Utilities.h"
 #include "NANDInfo/ValidityList.h"
+#include "NANDInfo/collect/BasicInfo.h"
 #include "NANDInfo/decode/Counters.h"
-#include "NANDInfo/deliver/StructuredLogState.h"
+#include "NANDInfo/deliver/NANDLogWriter.h"
 #include "base/Text.h"
 #include "platform/FaultwatchSupport.h"
 #include "platform/StandardStreams.h"
 
 namespace NANDInfo {
 
+using base::Error, base::Result;
 using plist::Dictionary;
 
 namespace {
 
 constexpr char kUnparsable[] = "data cannot be parsed";
 constexpr char kClassWithoutDefectModes[] = "ZMCStorage";
+constexpr std::size_t kMaxChipId = 63;
 
-// Writes the message, and is the handler's answer to it.
-bool refuse(const Services& services, const std::string& message) {
-  services.streams.writeError(message);
-  return false;
+// The text of a characteristic.
+Result<std::string> characteristic(const Dictionary& device, const char* key) {
+  if (const std::string* text = device.text(key)) return *text;
+  return Error{base::format(device.find(key) != nullptr
+                                ? "ERROR: %s is not stored as a OrvalstrTypeID\n"
+                                : "ERROR: Could not determine the %s\n",
+                            key)};
 }
 
-// The text of a characteristic; null, with a message, when it is missing or no text.
-const std::string* characteristic(const Services& services, const Dictionary& device,
-                                  const char* key) {
-  const char* problem = device.find(key) != nullptr
-                            ? "ERROR: %s is not stored as a OrvalstrTypeID\n"
-                            : "ERROR: Could not determine the %s\n";
-  const std::string* text = device.text(key);
-  if (text == nullptr) services.streams.writeError(base::format(problem, key));
-  return text;
-}
-
-}  // namespace
-
-bool DumpValidityList(const Services& services, std::span<const std::byte> list,
-                      const plist::Value&, std::string_view) {
-  if (!gNeedValidityList) return true;
-  auto lists = parseValidityList(list);
-  if (!lists) return refuse(services, kUnparsable);
-  Dictionary log{{"IntermediateWamp", gCurrentSysWamp}, {"UserWamp", gCurrentUserWamp}};
-  DumpNANDInfo(services, log);
-  for (std::size_t i = 0; i < lists->size(); ++i) {
-    if ((*lists)[i].empty()) continue;
-    log.set(base::format("ValidityList[%d]", static_cast<int>(i)), std::move((*lists)[i]));
+Dictionary validityLog(const StructuredLogState& state, const Dictionary& counters,
+                       ValidityLists lists) {
+  Dictionary log{{"IntermediateWamp", state.gCurrentSysWamp}, {"UserWamp", state.gCurrentUserWamp}};
+  addEntries(counters, log);
+  for (std::size_t i = 0; i < lists.size(); ++i) {
+    if (lists[i].empty()) continue;
+    log.set(base::format("ValidityList[%zu]", i), std::move(lists[i]));
   }
-  NLW_WriteLog(services, "165", &log);
-  return true;
+  return log;
 }
 
-bool DumpTelemetryList(const Services& services, std::span<const std::byte> list,
-                       const plist::Value& characteristics, std::string_view) {
-  constexpr int kLongestChipId = 63;
+// How the channels of a telemetry list are read.
+struct TelemetryLayout {
+  ChipKind chip;
+  CounterConverter* convert;
+  std::int32_t channels;
+};
+
+Result<TelemetryLayout> telemetryLayout(platform::StandardStreams& streams,
+                                        const plist::Value& characteristics) {
   const auto* device = characteristics.as<Dictionary>();
   if (device == nullptr) {
-    return refuse(services, "ERROR: Could not parse the Device Characteristics dictionary\n");
+    return Error{"ERROR: Could not parse the Device Characteristics dictionary\n"};
   }
-  const std::string* chipId = characteristic(services, *device, "chip-id");
-  if (chipId == nullptr) return false;
-  if (chipId->size() > kLongestChipId) {
-    return refuse(
-        services,
-        base::format("ERROR: Unable to obtain %s as conversion from the UniChar contents of "
-                     "Orvalstr failed, or the buffer of %d bytes is too small\n",
-                     "chip-id", kLongestChipId + 1));
+  const auto chipId = characteristic(*device, "chip-id");
+  if (!chipId) return chipId.error();
+  if (chipId->size() > kMaxChipId) {
+    return Error{base::format(
+        "ERROR: Unable to obtain %s as conversion from the UniChar contents of Orvalstr failed, or "
+        "the buffer of %zu bytes is too small\n",
+        "chip-id", kMaxChipId + 1)};
   }
-  const std::string* vendorId = characteristic(services, *device, "manufacturer-id");
-  if (vendorId == nullptr) return false;
+  const auto vendorId = characteristic(*device, "manufacturer-id");
+  if (!vendorId) return vendorId.error();
   const Vendor vendor = vendorOf(*vendorId);
-  services.streams.writeOutput(vendor.complaint);
-  const auto count = signed32(*device, "num-bus");
-  if (!count) return refuse(services, "ERROR: could not determine the number of channels\n");
-  const auto channels = parseTelemetryList(list, *count);
-  if (!channels) {
-    return refuse(services, "ERROR: Attempting to parse beyond the bounds of the buffer\n");
-  }
+  streams.writeOutput(vendor.complaint);
+  const auto channels = signed32(*device, "num-bus");
+  if (!channels) return Error{"ERROR: could not determine the number of channels\n"};
   const ChipKind chip = chipKind(*chipId);
-  for (const TelemetryChannel& channel : *channels) {
-    services.faultwatch.logStructuredData(
-        kStorageLogType, telemetryLog(channel, chip, counterConverter(chip, vendor.code)));
-  }
-  return true;
+  return TelemetryLayout{chip, counterConverter(chip, vendor.code), *channels};
 }
 
-bool DumpDefectsList(const Services& services, std::span<const std::byte> list,
-                     const plist::Value& characteristics, std::string_view className) {
-  const auto defects = DefectsList::parse(list);
-  if (!defects) return refuse(services, kUnparsable);
-  Dictionary header{{"Factory Count", static_cast<std::int32_t>(defects->factoryCount())}};
+Dictionary defectsHeader(const DefectsList& defects, const plist::Value& characteristics) {
+  Dictionary header{{"Factory Count", static_cast<std::int32_t>(defects.factoryCount())}};
   if (const auto* device = characteristics.as<Dictionary>()) {
     if (const auto descriptor = signed32(*device, "nand-device-desc")) {
       header.set("com.norba.NANDInfo.nandDesc", *descriptor);
     }
   }
-  services.faultwatch.logStructuredData(kStorageLogType, header);
+  return header;
+}
+
+}  // namespace
+
+Result<void> DumpValidityList(const Services& services, const StructuredLogState& state,
+                              std::span<const std::byte> list) {
+  if (!state.gNeedValidityList) return {};
+  auto lists = parseValidityList(list);
+  if (!lists) return Error{kUnparsable};
+  const auto statistics = readLegacyStatistics(services);
+  const Dictionary counters = statistics ? legacyInfo(*statistics, std::nullopt) : Dictionary();
+  const Dictionary log = validityLog(state, counters, *std::move(lists));
+  writeNANDLog(services, "165", &log);
+  return {};
+}
+
+Result<void> DumpTelemetryList(platform::FaultwatchSupport& faultwatch,
+                               platform::StandardStreams& streams,
+                               const plist::Value& characteristics,
+                               std::span<const std::byte> list) {
+  const auto layout = telemetryLayout(streams, characteristics);
+  if (!layout) return layout.error();
+  const auto channels = parseTelemetryList(list, layout->channels);
+  if (!channels) return Error{"ERROR: Attempting to parse beyond the bounds of the buffer\n"};
+  for (const TelemetryChannel& channel : *channels) {
+    faultwatch.logStructuredData(kStorageLogType,
+                                 telemetryLog(channel, layout->chip, layout->convert));
+  }
+  return {};
+}
+
+Result<void> DumpDefectsList(platform::FaultwatchSupport& faultwatch,
+                             platform::StandardStreams& streams,
+                             const plist::Value& characteristics, std::string_view className,
+                             std::span<const std::byte> list) {
+  const auto defects = DefectsList::parse(list);
+  if (!defects) return Error{kUnparsable};
+  faultwatch.logStructuredData(kStorageLogType, defectsHeader(*defects, characteristics));
+  const bool hasModes = className != kClassWithoutDefectModes;
   for (std::size_t i = 0; i < defects->size(); ++i) {
     Defect defect = (*defects)[i];
-    if (className != kClassWithoutDefectModes) {
-      const auto offset = reasonOffset(defect.mode);
-      if (!offset) {
-        services.streams.writeError(
-            base::format("Encountered unexpected defectMode: 0x%x", defect.mode));
-      }
-      defect.reason += offset.value_or(0);
+    const auto offset = hasModes ? reasonOffset(defect.mode) : 0;
+    if (!offset) {
+      streams.writeError(base::format("Encountered unexpected defectMode: 0x%x", defect.mode));
     }
-    services.faultwatch.logStructuredData(kStorageLogType, defectLog(defect));
+    defect.reason += offset.value_or(0);
+    faultwatch.logStructuredData(kStorageLogType, defectLog(defect));
   }
-  return true;
+  return {};
 }
 
 }  // namespace NANDInfo

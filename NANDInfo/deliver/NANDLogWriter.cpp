@@ -1,11 +1,9 @@
-#include "NANDInfo/NANDLogWriter.h"
+#include "NANDInfo/deliver/NANDLogWriter.h"
 
 #include <exception>
 #include <utility>
 
-#include "NANDInfo/Services.h"
 #include "NANDInfo/deliver/NANDLog.h"
-#include "base/CivilDate.h"
 #include "platform/Clock.h"
 #include "platform/DeviceProperties.h"
 #include "platform/FaultwatchSupport.h"
@@ -27,12 +25,13 @@ constexpr char kLastLoggedKey[] = "SSLastLoggedAt";
 constexpr double kInterval = 604800;  // seconds
 
 // A time in the future counts as recent. What is skipped is logged.
-bool wasWrittenRecently(const Services& services, Date now) {
-  const auto stored = services.preferences.QNSPreferencesGetValue(kLastLoggedKey, kDomain);
+bool wasWrittenRecently(platform::PreferenceStore& preferences, platform::SystemLog& systemLog,
+                        Date now) {
+  const auto stored = preferences.QNSPreferencesGetValue(kLastLoggedKey, kDomain);
   const Date* last = stored ? stored->as<Date>() : nullptr;
   if (last == nullptr || !(now.secondsSince1970 - last->secondsSince1970 < kInterval)) return false;
-  services.log.log(LogLevel::standard, "NANDLogWriter:Last written at %s current %s :skipped",
-                   description(*stored).c_str(), description(Value(now)).c_str());
+  systemLog.log(LogLevel::standard, "NANDLogWriter:Last written at %s current %s :skipped",
+                description(*stored).c_str(), description(Value(now)).c_str());
   return true;
 }
 
@@ -43,22 +42,18 @@ NANDLogOrigin originAt(const Services& services, Date now) {
           .operatingSystemVersion = services.systemVersion.operatingSystemVersion(),
           .date = NANDLogDate(now, services.clock.secondsFromUTC(now)),
           .incidentIdentifier = services.faultwatch.newIncidentIdentifier(),
-          .faultwatchKey = GetFaultwatchKey(services),
+          .faultwatchKey = faultwatchKey(services.deviceProperties),
           .processName = std::move(process.name),
           .processIdentifier = process.identifier};
 }
 
-base::CivilDate currentDate(const Services& services) {
-  return base::civilFromSeconds(services.clock.now().secondsSince1970).date;
-}
-
 }  // namespace
 
-void NLW_WriteLog(const Services& services, std::string_view logType,
+void writeNANDLog(const Services& services, std::string_view logType,
                   const plist::Dictionary* values) {
   try {
     const Date now = services.clock.now();
-    if (wasWrittenRecently(services, now) || values == nullptr) return;
+    if (wasWrittenRecently(services.preferences, services.log, now) || values == nullptr) return;
     const std::string text = NANDLogText(originAt(services, now), NANDLogEntries(*values));
     services.submission.QNSWriteLogForSubmission(
         logType, "StorageStatus", nullptr,
@@ -71,12 +66,12 @@ void NLW_WriteLog(const Services& services, std::string_view logType,
   }
 }
 
-std::string GetFaultwatchKey(const Services& services) {
-  return services.deviceProperties.textProperty("InverseDeviceID").value_or("error");
+std::string faultwatchKey(platform::DeviceProperties& properties) {
+  return properties.textProperty("InverseDeviceID").value_or("error");
 }
 
-int GetCurrentMonthNumber(const Services& services) { return currentDate(services).month; }
-
-std::int64_t GetCurrentYear(const Services& services) { return currentDate(services).year; }
+base::CivilDate currentDate(platform::Clock& clock) {
+  return base::civilFromSeconds(clock.now().secondsSince1970).date;
+}
 
 }  // namespace NANDInfo

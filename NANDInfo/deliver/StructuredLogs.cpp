@@ -1,4 +1,4 @@
-#include "NANDInfo/StructuredLogs.h"
+#include "NANDInfo/deliver/StructuredLogs.h"
 
 #include <array>
 #include <cstddef>
@@ -9,10 +9,8 @@
 #include <span>
 #include <vector>
 
-#include "NANDInfo/Collectors.h"
 #include "NANDInfo/Controller.h"
-#include "NANDInfo/Services.h"
-#include "NANDInfo/collect/WriteAmplification.h"
+#include "NANDInfo/collect/BasicInfo.h"
 #include "NANDInfo/controller/DriverHandles.h"
 #include "NANDInfo/deliver/ListHandlers.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
@@ -26,6 +24,15 @@ namespace NANDInfo {
 
 namespace {
 
+// A list as it comes from the driver, and what its handler may want to know of the dump.
+struct List {
+  std::span<const std::byte> bytes;
+  const plist::Value& characteristics;
+  std::string_view className;
+  const StructuredLogState& state;
+};
+using ListHandler = base::Result<void>(const Services& services, const List& list);
+
 // The lists in the order of their retrieval; each is asked for with the arguments from 0 on.
 struct ListRow {
   SelectorGetter nand_exporter_t::*slot;
@@ -35,11 +42,22 @@ struct ListRow {
 };
 
 constexpr ListRow kLists[] = {
-    {&nand_exporter_t::getBandStatsSelectors, 1, DumpValidityList,
+    {&nand_exporter_t::getBandStatsSelectors, 1,
+     [](const Services& services, const List& list) {
+       return DumpValidityList(services, list.state, list.bytes);
+     },
      "Validity list retrieval is not supported\n"},
-    {&nand_exporter_t::getTelemetryListSelectors, 3, DumpTelemetryList,
+    {&nand_exporter_t::getTelemetryListSelectors, 3,
+     [](const Services& services, const List& list) {
+       return DumpTelemetryList(services.faultwatch, services.streams, list.characteristics,
+                                list.bytes);
+     },
      "Telemetry list retrieval is not supported\n"},
-    {&nand_exporter_t::getDefectsListSelectors, 1, DumpDefectsList,
+    {&nand_exporter_t::getDefectsListSelectors, 1,
+     [](const Services& services, const List& list) {
+       return DumpDefectsList(services.faultwatch, services.streams, list.characteristics,
+                              list.className, list.bytes);
+     },
      "Defects list retrieval is not supported\n"},
 };
 
@@ -99,6 +117,7 @@ struct Source {
   const nand_exporter_t& exporter;
   const plist::Value& characteristics;
   std::uint32_t flags;  // of every command
+  const StructuredLogState& state;
 };
 
 // Fetches one list, `index` in the order of retrieval, and has it handled.
@@ -133,7 +152,10 @@ bool retrieveList(const Services& services, const Source& source, const ListRetr
         "Could not retrieve data from driver for selector %u\n", selectors->dataOpType));
     return true;
   }
-  return retrieval.handler(services, list, source.characteristics, source.exporter.className);
+  const auto handled = retrieval.handler(
+      services, {list, source.characteristics, source.exporter.className, source.state});
+  if (!handled) services.streams.writeError(handled.error().text);
+  return static_cast<bool>(handled);
 }
 
 bool retrieveLists(const Services& services, const Source& source) {
@@ -145,34 +167,18 @@ bool retrieveLists(const Services& services, const Source& source) {
   return handled;
 }
 
-// The legacy counters, handed to the user and released; nothing when they can't be had.
-template <typename User>
-void withLegacyCounters(const Services& services, User use) {
-  LegacyNandInfoCxt context;
-  nand_exporter_t* exporter = nullptr;
-  if (!load_nand_info(services, exporter, &context)) return;
-  use(context);
-  if (exporter->releaseLegacy != nullptr) exporter->releaseLegacy(&context);
-}
-
-void decideOnValidityList(const Services& services) {
-  WriteAmplification amplification;
-  withLegacyCounters(services, [&](const LegacyNandInfoCxt& context) {
-    amplification = writeAmplificationOf(context);
-  });
-  gCurrentUserWamp = amplification.user;
-  gCurrentSysWamp = amplification.intermediate;
-  gNeedValidityList =
-      isHighWriteAmplification(gCurrentUserWamp, services.preferences.QNSPreferencesGetValue(
-                                                     "userWAmp", "com.norba.NANDInfo")) ||
-      gForceCollectionSet;
+StructuredLogState stateOf(const Services& services, bool forceCollection) {
+  const auto statistics = readLegacyStatistics(services);
+  return structuredLogState(
+      statistics ? &*statistics : nullptr,
+      services.preferences.QNSPreferencesGetValue("userWAmp", "com.norba.NANDInfo"),
+      forceCollection);
 }
 
 }  // namespace
 
-bool DumpStorageStructuredLog(const Services& services, bool flag) {
-  decideOnValidityList(services);
-
+bool dumpStructuredLogs(const Services& services, bool flag, bool forceCollection) {
+  const StructuredLogState state = stateOf(services, forceCollection);
   nand_exporter_t* exporter = nullptr;
   const RegistryHandle service(services, findNandExporter(services, exporter));
   if (service.get() == 0) {
@@ -189,7 +195,7 @@ bool DumpStorageStructuredLog(const Services& services, bool flag) {
   bool handled = false;
   if (characteristics) {
     handled = retrieveLists(
-        services, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0});
+        services, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0, state});
   } else {
     services.streams.writeError("failed to create dictionary");
   }
@@ -197,14 +203,6 @@ bool DumpStorageStructuredLog(const Services& services, bool flag) {
     services.streams.writeError("Could not close connection to service\n");
   }
   return handled;
-}
-
-void DumpNANDInfo(const Services& services, plist::Dictionary& dictionary) {
-  withLegacyCounters(services, [&](const LegacyNandInfoCxt& context) {
-    for (const auto& [key, value] : buildLegacyNANDInfoDict(services, context, true)) {
-      dictionary.set(key, value);
-    }
-  });
 }
 
 }  // namespace NANDInfo

@@ -16,7 +16,6 @@
 #include "NANDInfo/ValidityList.h"
 #include "NANDInfo/collect/WriteAmplification.h"
 #include "NANDInfo/deliver/ListHandlers.h"
-#include "NANDInfo/deliver/StructuredLogState.h"
 #include "support/ControllerLists.h"
 #include "support/StorageDevice.h"
 
@@ -190,7 +189,7 @@ struct StructuredLogsTest : testing::Test, support::StorageDevice {
   void restart() {
     EXPECT_EQ(registry.problems(), Lines());
     ResetExporters();
-    ResetStructuredLogState();
+    gForceCollectionSet = false;
     registry = FakeDeviceRegistry();
     registry.add({.className = "Bus",
                   .properties = {{kCharacteristics, characteristics}},
@@ -270,17 +269,16 @@ TEST_F(StructuredLogsTest, TheValidityListIsLoggedWhenItIsWanted) {
     SCOPED_TRACE(&row - rows);
     restart();
     gForceCollectionSet = row.forced;
-    gCurrentUserWamp = gCurrentSysWamp = 9;
-    gNeedValidityList = !row.logged;
     if (row.preference) {
       preferences.setMobile("com.norba.NANDInfo", "userWAmp", *row.preference);
     }
     if (row.statisticsFail) registry.standing.erase("9 data 13/0");
     EXPECT_TRUE(DumpStorageStructuredLog(platform, false));
-    EXPECT_EQ(gNeedValidityList, row.logged);
-    EXPECT_EQ(gCurrentUserWamp, row.statisticsFail ? 0 : 3);
-    EXPECT_EQ(gCurrentSysWamp, 0);
-    EXPECT_EQ(submission.logs.size(), row.logged ? 1u : 0u);
+    ASSERT_EQ(submission.logs.size(), row.logged ? 1u : 0u);
+    if (row.logged) {
+      const char* const user = row.statisticsFail ? "UserWamp:0.00;" : "UserWamp:3.00;";
+      EXPECT_NE(submission.logs[0].contents.find(user), std::string::npos);
+    }
     EXPECT_EQ(structured.size(), 8u);
   }
 }
@@ -431,16 +429,17 @@ TEST_F(StructuredLogsTest, TelemetryNeedsThreeCharacteristics) {
   for (const auto& row : rows) {
     restart();
     SCOPED_TRACE(&row - rows);
-    EXPECT_EQ(DumpTelemetryList(platform, support::telemetryList(2), row.characteristics, kQRT3),
-              row.error.empty());
-    EXPECT_EQ(errors, row.error.empty() ? Lines() : Lines{row.error});
+    const auto handled = DumpTelemetryList(platform.faultwatch, streams, row.characteristics,
+                                           support::telemetryList(2));
+    EXPECT_EQ(handled ? "" : handled.error().text, row.error);
     EXPECT_EQ(structured.size(), row.logs);
   }
   // The vendor's lowest byte doesn't count, and only six are read.
   const auto readStage = [&](const char* vendor) {
     restart();
     const auto changed = with("manufacturer-id", vendor);
-    EXPECT_TRUE(DumpTelemetryList(platform, support::telemetryList(2), changed, kQRT3));
+    EXPECT_TRUE(
+        DumpTelemetryList(platform.faultwatch, streams, changed, support::telemetryList(2)));
     return structured[0].second.number("readStage[4]")->int64Value();
   };
   characteristics.set("chip-id", "");
@@ -455,7 +454,8 @@ TEST_F(StructuredLogsTest, TheDefectModeCountsOnNewerDriversOnly) {
     for (const std::uint32_t mode : {0u, 1u, 2u, 3u, 0xFFFFFFFFu}) {
       records.push_back({0, 0, 0, 0, 50, 0, 0, mode});
     }
-    EXPECT_TRUE(DumpDefectsList(platform, support::defectsList(0, records), properties, className));
+    EXPECT_TRUE(DumpDefectsList(platform.faultwatch, streams, properties, className,
+                                support::defectsList(0, records)));
     std::vector<std::int64_t> all;
     for (const auto& entry : structured) {
       if (const auto* reason = entry.second.number("Reason")) all.push_back(reason->int64Value());

@@ -9,8 +9,8 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"
+#include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/decode/ProcessState.h"
-#include "NANDInfo/deliver/StructuredLogState.h"
 #include "daemon/Entry.h"
 #include "end_to_end/Device.h"
 #include "host/Host.h"
@@ -37,7 +37,7 @@ std::string runDay(
   ::setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent", 1);
   NANDInfo::ResetExporters();
   support::freshErrors();
-  NANDInfo::ResetStructuredLogState();
+  NANDInfo::gForceCollectionSet = false;
   const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
   ::testing::internal::CaptureStderr();
   {

@@ -7,6 +7,9 @@
 
 namespace MORVEND_EXPORTED NANDInfo {
 
+// The validity list is wanted always. Nothing in the library sets it.
+extern bool gForceCollectionSet;
+
 // Works out the write amplification, and with it whether the validity list is wanted; then fetches
 // the lists that the controller's driver offers and hands each to its handler. True when every list
 // that could be fetched was handled. The flag goes to the driver with each command.

@@ -1,0 +1,19 @@
+// The stats magazine's windows, from the controller's snapshots.
+#pragma once
+
+#include <cstdint>
+
+#include "NANDInfo/Magazine.h"
+#include "NANDInfo/Services.h"
+#include "plist/Value.h"
+
+namespace NANDInfo {
+
+// What CopySMagNANDFTLInfo promises.
+plist::Dictionary magazineInfo(const Services& services, std::uint64_t hours, bool differences,
+                               std::uint32_t mode);
+
+// What CopySMagNANDFTLCustomHistoryInfo promises.
+plist::Dictionary magazineHistory(const Services& services, bool skips);
+
+}  // namespace NANDInfo

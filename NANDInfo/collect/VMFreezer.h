@@ -1,0 +1,12 @@
+// The writes of the kernel's swap-out thread.
+#pragma once
+
+#include "NANDInfo/Services.h"
+#include "plist/Value.h"
+
+namespace NANDInfo {
+
+// How many bytes it has written, under two keys; empty when that isn't known.
+plist::Dictionary swapOutInfo(platform::KernelSnapshots& snapshots);
+
+}  // namespace NANDInfo

@@ -1,0 +1,36 @@
+// What is logged, under the names of the library's interface.
+
+#include "NANDInfo/NANDLogWriter.h"
+#include "NANDInfo/StructuredLogs.h"
+#include "NANDInfo/Utilities.h"
+#include "NANDInfo/collect/BasicInfo.h"
+#include "NANDInfo/deliver/NANDLogWriter.h"
+#include "NANDInfo/deliver/StructuredLogs.h"
+
+namespace NANDInfo {
+
+bool gForceCollectionSet = false;
+
+bool DumpStorageStructuredLog(const Services& services, bool flag) {
+  return dumpStructuredLogs(services, flag, gForceCollectionSet);
+}
+
+void DumpNANDInfo(const Services& services, plist::Dictionary& dictionary) {
+  const auto statistics = readLegacyStatistics(services);
+  if (statistics) addEntries(legacyInfo(*statistics, std::nullopt), dictionary);
+}
+
+void NLW_WriteLog(const Services& services, std::string_view logType,
+                  const plist::Dictionary* values) {
+  writeNANDLog(services, logType, values);
+}
+
+std::string GetFaultwatchKey(const Services& services) {
+  return faultwatchKey(services.deviceProperties);
+}
+
+int GetCurrentMonthNumber(const Services& services) { return currentDate(services.clock).month; }
+
+std::int64_t GetCurrentYear(const Services& services) { return currentDate(services.clock).year; }
+
+}  // namespace NANDInfo
