@@ -2,7 +2,8 @@
 //
 // A file is a header, objects, a table of the objects' offsets, and a trailer that says how wide
 // offsets and object references are, how many objects there are, which one is the top level and
-// where the table begins. Containers hold references. Everything is big-endian.
+// where the table begins. Containers hold references. Everything is big-endian. Read by hand: there
+// is no library for it alone.
 #pragma once
 
 #include <string_view>

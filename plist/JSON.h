@@ -1,4 +1,4 @@
-// Values as JSON text.
+// Values as JSON text. Written by hand: in the order of the entries, at the speed of appending.
 #pragma once
 
 #include <string>

@@ -6,6 +6,7 @@
 #include <cmath>
 
 #include "tools/common/Terminal.h"
+#include "tools/common/TerminalText.h"
 
 namespace demo {
 
@@ -13,7 +14,7 @@ std::size_t screenWidth() { return std::clamp<std::size_t>(tools::terminalWidth(
 
 std::string heading(std::string_view text) {
   static const bool terminal = ::isatty(STDOUT_FILENO) == 1;
-  std::string line(text);
+  const std::string line = tools::printable(text);
   return terminal ? "\x1b[1m" + line + "\x1b[0m\n" : line + "\n";
 }
 
@@ -26,7 +27,8 @@ std::string shortKey(std::string_view key) {
 std::string wrapped(const std::vector<std::string>& names) {
   const std::string indent(kIndent, ' ');
   std::string text, line = indent;
-  for (const std::string& name : names) {
+  for (const std::string& each : names) {
+    const std::string name = tools::printable(each);
     if (line.size() > kIndent && line.size() + 1 + name.size() > screenWidth()) {
       text += line + '\n';
       line = indent;
@@ -49,7 +51,7 @@ std::string bar(double share, std::size_t width) {
 
 std::string skyline(std::span<const std::uint64_t> counts) {
   static constexpr const char* kHeights[] = {"▁", "▂", "▃", "▄", "▅", "▆", "▇", "█"};
-  const std::uint64_t most = counts.empty() ? 0 : *std::max_element(counts.begin(), counts.end());
+  const std::uint64_t most = counts.empty() ? 0 : std::ranges::max(counts);
   std::string text;
   for (const std::uint64_t count : counts) {
     const double share = most == 0 ? 0 : static_cast<double>(count) / static_cast<double>(most);

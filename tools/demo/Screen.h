@@ -1,4 +1,4 @@
-// Text for people: bars and headings, as wide as the terminal.
+// Text for people: headings, names and bars, as wide as the terminal.
 #pragma once
 
 #include <cstdint>

@@ -2,6 +2,7 @@
 
 #include "base/Text.h"
 #include "tools/common/Table.h"
+#include "tools/common/TerminalText.h"
 #include "tools/demo/Screen.h"
 
 namespace demo {
@@ -22,7 +23,7 @@ std::string preferencesPath(const std::string& user, const std::string& domain) 
 
 std::string namesOf(Device& device, const std::string& folder) {
   std::string names;
-  for (const std::string& name : device.namesIn(folder)) names += " " + name;
+  for (const std::string& name : device.namesIn(folder)) names += " " + tools::printable(name);
   return "  " + device.pathOf(folder) + "\n   " + names + "\n";
 }
 

@@ -9,6 +9,7 @@
 #include "NANDInfo/Services.h"
 #include "base/Text.h"
 #include "tools/common/Table.h"
+#include "tools/common/TerminalText.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 #include "tools/demo/TelemetryRules.h"
@@ -17,6 +18,7 @@ namespace demo {
 
 using base::format;
 using plist::Dictionary;
+using tools::printable;
 using tools::Table;
 using Align = Table::Align;
 
@@ -55,7 +57,7 @@ class LeftText {
 
  private:
   void addRow(std::size_t count, const char* what, const std::string& rule) {
-    if (count > 0) text_ += format("    %5zu %-14s %s\n", count, what, rule.c_str());
+    if (count > 0) text_ += format("    %5zu %-14s %s\n", count, what, printable(rule).c_str());
   }
 
   void addLogs() {
@@ -64,7 +66,7 @@ class LeftText {
     for (const std::string& name : device_.namesIn(Device::kSubmitted)) {
       const std::string path = std::string(Device::kSubmitted) + "/" + name;
       const std::string content = device_.bytes(path).value_or("");
-      text_ += format("  %s, %zu bytes\n", name.c_str(), content.size());
+      text_ += format("  %s, %zu bytes\n", printable(name).c_str(), content.size());
       if (name.ends_with(Device::kOptions)) {
         addRow(device_.propertyList(path).value_or(Dictionary()).size(), "options",
                "fixed list of the report");
@@ -159,10 +161,9 @@ class LeftText {
                 kIndent);
     std::size_t count = 0;
     for (auto& [rule, counters] : byRule) {
-      const auto listed = static_cast<std::size_t>(
-          std::stable_partition(counters.begin(), counters.end(),
-                                [](const Counter& counter) { return counter.listed.has_value(); }) -
-          counters.begin());
+      const auto withheld = std::ranges::stable_partition(
+          counters, [](const Counter& counter) { return counter.listed.has_value(); });
+      const std::size_t listed = counters.size() - withheld.size();
       table.addRow(
           {rule.step + ", by " + rule.rule, "", format("%zu of %zu", listed, counters.size())});
       count += counters.size();
@@ -184,7 +185,7 @@ class LeftText {
     for (const std::string& name : device_.namesIn(kStructured)) {
       const std::string path = std::string(kStructured) + "/" + name;
       const std::string content = device_.bytes(path).value_or("");
-      text_ += format("  %s, %zu bytes\n", device_.pathOf(path).c_str(), content.size());
+      text_ += format("  %s, %zu bytes\n", printable(device_.pathOf(path)).c_str(), content.size());
       addRecords(content);
     }
   }

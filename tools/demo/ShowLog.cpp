@@ -7,6 +7,7 @@
 #include "base/CivilDate.h"
 #include "base/Text.h"
 #include "tools/common/Table.h"
+#include "tools/common/TerminalText.h"
 #include "tools/demo/Rules.h"
 #include "tools/demo/Screen.h"
 
@@ -257,7 +258,8 @@ class LogText {
   void addHistograms() {
     std::vector<const Dictionary::Entry*> histograms;
     for (const auto& entry : section("PLDistributionsHistogram")) {
-      if (entry.value.as<Dictionary>() != nullptr && isAskedFor(entry.key)) {
+      const auto* histogram = entry.value.as<Dictionary>();
+      if (histogram != nullptr && !histogram->empty() && isAskedFor(entry.key)) {
         histograms.push_back(&entry);
       }
     }
@@ -267,7 +269,7 @@ class LogText {
     for (const std::size_t i : shown) {
       const Dictionary& histogram = *histograms[i]->value.as<Dictionary>();
       const auto counts = countsOf(histogram);
-      const std::uint64_t most = *std::max_element(counts.begin(), counts.end());
+      const std::uint64_t most = std::ranges::max(counts);
       Table table({{"", Align::right}, {"", Align::right}, {"", Align::left}}, kIndent);
       std::size_t row = 0;
       for (const auto& [label, count] : histogram) {
@@ -276,7 +278,8 @@ class LogText {
         table.addRow({label, std::to_string(counts[row]), bar(share, screenWidth() / 2)});
         ++row;
       }
-      text_ += (i > 0 ? "\n  " : "  ") + shortKey(histograms[i]->key) + "\n" + table.text();
+      text_ += (i > 0 ? "\n  " : "  ") + tools::printable(shortKey(histograms[i]->key)) + "\n" +
+               table.text();
     }
     text_ += more(histograms.size(), shown.size());
   }

@@ -76,8 +76,8 @@ tools::Table tableOf(std::vector<Row> rows) {
 
 template <typename Content>
 bool holdsOnly(const Array& array) {
-  return std::all_of(array.begin(), array.end(),
-                     [](const Value& value) { return value.as<Content>() != nullptr; });
+  return std::ranges::all_of(array,
+                             [](const Value& value) { return value.as<Content>() != nullptr; });
 }
 
 std::vector<std::string_view> keysOf(const std::vector<const Dictionary*>& dictionaries) {
@@ -180,7 +180,7 @@ void appendNested(std::string& out, std::span<const Nested> rest, std::size_t wi
 
 // Whether every value is shown in one cell.
 bool isFlat(const Dictionary& dictionary) {
-  return std::all_of(dictionary.begin(), dictionary.end(), [](const Dictionary::Entry& entry) {
+  return std::ranges::all_of(dictionary, [](const Dictionary::Entry& entry) {
     const auto* array = entry.value.as<Array>();
     return entry.value.as<Dictionary>() == nullptr && (array == nullptr || array->empty());
   });
