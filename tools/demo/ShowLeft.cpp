@@ -161,11 +161,11 @@ class LeftText {
                 kIndent);
     std::size_t count = 0;
     for (auto& [rule, counters] : byRule) {
-      const auto withheld = std::ranges::stable_partition(
-          counters, [](const Counter& counter) { return counter.listed.has_value(); });
-      const std::size_t listed = counters.size() - withheld.size();
+      const auto isListed = [](const Counter& counter) { return counter.listed.has_value(); };
+      const auto listed = std::ranges::count_if(counters, isListed);
+      std::stable_partition(counters.begin(), counters.end(), isListed);
       table.addRow(
-          {rule.step + ", by " + rule.rule, "", format("%zu of %zu", listed, counters.size())});
+          {rule.step + ", by " + rule.rule, "", format("%td of %zu", listed, counters.size())});
       count += counters.size();
       if (!all_ && counters.size() > kMaxCountersOfRule) counters.resize(kMaxCountersOfRule);
       for (const auto& [key, value, entry] : counters) {
