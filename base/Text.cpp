@@ -1,5 +1,6 @@
 #include "base/Text.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cmath>
@@ -42,27 +43,31 @@ std::string doubleText(double value) {
   return {text.data(), end.ptr};
 }
 
+char* writeInteger(char* to, std::int64_t value) {
+  return std::to_chars(to, to + kLongestNumber, value).ptr;
+}
+char* writeInteger(char* to, std::uint64_t value) {
+  return std::to_chars(to, to + kLongestNumber, value).ptr;
+}
+
+char* writeReal(char* to, double value) {
+  // Not-a-number has a sign that nobody wants to read.
+  if (std::isnan(value)) return std::copy_n("nan", 3, to);
+  return std::to_chars(to, to + kLongestNumber, value).ptr;
+}
+
 namespace {
 
 template <typename Number>
-void append(std::string& text, Number value) {
-  std::array<char, 32> digits;
-  const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), value);
-  text.append(digits.data(), end.ptr);
+void append(std::string& text, Number value, char* (*write)(char*, Number)) {
+  std::array<char, kLongestNumber> digits;
+  text.append(digits.data(), write(digits.data(), value));
 }
 
 }  // namespace
 
-void appendInteger(std::string& text, std::int64_t value) { append(text, value); }
-void appendInteger(std::string& text, std::uint64_t value) { append(text, value); }
-
-void appendReal(std::string& text, double value) {
-  // Not-a-number has a sign that nobody wants to read.
-  if (std::isnan(value)) {
-    text += "nan";
-  } else {
-    append(text, value);
-  }
-}
+void appendInteger(std::string& text, std::int64_t value) { append(text, value, writeInteger); }
+void appendInteger(std::string& text, std::uint64_t value) { append(text, value, writeInteger); }
+void appendReal(std::string& text, double value) { append(text, value, writeReal); }
 
 }  // namespace base

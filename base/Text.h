@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdarg>
+#include <cstddef>
 #include <cstdint>
 #include <string>
 
@@ -16,11 +17,17 @@ std::string vformat(const char* format, std::va_list arguments)
 // The text of "%.16g": integral values without a decimal point, "inf", "-inf", "nan".
 std::string doubleText(double value);
 
-// Appends the decimal digits of an integer.
+// Writes the decimal digits of an integer, or the shortest text that reads back as the same double
+// ("inf", "-inf", "nan" for the rest), where there is room for kLongestNumber characters. Returns
+// the end.
+inline constexpr std::size_t kLongestNumber = 32;
+char* writeInteger(char* to, std::int64_t value);
+char* writeInteger(char* to, std::uint64_t value);
+char* writeReal(char* to, double value);
+
+// The same, appended to a text.
 void appendInteger(std::string& text, std::int64_t value);
 void appendInteger(std::string& text, std::uint64_t value);
-
-// Appends the shortest text that reads back as the same double: "inf", "-inf", "nan" for the rest.
 void appendReal(std::string& text, double value);
 
 }  // namespace base

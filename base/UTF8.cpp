@@ -1,22 +1,10 @@
 #include "base/UTF8.h"
 
-#include <cstdint>
-#include <cstring>
-
 namespace base {
 
 namespace {
 
 constexpr EscapedCharacters kForbidden("\t\n\r", "");
-
-constexpr std::uint64_t eachByte(std::uint64_t byte) { return byte * 0x0101010101010101; }
-
-// Whether eight bytes are ASCII without control characters.
-bool areEightPlain(const char* bytes) {
-  std::uint64_t word = 0;
-  std::memcpy(&word, bytes, sizeof word);
-  return (((word - eachByte(0x20)) | word) & eachByte(0x80)) == 0;
-}
 
 }  // namespace
 
@@ -41,7 +29,7 @@ Character firstCharacter(std::string_view text) {
 
 bool isWritable(std::string_view text) {
   for (std::size_t i = 0; i < text.size();) {
-    if (text.size() - i >= 8 && areEightPlain(text.data() + i)) {
+    if (text.size() - i >= 8 && !kForbidden.stopsAmongEight(text.data() + i)) {
       i += 8;
     } else if (!kForbidden.stopsAt(text[i])) {
       ++i;

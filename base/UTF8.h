@@ -4,6 +4,8 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
 #include <string>
 #include <string_view>
 
@@ -45,7 +47,8 @@ void appendCharacter(std::string& out, char32_t character);
 class EscapedCharacters {
  public:
   // All control characters but those in `plain`, and those in `escaped`.
-  constexpr EscapedCharacters(std::string_view plain, std::string_view escaped) {
+  constexpr EscapedCharacters(std::string_view plain, std::string_view escaped)
+      : escaped_(escaped) {
     for (std::size_t c = 0; c < 0x20; ++c) stops_[c] = true;
     for (std::size_t c = 0x80; c < 0x100; ++c) stops_[c] = true;
     for (const char c : plain) stops_[static_cast<unsigned char>(c)] = false;
@@ -55,14 +58,33 @@ class EscapedCharacters {
   // Whether a run of plain bytes ends here: at an escaped character, or at one that isn't ASCII.
   bool stopsAt(char byte) const { return stops_[static_cast<unsigned char>(byte)]; }
 
-  // The same for any of eight bytes, with one branch for all of them.
+  // Whether the whole of a text is written as it is.
+  bool isPlain(std::string_view text) const {
+    std::size_t i = 0;
+    for (; text.size() - i >= 8; i += 8) {
+      if (stopsAmongEight(text.data() + i)) return false;
+    }
+    for (; i < text.size(); ++i) {
+      if (stopsAt(text[i])) return false;
+    }
+    return true;
+  }
+
+  // Whether a run may end among eight bytes: surely not, if this says no.
   bool stopsAmongEight(const char* bytes) const {
-    bool stops = false;
-    for (int i = 0; i < 8; ++i) stops |= stopsAt(bytes[i]);
-    return stops;
+    std::uint64_t word = 0;
+    std::memcpy(&word, bytes, sizeof word);
+    constexpr std::uint64_t ones = 0x0101010101010101;
+    std::uint64_t stops = (word - 0x20 * ones) | word;
+    for (const char c : escaped_) {
+      const std::uint64_t zeroWhereEqual = word ^ static_cast<unsigned char>(c) * ones;
+      stops |= (zeroWhereEqual - ones) & ~zeroWhereEqual;
+    }
+    return (stops & 0x80 * ones) != 0;
   }
 
  private:
+  std::string_view escaped_;
   std::array<bool, 256> stops_{};
 };
 
