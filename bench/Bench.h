@@ -18,8 +18,9 @@ struct Row {
 
 class Table {
  public:
-  // Runs both in turns, `rounds` pairs after one uncounted pair, and adds the row. Times are
-  // divided by `items`, the number of things that one call does.
+  // Runs both in turns, `rounds` pairs after one uncounted pair, and adds the row. The
+  // times are the processor's for this process, divided by `items`, the number of things that one
+  // call does.
   void compare(const std::string& what, const std::string& against, double goal, double items,
                const std::function<void()>& ours, const std::function<void()>& yardstick,
                int rounds = 15);

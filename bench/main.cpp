@@ -13,12 +13,9 @@ namespace {
 constexpr struct {
   std::string_view name;
   void (*add)(bench::Table&);
-} kGroups[] = {{"process", bench::addProcessRows},
-               {"store", bench::addCounterStoreRows},
-               {"report", bench::addReportRows},
-               {"plist", bench::addPropertyListRows},
-               {"parser", bench::addStorageParserRows},
-               {"table", bench::addStorageTableRows},
+} kGroups[] = {{"process", bench::addProcessRows},      {"store", bench::addCounterStoreRows},
+               {"report", bench::addReportRows},        {"plist", bench::addPropertyListRows},
+               {"parser", bench::addStorageParserRows}, {"table", bench::addStorageTableRows},
                {"day", bench::addDailyRunRows}};
 
 }  // namespace

@@ -18,21 +18,19 @@ void addStartRows(Table& table) {
   const Arguments empty{program("empty_program")}, unknown{program("morvend"), "-unknown"},
       gated{program("morvend"), "-d"};
   run(gated);  // closes the gate
-  table.compare(
-      "start and end, unknown option", "empty program, same libraries", 1.5, 1,
-      [&] { run(unknown); }, [&] { run(empty); }, 101);
-  table.compare(
-      "-d with the gate closed", "empty program, same libraries", 2, 1, [&] { run(gated); },
-      [&] { run(empty); }, 101);
+  const auto add = [&](const char* what, double goal, const Arguments& arguments) {
+    table.compareFigures(
+        what, "empty program, same libraries", goal, "ns", [&] { return run(arguments); },
+        [&] { return run(empty); }, 101);
+  };
+  add("start and end, unknown option", 1.5, unknown);
+  add("-d with the gate closed", 2, gated);
   table.compareFigures(
       "-d with the gate closed, peak memory", "empty program, same libraries", 1.5, "KiB",
       [&] { return peakKiB(gated); }, [&] { return peakKiB(empty); });
 
   support::writeController(root);
-  const Arguments statistics{program("nandinfo"), "ftl", "--round"};
-  table.compare(
-      "nandinfo ftl, every counter", "empty program, same libraries", 3, 1,
-      [&] { run(statistics); }, [&] { run(empty); }, 101);
+  add("nandinfo ftl, every counter", 3, {program("nandinfo"), "ftl", "--round"});
 }
 
 void addReportRows(Table& table, const std::string& size, const ReportDevice& device, int rounds) {
