@@ -1,5 +1,6 @@
 #include "plist/Value.h"
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstring>
@@ -58,11 +59,15 @@ namespace {
 // Up to this size a walk over the keys is as fast as a hash.
 constexpr std::size_t kUnindexed = 8;
 
+bool keyIsBelow(const Dictionary::Entry& entry, std::string_view key) { return entry.key < key; }
+
 }  // namespace
 
+// Keys often come in ascending order, and often in the order in which they came before.
 struct Dictionary::Index {
-  base::KeyIndex keys;
-  std::size_t expected = 0;  // the place after the last one set: keys often come in the same order
+  bool ascending;            // all keys so far: they are found by bisection, and `keys` is empty
+  base::KeyIndex keys;       // otherwise
+  std::size_t expected = 0;  // the place after the last one set
 };
 
 Dictionary::Dictionary() = default;
@@ -78,20 +83,36 @@ Dictionary::Dictionary(std::initializer_list<Entry> entries) {
   for (const Entry& entry : entries) set(entry.key, entry.value);
 }
 
-// The key's place in entries_, or the size if it isn't there. The hash is read only with an index.
+// The key's place in entries_, or the size if it isn't there. The hash is read only with hashed
+// keys.
 std::size_t Dictionary::place(std::string_view key, std::uint32_t hash) const {
   if (!index_) {
     std::size_t i = 0;
     while (i < entries_.size() && entries_[i].key != key) ++i;
     return i;
   }
+  if (index_->ascending) {
+    const auto found = std::lower_bound(entries_.begin(), entries_.end(), key, keyIsBelow);
+    return found != entries_.end() && found->key == key
+               ? static_cast<std::size_t>(found - entries_.begin())
+               : entries_.size();
+  }
   const std::uint32_t found =
       index_->keys.find(hash, [&](std::uint32_t entry) { return entries_[entry].key == key; });
   return found == base::KeyIndex::kNone ? entries_.size() : found;
 }
 
+std::uint32_t Dictionary::hashFor(std::string_view key) const {
+  return index_ && !index_->ascending ? base::keyHash(key) : 0;
+}
+
 void Dictionary::buildIndex() {
-  index_ = std::make_unique<Index>(Index{base::KeyIndex(2 * entries_.size())});
+  const bool ascending =
+      std::is_sorted(entries_.begin(), entries_.end(),
+                     [](const Entry& a, const Entry& b) { return keyIsBelow(a, b.key); });
+  index_ = std::make_unique<Index>(
+      Index{ascending, base::KeyIndex(ascending ? 0 : 2 * entries_.size())});
+  if (ascending) return;
   for (std::size_t i = 0; i < entries_.size(); ++i) {
     index_->keys.insert(base::keyHash(entries_[i].key), static_cast<std::uint32_t>(i));
   }
@@ -100,23 +121,29 @@ void Dictionary::buildIndex() {
 template <typename Key>
 Value& Dictionary::setKey(Key&& key, Value&& value) {
   std::uint32_t hash = 0;
-  std::size_t found = 0;
+  std::size_t found = entries_.size();
+  const bool last =
+      index_ && index_->ascending && (entries_.empty() || keyIsBelow(entries_.back(), key));
   if (index_ && index_->expected < entries_.size() && entries_[index_->expected].key == key) {
     found = index_->expected;
-  } else {
-    if (index_) hash = base::keyHash(key);
+  } else if (!last) {
+    hash = hashFor(key);
     found = place(key, hash);
   }
   if (index_) index_->expected = found + 1;
   if (found < entries_.size()) return entries_[found].value = std::move(value);
   if (entries_.empty()) entries_.reserve(kUnindexed / 2);
-  entries_.emplace_back(std::string(std::forward<Key>(key)), std::move(value));
-  if (index_) {
-    index_->keys.insert(hash, static_cast<std::uint32_t>(found));
+  entries_.emplace_back(std::forward<Key>(key), std::move(value));
+  if (!index_) {
+    if (entries_.size() > kUnindexed) buildIndex();
+  } else {
     // A key that is new at the end may be followed by one that is first in the list.
     index_->expected = 0;
-  } else if (entries_.size() > kUnindexed) {
-    buildIndex();
+    if (!index_->ascending) {
+      index_->keys.insert(hash, static_cast<std::uint32_t>(found));
+    } else if (!last) {
+      buildIndex();
+    }
   }
   return entries_.back().value;
 }
@@ -130,7 +157,7 @@ Value& Dictionary::set(std::string&& key, Value value) {
 }
 
 bool Dictionary::remove(std::string_view key) {
-  const std::size_t found = place(key, index_ ? base::keyHash(key) : 0);
+  const std::size_t found = place(key, hashFor(key));
   if (found == entries_.size()) return false;
   entries_.erase(entries_.begin() + static_cast<std::ptrdiff_t>(found));
   if (index_) buildIndex();
@@ -138,7 +165,7 @@ bool Dictionary::remove(std::string_view key) {
 }
 
 const Value* Dictionary::find(std::string_view key) const {
-  const std::size_t found = place(key, index_ ? base::keyHash(key) : 0);
+  const std::size_t found = place(key, hashFor(key));
   return found < entries_.size() ? &entries_[found].value : nullptr;
 }
 

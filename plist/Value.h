@@ -83,8 +83,9 @@ struct Date {
 using Array = std::vector<Value>;
 using Data = std::vector<std::uint8_t>;
 
-// A dictionary that keeps the order in which its keys were first set. Lookup takes constant time,
-// removal time in proportion to the size.
+// A dictionary that keeps the order in which its keys were first set. Lookup takes constant time
+// (with the logarithm of the size while all keys came in ascending order), removal time in
+// proportion to the size.
 class Dictionary {
  public:
   struct Entry;
@@ -133,6 +134,7 @@ class Dictionary {
  private:
   struct Index;
 
+  std::uint32_t hashFor(std::string_view key) const;
   std::size_t place(std::string_view key, std::uint32_t hash) const;
   template <typename Key>
   Value& setKey(Key&& key, Value&& value);
@@ -177,7 +179,9 @@ class Value {
 };
 
 struct Dictionary::Entry {
-  Entry(std::string k, Value v) : key(std::move(k)), value(std::move(v)) {}
+  // Of anything that a text and a value can be made of.
+  template <typename Key, typename Content>
+  Entry(Key&& k, Content&& v) : key(std::forward<Key>(k)), value(std::forward<Content>(v)) {}
 
   std::string key;
   Value value;

@@ -2,7 +2,6 @@
 
 #include <expat.h>
 
-#include <algorithm>
 #include <charconv>
 #include <cstdint>
 #include <memory>
@@ -57,7 +56,17 @@ Element elementOf(const char* name) {
   }
 }
 
-bool isSpace(char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r'; }
+bool isSpace(char c) {
+  constexpr std::uint64_t kSpaces = 1ull << ' ' | 1ull << '\t' | 1ull << '\n' | 1ull << '\r';
+  return static_cast<unsigned char>(c) <= ' ' && (kSpaces >> c & 1) != 0;
+}
+
+bool isAllSpace(std::string_view text) {
+  for (const char c : text) {
+    if (!isSpace(c)) return false;
+  }
+  return true;
+}
 
 std::string_view trimmed(std::string_view text) {
   while (!text.empty() && isSpace(text.front())) text.remove_prefix(1);
@@ -266,7 +275,7 @@ class Reader {
         scalar_ != Element::other && scalar_ != Element::yes && scalar_ != Element::no;
     if (takesText) {
       text_ += text;
-    } else if (!std::all_of(text.begin(), text.end(), isSpace)) {
+    } else if (!isAllSpace(text)) {
       fail("text outside of a scalar");
     }
   }
