@@ -23,7 +23,7 @@ using plist::Array;
 using plist::Dictionary;
 using plist::Value;
 
-// A report's sections as plain rows.
+// A report's sections as plain rows; keys stand in their order, as the history delivers them.
 struct Report {
   struct Distribution {
     std::string key;
@@ -45,11 +45,11 @@ Report sampleReport() {
   const auto next = [&state] { return (state = state * 6364136223846793005u + 1) >> 33; };
   const auto real = [&next] { return static_cast<double>(next()) / 7000.0; };
   for (int i = 0; i < 5000; ++i) {
-    report.scalars.emplace_back("com.norba.subsystem.counter" + std::to_string(i),
+    report.scalars.emplace_back("com.norba.subsystem.counter" + std::to_string(10000 + i),
                                 static_cast<std::int64_t>(next() >> (i % 31)));
   }
   for (int i = 0; i < 1000; ++i) {
-    const std::string key = "com.norba.subsystem.latency" + std::to_string(i);
+    const std::string key = "com.norba.subsystem.latency" + std::to_string(1000 + i);
     report.distributions.push_back({key, {real(), real(), real(), real()}, 100});
     report.histograms.push_back({key,
                                  {{"(-inf, 10]", next() % 1000},

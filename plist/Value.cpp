@@ -67,7 +67,7 @@ bool keyIsBelow(const Dictionary::Entry& entry, std::string_view key) { return e
 struct Dictionary::Index {
   bool ascending;            // all keys so far: they are found by bisection, and `keys` is empty
   base::KeyIndex keys;       // otherwise
-  std::size_t expected = 0;  // the place after the last one set
+  std::size_t expected = 0;  // the place after the last one set; 0 after a new one
 };
 
 Dictionary::Dictionary() = default;
@@ -122,9 +122,11 @@ template <typename Key>
 Value& Dictionary::setKey(Key&& key, Value&& value) {
   std::uint32_t hash = 0;
   std::size_t found = entries_.size();
-  const bool last =
-      index_ && index_->ascending && (entries_.empty() || keyIsBelow(entries_.back(), key));
-  if (index_ && index_->expected < entries_.size() && entries_[index_->expected].key == key) {
+  const bool comesAgain = index_ && index_->expected != 0 && index_->expected < entries_.size() &&
+                          entries_[index_->expected].key == key;
+  const bool last = !comesAgain && index_ && index_->ascending &&
+                    (entries_.empty() || keyIsBelow(entries_.back(), key));
+  if (comesAgain) {
     found = index_->expected;
   } else if (!last) {
     hash = hashFor(key);
@@ -137,7 +139,6 @@ Value& Dictionary::setKey(Key&& key, Value&& value) {
   if (!index_) {
     if (entries_.size() > kUnindexed) buildIndex();
   } else {
-    // A key that is new at the end may be followed by one that is first in the list.
     index_->expected = 0;
     if (!index_->ascending) {
       index_->keys.insert(hash, static_cast<std::uint32_t>(found));
