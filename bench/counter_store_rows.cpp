@@ -80,8 +80,10 @@ void fill(Device& device) {
 void addQueryRows(bench::Table& table) {
   Device device;
   fill(device);
-  Bare bare(device.root / support::kCountersDatabase, "PRAGMA cell_size_check = ON");
-  Bare bareSamples(device.root / support::kCountersDatabase, "PRAGMA cell_size_check = ON");
+  Bare bare(device.root / support::kCountersDatabase,
+            "PRAGMA cell_size_check = ON; PRAGMA cache_size = -128");
+  Bare bareSamples(device.root / support::kCountersDatabase,
+                   "PRAGMA cell_size_check = ON; PRAGMA cache_size = -128");
   const auto history = device.store.initWithDefaultPath();
 
   sqlite3_stmt* scan = bare.prepare(

@@ -229,6 +229,9 @@ Failure CounterDatabase::connect(Use use) {
   }
   const auto open = [&](Connection::Access access) {
     connection_ = std::make_unique<Connection>(path + "/" + name_, access);
+    // A scan comes to each page once: a cache of many would be memory that is filled and never
+    // read.
+    if (use == Use::read) connection_->execute("PRAGMA cache_size = -128");
     verify(use);
   };
   std::string aloneBecause = sharedBeside ? kShared : "";
