@@ -20,9 +20,16 @@ class PLHistoryDistributionEnumerator {
 
   virtual ~PLHistoryDistributionEnumerator() = default;
 
-  // The next samples, as many as the store has at hand; empty at the end. They are borrowed until
-  // the next call. Samples come in blocks because a call for each would double the cost of reading.
+  // The next samples, as many as the store has at hand; empty at the end, and after a failure. They
+  // are borrowed until the next call. Samples come in blocks because a call for each would double
+  // the cost of reading; those that nobody asks for aren't read.
   virtual Samples getNextValues() = 0;
+
+  // Whether samples couldn't be read: what came is not all of them.
+  virtual bool failed() const { return false; }
+
+  // Whether the query has a row of the same key for its last day too; known on the day before that.
+  virtual bool comesAgain() { return false; }
 };
 
 class PLHistory {

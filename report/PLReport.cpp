@@ -45,11 +45,16 @@ Sections PLReport::sectionsOfDay(std::int32_t day) const {
     history->distributionsForKeyPrefix(
         "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
           if (const auto* options = config_->configOptionsForDistributionKey(key)) {
-            sections.computeAndAddDistribution(samples, key, *options);
+            if (samples.comesAgain()) {
+              sections.keepPlace(key, *options);
+            } else {
+              sections.computeAndAddDistribution(samples, key, *options);
+            }
           } else {
             refuse(key);
           }
         });
+    sections.dropKeptPlaces();
     unread = history->failed();
   }
   if (sections.empty()) {

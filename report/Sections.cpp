@@ -47,6 +47,7 @@ void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerat
        block = samples.getNextValues()) {
     distribution.add(block.values);
   }
+  if (samples.failed()) return;
   if (intervals != nullptr && !distribution.histogramFailed()) {
     if (auto histogram = distribution.histogram()) {
       histograms.set(key, std::move(*histogram));
@@ -55,6 +56,20 @@ void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerat
     }
   }
   distributions.set(key, distribution.statistics());
+}
+
+void Sections::keepPlace(std::string_view key, const CounterOptions& options) {
+  distributions.set(key, plist::Array());
+  if (options.intervals) histograms.set(key, plist::Dictionary());
+}
+
+void Sections::dropKeptPlaces() {
+  distributions.keepIf([](std::string_view, const plist::Value& statistics) {
+    return !statistics.as<plist::Array>()->empty();
+  });
+  histograms.keepIf([](std::string_view, const plist::Value& histogram) {
+    return !histogram.as<plist::Dictionary>()->empty();
+  });
 }
 
 }  // namespace report

@@ -31,9 +31,15 @@ class Sections {
   void addScalarForKey(std::string_view key, const std::function<std::int64_t()>& byExecutingBlock);
 
   // Stores the statistics of the samples, and their histogram if the options hold intervals. Both
-  // take the place of what the key had.
+  // take the place of what the key had. Nothing when the samples can't be read.
   void computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
                                  std::string_view key, const CounterOptions& options);
+
+  // For a distribution of which a later day has a row too, which replaces this one: the key stands
+  // where this day's row puts it, without its samples being read.
+  void keepPlace(std::string_view key, const CounterOptions& options);
+  // The places to which no later row came.
+  void dropKeptPlaces();
 
   void addMetadata(std::string_view key, std::string text) { metadata.set(key, std::move(text)); }
 

@@ -28,12 +28,12 @@ class Rows {
   bool valid() const { return valid_; }
   std::int32_t day() const { return day_; }
   std::string_view key() const { return key_; }  // as it is stored
+  sqlite::Column column(int index) const { return statement_.column(index); }
   bool isAt(std::int32_t day, std::string_view key) const {
     return valid_ && day_ == day && key_ == key;
   }
-  bool isBefore(const Rows& other) const {
-    if (!valid_ || !other.valid_) return valid_;
-    return day_ != other.day_ ? day_ < other.day_ : key_ < other.key_;
+  bool isBefore(std::int32_t day, std::string_view key) const {
+    return valid_ && (day_ != day ? day_ < day : key_ < key);
   }
 
   void next() {
@@ -57,49 +57,96 @@ class Rows {
   std::string room_;
 };
 
-// The samples of one day and key: what is packed, then what is still staged.
+bool hasRowid(const sqlite::Statement& row) { return row.column(2).isInteger(); }
+
+// The distributions of a query, one after the other, each with its samples: what is packed, then
+// what is still staged.
 class StoredSamples : public platform::PLHistoryDistributionEnumerator {
  public:
-  StoredSamples(const sqlite::Statement& packed, Rows& packedRows, const sqlite::Statement& staged,
-                Rows& stagedRows)
-      : packed_(packed), packedRows_(packedRows), staged_(staged), stagedRows_(stagedRows) {}
+  StoredSamples(sqlite::Connection& connection, std::string_view keyPrefix, std::int32_t firstDay,
+                std::int32_t lastDay)
+      : connection_(connection),
+        last_(lastDay),
+        packed_(connection,
+                "SELECT day, key, rowid FROM packed WHERE day BETWEEN ? AND ? "
+                "ORDER BY day, key, rowid",
+                firstDay, lastDay),
+        staged_(connection,
+                "SELECT day, key, seconds, value FROM staged WHERE day BETWEEN ? AND ? "
+                "ORDER BY day, key, rowid",
+                firstDay, lastDay),
+        lastDay_(connection,
+                 "SELECT day, key, rowid FROM packed WHERE day = ?1 AND ?1 > ?2 ORDER BY key",
+                 lastDay, firstDay),
+        packedRows_(packed_, keyPrefix, hasRowid),
+        stagedRows_(staged_, keyPrefix,
+                    [](const sqlite::Statement& row) {
+                      return row.column(2).isInteger() && row.column(3).isReal();
+                    }),
+        lastDayRows_(lastDay_, keyPrefix, hasRowid),
+        blobs_(connection, "packed", "samples") {
+    arrive();
+  }
 
-  void begin(std::int32_t day, std::string_view key) {
-    day_ = day;
-    key_.assign(key);
-    unpacked_ = 0;
+  // Whether this is at a distribution, not at the end.
+  bool valid() const { return valid_; }
+
+  // Goes to the next one, past the samples that were not read.
+  void next() {
+    while (packedRows_.isAt(day_, key_)) packedRows_.next();
+    while (stagedRows_.isAt(day_, key_)) stagedRows_.next();
+    arrive();
   }
   std::int32_t day() const { return day_; }
   std::string_view key() const { return key_; }
 
   Samples getNextValues() override {
     for (; packedRows_.isAt(day_, key_); packedRows_.next(), unpacked_ = 0) {
-      if (const std::size_t count = unpack(packed_.column(2).bytes())) return block(count);
+      if (const std::size_t count = unpack(packedRows_.column(2).integer())) return block(count);
+      if (failed()) return {};
     }
     std::size_t count = 0;
     for (; count < kBlock && stagedRows_.isAt(day_, key_); stagedRows_.next(), ++count) {
-      values_[count] = staged_.column(3).real();
-      seconds_[count] = static_cast<std::int32_t>(staged_.column(2).integer());
+      values_[count] = stagedRows_.column(3).real();
+      seconds_[count] = static_cast<std::int32_t>(stagedRows_.column(2).integer());
     }
     return block(count);
   }
 
-  // Passes over what was not read.
-  void finish() {
-    while (packedRows_.isAt(day_, key_)) packedRows_.next();
-    while (stagedRows_.isAt(day_, key_)) stagedRows_.next();
+  bool failed() const override { return static_cast<bool>(connection_.failure()); }
+
+  bool comesAgain() override {
+    if (day_ == last_ || day_ + 1 != last_) return false;
+    // Both go through the keys in their order.
+    while (lastDayRows_.isBefore(last_, key_)) lastDayRows_.next();
+    return lastDayRows_.isAt(last_, key_);
   }
 
  private:
   static constexpr std::size_t kBlock = 512;
 
+  void arrive() {
+    valid_ = !failed() && (packedRows_.valid() || stagedRows_.valid());
+    if (!valid_) return;
+    const bool staged =
+        !packedRows_.valid() || stagedRows_.isBefore(packedRows_.day(), packedRows_.key());
+    const Rows& first = staged ? stagedRows_ : packedRows_;
+    day_ = first.day();
+    key_.assign(first.key());
+    unpacked_ = 0;
+  }
+
   Samples block(std::size_t count) const {
     return {{values_.data(), count}, {seconds_.data(), count}};
   }
 
-  std::size_t unpack(std::string_view bytes) {
-    const std::size_t count = std::min(kBlock, bytes.size() / kPackedSampleSize - unpacked_);
-    const char* record = bytes.data() + unpacked_ * kPackedSampleSize;
+  // The next records of a packed row; 0 at their end, and after a failure.
+  std::size_t unpack(std::int64_t row) {
+    if (unpacked_ == 0) size_ = blobs_.open(row);
+    const std::size_t count = std::min(kBlock, size_ / kPackedSampleSize - unpacked_);
+    const std::size_t offset = unpacked_ * kPackedSampleSize;
+    if (count == 0 || !blobs_.read(offset, {records_.data(), count * kPackedSampleSize})) return 0;
+    const char* record = records_.data();
     for (std::size_t i = 0; i < count; ++i, record += kPackedSampleSize) {
       std::memcpy(&values_[i], record, sizeof(double));
       std::memcpy(&seconds_[i], record + sizeof(double), sizeof(std::int32_t));
@@ -108,13 +155,17 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
     return count;
   }
 
-  const sqlite::Statement& packed_;
-  Rows& packedRows_;
-  const sqlite::Statement& staged_;
-  Rows& stagedRows_;
+  sqlite::Connection& connection_;
+  const std::int32_t last_;
+  sqlite::Statement packed_, staged_, lastDay_;
+  Rows packedRows_, stagedRows_, lastDayRows_;
+  sqlite::BlobColumn blobs_;
+  bool valid_ = false;
   std::int32_t day_ = 0;
   std::string key_;
-  std::size_t unpacked_ = 0;  // records of the current packed row that were handed out
+  std::size_t size_ = 0;      // of the current packed row's blob, once it is open
+  std::size_t unpacked_ = 0;  // records of it that were handed out
+  std::array<char, kBlock * kPackedSampleSize> records_;
   std::array<double, kBlock> values_;
   std::array<std::int32_t, kBlock> seconds_;
 };
@@ -152,28 +203,9 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
   const std::string_view prefix = base::writable(keyPrefix, prefixRoom);
   failed_ = !database_.read([&](sqlite::Connection& connection) {
     const sqlite::Transaction snapshot(connection, sqlite::Transaction::Kind::read);
-    sqlite::Statement packed(connection,
-                             "SELECT day, key, samples FROM packed WHERE day BETWEEN ? AND ? "
-                             "ORDER BY day, key, rowid",
-                             minDaysSince1970, maxDaysSince1970);
-    sqlite::Statement staged(
-        connection,
-        "SELECT day, key, seconds, value FROM staged WHERE day BETWEEN ? AND ? "
-        "ORDER BY day, key, rowid",
-        minDaysSince1970, maxDaysSince1970);
-    // The type of the data is known without reading them.
-    Rows packedRows(packed, prefix,
-                    [](const sqlite::Statement& row) { return row.column(2).isBlob(); });
-    Rows stagedRows(staged, prefix, [](const sqlite::Statement& row) {
-      return row.column(2).isInteger() && row.column(3).isReal();
-    });
-    StoredSamples samples(packed, packedRows, staged, stagedRows);
-    bool stop = false;
-    while (!stop && (packedRows.valid() || stagedRows.valid())) {
-      const Rows& first = stagedRows.isBefore(packedRows) ? stagedRows : packedRows;
-      samples.begin(first.day(), first.key());
+    StoredSamples samples(connection, prefix, minDaysSince1970, maxDaysSince1970);
+    for (bool stop = false; !stop && samples.valid(); samples.next()) {
       rowHandler(base::writable(samples.key(), room), samples.day(), samples, stop);
-      samples.finish();
     }
   });
 }

@@ -140,6 +140,30 @@ Statement::~Statement() {
   prepared_->inUse = false;
 }
 
+std::size_t BlobColumn::open(std::int64_t row) {
+  if (connection_.failure()) return 0;
+  const int code = blob_ != nullptr ? sqlite3_blob_reopen(blob_, row)
+                                    : sqlite3_blob_open(connection_.database_, "main", table_,
+                                                        column_, row, 0, &blob_);
+  return check(code) ? static_cast<std::size_t>(sqlite3_blob_bytes(blob_)) : 0;
+}
+
+bool BlobColumn::read(std::size_t offset, std::span<char> into) {
+  return !connection_.failure() &&
+         check(sqlite3_blob_read(blob_, into.data(), static_cast<int>(into.size()),
+                                 static_cast<int>(offset)));
+}
+
+bool BlobColumn::check(int code) {
+  if (code == SQLITE_ERROR) {
+    // The index names a row that isn't there, or holds something else.
+    connection_.fail(Failure::Kind::damaged, sqlite3_errmsg(connection_.database_));
+  } else {
+    connection_.check(code);
+  }
+  return code == SQLITE_OK;
+}
+
 Transaction::Transaction(Connection& connection, Kind kind)
     : connection_(connection), open_(!connection.failure() && !connection.inTransaction()) {
   if (open_) connection_.execute(kind == Kind::read ? "BEGIN" : "BEGIN IMMEDIATE");

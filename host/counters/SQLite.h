@@ -12,6 +12,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -62,6 +63,7 @@ class Connection {
   void leaveNothingBeside();
 
  private:
+  friend class BlobColumn;
   friend class Statement;
 
   struct Prepared {
@@ -163,6 +165,30 @@ class Statement {
   Connection& connection_;
   Connection::Prepared* prepared_;
   sqlite3_stmt* statement_ = nullptr;
+};
+
+// Blobs of one column of a table, read where they lie and no further than is asked for.
+class BlobColumn {
+ public:
+  BlobColumn(Connection& connection, const char* table, const char* column)
+      : connection_(connection), table_(table), column_(column) {}
+  ~BlobColumn() { sqlite3_blob_close(blob_); }
+  BlobColumn(const BlobColumn&) = delete;
+  BlobColumn& operator=(const BlobColumn&) = delete;
+
+  // Goes to a row that a query has found, and returns the size of its blob; 0 after a failure,
+  // which it also is when the row has no blob.
+  std::size_t open(std::int64_t row);
+
+  // Fills the memory from an offset on, within the size; false after a failure.
+  bool read(std::size_t offset, std::span<char> into);
+
+ private:
+  bool check(int code);
+
+  Connection& connection_;
+  const char *table_, *column_;
+  sqlite3_blob* blob_ = nullptr;
 };
 
 // A transaction; one that is open already is joined. What isn't committed is taken back at the end

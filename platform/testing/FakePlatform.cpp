@@ -30,8 +30,11 @@ namespace {
 
 class BlockEnumerator : public PLHistoryDistributionEnumerator {
  public:
-  BlockEnumerator(const std::vector<double>& samples, std::size_t blockSize)
-      : left_(samples), offsets_(samples.size(), 0), blockSize_(blockSize) {}
+  BlockEnumerator(const std::vector<double>& samples, std::size_t blockSize, bool comesAgain)
+      : left_(samples),
+        offsets_(samples.size(), 0),
+        blockSize_(blockSize),
+        comesAgain_(comesAgain) {}
 
   Samples getNextValues() override {
     const std::size_t count = std::min(blockSize_, left_.size());
@@ -40,10 +43,13 @@ class BlockEnumerator : public PLHistoryDistributionEnumerator {
     return {values, std::span(offsets_).first(count)};
   }
 
+  bool comesAgain() override { return comesAgain_; }
+
  private:
   std::span<const double> left_;
   std::vector<std::int32_t> offsets_;
   std::size_t blockSize_;
+  bool comesAgain_;
 };
 
 class OpenHistory : public PLHistory {
@@ -65,7 +71,9 @@ class OpenHistory : public PLHistory {
     bool stop = false;
     for (const auto& [row, samples] : store_.distributions) {
       if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
-      BlockEnumerator enumerator(samples, store_.blockSize);
+      const bool comesAgain =
+          row.first == maxDay - 1 && store_.distributions.contains({maxDay, row.second});
+      BlockEnumerator enumerator(samples, store_.blockSize, comesAgain);
       rowHandler(row.second, row.first, enumerator, stop);
     }
   }
