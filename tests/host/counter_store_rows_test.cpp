@@ -125,6 +125,28 @@ TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsThe
   EXPECT_EQ(here.rows().back(), "1 c 0:1 0:2");
 }
 
+TEST_F(CounterStoreRows, ASeriesTellsOnTheLastDayButOneWhetherItComesAgain) {
+  const struct {
+    std::int32_t day;
+    const char* keys;
+  } days[] = {{0, "c"}, {5, "abcd"}, {6, "bde"}};
+  for (const auto& [day, keys] : days) {
+    for (const char* key = keys; *key != '\0'; ++key) here.store.push({key, 1}, 1, day, 0);
+  }
+  here.store.PLClientCheckpoint();
+  const auto again = [&](std::int32_t first, std::int32_t last) {
+    std::string seen;
+    here.store.history()->distributionsForKeyPrefix(
+        "", first, last,
+        [&](std::string_view key, std::int32_t, platform::PLHistoryDistributionEnumerator& samples,
+            bool&) { seen.append(key).append(samples.comesAgain() ? "+" : ""); });
+    return seen;
+  };
+  EXPECT_EQ(again(5, 6), "ab+cd+bde");
+  EXPECT_EQ(again(6, 6), "bde");
+  EXPECT_EQ(again(0, 5), "cabcd");
+}
+
 TEST_F(CounterStoreRows, ACheckpointKeepsTheNewestSixtyDaysThatHoldRowsOfAnyKind) {
   for (int i = 0; i < 70; ++i) {
     const std::int32_t day = i * 500 - 14500;
