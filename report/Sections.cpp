@@ -12,6 +12,12 @@ void Sections::noteOptions(std::string_view key, const CounterOptions& options) 
   if (&options == &PLConfig::kUnnamed) unnamed_.emplace(key);
 }
 
+void Sections::noteHistogram(std::string_view key, const CounterOptions& options) const {
+  if (!options.intervals) return;
+  log_->log(LogLevel::debug, "Treating key %.*s as a histogram", static_cast<int>(key.size()),
+            key.data());
+}
+
 const CounterOptions* Sections::scalarOptions(std::string_view key) const {
   return whitelist_ != nullptr ? whitelist_->configOptionsForScalarKey(key) : nullptr;
 }
@@ -32,16 +38,13 @@ void Sections::addScalarForKey(std::string_view key,
 void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerator& samples,
                                          std::string_view key, const CounterOptions& options) {
   noteOptions(key, options);
-  const int length = static_cast<int>(key.size());
+  noteHistogram(key, options);
   const Intervals* intervals = options.intervals ? &*options.intervals : nullptr;
-  if (intervals != nullptr) {
-    log_->log(LogLevel::debug, "Treating key %.*s as a histogram", length, key.data());
-  }
   Distribution distribution(intervals);
   if (distribution.histogramFailed()) {
     log_->log(LogLevel::standard,
               "Couldn't allocate histCounts for key %.*s. Will not calculate histogram values",
-              length, key.data());
+              static_cast<int>(key.size()), key.data());
   }
   for (auto block = samples.getNextValues(); !block.values.empty();
        block = samples.getNextValues()) {
@@ -59,6 +62,7 @@ void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerat
 }
 
 void Sections::keepPlace(std::string_view key, const CounterOptions& options) {
+  noteHistogram(key, options);
   distributions.set(key, plist::Array());
   if (options.intervals) histograms.set(key, plist::Dictionary());
 }

@@ -56,6 +56,7 @@ class Sections {
 
  private:
   void noteOptions(std::string_view key, const CounterOptions& options);
+  void noteHistogram(std::string_view key, const CounterOptions& options) const;
 
   const PLConfig* whitelist_;
   platform::SystemLog* log_;
