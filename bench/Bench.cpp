@@ -69,7 +69,7 @@ void Table::add(Row row) {
     std::printf("%-46s %-40s %12s %12s %8s %6s\n", "what", "against", "ours", "yardstick", "ratio",
                 "goal");
   }
-  std::printf("%-46s %-40s %12s %12s %7.2fx %5.2fx%s\n", row.what.c_str(), row.against.c_str(),
+  std::printf("%-46s %-40s %12s %12s %7.3fx %5.3gx%s\n", row.what.c_str(), row.against.c_str(),
               shown(row.ours, row.unit).c_str(), shown(row.yardstick, row.unit).c_str(), row.ratio,
               row.goal, row.ratio <= row.goal ? "" : "  MISSED");
   std::fflush(stdout);

@@ -74,13 +74,17 @@ void ReportDevice::addStorage(mkdevice::ControllerKind controller) {
   std::filesystem::copy_file(FAULTWATCH_SUPPORT_MODULE, module / "FaultwatchSupport");
 }
 
-void ReportDevice::forgetRuns() const {
+void forgetLogs(const support::TemporaryFolder& root) {
   std::error_code none;
   for (const char* folder : {"var/spool/morvend/submitted", "var/spool/morvend/structured"}) {
-    for (const auto& log : std::filesystem::directory_iterator(root_ / folder, none)) {
+    for (const auto& log : std::filesystem::directory_iterator(root / folder, none)) {
       std::filesystem::remove(log);
     }
   }
+}
+
+void ReportDevice::forgetRuns() const {
+  forgetLogs(root_);
   if (buffers_.empty()) return;
   // The storage log is weekly, and data usage a difference.
   for (const char* domain : {"com.norba.pellorand.morvend", "com.norba.quenset.morvend"}) {

@@ -13,6 +13,9 @@
 
 namespace bench {
 
+// Removes the logs that runs have left in a device root.
+void forgetLogs(const support::TemporaryFolder& root);
+
 // Its history holds three days up to yesterday, and a whitelist lets it all through: a tenth by
 // exact keys, the rest by prefixes, as families of counters are whitelisted; with roundings and,
 // for every tenth distribution, a histogram.

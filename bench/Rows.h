@@ -11,6 +11,10 @@ void addProcessRows(Table& table);
 // Whole days with a storage controller, as processes; prints below a row what the steps take.
 void addDailyRunRows(Table& table);
 
+// Whole days of sample devices with ever more counters, as processes: the cost of a counter beside
+// what it is with fewer.
+void addGrowthRows(Table& table);
+
 // Reading and writing the counters store.
 void addCounterStoreRows(Table& table);
 

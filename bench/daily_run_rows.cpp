@@ -122,11 +122,11 @@ void addDailyRunRows(Table& table) {
     ReportDevice device(5000, 1000, 100);
     device.addStorage(kind);
     table.compareFigures(
-        std::string("-f, 5,000 keys and storage, ") + name, "the sum of its parts, bare", 1.6, "ns",
+        std::string("-f, 5,000 keys and storage, ") + name, "the sum of its parts, bare", 1.3, "ns",
         [&] { return run(device.report()); }, [&] { return run(device.bareReport()); }, 31);
     if (kind != mkdevice::ControllerKind::qrt3) continue;
     table.compareFigures(
-        "the same with qrt3, peak memory", "the sum of its parts, bare", 1.5, "KiB",
+        "the same with qrt3, peak memory", "the sum of its parts, bare", 1.25, "KiB",
         [&] { return peakKiB(device.report()); }, [&] { return peakKiB(device.bareReport()); });
     printSteps(device);
   }

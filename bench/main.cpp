@@ -16,7 +16,7 @@ constexpr struct {
 } kGroups[] = {{"process", bench::addProcessRows},      {"store", bench::addCounterStoreRows},
                {"report", bench::addReportRows},        {"plist", bench::addPropertyListRows},
                {"parser", bench::addStorageParserRows}, {"table", bench::addStorageTableRows},
-               {"day", bench::addDailyRunRows}};
+               {"day", bench::addDailyRunRows},         {"growth", bench::addGrowthRows}};
 
 }  // namespace
 

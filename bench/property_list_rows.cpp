@@ -147,10 +147,10 @@ void addPropertyListRows(Table& table) {
     std::abort();
   }
   table.compare(
-      "property list: write", "appending to a string", 1.7, 1,
+      "property list: write", "appending to a string", 1.4, 1,
       [&] { keep(plist::writeXML(value)); }, [&] { keep(appended(report)); }, 51);
   table.compare(
-      "property list: read", "bare expat", 1.5, 1, [&] { keep(plist::read(document)); },
+      "property list: read", "bare expat", 1.3, 1, [&] { keep(plist::read(document)); },
       [&] { parseBare(document); }, 51);
 }
 
