@@ -11,7 +11,6 @@
 #include <utility>
 #include <vector>
 
-#include "NANDInfo/CounterDecoders.h"
 #include "NANDInfo/GenericParserContext.h"
 
 namespace fuzz {

@@ -1,6 +1,7 @@
 // FTL statistics, by name and by key.
 
 #include "CounterDecoder.h"
+#include "NANDInfo/FTLDecoder.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const auto bytes = std::as_bytes(std::span(data, size));

@@ -3,6 +3,8 @@
 #include <algorithm>
 
 #include "CounterDecoder.h"
+#include "NANDInfo/FTLDecoder.h"
+#include "NANDInfo/LegacyDecoder.h"
 
 namespace {
 

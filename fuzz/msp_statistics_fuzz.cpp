@@ -1,6 +1,7 @@
 // MSP statistics.
 
 #include "CounterDecoder.h"
+#include "NANDInfo/MSPDecoder.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
   const auto bytes = std::as_bytes(std::span(data, size));

@@ -4,12 +4,12 @@
 #include <cstdint>
 #include <string_view>
 
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/collect/DerivedFields.h"
 #include "NANDInfo/collect/DeviceFields.h"
+#include "NANDInfo/controller/StorageController.h"
 #include "NANDInfo/decode/Weeks.h"
 #include "base/CivilDate.h"
 #include "base/Convert.h"
@@ -132,7 +132,7 @@ Dictionary legacyInfo(const LegacyNandInfoCxt& context, std::optional<std::int32
 base::Result<LegacyNandInfoCxt> readLegacyStatistics(const Services& services) {
   LegacyNandInfoCxt context;
   nand_exporter_t* exporter = nullptr;
-  if (!load_nand_info(services, exporter, &context)) return base::Error{"Unable to parse buffer"};
+  if (!loadLegacy(services, exporter, &context)) return base::Error{"Unable to parse buffer"};
   return context;
 }
 

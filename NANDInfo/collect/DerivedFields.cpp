@@ -4,7 +4,6 @@
 #include <cstdint>
 
 #include "NANDInfo/Keys.h"
-#include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/decode/Counters.h"
 #include "NANDInfo/decode/Weeks.h"
@@ -85,7 +84,7 @@ Dictionary sharedFields(const Dictionary& derived) {
 
 void copyIfPresent(const Dictionary& from, std::string_view key, Dictionary& to,
                    std::string_view newKey) {
-  if (const auto* value = from.find(key)) CopyDictionary(newKey, *value, to);
+  if (const auto* value = from.find(key)) to.set(newKey, *value);
 }
 
 }  // namespace NANDInfo

@@ -5,11 +5,10 @@
 #include <string_view>
 
 #include "NANDInfo/APIErrorMessage.h"
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/collect/Recorded.h"
-#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/controller/StorageController.h"
 
 namespace NANDInfo {
 
@@ -31,27 +30,25 @@ void addKindOfController(std::string_view className, Dictionary& counters) {
 
 base::Result<Dictionary> readFTLStatistics(const Services& services, FTLParser parser,
                                            FTLSource source, std::uint32_t argument) {
-  const OpenExporter exporter(services);
-  if (exporter.get() == nullptr) return Error{"gatherZMCFTLData: Could not get nand_exporter_t"};
-  if (exporter->io_connection == 0) return Error{"gatherZMCFTLData: No io_connection exist"};
+  const auto controller = openController(services);
+  if (!controller) return Error{"gatherZMCFTLData: Could not get nand_exporter_t"};
+  if (!controller->service.isOpen()) return Error{"gatherZMCFTLData: No io_connection exist"};
+  const nand_exporter_t* const exporter = controller->exporter;
   const bool statistics = source == FTLSource::statistics;
   const auto getter = statistics ? exporter->getStatsSelectors : exporter->getReadStatsSelectors;
   if (getter == nullptr) {
     return Error{statistics ? "gatherZMCFTLData: No getStatsSelectors exist"
                             : "gatherZMCFTLData: No getReadStatsSelectors exist"};
   }
-  TunnelCommandBlock block{.argument = statistics ? 0 : argument};
-  Buffer buffer;
-  if (!executeTunnelCommand(services, exporter->io_connection, exporter.get(), getter(), block,
-                            buffer)) {
-    return Error{GetAPIErrorMessage()};
-  }
+  const auto answer = fetchStatistics(*controller, getter(), statistics ? 0 : argument);
+  if (!answer) return answer.error();
   const std::unique_ptr<GenericParserCxt> context(new (std::nothrow) GenericParserCxt);
   if (context == nullptr) {
     return Error{"gatherZMCFTLData: Could not allocate memory for pcxt.ftlData"};
   }
   const auto parse = parser == FTLParser::statKey ? exporter->parseFTLStatKey : exporter->parseFTL;
-  if (parse(context.get(), buffer) == 0) return Error{"gatherZMCFTLData: parseFTL failed"};
+  if (parse(context.get(), answer->delivered()) == 0)
+    return Error{"gatherZMCFTLData: parseFTL failed"};
   Dictionary counters = CreateDictFromCxt(*context);
   addKindOfController(exporter->className, counters);
   return counters;

@@ -6,14 +6,13 @@
 #include <string>
 
 #include "NANDInfo/APIErrorMessage.h"
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/collect/FTLInfo.h"
 #include "NANDInfo/collect/Recorded.h"
-#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/controller/StorageController.h"
 
 namespace NANDInfo {
 
@@ -24,27 +23,24 @@ namespace {
 
 constexpr std::uint32_t kMaxMSPs = 10;
 
-bool getNANDMSPBuffer(const Services& services, const OpenExporter& exporter, std::uint32_t index,
-                      Buffer& buffer) {
-  TunnelCommandBlock block{.argument = index};
-  return executeTunnelCommand(services, exporter->io_connection, exporter.get(),
-                              exporter->getMSPStatsSelectors(), block, buffer);
+// An MSP's buffer; none when it doesn't answer.
+std::optional<TunnelAnswer> getNANDMSPBuffer(const StorageController& controller,
+                                             std::uint32_t index) {
+  return recorded(fetchStatistics(controller, controller.exporter->getMSPStatsSelectors(), index));
 }
 
 // The number of MSPs that answer.
-std::uint32_t countMSPs(const Services& services, const OpenExporter& exporter) {
+std::uint32_t countMSPs(const StorageController& controller) {
   std::uint32_t count = 0;
-  for (Buffer buffer; count < kMaxMSPs; ++count, buffer.clear()) {
-    if (!getNANDMSPBuffer(services, exporter, count, buffer)) break;
-  }
+  while (count < kMaxMSPs && getNANDMSPBuffer(controller, count)) ++count;
   return count;
 }
 
 // All counters of each MSP under its index, as far as they could be read. The count is taken first:
 // a controller that stops answering in between is seen as such.
-Dictionary readMSPs(const Services& services, const OpenExporter& exporter) {
+Dictionary readMSPs(const StorageController& controller) {
   Dictionary msps;
-  const std::uint32_t count = countMSPs(services, exporter);
+  const std::uint32_t count = countMSPs(controller);
   if (count == 0) {
     SetAPIErrorMessage("CopyWhitelistedNANDMSPInfo: Unable to gather any NAND MSP fields");
     return msps;
@@ -55,17 +51,17 @@ Dictionary readMSPs(const Services& services, const OpenExporter& exporter) {
     return msps;
   }
   for (std::uint32_t index = 0; index < count; ++index) {
-    Buffer buffer;
-    if (!getNANDMSPBuffer(services, exporter, index, buffer)) {
+    const auto answer = getNANDMSPBuffer(controller, index);
+    if (!answer) {
       SetAPIErrorMessage("gatherZMCMSPData: getNANDMSPBuffer tunnel command failed !");
       break;
     }
-    if (exporter->parseMSP(context.get(), buffer) == 0) {
+    if (controller.exporter->parseMSP(context.get(), answer->delivered()) == 0) {
       SetAPIErrorMessage("gatherZMCMSPData: parseMSP failed !");
       break;
     }
     msps.set(std::to_string(index), CreateDictFromCxt(*context));
-    exporter->releaseGeneric(context.get());
+    controller.exporter->releaseGeneric(context.get());
   }
   return msps;
 }
@@ -86,13 +82,14 @@ Dictionary firmwareVersion(const Dictionary& counters) {
 }  // namespace
 
 base::Result<Dictionary> readMSPStatistics(const Services& services) {
-  const OpenExporter exporter(services);
-  if (exporter.get() == nullptr) return Error{"gatherZMCMSPData: Could not get nand_exporter_t"};
-  if (exporter->getMSPStatsSelectors == nullptr || exporter->parseMSP == nullptr) {
+  const auto controller = openController(services);
+  if (!controller) return Error{"gatherZMCMSPData: Could not get nand_exporter_t"};
+  const nand_exporter_t& exporter = *controller->exporter;
+  if (exporter.getMSPStatsSelectors == nullptr || exporter.parseMSP == nullptr) {
     return Error{"gatherZMCMSPData: Controller does not support MSP data"};
   }
-  if (exporter->io_connection == 0) return Error{"gatherZMCMSPData: No io_connection exist"};
-  return readMSPs(services, exporter);
+  if (!controller->service.isOpen()) return Error{"gatherZMCMSPData: No io_connection exist"};
+  return readMSPs(*controller);
 }
 
 Dictionary reportedMSP(const Dictionary& counters, const Dictionary& shared, bool round) {

@@ -8,6 +8,7 @@
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/collect/DerivedFields.h"
 #include "NANDInfo/collect/FTLInfo.h"
+#include "NANDInfo/controller/EANService.h"
 
 namespace NANDInfo {
 
@@ -26,7 +27,7 @@ Dictionary storageStats(const Services& services, bool round) {
   const Dictionary derived = fieldsAlong(services);
   for (const char* key : kDerivedFields) copyIfPresent(derived, key, statistics, key);
   for (const EANQuery& query : EANQueries()) {
-    statistics.set(query.key, query.query(services, query.code));
+    statistics.set(query.key, askEAN(services, query.figure, query.code));
   }
   Dictionary info = CreateFilteredDict_SigDig(std::move(statistics),
                                               &WhitelistedStorageStats_SigDigDict(), round);

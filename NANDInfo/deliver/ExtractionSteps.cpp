@@ -7,13 +7,13 @@
 #include <utility>
 
 #include "NANDInfo/APIErrorMessage.h"
+#include "NANDInfo/DriverService.h"
 #include "NANDInfo/Events.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Magazine.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/collect/MagazineInfo.h"
-#include "NANDInfo/controller/DriverHandles.h"
 #include "NANDInfo/deliver/EventSender.h"
 #include "platform/DeviceRegistry.h"
 #include "platform/SystemLog.h"
@@ -64,13 +64,11 @@ Dictionary nvramStatistics(const Services& services) {
                      {"SystemUsed", "systemused"},
                      {"Generation", "norwrites"},
                      {"Version", "version"}};
-  const RegistryHandle service(services,
-                               services.registry.DrvGetMatchingService("NvramDiagService"));
-  if (service.get() == 0) return {};
+  const auto service = DriverService::matching(services, "NvramDiagService");
+  if (!service.isPresent()) return {};
   Dictionary statistics;
   for (const auto& [property, field] : kProperties) {
-    auto value = services.registry.searchProperty(service.get(), property,
-                                                  platform::DeviceRegistry::Direction::children);
+    auto value = service.property(property, platform::DeviceRegistry::Direction::children);
     if (value) statistics.set(field, *std::move(value));
   }
   return statistics;

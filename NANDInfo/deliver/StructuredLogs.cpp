@@ -1,20 +1,15 @@
 #include "NANDInfo/deliver/StructuredLogs.h"
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
-#include <cstdlib>
-#include <cstring>
-#include <memory>
 #include <span>
+#include <string_view>
 #include <vector>
 
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/collect/BasicInfo.h"
-#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/controller/StorageController.h"
 #include "NANDInfo/deliver/ListHandlers.h"
 #include "NANDInfo/deliver/StructuredLogState.h"
-#include "base/ByteReader.h"
 #include "base/Text.h"
 #include "platform/DeviceRegistry.h"
 #include "platform/PreferenceStore.h"
@@ -83,37 +78,12 @@ std::vector<ListRetrieval> retrievalsFrom(const Services& services,
   return retrievals;
 }
 
-// The flags of a list command; the argument stands in the bits from the third on.
-constexpr std::uint32_t kSizeQuery = 1, kCallersFlag = 2;
-constexpr int kArgumentShift = 2;
-
-std::array<std::byte, 24> commandBlock(std::uint32_t opType, std::uint32_t flags) {
-  std::array<std::byte, 24> block{};
-  for (unsigned i = 0; i < 4; ++i) {
-    block[i] = static_cast<std::byte>(opType >> 8 * i & 0xFF);
-    block[4 + i] = static_cast<std::byte>(flags >> 8 * i & 0xFF);
-  }
-  return block;
-}
-
-struct FreeMemory {
-  void operator()(std::byte* memory) const { std::free(memory); }
-};
-using Pages = std::unique_ptr<std::byte[], FreeMemory>;
-
-// Zeroed memory that begins at a page, as drivers want it for a list; null when it is refused.
-Pages allocatePages(std::size_t size) {
-  constexpr std::size_t kLargestPage = 16384;
-  if (size > kLargestBuffer) return nullptr;
-  const std::size_t rounded = (size + kLargestPage - 1) / kLargestPage * kLargestPage;
-  Pages pages(static_cast<std::byte*>(std::aligned_alloc(kLargestPage, rounded)));
-  if (pages) std::memset(pages.get(), 0, rounded);
-  return pages;
-}
+// The flag of a list command that callers of the dump set.
+constexpr std::uint32_t kCallersFlag = 2;
 
 // An open driver whose lists are dumped.
 struct Source {
-  platform::DriverConnection connection;
+  const DriverService& service;
   const nand_exporter_t& exporter;
   const plist::Value& characteristics;
   std::uint32_t flags;  // of every command
@@ -125,35 +95,31 @@ bool retrieveList(const Services& services, const Source& source, const ListRetr
                   int index) {
   const SelectorPair* selectors = retrieval.getSelectors();
   if (selectors == nullptr) return false;
-  const std::uint32_t flags = source.flags | retrieval.argument << kArgumentShift;
-  std::array<std::byte, 4> announced{};
-  const auto asked = services.drivers.DrvCallStructMethod(
-      source.connection, source.exporter.sizeSelector,
-      commandBlock(selectors->sizeOpType, flags | kSizeQuery), announced);
-  if (asked.status != 0) {
-    services.streams.writeError(base::format(
-        "DrvCallStructMethod failed with status 0x%x on selector index %d\n", asked.status, index));
-    return true;
+  const TunnelAnswer list =
+      source.service.exchange({.sizeMethod = source.exporter.sizeSelector,
+                               .dataMethod = source.exporter.dataSelector,
+                               .opTypes = *selectors,
+                               .flags = source.flags | retrieval.argument << kListArgumentShift,
+                               .fetchesNothing = false});
+  switch (list.failure) {
+    case TunnelAnswer::Failure::size:
+      services.streams.writeError(
+          base::format("DrvCallStructMethod failed with status 0x%x on selector index %d\n",
+                       list.status, index));
+      return true;
+    case TunnelAnswer::Failure::memory:
+      services.streams.writeError(base::format("Could not malloc %u bytes", list.announced));
+      return false;
+    case TunnelAnswer::Failure::data:
+      services.streams.writeError(base::format(
+          "Could not retrieve data from driver for selector %u\n", selectors->dataOpType));
+      return true;
+    case TunnelAnswer::Failure::none:
+      break;
   }
-  const std::size_t size = base::littleEndian<std::uint32_t>(announced);
-  if (size == 0) return true;
-  const Pages pages = allocatePages(size);
-  if (!pages) {
-    services.streams.writeError(
-        base::format("Could not malloc %zd bytes", static_cast<std::ptrdiff_t>(size)));
-    return false;
-  }
-  const std::span list(pages.get(), size);
-  const auto fetched =
-      services.drivers.DrvCallStructMethod(source.connection, source.exporter.dataSelector,
-                                           commandBlock(selectors->dataOpType, flags), list);
-  if (fetched.status != 0) {
-    services.streams.writeError(base::format(
-        "Could not retrieve data from driver for selector %u\n", selectors->dataOpType));
-    return true;
-  }
+  if (list.announced == 0) return true;
   const auto handled = retrieval.handler(
-      services, {list, source.characteristics, source.exporter.className, source.state});
+      services, {list.whole(), source.characteristics, source.exporter.className, source.state});
   if (!handled) services.streams.writeError(handled.error().text);
   return static_cast<bool>(handled);
 }
@@ -179,27 +145,25 @@ StructuredLogState stateOf(const Services& services, bool forceCollection) {
 
 bool dumpStructuredLogs(const Services& services, bool flag, bool forceCollection) {
   const StructuredLogState state = stateOf(services, forceCollection);
-  nand_exporter_t* exporter = nullptr;
-  const RegistryHandle service(services, findNandExporter(services, exporter));
-  if (service.get() == 0) {
+  auto [exporter, service] = findController(services);
+  if (!service.isPresent()) {
     services.streams.writeError("Could not get matching Regmora service for exporting classes\n");
     return false;
   }
-  DriverHandle connection(services, service.get());
-  if (connection.status() != 0 || connection.get() == 0) {
+  if (service.open() != 0 || !service.isOpen()) {
     services.streams.writeError("Could not get connection to service\n");
     return false;
   }
-  const auto characteristics = services.registry.searchProperty(
-      service.get(), exporter->propertyKey, platform::DeviceRegistry::Direction::parents);
+  const auto characteristics =
+      service.property(exporter->propertyKey, platform::DeviceRegistry::Direction::parents);
   bool handled = false;
   if (characteristics) {
-    handled = retrieveLists(
-        services, {connection.get(), *exporter, *characteristics, flag ? kCallersFlag : 0, state});
+    handled = retrieveLists(services,
+                            {service, *exporter, *characteristics, flag ? kCallersFlag : 0, state});
   } else {
     services.streams.writeError("failed to create dictionary");
   }
-  if (connection.close() != 0) {
+  if (service.close() != 0) {
     services.streams.writeError("Could not close connection to service\n");
   }
   return handled;

@@ -106,7 +106,7 @@ TEST(StorageStats, DerivedFieldsAndImages) {
   device.registry.add({.className = kEANClassName});
   std::uint64_t answer = 1234561;
   for (const EANQuery& query : EANQueries()) {
-    const int method = query.query == GetEANImageSize ? 3 : 7;
+    const int method = query.figure == EANFigure::imageSize ? 3 : 7;
     device.registry.standing[base::format("%d(%u)", method, query.code)] = {.scalar = answer++};
   }
   const Dictionary derived{{"TLM_formatWeeksSince2000", 0},
@@ -117,7 +117,7 @@ TEST(StorageStats, DerivedFieldsAndImages) {
   const auto expect = [&](StorageDevice& on, bool hasDerived, bool hasImages, const char* text) {
     Dictionary expected = hasDerived ? derived : Dictionary();
     for (const EANQuery& query : EANQueries()) {
-      const bool isSize = query.query == GetEANImageSize;
+      const bool isSize = query.figure == EANFigure::imageSize;
       expected.set(query.key, !hasImages ? 0 : isSize ? 1234600 : 1235000);
     }
     expected.set("TLM_APIErrorMessage", text);

@@ -266,7 +266,8 @@ TEST_F(ControllerTest, EANQueriesAskInOrderAndAnswerZeroOnFailure) {
     const EANQuery& query = EANQueries()[i];
     registry.script.push_back({rows[i].call, {.scalar = ~i}});
     EXPECT_STREQ(query.key, rows[i].key);
-    EXPECT_EQ(query.query(platform, query.code), ~i);
+    auto* const ask = query.figure == EANFigure::imageSize ? GetEANImageSize : GetEANUpdateCount;
+    EXPECT_EQ(ask(platform, query.code), ~i);
   }
   EXPECT_EQ(log.lines(), Lines());
 

@@ -10,7 +10,7 @@
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/StructuredLogs.h"
-#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/interface/Exporters.h"
 #include "daemon/Entry.h"
 #include "end_to_end/Device.h"
 #include "host/Host.h"

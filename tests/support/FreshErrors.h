@@ -3,7 +3,7 @@
 
 #include <optional>
 
-#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/controller/APIErrorScope.h"
 
 namespace support {
 

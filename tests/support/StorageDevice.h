@@ -11,7 +11,7 @@
 
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/interface/Exporters.h"
 #include "support/ControllerBuffers.h"
 #include "support/FreshErrors.h"
 #include "support/TestPlatform.h"

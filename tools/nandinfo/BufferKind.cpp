@@ -4,8 +4,9 @@
 #include <optional>
 #include <string_view>
 
-#include "NANDInfo/CounterDecoders.h"
 #include "NANDInfo/DefectsList.h"
+#include "NANDInfo/FTLDecoder.h"
+#include "NANDInfo/MSPDecoder.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
 #include "base/ByteReader.h"

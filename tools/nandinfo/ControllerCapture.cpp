@@ -6,14 +6,15 @@
 #include <array>
 #include <set>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/EAN.h"
 #include "base/Text.h"
 #include "host/recorded/SimulatedDriver.h"
 #include "platform/DeviceRegistry.h"
 
 namespace nandinfo {
 
+using NANDInfo::DriverService;
+using Failure = NANDInfo::TunnelAnswer::Failure;
 using NANDInfo::nand_exporter_t;
 using platform::DriverStatus;
 using plist::Array;
@@ -61,20 +62,18 @@ std::string ControllerCapture::run() {
   // The library takes the first controller that can be opened, and at some places the first one.
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && exporter_ == nullptr; ++row) {
-    const NANDInfo::RegistryHandle service(
-        services_, services_.registry.DrvGetMatchingService(row->className));
-    if (service.get() == 0) continue;
-    if (std::string error = captureController(*row, service.get(), true); !error.empty()) {
+    auto service = DriverService::matching(services_, row->className);
+    if (!service.isPresent()) continue;
+    if (std::string error = captureController(*row, std::move(service), true); !error.empty()) {
       return error;
     }
   }
   // Where none is registered, it takes the first one of a walk.
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && entries.empty(); ++row) {
-    const NANDInfo::RegistryHandle service(
-        services_, NANDInfo::FindServiceUsingIterator(services_, row->className));
-    if (service.get() == 0) continue;
-    if (std::string error = captureController(*row, service.get(), false); !error.empty()) {
+    auto service = DriverService::walkedTo(services_, row->className);
+    if (!service.isPresent()) continue;
+    if (std::string error = captureController(*row, std::move(service), false); !error.empty()) {
       return error;
     }
   }
@@ -86,32 +85,30 @@ std::string ControllerCapture::run() {
 }
 
 std::string ControllerCapture::captureController(const nand_exporter_t& exporter,
-                                                 platform::RegistryObject service,
-                                                 bool registered) {
+                                                 DriverService service, bool registered) {
   Dictionary entry{{"Class", exporter.className}}, driver;
   if (!registered) entry.set("Registered", false);
-  NANDInfo::DriverHandle connection(services_, service);
-  if (connection.status() != 0 || connection.get() == 0) {
+  if (service.open() != 0 || !service.isOpen()) {
     leaveOut(exporter.className, "it can't be opened");
     driver.set("RefuseOpen", true);
   } else {
     exporter_ = &exporter;
     className = exporter.className;
-    connection_ = connection.get();
     for (const BufferKind& kind : kKinds) {
-      if (std::string error = captureBuffers(kind); !error.empty()) return error;
+      if (std::string error = captureBuffers(service, kind); !error.empty()) return error;
     }
     driver.set("Buffers", std::move(answers_));
-    captureRecommendation(driver);
+    captureRecommendation(service, driver);
     captureCharacteristics(service, entry);
-    if (connection.close() != 0) driver.set("FailClose", true);
+    if (service.close() != 0) driver.set("FailClose", true);
   }
   entry.set("Driver", std::move(driver));
   entries.push_back(std::move(entry));
   return {};
 }
 
-std::string ControllerCapture::captureBuffers(const BufferKind& kind) {
+std::string ControllerCapture::captureBuffers(const DriverService& service,
+                                              const BufferKind& kind) {
   const NANDInfo::SelectorGetter getter = exporter_->*kind.selectors;
   const NANDInfo::SelectorPair* selectors = getter != nullptr ? getter() : nullptr;
   if (selectors == nullptr) {
@@ -120,47 +117,43 @@ std::string ControllerCapture::captureBuffers(const BufferKind& kind) {
   }
   for (std::uint32_t argument = 0; argument < kind.arguments; ++argument) {
     invocation_.progress(base::format("%s %u", kind.name, argument));
-    if (std::string error = captureBuffer(kind, *selectors, argument); !error.empty()) return error;
+    if (std::string error = captureBuffer(service, kind, *selectors, argument); !error.empty())
+      return error;
   }
   return {};
 }
 
-std::string ControllerCapture::captureBuffer(const BufferKind& kind,
+std::string ControllerCapture::captureBuffer(const DriverService& service, const BufferKind& kind,
                                              const NANDInfo::SelectorPair& selectors,
                                              std::uint32_t argument) {
   const std::string key = base::format("%u:%u", selectors.dataOpType, argument);
-  std::array<std::byte, 4> announced{};
-  const auto asked = tunnel(exporter_->sizeSelector, selectors.sizeOpType, true, kind.argumentIn,
-                            argument, announced);
-  if (asked.status != 0) {
-    leaveOut(kind, argument, statusText(asked.status));
+  const bool inFlags = kind.argumentIn == ArgumentIn::flags;
+  const NANDInfo::TunnelAnswer fetched =
+      service.exchange({.sizeMethod = exporter_->sizeSelector,
+                        .dataMethod = exporter_->dataSelector,
+                        .opTypes = selectors,
+                        .flags = inFlags ? argument << NANDInfo::kListArgumentShift : 0,
+                        .argument = inFlags ? 0 : argument});
+  if (fetched.failure == Failure::size) {
+    leaveOut(kind, argument, statusText(fetched.status));
     // What nothing is known of fails like that.
-    if (asked.status != host::recorded::kNotSupported) {
-      answers_.set(key, Dictionary{{"FailSize", std::uint64_t{asked.status}}});
+    if (fetched.status != host::recorded::kNotSupported) {
+      answers_.set(key, Dictionary{{"FailSize", std::uint64_t{fetched.status}}});
     }
     return {};
   }
-  std::uint64_t size = 0;
-  for (std::size_t i = announced.size(); i > 0; --i) {
-    size = size << 8 | std::to_integer<std::uint64_t>(announced[i - 1]);
-  }
-  Dictionary answer{{"Announce", size}};
-  if (size > NANDInfo::kLargestBuffer) {
-    leaveOut(kind, argument, "the driver announces more than a buffer may have");
+  Dictionary answer{{"Announce", std::uint64_t{fetched.announced}}};
+  if (fetched.failure != Failure::none) {
+    const bool tooLarge = fetched.failure == Failure::memory;
+    leaveOut(
+        kind, argument,
+        tooLarge ? "the driver announces more than a buffer may have" : statusText(fetched.status));
+    if (!tooLarge) answer.set("FailData", std::uint64_t{fetched.status});
     answers_.set(key, std::move(answer));
     return {};
   }
-  NANDInfo::Buffer buffer(size);
-  const auto fetched = tunnel(exporter_->dataSelector, selectors.dataOpType, false, kind.argumentIn,
-                              argument, buffer);
-  if (fetched.status != 0) {
-    leaveOut(kind, argument, statusText(fetched.status));
-    answer.set("FailData", std::uint64_t{fetched.status});
-    answers_.set(key, std::move(answer));
-    return {};
-  }
-  const std::string_view bytes(reinterpret_cast<const char*>(buffer.data()),
-                               std::min(fetched.outputSize, buffer.size()));
+  const std::string_view bytes(reinterpret_cast<const char*>(fetched.delivered().data()),
+                               fetched.delivered().size());
   const std::string digest = sha256(bytes);
   std::string& file = files_[digest];
   if (file.empty()) {
@@ -174,32 +167,14 @@ std::string ControllerCapture::captureBuffer(const BufferKind& kind,
                                {"file", file},
                                {"sha256", digest}});
   answer.set("File", file);
-  answers_.set(key, bytes.size() == size ? Value(file) : Value(std::move(answer)));
+  answers_.set(key, bytes.size() == fetched.announced ? Value(file) : Value(std::move(answer)));
   return {};
 }
 
-platform::DriverConnections::CallResult ControllerCapture::tunnel(std::uint32_t method,
-                                                                  std::uint32_t opType,
-                                                                  bool sizeQuery, ArgumentIn place,
-                                                                  std::uint32_t argument,
-                                                                  std::span<std::byte> output) {
-  constexpr int kFlagsShift = 2;
-  const bool inFlags = place == ArgumentIn::flags;
-  const std::uint32_t words[] = {opType,
-                                 (sizeQuery ? 1U : 0U) | (inFlags ? argument << kFlagsShift : 0),
-                                 inFlags ? 0 : argument};
-  std::array<std::byte, 24> block{};
-  for (std::size_t i = 0; i < sizeof words; ++i) {
-    block[i] = static_cast<std::byte>(words[i / 4] >> (i % 4 * 8) & 0xFF);
-  }
-  return services_.drivers.DrvCallStructMethod(connection_, method, block, output);
-}
-
-void ControllerCapture::captureRecommendation(Dictionary& driver) {
+void ControllerCapture::captureRecommendation(const DriverService& service, Dictionary& driver) {
   if (exporter_->recommendDeletionSelector == NANDInfo::kNoSelector) return;
   std::array<std::byte, 4> output{};
-  const auto answer = services_.drivers.DrvCallStructMethod(
-      connection_, exporter_->recommendDeletionSelector, {}, output);
+  const auto answer = service.call(exporter_->recommendDeletionSelector, output);
   if (answer.status != 0) return leaveOut("deletion recommendation", statusText(answer.status));
   plist::Data bytes;
   for (std::size_t i = 0; i < std::min(output.size(), answer.outputSize); ++i) {
@@ -208,13 +183,12 @@ void ControllerCapture::captureRecommendation(Dictionary& driver) {
   driver.set("RecommendsDeletion", std::move(bytes));
 }
 
-void ControllerCapture::captureCharacteristics(platform::RegistryObject service,
-                                               Dictionary& entry) {
+void ControllerCapture::captureCharacteristics(const DriverService& service, Dictionary& entry) {
   // Those that a command reads. What else an entry tells of itself may identify it.
   constexpr std::string_view kRead[] = {"chip-id", "manufacturer-id", "num-bus",
                                         "nand-device-desc"};
-  auto found = services_.registry.searchProperty(service, exporter_->propertyKey,
-                                                 platform::DeviceRegistry::Direction::parents);
+  auto found =
+      service.property(exporter_->propertyKey, platform::DeviceRegistry::Direction::parents);
   if (!found) return leaveOut(exporter_->propertyKey, "the registry has no such property");
   if (invocation_.arguments.redact) {
     Dictionary kept;
@@ -229,14 +203,13 @@ void ControllerCapture::captureCharacteristics(platform::RegistryObject service,
 }
 
 void ControllerCapture::captureEAN() {
-  constexpr std::uint32_t kMethods[] = {3, 7};  // an image's size, and the number of its updates
-  const NANDInfo::RegistryHandle service(
-      services_, services_.registry.DrvGetMatchingService(NANDInfo::kEANClassName));
-  if (service.get() == 0) return leaveOut(NANDInfo::kEANClassName, "the registry has none");
+  constexpr std::uint32_t kMethods[] = {NANDInfo::kEANImageSizeMethod,
+                                        NANDInfo::kEANUpdateCountMethod};
+  auto service = DriverService::matching(services_, NANDInfo::kEANClassName);
+  if (!service.isPresent()) return leaveOut(NANDInfo::kEANClassName, "the registry has none");
   Dictionary driver;
-  const NANDInfo::DriverHandle connection(services_, service.get());
-  if (connection.status() != 0) {
-    leaveOut(NANDInfo::kEANClassName, statusText(connection.status()));
+  if (const DriverStatus refused = service.open(); refused != 0) {
+    leaveOut(NANDInfo::kEANClassName, statusText(refused));
     driver.set("RefuseOpen", true);
   } else {
     std::set<std::uint32_t> codes;
@@ -248,8 +221,7 @@ void ControllerCapture::captureEAN() {
         for (int shift = 24; shift >= 0; shift -= 8) key += static_cast<char>(code >> shift & 0xFF);
         const std::uint64_t input[] = {code};
         std::uint64_t output[] = {0};
-        const auto status =
-            services_.drivers.DrvCallMethod(connection.get(), method, input, output);
+        const auto status = service.call(method, input, output);
         if (status == 0) {
           scalars.set(key, output[0]);
         } else {
@@ -264,13 +236,11 @@ void ControllerCapture::captureEAN() {
 
 void ControllerCapture::captureNVRAM() {
   constexpr char kClass[] = "NvramDiagService";
-  const NANDInfo::RegistryHandle service(services_,
-                                         services_.registry.DrvGetMatchingService(kClass));
-  if (service.get() == 0) return leaveOut(kClass, "the registry has none");
+  const auto service = DriverService::matching(services_, kClass);
+  if (!service.isPresent()) return leaveOut(kClass, "the registry has none");
   Dictionary properties;
   for (const char* const key : {"CommonUsed", "SystemUsed", "Generation", "Version"}) {
-    if (auto value = services_.registry.searchProperty(
-            service.get(), key, platform::DeviceRegistry::Direction::children)) {
+    if (auto value = service.property(key, platform::DeviceRegistry::Direction::children)) {
       properties.set(key, *std::move(value));
     }
   }

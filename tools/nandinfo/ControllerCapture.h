@@ -7,7 +7,7 @@
 #include <string_view>
 
 #include "NANDInfo/Controller.h"
-#include "platform/DeviceRegistry.h"
+#include "NANDInfo/DriverService.h"
 #include "tools/nandinfo/CaptureFolder.h"
 #include "tools/nandinfo/Commands.h"
 
@@ -36,19 +36,15 @@ class ControllerCapture {
   enum class ArgumentIn { word, flags };
 
   std::string captureController(const NANDInfo::nand_exporter_t& exporter,
-                                platform::RegistryObject service, bool registered);
-  std::string captureBuffers(const BufferKind& kind);
-  std::string captureBuffer(const BufferKind& kind, const NANDInfo::SelectorPair& selectors,
-                            std::uint32_t argument);
-  void captureRecommendation(plist::Dictionary& driver);
-  void captureCharacteristics(platform::RegistryObject service, plist::Dictionary& entry);
+                                NANDInfo::DriverService service, bool registered);
+  std::string captureBuffers(const NANDInfo::DriverService& service, const BufferKind& kind);
+  std::string captureBuffer(const NANDInfo::DriverService& service, const BufferKind& kind,
+                            const NANDInfo::SelectorPair& selectors, std::uint32_t argument);
+  void captureRecommendation(const NANDInfo::DriverService& service, plist::Dictionary& driver);
+  void captureCharacteristics(const NANDInfo::DriverService& service, plist::Dictionary& entry);
   void captureEAN();
   void captureNVRAM();
 
-  platform::DriverConnections::CallResult tunnel(std::uint32_t method, std::uint32_t opType,
-                                                 bool sizeQuery, ArgumentIn place,
-                                                 std::uint32_t argument,
-                                                 std::span<std::byte> output);
   void leaveOut(std::string what, std::string reason);
   void leaveOut(const BufferKind& kind, std::uint32_t argument, std::string reason);
 
@@ -56,8 +52,7 @@ class ControllerCapture {
   const NANDInfo::Services services_;
   CaptureFolder& folder_;
   const NANDInfo::nand_exporter_t* exporter_ = nullptr;  // the one that is asked
-  platform::DriverConnection connection_ = 0;
-  plist::Dictionary answers_;                 // the driver's, by op type and argument
+  plist::Dictionary answers_;                            // the driver's, by op type and argument
   std::map<std::string, std::string> files_;  // by their digests: what is equal is written once
   std::uint32_t firstLeftOut_ = 0, lastLeftOut_ = 0;  // arguments of the last entry of leftOut
   const BufferKind* kindLeftOut_ = nullptr;

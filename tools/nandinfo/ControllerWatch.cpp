@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <span>
 
-#include "NANDInfo/NANDInfo.h"
-#include "NANDInfo/controller/DriverHandles.h"
+#include "NANDInfo/Controller.h"
+#include "NANDInfo/DriverService.h"
 #include "base/Text.h"
 #include "platform/Clock.h"
 #include "platform/DeviceProperties.h"
@@ -93,8 +93,7 @@ ControllerWatch::ControllerWatch(const NANDInfo::Services& inner, DirectTexts te
 std::string ControllerWatch::problem() {
   if (!lookedUp_) {
     for (const auto& exporter : exporters()) {
-      NANDInfo::RegistryHandle(services_,
-                               NANDInfo::FindServiceUsingIterator(services_, exporter.className));
+      NANDInfo::DriverService::walkedTo(services_, exporter.className);
     }
   }
   if (found_.empty()) {
@@ -102,9 +101,7 @@ std::string ControllerWatch::problem() {
   }
   if (stage_ == Stage::nothing) {
     // The library knew that it needn't ask. Whether it could have, is seen by opening.
-    const NANDInfo::RegistryHandle service(
-        services_, NANDInfo::FindServiceUsingIterator(services_, found_.c_str()));
-    const NANDInfo::DriverHandle connection(services_, service.get());
+    NANDInfo::DriverService::walkedTo(services_, found_).open();
   }
   if (answered_ || stage_ == Stage::opened) return {};
   const std::string status =

@@ -6,8 +6,10 @@
 #include <utility>
 #include <vector>
 
-#include "NANDInfo/CounterDecoders.h"
 #include "NANDInfo/DefectsList.h"
+#include "NANDInfo/FTLDecoder.h"
+#include "NANDInfo/LegacyDecoder.h"
+#include "NANDInfo/MSPDecoder.h"
 #include "NANDInfo/SnapshotReader.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"

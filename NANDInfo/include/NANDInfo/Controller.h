@@ -7,6 +7,7 @@
 #include <span>
 #include <vector>
 
+#include "NANDInfo/DriverService.h"
 #include "NANDInfo/Parsers.h"
 #include "NANDInfo/Services.h"
 #include "base/Exported.h"
@@ -15,10 +16,6 @@
 
 namespace MORVEND_EXPORTED NANDInfo {
 
-// The op types of a tunnel command: of its size phase and of its data phase.
-struct SelectorPair {
-  std::uint32_t sizeOpType, dataOpType;
-};
 using SelectorGetter = const SelectorPair* (*)();
 
 const SelectorPair* getStatsSelectors();
@@ -30,6 +27,9 @@ const SelectorPair* getTaskSchedulerSelectors();
 const SelectorPair* getSnapshotSelectors();
 const SelectorPair* getSnapshotHeaderSelectors();
 const SelectorPair* getBandStatsSelectors();
+
+// A list's command has no argument word: the argument stands in its flags, from the third bit on.
+inline constexpr int kListArgumentShift = 2;
 
 inline constexpr std::uint32_t kNoSelector = 0xFFFFFFFF;
 
@@ -58,9 +58,6 @@ inline constexpr std::size_t kExporters = 3;
 extern nand_exporter_t nand_exporters_tunnel[kExporters + 1];
 
 using Buffer = std::vector<std::byte>;
-
-// A driver that announces more than this is treated as if the memory were refused.
-inline constexpr std::size_t kLargestBuffer = std::size_t{16} << 20;
 
 // The caller's part of a tunnel command; the rest of the 24-byte block is the command's own.
 struct TunnelCommandBlock {

@@ -14,11 +14,15 @@ namespace MORVEND_EXPORTED NANDInfo {
 std::uint64_t GetEANImageSize(const Services& services, std::uint32_t code);
 std::uint64_t GetEANUpdateCount(const Services& services, std::uint32_t code);
 
+// What they ask the driver of the service.
 inline constexpr char kEANClassName[] = "NorbaNVMeEAN";
+inline constexpr std::uint32_t kEANImageSizeMethod = 3, kEANUpdateCountMethod = 7;
+
+enum class EANFigure : std::uint8_t { imageSize, updateCount };
 
 struct EANQuery {
   const char* key;  // of the storage statistics
-  std::uint64_t (*query)(const Services& services, std::uint32_t code);
+  EANFigure figure;
   std::uint32_t code;
 };
 

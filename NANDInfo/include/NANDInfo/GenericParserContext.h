@@ -49,6 +49,13 @@ class GenericParserCxt {
   std::pmr::string names_;  // of all records, one after the other
 };
 
+// What became of a buffer that was decoded into a context.
+struct Decoded {
+  std::uint32_t values =
+      0;                  // that count as added, dropped ones among them; 0: it is no such buffer
+  std::string complaint;  // the first thing that was wrong with it; empty: nothing was
+};
+
 // Appends one field named prefix followed by suffix. False when the context is null or memory is
 // refused.
 bool AddSingleValueToGenericContext(GenericParserCxt* context, std::string_view prefix,

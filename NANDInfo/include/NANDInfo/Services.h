@@ -24,6 +24,11 @@ class SystemVersion;
 
 namespace MORVEND_EXPORTED NANDInfo {
 
+struct nand_exporter_t;
+
+// The process's table of controller drivers: nand_exporters_tunnel.
+nand_exporter_t* exporterTable();
+
 struct Services {
   platform::SystemLog& log;
   platform::StandardStreams& streams;
@@ -40,6 +45,7 @@ struct Services {
   platform::DeviceRegistry& registry;
   platform::DriverConnections& drivers;
   platform::PurgeableSpace& purgeableSpace;
+  nand_exporter_t* exporters = exporterTable();  // that are looked for
 
   // Each service under its name, out of whatever has them: a host, a test's fakes.
   template <typename Source>

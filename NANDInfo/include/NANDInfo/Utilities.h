@@ -29,7 +29,9 @@ plist::Value GetStringFromDictionarySafe(const plist::Dictionary& dictionary, st
 void CopyDictionary(std::string_view key, const plist::Value& value, plist::Dictionary& target);
 
 // Stores all entries in the target; they replace what it has under their keys.
-void addEntries(const plist::Dictionary& entries, plist::Dictionary& target);
+inline void addEntries(const plist::Dictionary& entries, plist::Dictionary& target) {
+  for (const auto& [key, value] : entries) target.set(key, value);
+}
 
 // At most two, or eight, hexadecimal characters as a number. A character that isn't hexadecimal is
 // said on standard output and adds nothing.

@@ -1,4 +1,4 @@
-#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/MSPDecoder.h"
 
 #include <algorithm>
 #include <optional>

@@ -3,7 +3,9 @@
 #include <utility>
 
 #include "NANDInfo/APIErrorMessage.h"
-#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/FTLDecoder.h"
+#include "NANDInfo/LegacyDecoder.h"
+#include "NANDInfo/MSPDecoder.h"
 
 namespace NANDInfo {
 

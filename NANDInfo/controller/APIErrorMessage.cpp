@@ -4,7 +4,7 @@
 #include <cstdio>
 #include <utility>
 
-#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/controller/APIErrorScope.h"
 
 namespace NANDInfo {
 

@@ -1,4 +1,4 @@
-#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/LegacyDecoder.h"
 
 #include <algorithm>
 

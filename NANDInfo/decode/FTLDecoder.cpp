@@ -1,4 +1,4 @@
-#include "NANDInfo/CounterDecoders.h"
+#include "NANDInfo/FTLDecoder.h"
 
 #include <algorithm>
 #include <array>

@@ -66,10 +66,6 @@ void CopyDictionary(std::string_view key, const Value& value, plist::Dictionary&
   target.set(key, value);
 }
 
-void addEntries(const plist::Dictionary& entries, plist::Dictionary& target) {
-  for (const auto& [key, value] : entries) CopyDictionary(key, value, target);
-}
-
 std::uint8_t hexStringToByte(const Services& services, std::string_view text) {
   const HexNumber byte = hexByte(text);
   services.streams.writeOutput(byte.complaint);

@@ -1,10 +1,10 @@
-// The known controller drivers, and the op types of their tunnel commands.
+#include "NANDInfo/interface/Exporters.h"
 
 #include <algorithm>
 #include <iterator>
 
 #include "NANDInfo/Controller.h"
-#include "NANDInfo/decode/ProcessState.h"
+#include "NANDInfo/Services.h"
 #include "platform/DeviceRegistry.h"
 
 namespace NANDInfo {
@@ -60,6 +60,8 @@ constexpr nand_exporter_t kTable[kExporters + 1] = {
 }  // namespace
 
 nand_exporter_t nand_exporters_tunnel[] = {kTable[0], kTable[1], kTable[2], kTable[3]};
+
+nand_exporter_t* exporterTable() { return nand_exporters_tunnel; }
 
 void ResetExporters() {
   std::copy(std::begin(kTable), std::end(kTable), std::begin(nand_exporters_tunnel));

@@ -1,0 +1,17 @@
+// FTL statistics as a function of the bytes alone: the buffer and the fields are those of
+// ZMCFTLParseBufferToCxt, but what it would record as a message is handed back.
+#pragma once
+
+#include <cstddef>
+#include <span>
+
+#include "NANDInfo/GenericParserContext.h"
+#include "base/Exported.h"
+
+namespace MORVEND_EXPORTED NANDInfo {
+
+// Appends the fields: under the names of the table, or all under their keys.
+Decoded decodeFTL(std::span<const std::byte> buffer, GenericParserCxt* context);
+Decoded decodeFTLByKey(std::span<const std::byte> buffer, GenericParserCxt* context);
+
+}  // namespace NANDInfo
