@@ -24,7 +24,7 @@ inline void require(bool condition) {
 inline Fields fieldsOf(const NANDInfo::GenericParserCxt& context) {
   Fields fields;
   for (std::size_t i = 0; i < context.size(); ++i) {
-    require(context[i].name.size() <= NANDInfo::kLongestFieldName);
+    require(context[i].name.size() <= NANDInfo::kMaxFieldName);
     fields.emplace_back(context[i].name, context[i].value);
   }
   return fields;

@@ -9,7 +9,7 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   const auto list = NANDInfo::DefectsList::parse(std::as_bytes(std::span(bytes, size)));
-  if (list.has_value() != (size >= 12)) std::abort();
+  if (static_cast<bool>(list) != (size >= 12)) std::abort();
   if (!list) return 0;
   std::uint32_t claimed;
   std::memcpy(&claimed, bytes + 8, sizeof claimed);

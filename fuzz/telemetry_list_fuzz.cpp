@@ -17,7 +17,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   const auto buffer = std::as_bytes(std::span(bytes + 6, size - 6));
   const auto list = NANDInfo::parseTelemetryList(buffer, channels);
   const std::size_t expected = channels > 0 ? static_cast<std::size_t>(channels) : 0;
-  if (list.has_value() != (expected <= buffer.size() / 4128)) std::abort();
+  if (static_cast<bool>(list) != (expected <= buffer.size() / 4128)) std::abort();
   if (!list) return 0;
   if (list->size() != expected) std::abort();
   for (const auto& channel : *list) {

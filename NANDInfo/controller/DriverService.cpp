@@ -27,10 +27,10 @@ BlockBytes block(const TunnelCommand& command, std::uint32_t opType, std::uint32
 
 // Zeroed memory that begins at a page; null when it is refused, and for no bytes.
 std::byte* allocatePages(std::size_t size) {
-  constexpr std::size_t kLargestPage = 16384;
-  if (size > kLargestBuffer) return nullptr;
-  const std::size_t rounded = (size + kLargestPage - 1) / kLargestPage * kLargestPage;
-  void* const pages = rounded != 0 ? std::aligned_alloc(kLargestPage, rounded) : nullptr;
+  constexpr std::size_t kMaxPage = 16384;
+  if (size > kMaxBuffer) return nullptr;
+  const std::size_t rounded = (size + kMaxPage - 1) / kMaxPage * kMaxPage;
+  void* const pages = rounded != 0 ? std::aligned_alloc(kMaxPage, rounded) : nullptr;
   if (pages != nullptr) std::memset(pages, 0, rounded);
   return static_cast<std::byte*>(pages);
 }

@@ -7,12 +7,12 @@
 
 namespace NANDInfo {
 
-std::optional<DefectsList> DefectsList::parse(std::span<const std::byte> buffer) {
+base::Result<DefectsList> DefectsList::parse(std::span<const std::byte> buffer) {
   base::ByteReader reader(buffer);
   reader.read<std::uint32_t>();
   const auto factoryCount = reader.read<std::uint32_t>();
   const auto count = reader.read<std::uint32_t>();
-  if (!count) return std::nullopt;
+  if (!count) return base::Error{"it is shorter than the list's header"};
   const std::size_t fitting = std::min<std::size_t>(*count, reader.rest().size() / kRecordSize);
   return DefectsList(*factoryCount, reader.rest().first(fitting * kRecordSize));
 }

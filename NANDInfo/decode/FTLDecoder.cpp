@@ -26,7 +26,7 @@ std::optional<Record> nextRecord(base::ByteReader& words) {
   while (const auto header = readFTLHeader(words)) {
     const auto [key, count] = *header;
     if (count == 0) continue;
-    if (key == kEndKey || key > kLargestFTLKey) return std::nullopt;
+    if (key == kEndKey || key > kMaxFTLKey) return std::nullopt;
     const auto values = takeFTLValues(words, *header);
     if (!values) return std::nullopt;
     return Record{key, count, *values};
@@ -51,7 +51,7 @@ class Name {
  private:
   std::size_t room() const { return static_cast<std::size_t>(text_.data() + text_.size() - end_); }
 
-  std::array<char, kLongestFieldName> text_;
+  std::array<char, kMaxFieldName> text_;
   char* end_ = text_.data();
 };
 

@@ -14,7 +14,7 @@ struct FTLHeader {
 };
 
 // A larger key is no key.
-inline constexpr std::uint32_t kLargestFTLKey = 0x30000000;
+inline constexpr std::uint32_t kMaxFTLKey = 0x30000000;
 inline constexpr std::uint32_t kFTLValueSize = 8;
 
 // The next header; none when no whole word is left.

@@ -13,7 +13,7 @@ namespace NANDInfo {
 namespace {
 
 // The index of an element has 16 bits.
-constexpr std::uint32_t kMostElements = 65535;
+constexpr std::uint32_t kMaxElements = 65535;
 
 }  // namespace
 
@@ -25,8 +25,8 @@ GenericParserCxt::Field GenericParserCxt::operator[](std::size_t place) const {
 
 bool GenericParserCxt::add(std::string_view prefix, std::string_view suffix, std::uint64_t value) {
   const std::size_t nameStart = names_.size();
-  prefix = prefix.substr(0, kLongestFieldName);
-  suffix = suffix.substr(0, kLongestFieldName - prefix.size());
+  prefix = prefix.substr(0, kMaxFieldName);
+  suffix = suffix.substr(0, kMaxFieldName - prefix.size());
   try {
     names_.append(prefix).append(suffix);
     records_.push_back({value, names_.size()});
@@ -53,7 +53,7 @@ bool AddMultipleFieldsToGenericContext(GenericParserCxt* context, std::string_vi
   if (elementSize == 0 || count == 0) return true;
   if (elementSize > sizeof(std::uint64_t)) return false;
   const std::size_t elements =
-      std::min<std::size_t>(source.size() / elementSize, std::min(count, kMostElements));
+      std::min<std::size_t>(source.size() / elementSize, std::min(count, kMaxElements));
   bool allAdded = true;
   for (std::size_t i = 0; i < elements; ++i) {
     std::array<char, 8> digits;

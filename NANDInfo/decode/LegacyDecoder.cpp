@@ -78,7 +78,7 @@ bool decodeLegacy(std::span<const std::byte> buffer, LegacyNandInfoCxt& context)
   while (const auto header = readFTLHeader(words)) {
     hasHeader = true;
     const auto values = takeFTLValues(words, *header);
-    if (header->key > kLargestFTLKey || !values) {
+    if (header->key > kMaxFTLKey || !values) {
       context.exportVersion = 0;
       return false;
     }

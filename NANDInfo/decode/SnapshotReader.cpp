@@ -18,8 +18,8 @@ enum : std::uint32_t {
   kEndOfBuffer = 0xF19158ED
 };
 
-constexpr std::size_t kSmallestContainerPayload = 4;  // its type
-constexpr std::size_t kLongestThreadName = 64;
+constexpr std::size_t kMinContainerPayload = 4;  // its type
+constexpr std::size_t kMaxThreadName = 64;
 
 using Bytes = std::span<const std::byte>;
 
@@ -50,7 +50,7 @@ struct Container {
   // A name item need not hold a final zero; an empty one agrees with every name.
   bool isOfThread(std::string_view wanted) const {
     if (!threadName) return false;
-    const std::size_t length = std::min(threadName->size(), kLongestThreadName);
+    const std::size_t length = std::min(threadName->size(), kMaxThreadName);
     for (std::size_t i = 0; i < length; ++i) {
       const char character = static_cast<char>((*threadName)[i]);
       if (character != (i < wanted.size() ? wanted[i] : '\0')) return false;
@@ -73,7 +73,7 @@ std::optional<Bytes> getIOStatsWithThreadnameFromKCDataHelper(Bytes snapshot,
     stopped.item = snapshot.size() - reader.rest().size();
     const auto item = nextItem(reader);
     const bool begins =
-        item && item->type == kContainerBegin && item->payload.size() >= kSmallestContainerPayload;
+        item && item->type == kContainerBegin && item->payload.size() >= kMinContainerPayload;
     const bool ends =
         !item || item->type == kEndOfBuffer ||
         (item->type == kContainerEnd && !open.empty() && item->flags == open.back().identifier);

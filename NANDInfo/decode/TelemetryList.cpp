@@ -40,8 +40,7 @@ constexpr bool regionsAreApart() {
   std::size_t end = 0;
   for (const Region& region : kRegions) {
     if (region.firstWord < end) return false;
-    end = region.firstWord +
-          *std::max_element(std::begin(region.elements), std::end(region.elements));
+    end = region.firstWord + std::ranges::max(region.elements);
   }
   return end <= std::tuple_size_v<NandCountersRecord>;
 }
@@ -60,14 +59,15 @@ constexpr VendorConverter kVendorConverters[] = {
 
 }  // namespace
 
-std::optional<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const std::byte> buffer,
-                                                                std::int32_t channels) {
+base::Result<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const std::byte> buffer,
+                                                               std::int32_t channels) {
   const auto count = static_cast<std::uint64_t>(std::max(channels, 0));
   base::ByteReader reader(buffer);
   const auto blocks = reader.take(count * kCounterBlockSize);
-  if (!blocks) return std::nullopt;
   const auto summaries = reader.take(count * kTelemetrySummarySize);
-  if (!summaries) return std::nullopt;
+  if (!blocks || !summaries) {
+    return base::Error{base::format("there are not %d channels in it", channels)};
+  }
   std::vector<TelemetryChannel> list;
   for (std::size_t i = 0; i < count; ++i) {
     list.push_back({blocks->subspan(i * kCounterBlockSize).first<kCounterBlockSize>(),
@@ -93,10 +93,8 @@ Vendor vendorOf(std::string_view manufacturerIdentifier) {
 CounterConverter* counterConverter(ChipKind chip, std::uint64_t vendor) {
   if (chip == ChipKind::QM7) return parseCountersAlgoGeneric;
   if (chip == ChipKind::QM8) return parseCountersAlgoGenericQ8;
-  for (const auto& row : kVendorConverters) {
-    if (row.vendor == vendor) return row.convert;
-  }
-  return parseCounters1y;
+  const auto* row = std::ranges::find(kVendorConverters, vendor, &VendorConverter::vendor);
+  return row != std::end(kVendorConverters) ? row->convert : parseCounters1y;
 }
 
 plist::Dictionary telemetryLog(const TelemetryChannel& channel, ChipKind chip,

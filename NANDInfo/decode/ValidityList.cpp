@@ -13,13 +13,15 @@ constexpr std::size_t kUnreadSize = 12;  // of a record, before the list's index
 
 }  // namespace
 
-std::optional<ValidityLists> parseValidityList(std::span<const std::byte> buffer) {
+base::Result<ValidityLists> parseValidityList(std::span<const std::byte> buffer) {
   base::ByteReader header(buffer);
   const std::uint64_t count = header.read<std::uint32_t>().value_or(0);
   const std::uint64_t headerUnits = header.read<std::uint32_t>().value_or(UINT32_MAX);
   base::ByteReader body(buffer);
-  if (count == 0 || !body.take(headerUnits * kHeaderUnit)) return std::nullopt;
-  if (body.rest().size() < count * kRecordSize) return std::nullopt;
+  if (count == 0 || !body.take(headerUnits * kHeaderUnit) ||
+      body.rest().size() < count * kRecordSize) {
+    return base::Error{"it has no records, or more than the bytes hold"};
+  }
 
   ValidityLists lists;
   for (std::uint64_t i = 0; i < count; ++i) {

@@ -9,7 +9,7 @@ namespace NANDInfo {
 
 namespace {
 
-constexpr std::size_t kMostDigits = std::numeric_limits<std::uint32_t>::digits10 + 1;
+constexpr std::size_t kMaxDigits = std::numeric_limits<std::uint32_t>::digits10 + 1;
 
 // Calls visit(name) for each name of a row. Each is written where the one before ended if
 // visit(name) says that this one is kept, else in its place; there must be room for all of them.
@@ -26,7 +26,7 @@ char* writeNames(const NameRow& row, char* out, Visit visit) {
     if (item.count == 0) write(item, [](char* end) { return end; });
     for (std::uint32_t i = 0; i < item.count; ++i) {
       write(item, [number = item.first + i](char* end) {
-        return std::to_chars(end, end + kMostDigits, number).ptr;
+        return std::to_chars(end, end + kMaxDigits, number).ptr;
       });
     }
   });
@@ -37,7 +37,7 @@ std::size_t mostBytes(const NameRow& row) {
   std::size_t bytes = 0;
   visitItems(row, [&](const FamilyItem& item) {
     bytes += std::max(item.count, 1u) *
-             (familyStem(row.family).size() + 1 + item.text.size() + kMostDigits);
+             (familyStem(row.family).size() + 1 + item.text.size() + kMaxDigits);
   });
   return bytes;
 }

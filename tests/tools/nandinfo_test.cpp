@@ -250,7 +250,7 @@ TEST_F(Nandinfo, DecodesAWholeCapture) {
        "/c: statistics 0: it holds MSP statistics, not FTL statistics\n"},
       {{{"10:4", "big"}}, "/c: read-statistics 4: the capture is longer than 16 MiB\n"},
   };
-  file("c/big", support::Bytes(NANDInfo::kLargestBuffer));
+  file("c/big", support::Bytes(NANDInfo::kMaxBuffer));
   for (const auto& row : rows) {
     EXPECT_EQ(capture(row.buffers), 1);
     EXPECT_NE(err.find(row.err), std::string::npos) << err;

@@ -38,7 +38,7 @@ base::Result<FileBytes> readInput(const std::string& path) {
     if (got < 0 && error == EINTR) continue;
     if (got < 0) return failed(std::strerror(error));
     if (got == 0) return bytes;
-    if (bytes.size() > NANDInfo::kLargestBuffer) return failed("longer than 16 MiB");
+    if (bytes.size() > NANDInfo::kMaxBuffer) return failed("longer than 16 MiB");
   }
 }
 

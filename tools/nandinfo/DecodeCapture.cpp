@@ -221,8 +221,8 @@ class Capture {
 
   const NANDInfo::Services services_;
   const host::DeviceRoot folder_;
-  std::size_t left_ = NANDInfo::kLargestBuffer;  // bytes that may still be read
-  std::size_t count_ = 0;                        // of decoded buffers
+  std::size_t left_ = NANDInfo::kMaxBuffer;  // bytes that may still be read
+  std::size_t count_ = 0;                    // of decoded buffers
   Dictionary decoded_;
   Array undecoded_;
   std::string why_;  // it failed

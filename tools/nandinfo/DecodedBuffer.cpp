@@ -130,7 +130,7 @@ Dictionary decodedLegacy(Bytes bytes) {
 Dictionary decodedValidity(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::validity, bytes); !why.empty()) return refused(why);
   auto lists = NANDInfo::parseValidityList(bytes);
-  if (!lists) return refused("it has no records, or more than the bytes hold");
+  if (!lists) return refused(lists.error().text);
   Array fields;
   for (std::size_t i = 0; i < lists->size(); ++i) {
     if ((*lists)[i].empty()) continue;
@@ -185,7 +185,7 @@ Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout, std::uint3
     channels = static_cast<std::uint32_t>(bytes.size() / kChannelSize);
   }
   const auto list = NANDInfo::parseTelemetryList(bytes, static_cast<std::int32_t>(channels));
-  if (!list) return refused(base::format("there are not %u channels in it", channels));
+  if (!list) return refused(list.error().text);
   Dictionary byIndex;
   for (std::size_t i = 0; i < list->size(); ++i) {
     byIndex.set(std::to_string(i),

@@ -251,7 +251,7 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
         ->required();
   }
   if (takes(kChannels)) {
-    addNumber(app, "--channels", arguments.channels, NANDInfo::kLargestBuffer / kChannelSize,
+    addNumber(app, "--channels", arguments.channels, NANDInfo::kMaxBuffer / kChannelSize,
               "of the controller (default: as many as the file has room for, if it is full)");
   }
   if (takes(kNames)) {

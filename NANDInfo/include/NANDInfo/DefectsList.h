@@ -10,6 +10,7 @@
 #include <span>
 
 #include "base/Exported.h"
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace MORVEND_EXPORTED NANDInfo {
@@ -25,9 +26,9 @@ class DefectsList {
  public:
   static constexpr std::size_t kHeaderSize = 12, kRecordSize = 32;
 
-  // Borrows the buffer; none when it is shorter than the header. Records that don't lie wholly
+  // Borrows the buffer; fails when it is shorter than the header. Records that don't lie wholly
   // within it are cut off.
-  static std::optional<DefectsList> parse(std::span<const std::byte> buffer);
+  static base::Result<DefectsList> parse(std::span<const std::byte> buffer);
 
   std::uint32_t factoryCount() const { return factoryCount_; }
   std::size_t size() const { return records_.size() / kRecordSize; }

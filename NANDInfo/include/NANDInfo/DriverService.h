@@ -31,7 +31,7 @@ struct SelectorPair {
 };
 
 // A driver that announces more than this is treated as if the memory were refused.
-inline constexpr std::size_t kLargestBuffer = std::size_t{16} << 20;
+inline constexpr std::size_t kMaxBuffer = std::size_t{16} << 20;
 
 // A question whose answer is as long as the driver says: its block of 24 bytes goes to the driver
 // twice, first for the size, then for the data.

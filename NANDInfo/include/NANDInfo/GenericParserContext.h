@@ -17,7 +17,7 @@ namespace MORVEND_EXPORTED NANDInfo {
 class NameTable;
 
 // The longest name that is kept; what is longer is cut to it.
-inline constexpr std::size_t kLongestFieldName = 98;
+inline constexpr std::size_t kMaxFieldName = 98;
 
 // Fields in the order in which they were added; names may occur more than once. An allocation that
 // fails leaves the context as it was.

@@ -4,7 +4,6 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <optional>
 #include <span>
 #include <string>
 #include <string_view>
@@ -12,6 +11,7 @@
 
 #include "NANDInfo/CounterRecords.h"
 #include "base/Exported.h"
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace MORVEND_EXPORTED NANDInfo {
@@ -23,10 +23,10 @@ struct TelemetryChannel {
   std::span<const std::byte, kTelemetrySummarySize> summary;
 };
 
-// The channels, borrowed from the buffer; none when it is too short for so many. A negative number
+// The channels, borrowed from the buffer; fails when it is too short for so many. A negative number
 // of channels counts as 0.
-std::optional<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const std::byte> buffer,
-                                                                std::int32_t channels);
+base::Result<std::vector<TelemetryChannel>> parseTelemetryList(std::span<const std::byte> buffer,
+                                                               std::int32_t channels);
 
 enum class ChipKind : std::uint8_t { other, QM7, QM8 };
 ChipKind chipKind(std::string_view chipIdentifier);

@@ -7,18 +7,18 @@
 
 #include <array>
 #include <cstddef>
-#include <optional>
 #include <span>
 
 #include "base/Exported.h"
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace MORVEND_EXPORTED NANDInfo {
 
 using ValidityLists = std::array<plist::Array, 16>;
 
-// The values of each list, in record order; records of other lists are left out. None when there
-// are no records or they don't all fit.
-std::optional<ValidityLists> parseValidityList(std::span<const std::byte> buffer);
+// The values of each list, in record order; records of other lists are left out. Fails when
+// there are no records or they don't all fit.
+base::Result<ValidityLists> parseValidityList(std::span<const std::byte> buffer);
 
 }  // namespace NANDInfo
