@@ -53,6 +53,10 @@ bool executeTunnelCommand(const Services& services, platform::DriverConnection c
                                                   .argument = block.argument,
                                                   .inLength = block.inLength,
                                                   .inBuffer = block.inBuffer});
+    const bool fetches = answer.failure == TunnelAnswer::Failure::none ||
+                         answer.failure == TunnelAnswer::Failure::data;
+    block.opType = fetches ? selectors->dataOpType : selectors->sizeOpType;
+    block.sizeQuery = fetches ? 0 : 1;
     problem = failureText(answer.failure);
     if (answer.failure == TunnelAnswer::Failure::size) buffer.clear();
     const auto bytes = answer.delivered();

@@ -212,7 +212,7 @@ struct StructuredLogsTest : testing::Test, support::StorageDevice {
   Dictionary characteristics{{"chip-id", "QM7"},
                              {"manufacturer-id", "AD8252232142"},
                              {"num-bus", 2},
-                             {"nand-device-desc", 99}};
+                             {"nand-device-desc", -1.0}};
   const Lines& errors = streams.errors;
   const std::vector<std::pair<std::int32_t, Dictionary>>& structured = housekeeping.structured;
 };
@@ -245,7 +245,7 @@ TEST_F(StructuredLogsTest, ADumpFetchesTheListsInOrderAndLogsThem) {
     for (const auto& entry : structured) EXPECT_EQ(entry.first, 176);
     EXPECT_EQ(structured[1].second.number("RD")->int64Value(), 100);
     EXPECT_EQ(structured[6].second,
-              (Dictionary{{"Factory Count", 2}, {"com.norba.NANDInfo.nandDesc", 99}}));
+              (Dictionary{{"Factory Count", 2}, {"com.norba.NANDInfo.nandDesc", -1}}));
     ASSERT_EQ(submission.logs.size(), 1u);
     EXPECT_EQ(submission.logs[0].type, "165");
     const std::string& text = submission.logs[0].contents;

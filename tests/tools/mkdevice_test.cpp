@@ -274,7 +274,7 @@ TEST(MkdeviceController, EveryChipsTelemetryIsReadInItsLayout) {
       const auto bytes = folder.read(base::format("device/controller/telemetry-%d.bin", list));
       const auto channels =
           NANDInfo::parseTelemetryList(std::as_bytes(std::span(bytes)), kChannels);
-      for (const auto& channel : channels.value()) {
+      for (const auto& channel : *channels) {
         std::string log;
         plist::appendJSON(log, NANDInfo::telemetryLog(channel, row.kind, row.convert));
         EXPECT_NE(logs.find(log), logs.npos) << list;

@@ -1,5 +1,5 @@
-// What the storage library asks of the world outside, and nothing more. References: whoever makes
-// it keeps the services alive for as long.
+// What the storage library asks of the world outside, and nothing more but the drivers that it knows.
+// References: whoever makes it keeps the services alive for as long.
 #pragma once
 
 #include "base/Exported.h"
