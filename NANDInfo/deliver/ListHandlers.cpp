@@ -9,6 +9,7 @@
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/ValidityList.h"
 #include "NANDInfo/collect/BasicInfo.h"
+#include "NANDInfo/collect/LegacyInfo.h"
 #include "NANDInfo/decode/Counters.h"
 #include "NANDInfo/deliver/NANDLogWriter.h"
 #include "base/Text.h"

@@ -10,6 +10,7 @@
 #include "NANDInfo/collect/FTLInfo.h"
 #include "NANDInfo/collect/FTLStatistics.h"
 #include "NANDInfo/collect/HealthInfo.h"
+#include "NANDInfo/collect/LegacyInfo.h"
 #include "NANDInfo/collect/MSPInfo.h"
 #include "NANDInfo/collect/MagazineInfo.h"
 #include "NANDInfo/collect/Recorded.h"

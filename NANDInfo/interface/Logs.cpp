@@ -4,6 +4,7 @@
 #include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/collect/BasicInfo.h"
+#include "NANDInfo/collect/LegacyInfo.h"
 #include "NANDInfo/deliver/NANDLogWriter.h"
 #include "NANDInfo/deliver/StructuredLogs.h"
 
