@@ -17,15 +17,15 @@ namespace NANDInfo {
 
 using plist::Dictionary;
 
-base::Result<LegacyNandInfoCxt> readLegacyStatistics(const Services& services) {
+base::Result<LegacyNandInfoCxt> readLegacyStatistics(const ControllerServices& services) {
   LegacyNandInfoCxt context;
   nand_exporter_t* exporter = nullptr;
   if (!loadLegacy(services, exporter, &context)) return base::Error{"Unable to parse buffer"};
   return context;
 }
 
-Dictionary basicInfo(const Services& services) {
-  const auto context = readLegacyStatistics(services);
+Dictionary basicInfo(const CollectServices& services) {
+  const auto context = readLegacyStatistics(services.controller);
   if (!context) {
     return {{kNANDInfoErrorKey, "1"}, {kNANDInfoErrorMessageKey, context.error().text}};
   }

@@ -40,7 +40,7 @@ Dictionary purgeableSpace(platform::PurgeableSpace& space) {
   return info;
 }
 
-Dictionary deviceFields(const Services& services) {
+Dictionary deviceFields(const CollectServices& services) {
   Dictionary fields = purgeableSpace(services.purgeableSpace);
   addEntries(swapOutInfo(services.snapshots), fields);
   addEntries(diskInfo(services.files, services.deviceProperties), fields);
@@ -48,7 +48,7 @@ Dictionary deviceFields(const Services& services) {
   return fields;
 }
 
-Dictionary otherFields(const Services& services, const Dictionary* ftl) {
+Dictionary otherFields(const CollectServices& services, const Dictionary* ftl) {
   Dictionary fields = deviceFields(services);
   if (ftl != nullptr) {
     addEntries(derivedFields(*ftl), fields);

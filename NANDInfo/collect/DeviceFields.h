@@ -3,7 +3,7 @@
 
 #include <cstdint>
 
-#include "NANDInfo/Services.h"
+#include "NANDInfo/collect/CollectServices.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
@@ -15,10 +15,10 @@ std::int32_t storeDemoMode(platform::PreferenceStore& preferences);
 plist::Dictionary purgeableSpace(platform::PurgeableSpace& space);
 
 // Both of these, the kernel's swap-out and the disk: all that doesn't need the controller.
-plist::Dictionary deviceFields(const Services& services);
+plist::Dictionary deviceFields(const CollectServices& services);
 
 // The device's fields and those that are derived from the FTL counters, as far as there are any
 // (null: that there are none is noted as the process's message).
-plist::Dictionary otherFields(const Services& services, const plist::Dictionary* ftl);
+plist::Dictionary otherFields(const CollectServices& services, const plist::Dictionary* ftl);
 
 }  // namespace NANDInfo

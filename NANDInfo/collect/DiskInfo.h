@@ -1,8 +1,12 @@
 // The user data volume: its size, and how full it is.
 #pragma once
 
-#include "NANDInfo/Services.h"
 #include "plist/Value.h"
+
+namespace platform {
+class DeviceProperties;
+class FileSystem;
+}  // namespace platform
 
 namespace NANDInfo {
 

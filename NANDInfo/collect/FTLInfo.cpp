@@ -15,9 +15,9 @@ namespace NANDInfo {
 
 using plist::Dictionary;
 
-Dictionary whitelistedFTLInfo(const Services& services, bool round) {
-  auto counters =
-      ftlStatistics(services, "CopyWhitelistedNANDFTLInfo: Unable to gather other FTL fields");
+Dictionary whitelistedFTLInfo(const CollectServices& services, bool round) {
+  auto counters = ftlStatistics(services.controller,
+                                "CopyWhitelistedNANDFTLInfo: Unable to gather other FTL fields");
   if (counters) addEntries(otherFields(services, &*counters), *counters);
   Dictionary info = CreateFilteredDict_SigDig(std::move(counters).value_or(Dictionary()),
                                               &WhitelistedRawNANDFTLCounters_SigDigDict(), round);
@@ -25,7 +25,7 @@ Dictionary whitelistedFTLInfo(const Services& services, bool round) {
   return info;
 }
 
-Dictionary wholeFTLInfo(const Services& services, bool statKeys) {
+Dictionary wholeFTLInfo(const ControllerServices& services, bool statKeys) {
   const auto parser = statKeys ? FTLParser::statKey : FTLParser::named;
   Dictionary info =
       recorded(readFTLStatistics(services, parser, FTLSource::statistics, 0),
@@ -35,8 +35,9 @@ Dictionary wholeFTLInfo(const Services& services, bool statKeys) {
   return info;
 }
 
-Dictionary fieldsAlong(const Services& services) {
-  const auto ftl = ftlStatistics(services, "gatherZMCOtherData: Unable to get FTL counters");
+Dictionary fieldsAlong(const CollectServices& services) {
+  const auto ftl =
+      ftlStatistics(services.controller, "gatherZMCOtherData: Unable to get FTL counters");
   return ftl ? sharedFields(otherFields(services, &*ftl)) : Dictionary();
 }
 

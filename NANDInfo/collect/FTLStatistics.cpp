@@ -28,7 +28,7 @@ void addKindOfController(std::string_view className, Dictionary& counters) {
 
 }  // namespace
 
-base::Result<Dictionary> readFTLStatistics(const Services& services, FTLParser parser,
+base::Result<Dictionary> readFTLStatistics(const ControllerServices& services, FTLParser parser,
                                            FTLSource source, std::uint32_t argument) {
   const auto controller = openController(services);
   if (!controller) return Error{"gatherZMCFTLData: Could not get nand_exporter_t"};
@@ -47,14 +47,15 @@ base::Result<Dictionary> readFTLStatistics(const Services& services, FTLParser p
     return Error{"gatherZMCFTLData: Could not allocate memory for pcxt.ftlData"};
   }
   const auto parse = parser == FTLParser::statKey ? exporter->parseFTLStatKey : exporter->parseFTL;
-  if (parse(context.get(), answer->delivered()) == 0)
+  if (parse(context.get(), answer->delivered()) == 0) {
     return Error{"gatherZMCFTLData: parseFTL failed"};
+  }
   Dictionary counters = CreateDictFromCxt(*context);
   addKindOfController(exporter->className, counters);
   return counters;
 }
 
-std::optional<Dictionary> ftlStatistics(const Services& services, const char* missing) {
+std::optional<Dictionary> ftlStatistics(const ControllerServices& services, const char* missing) {
   return recorded(readFTLStatistics(services, FTLParser::named, FTLSource::statistics, 0), missing);
 }
 

@@ -65,7 +65,7 @@ bool isRetirable(const Dictionary& health) {
 }
 
 // The figures that a consumer gets; empty when there are none.
-Dictionary figuresFor(const Services& services, std::span<const NameRow> names) {
+Dictionary figuresFor(const ControllerServices& services, std::span<const NameRow> names) {
   Dictionary health = healthInfo(services);
   if (health.empty()) SetAPIErrorMessage("CopyServitaNANDInfo: Unable to get health API fields");
   const NameTable table(names);
@@ -84,24 +84,24 @@ Dictionary healthFigures(const Dictionary& ftl) {
       {kNANDHealthInfoNumDieFailures, signed64(ftl, "numDieFailures").value_or(-1)}};
 }
 
-Dictionary healthInfo(const Services& services) {
+Dictionary healthInfo(const ControllerServices& services) {
   const auto ftl = ftlStatistics(services, "gatherNANDHealthInfo: Unable to get FTL fields");
   return ftl ? healthFigures(*ftl) : Dictionary();
 }
 
-Dictionary servitaInfo(const Services& services) {
+Dictionary servitaInfo(const ControllerServices& services) {
   Dictionary info = figuresFor(services, kServitaFigures);
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary internalLabInfo(const Services& services) {
+Dictionary internalLabInfo(const ControllerServices& services) {
   Dictionary info = figuresFor(services, kInternalLabFigures);
   info.set(kNANDHealthInfoIsNANDRetirable, std::int64_t{isRetirable(info)});
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary otaInfo(const Services& services) { return figuresFor(services, kOTAFigures); }
+Dictionary otaInfo(const ControllerServices& services) { return figuresFor(services, kOTAFigures); }
 
 }  // namespace NANDInfo

@@ -1,7 +1,7 @@
 // The health figures of the FTL statistics, and who gets which of them.
 #pragma once
 
-#include "NANDInfo/Services.h"
+#include "NANDInfo/controller/ControllerServices.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
@@ -10,12 +10,12 @@ namespace NANDInfo {
 plist::Dictionary healthFigures(const plist::Dictionary& ftl);
 
 // The same of the controller's statistics; empty without them.
-plist::Dictionary healthInfo(const Services& services);
+plist::Dictionary healthInfo(const ControllerServices& services);
 
 // Those for the warranty service, for internal lab tools (with whether the flash may be retired)
 // and for system updates.
-plist::Dictionary servitaInfo(const Services& services);
-plist::Dictionary internalLabInfo(const Services& services);
-plist::Dictionary otaInfo(const Services& services);
+plist::Dictionary servitaInfo(const ControllerServices& services);
+plist::Dictionary internalLabInfo(const ControllerServices& services);
+plist::Dictionary otaInfo(const ControllerServices& services);
 
 }  // namespace NANDInfo

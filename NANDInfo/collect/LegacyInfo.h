@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <optional>
 
+#include "NANDInfo/GenericParserContext.h"
 #include "NANDInfo/Parsers.h"
 #include "plist/Value.h"
 

@@ -81,7 +81,7 @@ Dictionary firmwareVersion(const Dictionary& counters) {
 
 }  // namespace
 
-base::Result<Dictionary> readMSPStatistics(const Services& services) {
+base::Result<Dictionary> readMSPStatistics(const ControllerServices& services) {
   const auto controller = openController(services);
   if (!controller) return Error{"gatherZMCMSPData: Could not get nand_exporter_t"};
   const nand_exporter_t& exporter = *controller->exporter;
@@ -100,9 +100,9 @@ Dictionary reportedMSP(const Dictionary& counters, const Dictionary& shared, boo
   return msp;
 }
 
-Dictionary whitelistedMSPInfo(const Services& services, bool round) {
+Dictionary whitelistedMSPInfo(const CollectServices& services, bool round) {
   Dictionary info;
-  if (const auto msps = recorded(readMSPStatistics(services),
+  if (const auto msps = recorded(readMSPStatistics(services.controller),
                                  "CopyWhitelistedNANDMSPInfo: Unable to gather MSP fields")) {
     const Dictionary shared = fieldsAlong(services);
     for (const auto& [index, counters] : *msps) {

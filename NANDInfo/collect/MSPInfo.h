@@ -1,7 +1,7 @@
 // The statistics of each media storage processor.
 #pragma once
 
-#include "NANDInfo/Services.h"
+#include "NANDInfo/collect/CollectServices.h"
 #include "base/Result.h"
 #include "plist/Value.h"
 
@@ -9,7 +9,7 @@ namespace NANDInfo {
 
 // All counters of each MSP under its index in decimal, as far as they could be read; where that
 // ended early, why is noted as the process's message. No driver is open when it returns.
-base::Result<plist::Dictionary> readMSPStatistics(const Services& services);
+base::Result<plist::Dictionary> readMSPStatistics(const ControllerServices& services);
 
 // An MSP's whitelisted counters, rounded if wanted, with the fields that all MSPs share and the
 // parts of its firmware's version.
@@ -17,6 +17,6 @@ plist::Dictionary reportedMSP(const plist::Dictionary& counters, const plist::Di
                               bool round);
 
 // All MSPs so, under their indices, and the process's message.
-plist::Dictionary whitelistedMSPInfo(const Services& services, bool round);
+plist::Dictionary whitelistedMSPInfo(const CollectServices& services, bool round);
 
 }  // namespace NANDInfo

@@ -20,7 +20,7 @@ using plist::Value;
 namespace {
 
 // The snapshot so many hours back, with its time; the controller takes the low 32 bits.
-std::optional<Dictionary> snapshot(const Services& services, std::uint64_t hours) {
+std::optional<Dictionary> snapshot(const ControllerServices& services, std::uint64_t hours) {
   auto counters = recorded(readFTLStatistics(services, FTLParser::named, FTLSource::readStatistics,
                                              static_cast<std::uint32_t>(hours)));
   if (counters) addMagazineTimeStamp(*counters);
@@ -29,11 +29,11 @@ std::optional<Dictionary> snapshot(const Services& services, std::uint64_t hours
 
 }  // namespace
 
-Dictionary magazineInfo(const Services& services, std::uint64_t hours, bool differences,
+Dictionary magazineInfo(const CollectServices& services, std::uint64_t hours, bool differences,
                         std::uint32_t mode) {
   Dictionary info{{kNANDInfoIsStatMagSupported, std::int32_t{0}}};
-  const auto newer = snapshot(services, 0);
-  const auto older = snapshot(services, hours);
+  const auto newer = snapshot(services.controller, 0);
+  const auto older = snapshot(services.controller, hours);
   if (const Value* const supported = newer ? newer->find(kNANDInfoIsStatMagSupported) : nullptr) {
     info.set(kNANDInfoIsStatMagSupported, *supported);
   }
@@ -45,14 +45,14 @@ Dictionary magazineInfo(const Services& services, std::uint64_t hours, bool diff
     addEntries(*older, info);
   }
   addEntries(otherFields(services, newer ? &*newer : nullptr), info);
-  if (const auto statistics = ftlStatistics(services)) {
+  if (const auto statistics = ftlStatistics(services.controller)) {
     setAveragePECycles(info, *statistics);
   }
   info.set(kTLM_APIErrorMessage, GetAPIErrorMessage());
   return info;
 }
 
-Dictionary magazineHistory(const Services& services, bool skips) {
+Dictionary magazineHistory(const ControllerServices& services, bool skips) {
   auto newer = snapshot(services, 0);
   const Number* const supported = newer ? newer->number(kNANDInfoIsStatMagSupported) : nullptr;
   if (supported != nullptr && !supported->boolValue()) {

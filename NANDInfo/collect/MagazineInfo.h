@@ -4,16 +4,16 @@
 #include <cstdint>
 
 #include "NANDInfo/Magazine.h"
-#include "NANDInfo/Services.h"
+#include "NANDInfo/collect/CollectServices.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
 
 // What CopySMagNANDFTLInfo promises.
-plist::Dictionary magazineInfo(const Services& services, std::uint64_t hours, bool differences,
-                               std::uint32_t mode);
+plist::Dictionary magazineInfo(const CollectServices& services, std::uint64_t hours,
+                               bool differences, std::uint32_t mode);
 
 // What CopySMagNANDFTLCustomHistoryInfo promises.
-plist::Dictionary magazineHistory(const Services& services, bool skips);
+plist::Dictionary magazineHistory(const ControllerServices& services, bool skips);
 
 }  // namespace NANDInfo

@@ -22,12 +22,12 @@ constexpr const char* kDerivedFields[] = {kTLM_formatWeeksSince2000, kTLM_DQ_Cap
 
 }  // namespace
 
-Dictionary storageStats(const Services& services, bool round) {
+Dictionary storageStats(const CollectServices& services, bool round) {
   Dictionary statistics;
   const Dictionary derived = fieldsAlong(services);
   for (const char* key : kDerivedFields) copyIfPresent(derived, key, statistics, key);
   for (const EANQuery& query : EANQueries()) {
-    statistics.set(query.key, askEAN(services, query.figure, query.code));
+    statistics.set(query.key, askEAN(services.controller, query.figure, query.code));
   }
   Dictionary info = CreateFilteredDict_SigDig(std::move(statistics),
                                               &WhitelistedStorageStats_SigDigDict(), round);

@@ -1,12 +1,12 @@
 // The storage statistics: a few derived fields, and the EAN service's images.
 #pragma once
 
-#include "NANDInfo/Services.h"
+#include "NANDInfo/collect/CollectServices.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
 
 // Whitelisted, rounded if wanted, with the process's message.
-plist::Dictionary storageStats(const Services& services, bool round);
+plist::Dictionary storageStats(const CollectServices& services, bool round);
 
 }  // namespace NANDInfo

@@ -1,8 +1,11 @@
 // The writes of the kernel's swap-out thread.
 #pragma once
 
-#include "NANDInfo/Services.h"
 #include "plist/Value.h"
+
+namespace platform {
+class KernelSnapshots;
+}
 
 namespace NANDInfo {
 

@@ -5,6 +5,7 @@
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/collect/FTLInfo.h"
 #include "NANDInfo/collect/MSPInfo.h"
+#include "NANDInfo/collect/NVRAMInfo.h"
 #include "NANDInfo/collect/StorageStats.h"
 #include "NANDInfo/deliver/ExtractionSteps.h"
 #include "platform/Eventra.h"
@@ -39,10 +40,22 @@ const ExtractionStep kEV_Extraction_Step_Names[] = {
      [](const Services& services) {
        return sendStorageStats(services.log, services.eventra, storageStats(services, false));
      }},
-    {"NVRAM stat", sendNVRAMStatistics},
-    {"FTL statsMag daily", [](const Services& services) { return sendMagazine(services, 0); }},
-    {"FTL statsMag weekly", [](const Services& services) { return sendMagazine(services, 1); }},
-    {"FTL statsMag monthly", [](const Services& services) { return sendMagazine(services, 2); }},
+    {"NVRAM stat",
+     [](const Services& services) {
+       return sendNVRAMStatistics(services.eventra, nvramInfo(services));
+     }},
+    {"FTL statsMag daily",
+     [](const Services& services) {
+       return sendMagazine(services.log, services.eventra, services, 0);
+     }},
+    {"FTL statsMag weekly",
+     [](const Services& services) {
+       return sendMagazine(services.log, services.eventra, services, 1);
+     }},
+    {"FTL statsMag monthly",
+     [](const Services& services) {
+       return sendMagazine(services.log, services.eventra, services, 2);
+     }},
     {"FTL counters", nullptr},
 };
 

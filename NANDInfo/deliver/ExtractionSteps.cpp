@@ -7,7 +7,6 @@
 #include <utility>
 
 #include "NANDInfo/APIErrorMessage.h"
-#include "NANDInfo/DriverService.h"
 #include "NANDInfo/Events.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Magazine.h"
@@ -15,7 +14,6 @@
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/collect/MagazineInfo.h"
 #include "NANDInfo/deliver/EventSender.h"
-#include "platform/DeviceRegistry.h"
 #include "platform/SystemLog.h"
 
 namespace NANDInfo {
@@ -55,23 +53,6 @@ Dictionary sendEach(const EventSender& sender, std::initializer_list<Event> even
     if (sender.send(event, view, payload)) addEntries(*payload, sent);
   }
   return sent;
-}
-
-Dictionary nvramStatistics(const Services& services) {
-  static constexpr struct {
-    const char *property, *field;
-  } kProperties[] = {{"CommonUsed", "commonused"},
-                     {"SystemUsed", "systemused"},
-                     {"Generation", "norwrites"},
-                     {"Version", "version"}};
-  const auto service = DriverService::matching(services, "NvramDiagService");
-  if (!service.isPresent()) return {};
-  Dictionary statistics;
-  for (const auto& [property, field] : kProperties) {
-    auto value = service.property(property, platform::DeviceRegistry::Direction::children);
-    if (value) statistics.set(field, *std::move(value));
-  }
-  return statistics;
 }
 
 }  // namespace
@@ -117,15 +98,15 @@ Dictionary sendMSPStatistics(platform::SystemLog& log, platform::Eventra& eventr
   return sent;
 }
 
-Dictionary sendNVRAMStatistics(const Services& services) {
-  Dictionary statistics = nvramStatistics(services);
+Dictionary sendNVRAMStatistics(platform::Eventra& eventra, Dictionary statistics) {
   if (!statistics.empty()) {
-    sendEvent(services.eventra, kEventName_massStorage_NANDInfo_NORWrites, makePayload(statistics));
+    sendEvent(eventra, kEventName_massStorage_NANDInfo_NORWrites, makePayload(statistics));
   }
   return statistics;
 }
 
-Dictionary sendMagazine(const Services& services, std::int32_t deltaType) {
+Dictionary sendMagazine(platform::SystemLog& log, platform::Eventra& eventra,
+                        const CollectServices& services, std::int32_t deltaType) {
   static constexpr struct {
     const char* event;
     std::uint64_t hours;
@@ -134,7 +115,7 @@ Dictionary sendMagazine(const Services& services, std::int32_t deltaType) {
                   {kEventName_massStorage_NANDInfo_SM_WeeklyMA_FTLCounters_1, 168, false},
                   {kEventName_massStorage_NANDInfo_SM_Monthly_FTLCounters_1, 720, false}};
   if (deltaType < 0 || static_cast<std::size_t>(deltaType) >= std::size(kWindows)) {
-    services.log.log(platform::LogLevel::standard, "Unexpected SM delta type %d", deltaType);
+    log.log(platform::LogLevel::standard, "Unexpected SM delta type %d", deltaType);
     return failure("Wrong SM delta type");
   }
   const auto& [event, hours, addsHistory] = kWindows[deltaType];
@@ -144,11 +125,10 @@ Dictionary sendMagazine(const Services& services, std::int32_t deltaType) {
     return failure("Stats Magazine not supported");
   }
 
-  const EventSender sender(services.log, services.eventra,
-                           "createAndLogSMagFTLFieldsToEventraForEvent");
+  const EventSender sender(log, eventra, "createAndLogSMagFTLFieldsToEventraForEvent");
   sender.announce(event);
   window = fieldsFor(event, std::move(window));
-  if (addsHistory) addEntries(magazineHistory(services, false), window);
+  if (addsHistory) addEntries(magazineHistory(services.controller, false), window);
   const Payload payload = makePayload(std::move(window));
   return sender.send(event, event, payload) ? *payload : Dictionary();
 }

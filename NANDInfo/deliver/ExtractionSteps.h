@@ -3,7 +3,7 @@
 
 #include <cstdint>
 
-#include "NANDInfo/Services.h"
+#include "NANDInfo/collect/CollectServices.h"
 #include "plist/Value.h"
 
 namespace NANDInfo {
@@ -22,12 +22,13 @@ plist::Dictionary sendMSPStatistics(platform::SystemLog& log, platform::Eventra&
 plist::Dictionary sendStorageStats(platform::SystemLog& log, platform::Eventra& eventra,
                                    const plist::Dictionary& storage);
 
-// How full the boot variables' memory is and how often it was written: what there was to send, even
-// if the sink didn't take it; empty without that memory's service.
-plist::Dictionary sendNVRAMStatistics(const Services& services);
+// One event of the boot variables' memory, if there is anything to send; the result is that, even
+// if the sink didn't take it.
+plist::Dictionary sendNVRAMStatistics(platform::Eventra& eventra, plist::Dictionary statistics);
 
 // The stats magazine's counters of the last day (0), week (1) or month (2); an error message for
 // another type or without a magazine.
-plist::Dictionary sendMagazine(const Services& services, std::int32_t deltaType);
+plist::Dictionary sendMagazine(platform::SystemLog& log, platform::Eventra& eventra,
+                               const CollectServices& services, std::int32_t deltaType);
 
 }  // namespace NANDInfo

@@ -34,7 +34,7 @@ std::string joined(const Array& array) {
 std::optional<std::string> entryText(const Value& value) {
   if (const auto* number = value.as<Number>()) return numberText(*number);
   const auto* array = value.as<Array>();
-  if (array == nullptr || !std::any_of(array->begin(), array->end(), isNumber)) return std::nullopt;
+  if (array == nullptr || std::ranges::none_of(*array, isNumber)) return std::nullopt;
   return joined(*array);
 }
 

@@ -6,6 +6,7 @@
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Keys.h"
+#include "NANDInfo/collect/NVRAMInfo.h"
 #include "NANDInfo/deliver/Extraction.h"
 #include "NANDInfo/deliver/ExtractionSteps.h"
 
@@ -34,11 +35,13 @@ bool EventraSendEventLazyWrapper(const Services& services, std::string_view even
   return services.eventra.EventraSendEventLazy(event, std::move(producer));
 }
 
-Dictionary gatherNVRAMStats(const Services& services) { return sendNVRAMStatistics(services); }
+Dictionary gatherNVRAMStats(const Services& services) {
+  return sendNVRAMStatistics(services.eventra, nvramInfo(services));
+}
 
 Dictionary createAndLogSMagFTLFieldsToEventraForEvent(const Services& services,
                                                       std::int32_t deltaType) {
-  return sendMagazine(services, deltaType);
+  return sendMagazine(services.log, services.eventra, services, deltaType);
 }
 
 }  // namespace NANDInfo
