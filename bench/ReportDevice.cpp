@@ -142,8 +142,8 @@ void ReportDevice::fill(int scalars, int distributions, int samples) {
                            .seconds = sample});
       }
     }
-    if (const auto error = host_.counters().apply(changes); !error.empty()) {
-      throw std::runtime_error(error);
+    if (const auto applied = host_.counters().apply(changes); !applied) {
+      throw std::runtime_error(applied.error().text);
     }
   }
   host_.counters().PLClientCheckpoint();

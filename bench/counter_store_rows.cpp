@@ -70,8 +70,8 @@ void fill(Device& device) {
                          .sample = i * 0.37,
                          .seconds = i % 86400});
     }
-    if (const auto error = device.store.apply(changes); !error.empty()) {
-      throw std::runtime_error(error);
+    if (const auto applied = device.store.apply(changes); !applied) {
+      throw std::runtime_error(applied.error().text);
     }
   }
   device.store.PLClientCheckpoint();
@@ -166,7 +166,7 @@ void addAppendRow(bench::Table& table) {
       [&] {
         for (int i = 0; i < kAppends; ++i) {
           const auto error = device.store.push(key, i * 0.37, kDays, i);
-          if (!error.empty()) throw std::runtime_error(error);
+          if (!error.empty()) throw std::runtime_error(applied.error().text);
         }
       },
       [&] {

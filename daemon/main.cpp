@@ -2,6 +2,7 @@
 
 #include <string>
 
+#include "base/Result.h"
 #include "daemon/Entry.h"
 #include "host/Host.h"
 #include "host/process/EndSignals.h"
@@ -12,15 +13,15 @@ namespace {
 
 using platform::LogLevel;
 
-// Returns what of the day couldn't be kept, or the empty text.
-std::string run(const host::HostOptions& options, int argc, char** argv) {
+// Whether all of the day is kept.
+base::Result<void> run(const host::HostOptions& options, int argc, char** argv) {
   host::Host host(options);
-  if (const std::string problem = host.root().problem(); !problem.empty()) {
+  if (const auto root = host.root().isThere(); !root) {
     // Said, and then a run like any other on a device that has nothing.
-    host.services().log.log(LogLevel::error, "%s", problem.c_str());
+    host.services().log.log(LogLevel::error, "%s", root.error().text.c_str());
   }
   morvend::RunProcess(host.services(), host.context(), argc, argv);
-  return host.unkept();
+  return host.kept();
 }
 
 }  // namespace
@@ -31,8 +32,8 @@ int main(int argc, char** argv) {
   host::StandardErrorLog log(options.lowestLevel);
   options.log = &log;
   // The last line, after all that the host says at its end: the exit status doesn't tell.
-  if (const std::string unkept = run(options, argc, argv); !unkept.empty()) {
-    log.log(LogLevel::error, "the day is not done: %s", unkept.c_str());
+  if (const auto kept = run(options, argc, argv); !kept) {
+    log.log(LogLevel::error, "the day is not done: %s", kept.error().text.c_str());
   }
   return 0;
 }

@@ -29,8 +29,8 @@ class Connection {
     std::array<int, 2> ends;
     require(::socketpair(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0, ends.data()) == 0);
     peer_ = ends[1];
-    require(writeAll(peer_, "DATA\r\nOK 0123456789abcdef0123456789abcdef\r\nAGREE_UNIX_FD\r\n") ==
-            0);
+    require(static_cast<bool>(
+        writeAll(peer_, "DATA\r\nOK 0123456789abcdef0123456789abcdef\r\nAGREE_UNIX_FD\r\n")));
     require(sd_bus_new(&bus_) >= 0 && sd_bus_set_fd(bus_, ends[0], ends[0]) >= 0);
     require(sd_bus_start(bus_) >= 0);
     while (sd_bus_is_ready(bus_) <= 0) require(sd_bus_process(bus_, nullptr) >= 0);

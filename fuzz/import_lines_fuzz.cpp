@@ -13,7 +13,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
     if (parsed.error().text.empty()) std::abort();
     return 0;
   }
-  if (!pelloran::keyProblem(parsed->key).empty()) std::abort();
+  if (!pelloran::checkKey(parsed->key)) std::abort();
   if (!std::isfinite(parsed->change.sample)) std::abort();
   if (parsed->change.seconds < 0 || parsed->change.seconds >= 86400) std::abort();
   return 0;

@@ -131,10 +131,10 @@ morvend::DeviceContext& Host::context() { return assembly_->context; }
 CounterStore& Host::counters() { return assembly_->counters; }
 const DeviceRoot& Host::root() const { return assembly_->root; }
 
-std::string Host::unkept() {
-  if (std::string why = assembly_->preferences.flushAll(); !why.empty()) return why;
-  if (std::string why = assembly_->submission.unsubmitted(); !why.empty()) return why;
-  return assembly_->counters.unrecorded();
+base::Result<void> Host::kept() {
+  return assembly_->preferences.flushAll()
+      .and_then([this] { return assembly_->submission.submitted(); })
+      .and_then([this] { return assembly_->counters.recorded(); });
 }
 
 }  // namespace host

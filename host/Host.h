@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 
+#include "base/Result.h"
 #include "device/DeviceContext.h"
 #include "host/PlayedRun.h"
 #include "host/counters/CounterStore.h"
@@ -38,9 +39,9 @@ class Host {
   CounterStore& counters();
   const DeviceRoot& root() const;
 
-  // Brings the preferences to disk, and tells what couldn't be kept of all that this process was to
-  // keep: one file's path, and why. Empty when everything is kept.
-  std::string unkept();
+  // Brings the preferences to disk, and tells whether all is kept that this process was to keep;
+  // the error is of one file's path.
+  base::Result<void> kept();
 
  private:
   struct Assembly;

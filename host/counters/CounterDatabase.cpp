@@ -4,18 +4,18 @@
 #include <sys/stat.h>
 
 #include <array>
-#include <cerrno>
 #include <climits>
-#include <cstring>
 
 #include "base/Text.h"
 #include "host/counters/SQLite.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace host {
 
+using base::Error;
+using base::Result;
 using sqlite::Connection;
-using sqlite::Failure;
 
 namespace {
 
@@ -24,7 +24,7 @@ constexpr std::array<const char*, 3> kBeside = {"-wal", "-shm", "-journal"};
 constexpr char kAside[] = "PLDataStore.sqlitedb.corrupt";
 constexpr char kLogAside[] = "PLDataStore.sqlitedb.corrupt-wal";
 
-constexpr int kMostPagesInLog = 1000;
+constexpr int kMaxPagesInLog = 1000;
 
 // Scalars and days are found by (day, key). Samples are appended to `staged`, and a checkpoint
 // packs them into data of 12 bytes each. The texts are compared with those of a database that is
@@ -39,16 +39,17 @@ constexpr char kSchema[] =
     "CREATE INDEX packed_by_day ON packed(day, key);";
 constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
 
-constexpr char kNotRegular[] = "it, or a file beside it, is not a regular file";
-constexpr char kShared[] = "it, or a file beside it, is a file with several names";
-constexpr char kNoPath[] = "its path can't be read from /proc: ";
+const Error kNotRegular{"it, or a file beside it, is not a regular file"};
+const Error kShared{"it, or a file beside it, is a file with several names"};
+constexpr char kNoPath[] = "its path can't be read from /proc";
 
-// Where an open file or folder lies on the host; empty, with errno set, when nobody can say.
-std::string pathOfOpen(int file) {
+// Where an open file or folder lies on the host.
+Result<std::string> pathOfOpen(int file) {
   std::array<char, PATH_MAX> path;
   const ssize_t length =
       ::readlink(base::format("/proc/self/fd/%d", file).c_str(), path.data(), path.size());
-  return length <= 0 ? "" : std::string(path.data(), static_cast<std::size_t>(length));
+  if (length <= 0) return systemError().at(kNoPath);
+  return std::string(path.data(), static_cast<std::size_t>(length));
 }
 
 }  // namespace
@@ -57,259 +58,269 @@ CounterDatabase::CounterDatabase(const CounterPlace& place, DeviceRoot::Links li
     : place_(place), links_(links), name_(kName) {}
 CounterDatabase::~CounterDatabase() = default;
 
-bool CounterDatabase::read(const Work& work) {
-  Failure failure;
+Result<void> CounterDatabase::read(const Work& work) {
+  Result<void> done;
   if (!connection_) {
-    std::string error;
-    if (!openFolder(DeviceRoot::Missing::fails, error)) {
-      if (!error.empty()) place_.log.log(platform::LogLevel::error, "%s", error.c_str());
-      return error.empty();
-    }
+    const auto folder = openFolder(DeviceRoot::Missing::fails);
+    if (!folder) return folder.error();
+    if (!*folder) return {};
     const FileLock lock(folder_.get());
-    failure = connect(Use::read);
+    done = connect(Use::read);
   }
-  if (connection_ && !failure) {
-    work(*connection_);
-    failure = connection_->failure();
-  }
-  if (!failure) return true;
-  if (failure.kind == Failure::Kind::damaged && !linked_) {
-    const FileLock lock(folder_.get());
-    setAside(failure.text);
-  } else {
-    place_.log.log(platform::LogLevel::error, "%s", located(failure.text).c_str());
-  }
+  if (done && connection_) done = work(*connection_);
+  if (done) return {};
   connection_.reset();
-  return false;
+  if (!done.error().is(sqlite::kDamaged) || linked_) return std::move(done).at(path());
+  const FileLock lock(folder_.get());
+  return setAside(done.error()).value_or(done.error().at(path()));
 }
 
-std::string CounterDatabase::write(Missing missing, const Work& work) {
+Result<void> CounterDatabase::write(Missing missing, const Work& work) {
   const bool creates = missing == Missing::create;
-  std::string error;
-  if (!openFolder(creates ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails, error)) {
-    return error;
-  }
+  const auto folder =
+      openFolder(creates ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
+  if (!folder) return folder.error();
+  if (!*folder) return {};
   const FileLock lock(folder_.get());
   for (bool again = false;; again = true) {
-    Failure failure = connect(creates ? Use::create : Use::write);
-    if (!failure && !connection_) return {};
-    if (!failure) {
-      work(*connection_);
-      failure = connection_->failure();
+    auto done = connect(creates ? Use::create : Use::write);
+    if (done && !connection_) return {};
+    if (done) done = work(*connection_);
+    const bool written = static_cast<bool>(done);
+    if (written && connection_->pagesInLog() > kMaxPagesInLog) {
+      done = connection_->checkpoint(Connection::Checkpoint::passive);
     }
-    const bool written = !failure;
-    if (written && connection_->pagesInLog() > kMostPagesInLog) {
-      connection_->checkpoint(Connection::Checkpoint::passive);
-      failure = connection_->failure();
-    }
-    if (!failure) return {};
+    if (done) return {};
     connection_.reset();
-    const bool damaged = failure.kind == Failure::Kind::damaged;
+    const bool damaged = done.error().is(sqlite::kDamaged);
     // What was written is safe in the log, unless that is damaged.
     if (written && !damaged) return {};
-    if (damaged) setAside(failure.text);
-    if (!damaged || again) return located(failure.text);
+    if (const auto said = damaged ? setAside(done.error()) : std::nullopt) {
+      place_.log.log(platform::LogLevel::error, "%s", said->text.c_str());
+    }
+    if (!damaged || again) return std::move(done).at(path());
   }
 }
 
-std::string CounterDatabase::settle() {
-  std::string error = write(Missing::skip, [](Connection& connection) {
-    connection.checkpoint(Connection::Checkpoint::truncate);
-    connection.leaveNothingBeside();
+Result<void> CounterDatabase::settle() {
+  auto settled = write(Missing::skip, [](Connection& connection) {
+    return connection.checkpoint(Connection::Checkpoint::truncate).and_then([&] {
+      connection.leaveNothingBeside();
+      return Result<void>();
+    });
   });
   if (connection_) {
     const FileLock lock(folder_.get());
     connection_.reset();
   }
-  return error;
+  return settled;
 }
 
-// False with an empty error: there is nothing to be opened, and nothing is to be made.
-bool CounterDatabase::openFolder(DeviceRoot::Missing missing, std::string& error) {
+// False: there is nothing to be opened, and nothing is to be made.
+Result<bool> CounterDatabase::openFolder(DeviceRoot::Missing missing) {
   if (folder_) return true;
   const bool creates = missing == DeviceRoot::Missing::create;
   const auto home = place_.home();
   const bool reads = links_ == DeviceRoot::Links::followed;
   if (!home) {
-    if (creates || reads) error = "there is no home folder for the counters database";
+    if (creates || reads) return Error{"there is no home folder for the counters database"};
     return false;
   }
   const std::string folder = *home + "/Library/Pelloran";
   folderPath_ = place_.root.hostPath(folder);
-  folder_ = place_.root.openFolder(folder, missing);
-  if (reads && (folder_ ? isLink(folder_.get(), kName) : errno == ELOOP)) {
-    error = follow(folder);
-    if (!error.empty()) folder_ = {};
-    return error.empty();
+  auto found = place_.root.openFolder(folder, missing);
+  const bool led = found ? isLink(found->get(), kName)
+                         : found.error().is(std::errc::too_many_symbolic_link_levels);
+  if (reads && led) {
+    if (const auto followed = follow(folder); !followed) {
+      folder_ = {};
+      return followed.error().at(path());
+    }
+    return true;
   }
-  if (folder_) return true;
-  // EBADF: there is no device root.
-  if (!creates && (errno == ENOENT || errno == EBADF)) return false;
-  error = folderPath_ + ": " + errorText(errno);
-  return false;
+  if (found) {
+    folder_ = *std::move(found);
+    return true;
+  }
+  if (!creates && isMissing(found.error())) return false;
+  return found.error().at(folderPath_);
 }
 
 // Finds the file that links lead to, in its own folder and under its own name, beside which its log
-// lies. Returns the empty text or what went wrong.
-std::string CounterDatabase::follow(const std::string& folder) {
-  const FileDescriptor file = place_.root.openForStatus(folder + "/" + kName);
-  if (!file) {
-    return located(errno == ENOENT ? "a link to it leads nowhere within the device root"
-                                   : errorText(errno));
+// lies.
+Result<void> CounterDatabase::follow(const std::string& folder) {
+  const auto file = place_.root.openForStatus(folder + "/" + kName);
+  if (!file && isMissing(file.error())) {
+    return Error{"a link to it leads nowhere within the device root"};
   }
-  const std::string path = pathOfOpen(file.get());
-  const std::size_t slash = path.rfind('/');
+  if (!file) return file.error();
+  const auto found = pathOfOpen(file->get());
+  if (!found) return found.error();
+  const std::size_t slash = found->rfind('/');
   struct stat status;
-  if (slash == path.npos || ::fstat(file.get(), &status) != 0) {
-    return located(kNoPath + std::string(errorText(errno)));
+  if (slash == found->npos || ::fstat(file->get(), &status) != 0) {
+    return systemError().at(kNoPath);
   }
-  name_ = path.substr(slash + 1);
-  folder_ = FileDescriptor(
-      ::open(path.substr(0, slash + 1).c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-  if (!folder_) return located(errorText(errno));
+  name_ = found->substr(slash + 1);
+  auto itsFolder = opened(
+      ::open(found->substr(0, slash + 1).c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!itsFolder) return itsFolder.error();
+  folder_ = *std::move(itsFolder);
   linked_ = true;
-  const auto found = identity();
-  if (!found) return located(kNotRegular);
+  const auto now = identity();
+  if (!now) return kNotRegular;
   // The path was the machine's; the file is the one that was found below the root.
-  const bool same = found->device == status.st_dev && found->inode == status.st_ino;
-  return same ? std::string() : located("moved while it was looked for");
+  const bool same = now->device == status.st_dev && now->inode == status.st_ino;
+  if (!same) return Error{"moved while it was looked for"};
+  return {};
 }
 
-// The file that bears the database's name now; none, with errno set, when it isn't a regular file.
-std::optional<CounterDatabase::Identity> CounterDatabase::identity() const {
+// The file that bears the database's name now; it is a regular one.
+Result<CounterDatabase::Identity> CounterDatabase::identity() const {
   struct stat status;
   if (::fstatat(folder_.get(), name_.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
     if (errno == ENOENT) return Identity{};
-    return std::nullopt;
+    return systemError();
   }
-  if (!S_ISREG(status.st_mode)) {
-    errno = EINVAL;
-    return std::nullopt;
-  }
+  if (!S_ISREG(status.st_mode)) return notRegular();
   return Identity{status.st_dev, status.st_ino, status.st_nlink};
 }
 
-std::string CounterDatabase::create() {
+Result<void> CounterDatabase::create() {
   // A new database must not meet what is left of another one.
   for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
-  const FileDescriptor file(
+  const auto file = opened(
       ::openat(folder_.get(), kName, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-  return file ? std::string() : std::strerror(errno);
+  if (!file) return Error{file.error().text};
+  return {};
 }
 
 // With the lock held: sees to it that the connection is one to the file that is there. Without a
 // failure and without a connection there is no database, and none is to be created.
-Failure CounterDatabase::connect(Use use) {
+Result<void> CounterDatabase::connect(Use use) {
   auto now = identity();
   if (now && connection_ && *now == opened_) return {};
   connection_.reset();
-  if (!now) return {Failure::Kind::other, kNotRegular};
+  if (!now) return kNotRegular;
   bool sharedBeside = false;
   for (const char* suffix : kBeside) {
     struct stat status;
     if (::fstatat(folder_.get(), (name_ + suffix).c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
       continue;
     }
-    if (!S_ISREG(status.st_mode)) return {Failure::Kind::other, kNotRegular};
+    if (!S_ISREG(status.st_mode)) return kNotRegular;
     sharedBeside = sharedBeside || status.st_nlink > 1;
   }
   const bool shared = now->names > 1;
-  if (use != Use::read && (shared || sharedBeside)) return {Failure::Kind::other, kShared};
+  if (use != Use::read && (shared || sharedBeside)) return kShared;
   if (now->inode == 0) {
     if (use != Use::create) return {};
-    if (const std::string error = create(); !error.empty()) return {Failure::Kind::other, error};
+    if (auto created = create(); !created) return created;
     now = identity();
-    if (!now) return {Failure::Kind::other, kNotRegular};
+    if (!now) return kNotRegular;
   }
   opened_ = *now;
-  const std::string path = pathOfOpen(folder_.get());
   // SQLite takes a missing path for a temporary database.
-  if (path.empty()) {
-    return {Failure::Kind::other, kNoPath + std::string(errorText(errno))};
-  }
-  const auto open = [&](Connection::Access access) {
-    connection_ = std::make_unique<Connection>(path + "/" + name_, access);
-    // A scan comes to each page once: a cache of many would be memory that is filled and never
-    // read.
-    if (use == Use::read) connection_->execute("PRAGMA cache_size = -128");
-    verify(use);
-  };
-  std::string aloneBecause = sharedBeside ? kShared : "";
+  const auto folder = pathOfOpen(folder_.get());
+  if (!folder) return folder.error();
+  const std::string path = *folder + "/" + name_;
+  using Access = Connection::Access;
+  std::string aloneBecause = kShared.text;
   if (!sharedBeside) {
-    open(linked_ || shared ? Connection::Access::readOnly : Connection::Access::readWrite);
-    if (use == Use::read && connection_ &&
-        connection_->failure().kind == Failure::Kind::unwritable) {
-      aloneBecause = connection_->failure().text;
+    auto connected = openAs(use, path, linked_ || shared ? Access::readOnly : Access::readWrite);
+    if (connected || use != Use::read || !connected.error().is(sqlite::kUnwritable)) {
+      return connected;
     }
+    aloneBecause = connected.error().text;
   }
-  if (!aloneBecause.empty()) {
-    struct stat log;
-    if (::fstatat(folder_.get(), (name_ + kBeside[0]).c_str(), &log, AT_SYMLINK_NOFOLLOW) == 0 &&
-        log.st_size > 0) {
-      place_.log.log(platform::LogLevel::error, "%s",
-                     located("it is read without its write-ahead log: " + aloneBecause).c_str());
-    }
-    open(Connection::Access::immutable);
+  struct stat log;
+  if (::fstatat(folder_.get(), (name_ + kBeside[0]).c_str(), &log, AT_SYMLINK_NOFOLLOW) == 0 &&
+      log.st_size > 0) {
+    place_.log.log(platform::LogLevel::error, "%s: it is read without its write-ahead log: %s",
+                   this->path().c_str(), aloneBecause.c_str());
   }
-  return connection_ ? connection_->failure() : Failure{};
+  return openAs(use, path, Access::immutable);
 }
 
-// Makes sure that what was opened is a database of this store, and makes it one if it is empty.
-void CounterDatabase::verify(Use use) {
-  Connection& connection = *connection_;
+Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connection::Access access) {
+  auto connection = Connection::open(path, access);
+  if (!connection) return connection.error();
+  if (use == Use::read) {
+    // A scan comes to each page once: a cache of many would be memory that is filled and never
+    // read.
+    const auto set = (*connection)->execute("PRAGMA cache_size = -128");
+    if (!set) return set;
+  }
+  const auto sound = verify(**connection, use);
+  if (!sound) return sound.error();
+  if (*sound) connection_ = *std::move(connection);
+  return {};
+}
+
+// Makes sure that what was opened is a database of this store, and makes it one if it is empty;
+// false when it isn't to be made.
+Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
   std::int64_t version = 0;
   std::string schema;
   {
-    const sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::read);
+    sqlite::Transaction transaction(connection);
+    const auto begun = transaction.begin(sqlite::Transaction::Kind::read);
+    if (!begun) return begun.error();
     sqlite::Statement userVersion(connection, "PRAGMA user_version");
-    if (userVersion.step()) version = userVersion.column(0).integer();
     sqlite::Statement texts(connection,
                             "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL ORDER BY rowid");
-    while (texts.step()) schema.append(texts.column(0).bytes()).append(";");
+    const auto known = userVersion
+                           .forEach([&] {
+                             version = userVersion.column(0).integer();
+                             return false;
+                           })
+                           .and_then([&] {
+                             return texts.forEach([&] {
+                               schema.append(texts.column(0).bytes()).append(";");
+                               return true;
+                             });
+                           });
+    if (!known) return known.error();
   }
-  if (connection.failure()) return;
   if (version > kVersion) {
-    connection.fail(Failure::Kind::other, base::format("made by a newer version of the store (%d)",
-                                                       static_cast<int>(version)));
-  } else if (use != Use::read && connection.headerForbidsWriting()) {
-    connection.fail(Failure::Kind::damaged, "its header forbids writing");
-  } else if (version == 0 && schema.empty()) {
-    if (use != Use::create) {
-      connection_.reset();
-      return;
-    }
-    connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE");
-    connection.execute(kSchema);
-    connection.execute(kCreation);
-  } else if (version != kVersion || schema != kSchema) {
-    connection.fail(Failure::Kind::damaged, "its tables are not the store's");
-  } else if (use != Use::read) {
-    connection.execute("PRAGMA journal_mode = WAL");
+    return Error{
+        base::format("made by a newer version of the store (%d)", static_cast<int>(version))};
   }
+  if (use != Use::read && connection.headerForbidsWriting()) {
+    return Error{"its header forbids writing", sqlite::kDamaged};
+  }
+  Result<void> ready;
+  if (version == 0 && schema.empty()) {
+    if (use != Use::create) return false;
+    ready = connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE")
+                .and_then([&] { return connection.execute(kSchema); })
+                .and_then([&] { return connection.execute(kCreation); });
+  } else if (version != kVersion || schema != kSchema) {
+    return Error{"its tables are not the store's", sqlite::kDamaged};
+  } else if (use != Use::read) {
+    ready = connection.execute("PRAGMA journal_mode = WAL");
+  }
+  if (!ready) return ready.error();
+  return true;
 }
 
-// With the lock held. Does nothing when another process was first.
-void CounterDatabase::setAside(const std::string& why) {
+// With the lock held. What is to be said of it; none when another process was first.
+std::optional<Error> CounterDatabase::setAside(const Error& why) {
   connection_.reset();
   const auto now = identity();
-  if (!now || now->inode == 0 || *now != opened_) return;
+  if (!now || now->inode == 0 || *now != opened_) return std::nullopt;
   // The database goes first: what is left beside no database is removed before a new one is made.
   if (::renameat(folder_.get(), kName, folder_.get(), kAside) != 0) {
-    place_.log.log(platform::LogLevel::error, "%s",
-                   located(why + "; it can't be set aside: " + std::strerror(errno)).c_str());
-    return;
+    return Error{why.text + "; it can't be set aside: " + systemError().text}.at(path());
   }
   if (::renameat(folder_.get(), (name_ + kBeside[0]).c_str(), folder_.get(), kLogAside) != 0) {
     ::unlinkat(folder_.get(), kLogAside, 0);
   }
   for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
-  place_.log.log(platform::LogLevel::error, "%s",
-                 located(why + "; it is set aside as " + kAside).c_str());
   place_.foundDamaged();
+  return Error{why.text + "; it is set aside as " + kAside}.at(path());
 }
 
-std::string CounterDatabase::located(const std::string& text) const {
-  return folderPath_ + "/" + kName + ": " + text;
-}
+std::string CounterDatabase::path() const { return folderPath_ + "/" + kName; }
 
 }  // namespace host

@@ -13,15 +13,12 @@
 #include <optional>
 #include <string>
 
+#include "base/Result.h"
+#include "host/counters/SQLite.h"
 #include "host/files/DeviceRoot.h"
 #include "platform/SystemLog.h"
 
 namespace host {
-
-namespace sqlite {
-class Connection;
-struct Failure;
-}  // namespace sqlite
 
 // What the connections of one store share.
 struct CounterPlace {
@@ -41,20 +38,20 @@ class CounterDatabase {
   CounterDatabase(const CounterPlace& place, DeviceRoot::Links links);
   ~CounterDatabase();
 
-  // Runs the work on a connection for reading. True when it could be done; with no database there
-  // is nothing to be done, and the work isn't run. A failure is logged; no home folder is one.
-  using Work = std::function<void(sqlite::Connection&)>;
-  bool read(const Work& work);
+  // Runs the work on a connection for reading. With no database there is nothing to be done, and
+  // the work isn't run; but without a home folder that is a failure. Damage is said by the error.
+  using Work = std::function<base::Result<void>(sqlite::Connection&)>;
+  base::Result<void> read(const Work& work);
 
   // Runs the work, which writes, with the lock held; once more, on a new database, when the first
-  // turns out to be damaged. Returns the empty text, or what went wrong and where. The work must
-  // neither use this object nor open another connection to the database.
+  // turns out to be damaged, which is logged. The work must neither use this object nor open
+  // another connection to the database.
   enum class Missing { create, skip };
-  std::string write(Missing missing, const Work& work);
+  base::Result<void> write(Missing missing, const Work& work);
 
   // Brings everything into the database file and closes it; nothing stands beside it then, unless
-  // another connection is open. Returns as `write` does.
-  std::string settle();
+  // another connection is open.
+  base::Result<void> settle();
 
  private:
   struct Identity {
@@ -65,14 +62,15 @@ class CounterDatabase {
   };
   enum class Use { read, write, create };
 
-  bool openFolder(DeviceRoot::Missing missing, std::string& error);
-  std::string follow(const std::string& folder);
-  std::optional<Identity> identity() const;
-  std::string create();
-  sqlite::Failure connect(Use use);
-  void verify(Use use);
-  void setAside(const std::string& why);
-  std::string located(const std::string& text) const;
+  base::Result<bool> openFolder(DeviceRoot::Missing missing);
+  base::Result<void> follow(const std::string& folder);
+  base::Result<Identity> identity() const;
+  base::Result<void> create();
+  base::Result<void> connect(Use use);
+  base::Result<void> openAs(Use use, const std::string& path, sqlite::Connection::Access access);
+  static base::Result<bool> verify(sqlite::Connection& connection, Use use);
+  std::optional<base::Error> setAside(const base::Error& why);
+  std::string path() const;
 
   const CounterPlace& place_;
   const DeviceRoot::Links links_;

@@ -36,21 +36,32 @@ class Rows {
     return valid_ && (day_ != day ? day_ < day : key_ < key);
   }
 
+  // How the reading went so far; after a failure there is no row.
+  const base::Result<void>& outcome() const { return outcome_; }
+
   void next() {
-    while ((valid_ = statement_.step())) {
-      const sqlite::Column day = statement_.column(0), key = statement_.column(1);
-      if (!day.isInteger() || !key.isText() || !sound_(statement_)) continue;
-      // The bounds of the query have 32 bits, and so has the day.
-      day_ = static_cast<std::int32_t>(day.integer());
-      key_ = key.bytes();
-      if (base::writable(key_, room_).starts_with(keyPrefix_)) return;
-    }
+    valid_ = false;
+    outcome_ = statement_.forEach([this] {
+      valid_ = take();
+      return !valid_;
+    });
   }
 
  private:
+  // Whether the statement's row is one.
+  bool take() {
+    const sqlite::Column day = statement_.column(0), key = statement_.column(1);
+    if (!day.isInteger() || !key.isText() || !sound_(statement_)) return false;
+    // The bounds of the query have 32 bits, and so has the day.
+    day_ = static_cast<std::int32_t>(day.integer());
+    key_ = key.bytes();
+    return base::writable(key_, room_).starts_with(keyPrefix_);
+  }
+
   sqlite::Statement& statement_;
   std::string_view keyPrefix_;
   Sound sound_;
+  base::Result<void> outcome_;
   bool valid_ = false;
   std::int32_t day_ = 0;
   std::string_view key_;
@@ -65,8 +76,7 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
  public:
   StoredSamples(sqlite::Connection& connection, std::string_view keyPrefix, std::int32_t firstDay,
                 std::int32_t lastDay)
-      : connection_(connection),
-        last_(lastDay),
+      : last_(lastDay),
         packed_(connection,
                 "SELECT day, key, rowid FROM packed WHERE day BETWEEN ? AND ? "
                 "ORDER BY day, key, rowid",
@@ -113,7 +123,17 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
     return block(count);
   }
 
-  bool failed() const override { return static_cast<bool>(connection_.failure()); }
+  // How the reading went so far.
+  base::Result<void> outcome() const {
+    for (const Rows* rows : {&packedRows_, &stagedRows_, &lastDayRows_}) {
+      if (!rows->outcome()) return rows->outcome();
+    }
+    return unpacking_;
+  }
+  bool failed() const override {
+    return !(packedRows_.outcome() && stagedRows_.outcome() && lastDayRows_.outcome() &&
+             unpacking_);
+  }
 
   bool comesAgain() override {
     if (day_ == last_ || day_ + 1 != last_) return false;
@@ -142,10 +162,16 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
 
   // The next records of a packed row; 0 at their end, and after a failure.
   std::size_t unpack(std::int64_t row) {
-    if (unpacked_ == 0) size_ = blobs_.open(row);
+    if (unpacked_ == 0) {
+      const auto size = blobs_.open(row);
+      if (!size) unpacking_ = size.error();
+      size_ = size ? *size : 0;
+    }
     const std::size_t count = std::min(kBlock, size_ / kPackedSampleSize - unpacked_);
     const std::size_t offset = unpacked_ * kPackedSampleSize;
-    if (count == 0 || !blobs_.read(offset, {records_.data(), count * kPackedSampleSize})) return 0;
+    if (count == 0) return 0;
+    unpacking_ = blobs_.read(offset, {records_.data(), count * kPackedSampleSize});
+    if (!unpacking_) return 0;
     const char* record = records_.data();
     for (std::size_t i = 0; i < count; ++i, record += kPackedSampleSize) {
       std::memcpy(&values_[i], record, sizeof(double));
@@ -155,11 +181,11 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
     return count;
   }
 
-  sqlite::Connection& connection_;
   const std::int32_t last_;
   sqlite::Statement packed_, staged_, lastDay_;
   Rows packedRows_, stagedRows_, lastDayRows_;
   sqlite::BlobColumn blobs_;
+  base::Result<void> unpacking_;
   bool valid_ = false;
   std::int32_t day_ = 0;
   std::string key_;
@@ -172,25 +198,32 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
 
 }  // namespace
 
+void CounterHistory::read(const CounterDatabase::Work& work) {
+  if (failed_) return;
+  const auto done = database_.read(work);
+  failed_ = !done;
+  if (failed_) log_.log(platform::LogLevel::error, "%s", done.error().text.c_str());
+}
+
 void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
                                          std::int32_t maxDaysSince1970,
                                          const ScalarRowHandler& rowHandler) {
-  if (failed_) return;
   std::string prefixRoom, room;
   const std::string_view prefix = base::writable(keyPrefix, prefixRoom);
-  failed_ = !database_.read([&](sqlite::Connection& connection) {
+  read([&](sqlite::Connection& connection) {
     sqlite::Statement rows(connection,
                            "SELECT day, key, value FROM scalars WHERE day BETWEEN ? AND ? "
                            "ORDER BY day, key",
                            minDaysSince1970, maxDaysSince1970);
     bool stop = false;
-    while (!stop && rows.step()) {
+    return rows.forEach([&] {
       const sqlite::Column day = rows.column(0), stored = rows.column(1), value = rows.column(2);
-      if (!day.isInteger() || !stored.isText() || !value.isInteger()) continue;
+      if (!day.isInteger() || !stored.isText() || !value.isInteger()) return true;
       const std::string_view key = base::writable(stored.bytes(), room);
-      if (!key.starts_with(prefix)) continue;
+      if (!key.starts_with(prefix)) return true;
       rowHandler(key, static_cast<std::int32_t>(day.integer()), value.integer(), stop);
-    }
+      return !stop;
+    });
   });
 }
 
@@ -198,15 +231,16 @@ void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
                                                std::int32_t minDaysSince1970,
                                                std::int32_t maxDaysSince1970,
                                                const DistributionRowHandler& rowHandler) {
-  if (failed_) return;
   std::string prefixRoom, room;
   const std::string_view prefix = base::writable(keyPrefix, prefixRoom);
-  failed_ = !database_.read([&](sqlite::Connection& connection) {
-    const sqlite::Transaction snapshot(connection, sqlite::Transaction::Kind::read);
+  read([&](sqlite::Connection& connection) -> base::Result<void> {
+    sqlite::Transaction snapshot(connection);
+    if (auto begun = snapshot.begin(sqlite::Transaction::Kind::read); !begun) return begun;
     StoredSamples samples(connection, prefix, minDaysSince1970, maxDaysSince1970);
     for (bool stop = false; !stop && samples.valid(); samples.next()) {
       rowHandler(base::writable(samples.key(), room), samples.day(), samples, stop);
     }
+    return samples.outcome();
   });
 }
 

@@ -14,7 +14,7 @@ class CounterHistory : public platform::PLHistory {
  public:
   // The place is borrowed.
   explicit CounterHistory(const CounterPlace& place)
-      : database_(place, DeviceRoot::Links::followed) {}
+      : log_(place.log), database_(place, DeviceRoot::Links::followed) {}
 
   // Each query sees the database as it was when the query began. After a failure, which the log
   // tells, this history is empty. A handler may query this history and write to the store.
@@ -31,6 +31,9 @@ class CounterHistory : public platform::PLHistory {
   bool failed() const override { return failed_; }
 
  private:
+  void read(const CounterDatabase::Work& work);
+
+  platform::SystemLog& log_;
   CounterDatabase database_;
   bool failed_ = false;
 };

@@ -2,8 +2,10 @@
 
 #include <array>
 #include <cmath>
+#include <functional>
 #include <vector>
 
+#include "base/ByteWriter.h"
 #include "base/CivilDate.h"
 #include "base/UTF8.h"
 #include "host/counters/SQLite.h"
@@ -13,79 +15,82 @@ namespace host {
 namespace {
 
 constexpr int kDaysKept = 60;
-constexpr std::size_t kMostSamplesInRow = 65536;
+constexpr std::size_t kMaxSamplesInRow = 65536;
 
-void write(sqlite::Connection& connection, const CounterChange& change) {
+base::Result<void> write(sqlite::Connection& connection, const CounterChange& change) {
   std::string room;
   const std::string_view key = base::writable(change.key, room);
   switch (change.kind) {
     case CounterChange::Kind::set:
-      sqlite::Statement(connection,
-                        "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
-                        "ON CONFLICT(day, key) DO UPDATE SET value = excluded.value",
-                        change.day, key, change.amount)
+      return sqlite::Statement(connection,
+                               "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
+                               "ON CONFLICT(day, key) DO UPDATE SET value = excluded.value",
+                               change.day, key, change.amount)
           .run();
-      return;
     case CounterChange::Kind::add:
-      sqlite::Statement(
-          connection,
-          "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
-          "ON CONFLICT(day, key) DO UPDATE SET value = CASE "
-          "WHEN ?3 > 0 AND value > 9223372036854775807 - ?3 THEN 9223372036854775807 "
-          "WHEN ?3 < 0 AND value < -9223372036854775807 - 1 - ?3 THEN -9223372036854775807 - 1 "
-          "ELSE value + ?3 END",
-          change.day, key, change.amount)
+      return sqlite::Statement(
+                 connection,
+                 "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
+                 "ON CONFLICT(day, key) DO UPDATE SET value = CASE "
+                 "WHEN ?3 > 0 AND value > 9223372036854775807 - ?3 THEN 9223372036854775807 "
+                 "WHEN ?3 < 0 AND value < -9223372036854775807 - 1 - ?3 "
+                 "THEN -9223372036854775807 - 1 "
+                 "ELSE value + ?3 END",
+                 change.day, key, change.amount)
           .run();
-      return;
     case CounterChange::Kind::push:
-      sqlite::Statement(connection,
-                        "INSERT INTO staged(day, key, seconds, value) VALUES(?1, ?2, ?3, ?4)",
-                        change.day, key, change.seconds, change.sample)
+      return sqlite::Statement(
+                 connection, "INSERT INTO staged(day, key, seconds, value) VALUES(?1, ?2, ?3, ?4)",
+                 change.day, key, change.seconds, change.sample)
           .run();
   }
-}
-
-template <typename T>
-void appendBytes(std::string& bytes, T value) {
-  bytes.append(reinterpret_cast<const char*>(&value), sizeof value);
+  return {};
 }
 
 // Moves the staged samples behind those that are packed already.
-void pack(sqlite::Connection& connection) {
+base::Result<void> pack(sqlite::Connection& connection) {
   std::int64_t day = 0;
   std::string key, samples;
-  const auto flush = [&] {
-    if (samples.empty()) return;
-    sqlite::Statement(connection, "INSERT INTO packed(day, key, samples) VALUES(?, ?, ?)", day, key,
-                      sqlite::Blob{samples})
-        .run();
+  const auto flush = [&]() -> base::Result<void> {
+    if (samples.empty()) return {};
+    auto written =
+        sqlite::Statement(connection, "INSERT INTO packed(day, key, samples) VALUES(?, ?, ?)", day,
+                          key, sqlite::Blob{samples})
+            .run();
     samples.clear();
+    return written;
   };
+  base::Result<void> flushed;
+  bool any = false;
   sqlite::Statement staged(connection,
                            "SELECT day, key, seconds, value FROM staged ORDER BY day, key, rowid");
-  bool any = false;
-  while (staged.step()) {
+  const auto read = staged.forEach([&] {
     any = true;
     const sqlite::Column itsDay = staged.column(0), itsKey = staged.column(1);
     const sqlite::Column second = staged.column(2), value = staged.column(3);
-    if (!itsDay.isInteger() || !itsKey.isText() || !second.isInteger() || !value.isReal()) continue;
+    if (!itsDay.isInteger() || !itsKey.isText() || !second.isInteger() || !value.isReal()) {
+      return true;
+    }
     if (day != itsDay.integer() || key != itsKey.bytes() ||
-        samples.size() == kMostSamplesInRow * kPackedSampleSize) {
-      flush();
+        samples.size() == kMaxSamplesInRow * kPackedSampleSize) {
+      flushed = flush();
       day = itsDay.integer();
       key = itsKey.bytes();
     }
-    appendBytes(samples, value.real());
-    appendBytes(samples, static_cast<std::int32_t>(second.integer()));
-  }
-  flush();
+    base::appendLittleEndian(samples, value.real());
+    base::appendLittleEndian(samples, static_cast<std::int32_t>(second.integer()));
+    return static_cast<bool>(flushed);
+  });
+  if (!read) return read;
+  if (flushed) flushed = flush();
   // A day without new samples writes nothing.
-  if (any) sqlite::Statement(connection, "DELETE FROM staged").run();
+  if (!flushed || !any) return flushed;
+  return sqlite::Statement(connection, "DELETE FROM staged").run();
 }
 
 // Samples are packed before this, so that none is staged. Each step back is one seek in each table.
 // Days after today, of a clock that was wrong or of an import, are neither counted nor dropped.
-void dropOldDays(sqlite::Connection& connection, std::int32_t today) {
+base::Result<void> dropOldDays(sqlite::Connection& connection, std::int32_t today) {
   std::int64_t oldest = std::int64_t{today} + 1;
   for (int kept = 0; kept < kDaysKept; ++kept) {
     sqlite::Statement before(connection,
@@ -93,11 +98,25 @@ void dropOldDays(sqlite::Connection& connection, std::int32_t today) {
                              "SELECT max(day) AS day FROM scalars WHERE day < ?1 UNION ALL "
                              "SELECT max(day) FROM packed WHERE day < ?1)",
                              oldest);
-    if (!before.step() || !before.column(0).isInteger()) return;
+    const auto found = before.step();
+    if (!found) return found.error();
+    if (!*found || !before.column(0).isInteger()) return {};
     oldest = before.column(0).integer();
   }
-  sqlite::Statement(connection, "DELETE FROM scalars WHERE day < ?", oldest).run();
-  sqlite::Statement(connection, "DELETE FROM packed WHERE day < ?", oldest).run();
+  return sqlite::Statement(connection, "DELETE FROM scalars WHERE day < ?", oldest)
+      .run()
+      .and_then([&] {
+        return sqlite::Statement(connection, "DELETE FROM packed WHERE day < ?", oldest).run();
+      });
+}
+
+// Runs the work in a transaction for writing.
+base::Result<void> inTransaction(sqlite::Connection& connection,
+                                 const std::function<base::Result<void>()>& work) {
+  sqlite::Transaction transaction(connection);
+  return transaction.begin(sqlite::Transaction::Kind::write).and_then(work).and_then([&] {
+    return transaction.commit();
+  });
 }
 
 }  // namespace
@@ -141,72 +160,79 @@ void CounterStore::record(CounterChange::Kind kind, std::span<const platform::Sc
   for (const auto& [key, value] : values) {
     changes.push_back({.kind = kind, .key = key, .day = today, .amount = value});
   }
-  const std::string error = apply(changes);
+  auto applied = apply(changes);
   const std::scoped_lock lock(mutex_);
-  if (!error.empty() && error != clientError_) {
-    place_.log.log(platform::LogLevel::error, "Could not record counters: %s", error.c_str());
+  if (!applied && (lastRecord_ || applied.error().text != lastRecord_.error().text)) {
+    place_.log.log(platform::LogLevel::error, "Could not record counters: %s",
+                   applied.error().text.c_str());
   }
-  clientError_ = error;
-  if (unrecorded_.empty()) unrecorded_ = error;
+  if (recorded_) recorded_ = applied;
+  lastRecord_ = std::move(applied);
 }
 
-std::string CounterStore::unrecorded() {
+base::Result<void> CounterStore::recorded() {
   const std::scoped_lock lock(mutex_);
-  return unrecorded_;
+  return recorded_;
 }
 
 void CounterStore::PLClientCheckpoint() {
   const std::int32_t today = PLDaysSince1970();
   const std::scoped_lock lock(mutex_);
-  const std::string error =
+  const auto packed =
       database_.write(CounterDatabase::Missing::skip, [today](sqlite::Connection& connection) {
-        {
-          sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
-          pack(connection);
-          dropOldDays(connection, today);
-          transaction.commit();
-        }
-        connection.checkpoint(sqlite::Connection::Checkpoint::truncate);
+        return inTransaction(connection,
+                             [&] {
+                               return pack(connection).and_then([&] {
+                                 return dropOldDays(connection, today);
+                               });
+                             })
+            .and_then(
+                [&] { return connection.checkpoint(sqlite::Connection::Checkpoint::truncate); });
       });
-  if (!error.empty()) place_.log.log(platform::LogLevel::error, "%s", error.c_str());
+  if (!packed) {
+    place_.log.log(platform::LogLevel::error, "%s", packed.error().text.c_str());
+  }
 }
 
-std::string CounterStore::settle() {
+base::Result<void> CounterStore::settle() {
   const std::scoped_lock lock(mutex_);
   return database_.settle();
 }
 
-std::string CounterStore::apply(std::span<const CounterChange> changes) {
+base::Result<void> CounterStore::apply(std::span<const CounterChange> changes) {
   for (const CounterChange& change : changes) {
-    if (std::isnan(change.sample)) return "not a number can't be recorded as a sample";
+    if (std::isnan(change.sample)) {
+      return base::Error{"not a number can't be recorded as a sample"};
+    }
   }
+  const auto writeAll = [changes](sqlite::Connection& connection) -> base::Result<void> {
+    for (const CounterChange& change : changes) {
+      if (auto written = write(connection, change); !written) return written;
+    }
+    return {};
+  };
   const std::scoped_lock lock(mutex_);
-  return database_.write(
-      CounterDatabase::Missing::create, [changes](sqlite::Connection& connection) {
-        if (changes.size() == 1) {
-          write(connection, changes.front());
-          return;
-        }
-        sqlite::Transaction transaction(connection, sqlite::Transaction::Kind::write);
-        for (const CounterChange& change : changes) write(connection, change);
-        transaction.commit();
-      });
+  return database_.write(CounterDatabase::Missing::create, [&](sqlite::Connection& connection) {
+    // One change is a transaction of its own.
+    if (changes.size() == 1) return writeAll(connection);
+    return inTransaction(connection, [&] { return writeAll(connection); });
+  });
 }
 
-std::string CounterStore::set(std::string_view key, std::int64_t value, std::int32_t day) {
+base::Result<void> CounterStore::set(std::string_view key, std::int64_t value, std::int32_t day) {
   const CounterChange change{
       .kind = CounterChange::Kind::set, .key = key, .day = day, .amount = value};
   return apply({&change, 1});
 }
 
-std::string CounterStore::add(std::string_view key, std::int64_t value, std::int32_t day) {
+base::Result<void> CounterStore::add(std::string_view key, std::int64_t value, std::int32_t day) {
   const CounterChange change{
       .kind = CounterChange::Kind::add, .key = key, .day = day, .amount = value};
   return apply({&change, 1});
 }
 
-std::string CounterStore::push(std::string_view key, double value, std::int32_t day,
-                               std::int32_t seconds) {
+base::Result<void> CounterStore::push(std::string_view key, double value, std::int32_t day,
+                                      std::int32_t seconds) {
   const CounterChange change{.kind = CounterChange::Kind::push,
                              .key = key,
                              .day = day,

@@ -40,9 +40,8 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   // brings the write-ahead log into the database file. Failures are logged.
   void PLClientCheckpoint() override;
 
-  // Makes the database one file, as whoever copies it wants it. Returns the empty text or what went
-  // wrong.
-  std::string settle();
+  // Makes the database one file, as whoever copies it wants it.
+  base::Result<void> settle();
 
   // Failures are logged, the same one once for as long as it lasts.
   void PLClientSetValueForScalarKey(std::string_view key, std::int64_t value) override;
@@ -51,19 +50,19 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   void PLClientSetValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
   void PLClientAddValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
 
-  // Why the first of these values that was lost couldn't be recorded; empty when none was.
-  std::string unrecorded();
+  // Whether all of these values could be recorded; the error is the first one's.
+  base::Result<void> recorded();
 
   // The history lives no longer than the store.
   std::unique_ptr<platform::PLHistory> initWithDefaultPath() override { return history(); }
   std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
 
-  // Records all the changes or none. Like the three for one change, it returns the empty text or
-  // what went wrong. Sums saturate.
-  std::string apply(std::span<const CounterChange> changes);
-  std::string set(std::string_view key, std::int64_t value, std::int32_t day);
-  std::string add(std::string_view key, std::int64_t value, std::int32_t day);
-  std::string push(std::string_view key, double value, std::int32_t day, std::int32_t seconds);
+  // Records all the changes or none. Sums saturate.
+  base::Result<void> apply(std::span<const CounterChange> changes);
+  base::Result<void> set(std::string_view key, std::int64_t value, std::int32_t day);
+  base::Result<void> add(std::string_view key, std::int64_t value, std::int32_t day);
+  base::Result<void> push(std::string_view key, double value, std::int32_t day,
+                          std::int32_t seconds);
 
  private:
   void record(CounterChange::Kind kind, std::span<const platform::ScalarValue> values);
@@ -72,7 +71,7 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   platform::Clock& clock_;
   std::mutex mutex_;  // over what follows
   CounterDatabase database_;
-  std::string clientError_, unrecorded_;
+  base::Result<void> lastRecord_, recorded_;
 };
 
 }  // namespace host

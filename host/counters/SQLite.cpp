@@ -1,6 +1,8 @@
 #include "host/counters/SQLite.h"
 
-#include <cstring>
+#include <tuple>
+
+#include "host/files/SystemError.h"
 
 namespace host::sqlite {
 
@@ -29,45 +31,50 @@ std::string immutableUri(const std::string& path) {
   return uri + "?immutable=1";
 }
 
-Failure::Kind kindOf(int code) {
+std::errc kindOf(int code) {
   switch (code & 0xff) {
     case SQLITE_CORRUPT:
     case SQLITE_NOTADB:
-      return Failure::Kind::damaged;
+      return kDamaged;
     case SQLITE_READONLY:
     case SQLITE_CANTOPEN:
-      return Failure::Kind::unwritable;
+      return kUnwritable;
     default:
-      return Failure::Kind::other;
+      return {};
   }
 }
 
 }  // namespace
 
-Connection::Connection(const std::string& path, Access access) {
+base::Result<std::unique_ptr<Connection>> Connection::open(const std::string& path, Access access) {
   constexpr int common = SQLITE_OPEN_NOFOLLOW | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
-  check(access == Access::immutable
-            ? sqlite3_open_v2(immutableUri(path).c_str(), &database_,
-                              common | SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr)
-            : sqlite3_open_v2(path.c_str(), &database_,
-                              common | (access == Access::readOnly ? SQLITE_OPEN_READONLY
-                                                                   : SQLITE_OPEN_READWRITE),
-                              nullptr));
-  if (failure_) return;
-  openedReadOnly_ = readOnly();
-  sqlite3_busy_timeout(database_, kBusyMilliseconds);
-  sqlite3_db_config(database_, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
-  sqlite3_db_config(database_, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
-  sqlite3_db_config(database_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
+  std::unique_ptr<Connection> made(new Connection);
+  const int code =
+      access == Access::immutable
+          ? sqlite3_open_v2(immutableUri(path).c_str(), &made->database_,
+                            common | SQLITE_OPEN_READONLY | SQLITE_OPEN_URI, nullptr)
+          : sqlite3_open_v2(path.c_str(), &made->database_,
+                            common | (access == Access::readOnly ? SQLITE_OPEN_READONLY
+                                                                 : SQLITE_OPEN_READWRITE),
+                            nullptr);
+  if (code != SQLITE_OK) return made->error(code);
+  made->openedReadOnly_ = made->readOnly();
+  sqlite3_busy_timeout(made->database_, kBusyMilliseconds);
+  sqlite3_db_config(made->database_, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
+  sqlite3_db_config(made->database_, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
+  sqlite3_db_config(made->database_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
   // Takes the place of the automatic checkpoint.
   sqlite3_wal_hook(
-      database_,
+      made->database_,
       [](void* connection, sqlite3*, const char*, int pages) {
         static_cast<Connection*>(connection)->pagesInLog_ = pages;
         return SQLITE_OK;
       },
-      this);
-  execute("PRAGMA cell_size_check = ON; PRAGMA mmap_size = 0; PRAGMA synchronous = NORMAL");
+      made.get());
+  const auto set = made->execute(
+      "PRAGMA cell_size_check = ON; PRAGMA mmap_size = 0; PRAGMA synchronous = NORMAL");
+  if (!set) return set.error();
+  return made;
 }
 
 Connection::~Connection() {
@@ -75,20 +82,14 @@ Connection::~Connection() {
   sqlite3_close(database_);
 }
 
-void Connection::fail(Failure::Kind kind, std::string text) {
-  if (!failure_) failure_ = {kind, std::move(text)};
-}
-
-void Connection::failWithCode(int code) {
-  const Failure::Kind kind = kindOf(code);
-  const bool explained = database_ != nullptr && sqlite3_errcode(database_) != SQLITE_OK;
-  std::string text = explained ? sqlite3_errmsg(database_) : sqlite3_errstr(code);
+base::Error Connection::error(int code) const {
+  const std::errc kind = kindOf(code);
   // SQLite reports a disk that fails to read as a damaged database.
-  if (const int error = kind == Failure::Kind::damaged ? errorOfFiles() : 0; error != 0) {
-    fail(Failure::Kind::other, std::strerror(error));
-  } else {
-    fail(kind, std::move(text));
+  if (const int number = kind == kDamaged ? errorOfFiles() : 0; number != 0) {
+    return {systemError(number).text};
   }
+  const bool explained = database_ != nullptr && sqlite3_errcode(database_) != SQLITE_OK;
+  return {explained ? sqlite3_errmsg(database_) : sqlite3_errstr(code), kind};
 }
 
 // The last error number of a system call on the database file or its log, or 0.
@@ -104,24 +105,22 @@ int Connection::errorOfFiles() const {
   return 0;
 }
 
-void Connection::execute(const char* sql) {
-  if (!failure_) check(sqlite3_exec(database_, sql, nullptr, nullptr, nullptr));
+base::Result<void> Connection::execute(const char* sql) {
+  return check(sqlite3_exec(database_, sql, nullptr, nullptr, nullptr));
 }
 
-void Connection::checkpoint(Checkpoint mode) {
-  if (failure_) return;
+base::Result<void> Connection::checkpoint(Checkpoint mode) {
   const bool truncate = mode == Checkpoint::truncate;
-  check(sqlite3_wal_checkpoint_v2(database_, "main",
-                                  truncate ? SQLITE_CHECKPOINT_TRUNCATE : SQLITE_CHECKPOINT_PASSIVE,
-                                  nullptr, nullptr));
+  return check(sqlite3_wal_checkpoint_v2(
+      database_, "main", truncate ? SQLITE_CHECKPOINT_TRUNCATE : SQLITE_CHECKPOINT_PASSIVE, nullptr,
+      nullptr));
 }
 
 void Connection::leaveNothingBeside() {
   sqlite3_db_config(database_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 0, nullptr);
 }
 
-Connection::Prepared* Connection::prepare(const char* sql) {
-  if (failure_) return nullptr;
+base::Result<Connection::Prepared*> Connection::prepare(const char* sql) {
   for (Prepared& prepared : prepared_) {
     if (prepared.sql == sql && !prepared.inUse) {
       prepared.inUse = true;
@@ -129,52 +128,51 @@ Connection::Prepared* Connection::prepare(const char* sql) {
     }
   }
   sqlite3_stmt* statement = nullptr;
-  check(sqlite3_prepare_v3(database_, sql, -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr));
-  if (statement == nullptr) return nullptr;
+  const int code =
+      sqlite3_prepare_v3(database_, sql, -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr);
+  if (code != SQLITE_OK) return error(code);
   return &prepared_.emplace_back(Prepared{sql, statement, true});
 }
 
 Statement::~Statement() {
-  if (prepared_ == nullptr) return;
+  if (!prepared_) return;
   sqlite3_reset(statement_);
-  prepared_->inUse = false;
+  (*prepared_)->inUse = false;
 }
 
-std::size_t BlobColumn::open(std::int64_t row) {
-  if (connection_.failure()) return 0;
+base::Result<std::size_t> BlobColumn::open(std::int64_t row) {
   const int code = blob_ != nullptr ? sqlite3_blob_reopen(blob_, row)
                                     : sqlite3_blob_open(connection_.database_, "main", table_,
                                                         column_, row, 0, &blob_);
-  return check(code) ? static_cast<std::size_t>(sqlite3_blob_bytes(blob_)) : 0;
+  if (auto opened = check(code); !opened) return opened.error();
+  return static_cast<std::size_t>(sqlite3_blob_bytes(blob_));
 }
 
-bool BlobColumn::read(std::size_t offset, std::span<char> into) {
-  return !connection_.failure() &&
-         check(sqlite3_blob_read(blob_, into.data(), static_cast<int>(into.size()),
+base::Result<void> BlobColumn::read(std::size_t offset, std::span<char> into) {
+  return check(sqlite3_blob_read(blob_, into.data(), static_cast<int>(into.size()),
                                  static_cast<int>(offset)));
 }
 
-bool BlobColumn::check(int code) {
-  if (code == SQLITE_ERROR) {
-    // The index names a row that isn't there, or holds something else.
-    connection_.fail(Failure::Kind::damaged, sqlite3_errmsg(connection_.database_));
-  } else {
-    connection_.check(code);
-  }
-  return code == SQLITE_OK;
-}
-
-Transaction::Transaction(Connection& connection, Kind kind)
-    : connection_(connection), open_(!connection.failure() && !connection.inTransaction()) {
-  if (open_) connection_.execute(kind == Kind::read ? "BEGIN" : "BEGIN IMMEDIATE");
+base::Result<void> BlobColumn::check(int code) const {
+  // The index names a row that isn't there, or holds something else.
+  if (code == SQLITE_ERROR) return base::Error{sqlite3_errmsg(connection_.database_), kDamaged};
+  return connection_.check(code);
 }
 
 Transaction::~Transaction() {
-  if (open_ && connection_.inTransaction()) connection_.execute("ROLLBACK");
+  if (open_ && connection_.inTransaction()) std::ignore = connection_.execute("ROLLBACK");
 }
 
-void Transaction::commit() {
-  if (open_) connection_.execute("COMMIT");
+base::Result<void> Transaction::begin(Kind kind) {
+  if (connection_.inTransaction()) return {};
+  auto begun = connection_.execute(kind == Kind::read ? "BEGIN" : "BEGIN IMMEDIATE");
+  open_ = static_cast<bool>(begun);
+  return begun;
+}
+
+base::Result<void> Transaction::commit() {
+  if (!open_) return {};
+  return connection_.execute("COMMIT");
 }
 
 }  // namespace host::sqlite

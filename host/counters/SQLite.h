@@ -1,9 +1,6 @@
 // SQLite, thinly: a connection, and the use of one of its prepared statements.
 //
-// A failure stays with its connection: the first is kept, statements made after it do nothing and
-// deliver no row. So a piece of work is written straight down, and whoever gave it the connection
-// asks once, at its end, how it went. A connection that failed is of no further use: closing it
-// takes back what was not committed.
+// A connection that failed is of no further use: closing it takes back what was not committed.
 #pragma once
 
 #include <sqlite3.h>
@@ -12,22 +9,21 @@
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <memory>
 #include <span>
 #include <string>
 #include <string_view>
+#include <system_error>
+#include <utility>
+
+#include "base/Result.h"
 
 namespace host::sqlite {
 
-struct Failure {
-  // damaged: the file is not a sound database. unwritable: it, or what must stand beside it, can't
-  // be written.
-  enum class Kind { none, damaged, unwritable, other };
-
-  Kind kind = Kind::none;
-  std::string text;
-
-  explicit operator bool() const { return kind != Kind::none; }
-};
+// What these errors are: the file is not a sound database; it, or what must stand beside it, can't
+// be written. Any other is none.
+inline constexpr std::errc kDamaged = std::errc::bad_message;
+inline constexpr std::errc kUnwritable = std::errc::read_only_file_system;
 
 class Connection {
  public:
@@ -38,16 +34,13 @@ class Connection {
 
   // Opens an existing file; a link anywhere in its path is refused. The connection distrusts the
   // file, and checkpoints only when told to. For one thread.
-  Connection(const std::string& path, Access access);
+  static base::Result<std::unique_ptr<Connection>> open(const std::string& path, Access access);
   ~Connection();
   Connection(const Connection&) = delete;
   Connection& operator=(const Connection&) = delete;
 
-  const Failure& failure() const { return failure_; }
-  void fail(Failure::Kind kind, std::string text);
-
   // Runs statements that deliver nothing.
-  void execute(const char* sql);
+  base::Result<void> execute(const char* sql);
 
   // True when the header of a file that was opened for writing forbids that. Known once something
   // has been read.
@@ -57,7 +50,7 @@ class Connection {
   // Pages in the write-ahead log after the last commit on this connection.
   int pagesInLog() const { return pagesInLog_; }
   // Brings the log into the file. `passive` does what it can without waiting for anybody.
-  void checkpoint(Checkpoint mode);
+  base::Result<void> checkpoint(Checkpoint mode);
 
   // Lets the end of this connection, if it is the last to the file, remove what stands beside it.
   void leaveNothingBeside();
@@ -72,11 +65,13 @@ class Connection {
     bool inUse;
   };
 
-  Prepared* prepare(const char* sql);
-  void check(int code) {
-    if (code != SQLITE_OK) failWithCode(code);
+  Connection() = default;
+  base::Result<Prepared*> prepare(const char* sql);
+  base::Result<void> check(int code) const {
+    if (code == SQLITE_OK) return {};
+    return error(code);
   }
-  void failWithCode(int code);
+  base::Error error(int code) const;
   int errorOfFiles() const;
   bool readOnly() const { return sqlite3_db_readonly(database_, "main") == 1; }
 
@@ -84,7 +79,6 @@ class Connection {
   bool openedReadOnly_ = false;
   std::deque<Prepared> prepared_;
   int pagesInLog_ = 0;
-  Failure failure_;
 };
 
 // An argument that is bound as data.
@@ -118,30 +112,42 @@ class Column {
 // statement for the next use under the address of its text, so that the text must be a constant.
 class Statement {
  public:
-  // Binds the arguments in order; texts are borrowed for the life of the object.
+  // Binds the arguments in order; texts are borrowed for the life of the object. What fails here is
+  // the first step's to say.
   template <typename... Arguments>
   Statement(Connection& connection, const char* sql, const Arguments&... arguments)
       : connection_(connection), prepared_(connection.prepare(sql)) {
-    if (prepared_ == nullptr) return;
-    statement_ = prepared_->statement;
+    if (!prepared_) return;
+    statement_ = (*prepared_)->statement;
     int index = 0;
-    (connection_.check(bind(++index, arguments)), ...);
+    [[maybe_unused]] const auto add = [&](int code) {
+      if (code_ == SQLITE_OK) code_ = code;
+    };
+    (add(bind(++index, arguments)), ...);
   }
   ~Statement();
   Statement(const Statement&) = delete;
   Statement& operator=(const Statement&) = delete;
 
-  // True while there is a row; not to be called again after false.
-  bool step() {
-    if (statement_ == nullptr) return false;
-    const int code = sqlite3_step(statement_);
-    if (code == SQLITE_ROW) return true;
-    if (code != SQLITE_DONE) connection_.failWithCode(code);
-    return false;
+  // Whether there is a row; not to be called again after one that says no, or fails.
+  base::Result<bool> step() {
+    if (!prepared_) return prepared_.error();
+    if (code_ == SQLITE_OK) code_ = sqlite3_step(statement_);
+    if (code_ != SQLITE_ROW && code_ != SQLITE_DONE) return connection_.error(code_);
+    return std::exchange(code_, SQLITE_OK) == SQLITE_ROW;
   }
-  void run() {
-    while (step()) {
+
+  // Hands each row to `row`, until it returns false.
+  template <typename Row>
+  base::Result<void> forEach(Row row) {
+    for (;;) {
+      const auto more = step();
+      if (!more) return more.error();
+      if (!*more || !row()) return {};
     }
+  }
+  base::Result<void> run() {
+    return forEach([] { return true; });
   }
 
   // A column of the current row, from 0; borrowed until the next step.
@@ -163,8 +169,9 @@ class Statement {
   }
 
   Connection& connection_;
-  Connection::Prepared* prepared_;
+  base::Result<Connection::Prepared*> prepared_;
   sqlite3_stmt* statement_ = nullptr;
+  int code_ = SQLITE_OK;  // of the binding
 };
 
 // Blobs of one column of a table, read where they lie and no further than is asked for.
@@ -176,15 +183,14 @@ class BlobColumn {
   BlobColumn(const BlobColumn&) = delete;
   BlobColumn& operator=(const BlobColumn&) = delete;
 
-  // Goes to a row that a query has found, and returns the size of its blob; 0 after a failure,
-  // which it also is when the row has no blob.
-  std::size_t open(std::int64_t row);
+  // Goes to a row that a query has found; the size of its blob. A row without one is a failure.
+  base::Result<std::size_t> open(std::int64_t row);
 
-  // Fills the memory from an offset on, within the size; false after a failure.
-  bool read(std::size_t offset, std::span<char> into);
+  // Fills the memory from an offset on, within the size.
+  base::Result<void> read(std::size_t offset, std::span<char> into);
 
  private:
-  bool check(int code);
+  base::Result<void> check(int code) const;
 
   Connection& connection_;
   const char *table_, *column_;
@@ -197,16 +203,17 @@ class Transaction {
  public:
   enum class Kind { read, write };
 
-  Transaction(Connection& connection, Kind kind);
+  explicit Transaction(Connection& connection) : connection_(connection) {}
   ~Transaction();
   Transaction(const Transaction&) = delete;
   Transaction& operator=(const Transaction&) = delete;
 
-  void commit();
+  base::Result<void> begin(Kind kind);
+  base::Result<void> commit();
 
  private:
   Connection& connection_;
-  bool open_;
+  bool open_ = false;
 };
 
 }  // namespace host::sqlite

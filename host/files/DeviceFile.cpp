@@ -1,9 +1,6 @@
 #include "host/files/DeviceFile.h"
 
-#include <cerrno>
-#include <cstring>
-
-#include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "plist/PropertyList.h"
 
 namespace host {
@@ -14,20 +11,14 @@ const plist::Value* DeviceFile::value() {
 }
 
 std::optional<plist::Value> DeviceFile::load() const {
-  const FileDescriptor file = root_.openForReading(path_);
-  if (!file) {
-    // EBADF: there is no root.
-    if (errno != ENOENT && errno != ENOTDIR && errno != EBADF) {
-      log_.log(platform::LogLevel::error, "%s: %s", root_.hostPath(path_).c_str(),
-               std::strerror(errno));
-    }
-    return std::nullopt;
-  }
   // One byte more, for the codec to see that the file is too long.
-  auto content = readRegularFile(file.get(), plist::kMaxSize + 1).and_then(plist::read);
-  if (!content)
-    log_.log(platform::LogLevel::error, "%s: %s", root_.hostPath(path_).c_str(),
-             content.error().text.c_str());
+  auto content = root_.readFile(path_, plist::kMaxSize + 1).and_then(plist::read);
+  if (!content) {
+    const base::Error& why = content.error();
+    if (!isMissing(why) && !why.is(std::errc::not_a_directory)) {
+      log_.log(platform::LogLevel::error, "%s", why.at(root_.hostPath(path_)).text.c_str());
+    }
+  }
   return std::move(content).orNone();
 }
 

@@ -17,16 +17,16 @@ std::optional<std::uint64_t> amount(const plist::Dictionary& figures, const char
 
 std::optional<platform::FileSystem::Statistics> fileSystemHolding(const DeviceRoot& root,
                                                                   std::string_view path) {
-  const FileDescriptor file = root.openForStatus(path);
+  const auto file = root.openForStatus(path);
   struct statvfs status;
-  if (!file || ::fstatvfs(file.get(), &status) != 0) return std::nullopt;
+  if (!file || ::fstatvfs(file->get(), &status) != 0) return std::nullopt;
   return platform::FileSystem::Statistics{status.f_frsize, status.f_blocks, status.f_bavail};
 }
 
 std::optional<std::uint64_t> DeviceFileSystem::fileStatus(std::string_view path) {
-  const FileDescriptor file = root_.openForStatus(path);
+  const auto file = root_.openForStatus(path);
   struct stat status;
-  if (!file || ::fstat(file.get(), &status) != 0) return std::nullopt;
+  if (!file || ::fstat(file->get(), &status) != 0) return std::nullopt;
   return static_cast<std::uint64_t>(status.st_size);
 }
 

@@ -3,8 +3,8 @@
 // Every path of the device is resolved below it, ".." and links included, so that nothing outside
 // is read or written: by the kernel where it offers that (openat2), else part by part. Links within
 // the root are followed to what is read, and refused on the way to what is written. Paths are
-// device paths, with or without a leading slash. Nothing here logs: failures come back as error
-// numbers, for the service that knows what they mean to its user.
+// device paths, with or without a leading slash. Nothing here logs: failures come back, without the
+// path, for the service that knows what they mean to its user.
 #pragma once
 
 #include <string>
@@ -23,9 +23,8 @@ class DeviceRoot {
 
   const std::string& path() const { return path_; }
 
-  // Why nothing can be had from this root: its path, which is `what`, and the reason. Empty when it
-  // is a folder.
-  std::string problem(const char* what = "the device root") const;
+  // Whether the root is a folder; the error is of its path, which is `what`.
+  base::Result<void> isThere(const char* what = "the device root") const;
 
   // Whether this is a recorded device: a root with a folder device/, which alone answers for all
   // that is not a file of the device. Any other root is this machine. Looked up at each call.
@@ -38,31 +37,29 @@ class DeviceRoot {
   std::string hostPath(std::string_view folder, std::string_view name) const;
 
   // Opens a file for reading; links are followed, within the root. The file may be of any kind, and
-  // opening never blocks. On failure the descriptor is empty and errno says why.
-  FileDescriptor openForReading(std::string_view path) const;
+  // opening never blocks.
+  base::Result<FileDescriptor> openForReading(std::string_view path) const;
 
   // Opens a file of any kind for its status only: no right to read it is needed. Otherwise as
   // openForReading.
-  FileDescriptor openForStatus(std::string_view path) const;
+  base::Result<FileDescriptor> openForStatus(std::string_view path) const;
 
-  // The bytes of a regular file, at most `maximum` of them. The error is an error number's text.
+  // The bytes of a regular file, at most `maximum` of them.
   base::Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
 
   // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700,
   // but not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay
-  // within the root, as a system's own links from one of its folders to another do. On failure as
-  // openForReading.
+  // within the root, as a system's own links from one of its folders to another do.
   enum class Missing { fails, create };
   using Links = host::Links;
-  FileDescriptor openFolder(std::string_view path, Missing missing,
-                            Links links = Links::refused) const;
+  base::Result<FileDescriptor> openFolder(std::string_view path, Missing missing,
+                                          Links links = Links::refused) const;
 
  private:
-  FileDescriptor open(const std::string& path, int flags, Links links) const;
+  base::Result<FileDescriptor> open(const std::string& path, int flags, Links links) const;
 
   std::string path_;
-  FileDescriptor root_;
-  int error_;  // of the root's opening; 0
+  base::Result<FileDescriptor> root_;
 };
 
 }  // namespace host

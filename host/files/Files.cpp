@@ -7,23 +7,23 @@
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <cstdio>
-#include <cstring>
 #include <memory>
 #include <tuple>
+
+#include "host/files/SystemError.h"
 
 namespace host {
 
 namespace {
 
-// 0 for a regular file or for no file at all.
-int refuseOtherKinds(int folder, const std::string& name) {
+// Succeeds for a regular file and for no file at all.
+base::Result<void> refuseOtherKinds(int folder, const std::string& name) {
   struct stat status;
-  if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) {
-    return errno == ENOENT ? 0 : errno;
-  }
-  return S_ISREG(status.st_mode) ? 0 : EINVAL;
+  const auto found = checked(::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW));
+  if (!found) return isMissing(found.error()) ? base::Result<void>() : found;
+  if (!S_ISREG(status.st_mode)) return notRegular();
+  return {};
 }
 
 // The size of the file without the unfinished line at its end.
@@ -43,23 +43,17 @@ off_t sizeOfWholeLines(int file, off_t size) {
 
 }  // namespace
 
-const char* errorText(int error) {
-  if (error == ELOOP) return "too many links, or one where none is followed";
-  if (error == EMLINK) return "a file with several names";
-  return error == EINVAL ? "not a regular file" : std::strerror(error);
-}
-
 base::Result<std::string> readRegularFile(int file, std::size_t maximum) {
   struct stat status;
-  if (::fstat(file, &status) != 0) return base::Error{std::strerror(errno)};
-  if (!S_ISREG(status.st_mode)) return base::Error{errorText(EINVAL)};
+  if (::fstat(file, &status) != 0) return systemError();
+  if (!S_ISREG(status.st_mode)) return notRegular();
   std::string bytes;
   bytes.resize(std::min(maximum, static_cast<std::size_t>(status.st_size)));
   std::size_t filled = 0;
   while (filled < bytes.size()) {
     const ssize_t got = ::read(file, bytes.data() + filled, bytes.size() - filled);
     if (got < 0 && errno == EINTR) continue;
-    if (got < 0) return base::Error{std::strerror(errno)};
+    if (got < 0) return systemError();
     if (got == 0) break;
     filled += static_cast<std::size_t>(got);
   }
@@ -67,25 +61,26 @@ base::Result<std::string> readRegularFile(int file, std::size_t maximum) {
   return bytes;
 }
 
-int namesInFolder(int folder, std::vector<std::string>& names) {
+base::Result<std::vector<std::string>> namesInFolder(int folder) {
   // A description of its own, because the place in the listing belongs to the description.
   const int again = ::openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-  if (again < 0) return errno;
+  if (again < 0) return systemError();
   const auto close = [](DIR* listing) { ::closedir(listing); };
   const std::unique_ptr<DIR, decltype(close)> listing(::fdopendir(again), close);
   if (listing == nullptr) {
     ::close(again);
-    return ENOMEM;
+    return systemError(ENOMEM);
   }
+  std::vector<std::string> names;
   errno = 0;
   while (const dirent* entry = ::readdir(listing.get())) {
     const std::string_view name = entry->d_name;
     if (name != "." && name != "..") names.emplace_back(name);
     errno = 0;
   }
-  const int error = errno;
-  std::sort(names.begin(), names.end());
-  return error;
+  if (errno != 0) return systemError();
+  std::ranges::sort(names);
+  return names;
 }
 
 bool isPlainFileName(std::string_view name, std::size_t longest) {
@@ -94,44 +89,46 @@ bool isPlainFileName(std::string_view name, std::size_t longest) {
 }
 
 std::string shownText(std::string_view text) {
-  constexpr std::size_t kLongest = 80;
-  std::string shown(text.substr(0, kLongest));
-  std::replace_if(
-      shown.begin(), shown.end(), [](unsigned char c) { return c < 0x20 || c == 0x7f; }, '?');
-  return text.size() > kLongest ? shown + "..." : shown;
+  constexpr std::size_t kMaxShown = 80;
+  std::string shown(text.substr(0, kMaxShown));
+  std::ranges::replace_if(
+      shown, [](unsigned char c) { return c < 0x20 || c == 0x7f; }, '?');
+  return text.size() > kMaxShown ? shown + "..." : shown;
 }
 
-int writeAll(int file, std::string_view bytes) {
+base::Result<void> writeAll(int file, std::string_view bytes) {
   while (!bytes.empty()) {
     const ssize_t written = ::write(file, bytes.data(), bytes.size());
     if (written < 0 && errno == EINTR) continue;
-    if (written < 0) return errno;
-    if (written == 0) return EIO;
+    if (written < 0) return systemError();
+    if (written == 0) return systemError(EIO);
     bytes.remove_prefix(static_cast<std::size_t>(written));
   }
-  return 0;
+  return {};
 }
 
-int replaceFile(int folder, const std::string& name, std::string_view bytes) {
-  if (const int error = refuseOtherKinds(folder, name)) return error;
+base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
+  if (auto free = refuseOtherKinds(folder, name); !free) return free;
   const std::string beside = "." + name + ".new";
-  if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return errno;
-  const FileDescriptor file(
+  if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return systemError();
+  const auto file = opened(
       ::openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-  if (!file) return errno;
-  int error = writeAll(file.get(), bytes);
-  if (error == 0 && ::fsync(file.get()) != 0) error = errno;
-  if (error == 0 && ::renameat(folder, beside.c_str(), folder, name.c_str()) != 0) error = errno;
-  if (error != 0) {
+  if (!file) return file.error();
+  const auto replaced =
+      writeAll(file->get(), bytes)
+          .and_then([&] { return checked(::fsync(file->get())); })
+          .and_then(
+              [&] { return checked(::renameat(folder, beside.c_str(), folder, name.c_str())); });
+  if (!replaced) {
     ::unlinkat(folder, beside.c_str(), 0);
-    return error;
+    return replaced;
   }
-  return ::fsync(folder) == 0 ? 0 : errno;
+  return checked(::fsync(folder));
 }
 
-int renameToFreeName(int fromFolder, const std::string& from, int toFolder, const std::string& to) {
-  return ::renameat2(fromFolder, from.c_str(), toFolder, to.c_str(), RENAME_NOREPLACE) == 0 ? 0
-                                                                                            : errno;
+base::Result<void> renameToFreeName(int fromFolder, const std::string& from, int toFolder,
+                                    const std::string& to) {
+  return checked(::renameat2(fromFolder, from.c_str(), toFolder, to.c_str(), RENAME_NOREPLACE));
 }
 
 bool isLink(int folder, const std::string& name) {
@@ -140,59 +137,56 @@ bool isLink(int folder, const std::string& name) {
          S_ISLNK(status.st_mode);
 }
 
-RolledOver rollOver(int folder, const std::string& name, int oldest) {
+base::Result<RolledOver> rollOver(int folder, const std::string& path, const std::string& name,
+                                  int oldest) {
+  const auto at = [&path](const std::string& file) { return path + "/" + shownText(file); };
   RolledOver rolled;
   std::vector<std::string> places;  // each moves to the next
   bool free = false;
   for (int number = 0; number <= oldest && !free; ++number) {
-    rolled.at = number == 0 ? name : name + "." + std::to_string(number);
+    const std::string file = number == 0 ? name : name + "." + std::to_string(number);
     struct stat status;
-    free = ::fstatat(folder, rolled.at.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0;
-    if (free && errno != ENOENT) {
-      rolled.error = errno;
-      return rolled;
-    }
+    free = ::fstatat(folder, file.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0;
+    if (free && errno != ENOENT) return systemError().at(at(file));
     if (free || S_ISREG(status.st_mode)) {
-      places.push_back(rolled.at);
+      places.push_back(file);
     } else if (number == 0) {
-      rolled.error = EINVAL;
-      return rolled;
+      return notRegular().at(at(file));
     } else {
-      rolled.inTheWay.push_back(rolled.at);
+      rolled.inTheWay.push_back(file);
     }
   }
-  if (places.size() == 1 && !free) {
-    rolled.error = EINVAL;
-    rolled.at = rolled.inTheWay.front();
-    return rolled;
-  }
+  if (places.size() == 1 && !free) return notRegular().at(at(rolled.inTheWay.front()));
   for (std::size_t place = places.size() - 1; place > 0; --place) {
-    rolled.at = places[place - 1];
-    if (::renameat(folder, rolled.at.c_str(), folder, places[place].c_str()) != 0) {
-      rolled.error = errno;
-      return rolled;
+    const std::string& from = places[place - 1];
+    if (::renameat(folder, from.c_str(), folder, places[place].c_str()) != 0) {
+      return systemError().at(at(from));
     }
   }
-  rolled.at = free ? "" : places.back();
+  if (!free) rolled.dropped = places.back();
   return rolled;
 }
 
-int appendLines(int folder, const std::string& name, std::string_view lines) {
-  const FileDescriptor file(
+base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines) {
+  const auto file = opened(
       ::openat(folder, name.c_str(),
                O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
-  if (!file) return errno == ELOOP || errno == EISDIR ? EINVAL : errno;
-  const FileLock lock(file.get());
+  if (!file) {
+    const bool other = file.error().is(std::errc::too_many_symbolic_link_levels) ||
+                       file.error().is(std::errc::is_a_directory);
+    return other ? notRegular() : file.error();
+  }
+  const FileLock lock(file->get());
   struct stat status;
-  if (::fstat(file.get(), &status) != 0) return errno;
-  if (!S_ISREG(status.st_mode)) return EINVAL;
-  if (status.st_nlink > 1) return EMLINK;
-  const off_t whole = sizeOfWholeLines(file.get(), status.st_size);
-  if (whole != status.st_size && ::ftruncate(file.get(), whole) != 0) return errno;
-  const int error = writeAll(file.get(), lines);
+  if (::fstat(file->get(), &status) != 0) return systemError();
+  if (!S_ISREG(status.st_mode)) return notRegular();
+  if (status.st_nlink > 1) return severalNames();
+  const off_t whole = sizeOfWholeLines(file->get(), status.st_size);
+  if (whole != status.st_size && ::ftruncate(file->get(), whole) != 0) return systemError();
+  auto appended = writeAll(file->get(), lines);
   // Where this fails too, the next call removes the unfinished line.
-  if (error != 0) std::ignore = ::ftruncate(file.get(), whole);
-  return error;
+  if (!appended) std::ignore = ::ftruncate(file->get(), whole);
+  return appended;
 }
 
 FileLock::FileLock(int file) : file_(file) {

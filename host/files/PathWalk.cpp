@@ -5,33 +5,26 @@
 #include <unistd.h>
 
 #include <array>
-#include <cerrno>
 #include <climits>
-#include <optional>
 #include <string>
 #include <vector>
+
+#include "host/files/SystemError.h"
 
 namespace host {
 
 namespace {
 
-constexpr int kMaximumLinks = 40;                                 // as the kernel's
-constexpr std::size_t kMaximumPath = std::size_t{16} * PATH_MAX;  // with what links add to it
+constexpr int kMaxLinks = 40;                                 // as the kernel's
+constexpr std::size_t kMaxPath = std::size_t{16} * PATH_MAX;  // with what links add to it
 
-FileDescriptor failure(int error) {
-  errno = error;
-  return {};
-}
-
-// Where an open link leads; none with errno set.
-std::optional<std::string> targetOf(int link) {
+// Where an open link leads.
+base::Result<std::string> targetOf(int link) {
   std::array<char, PATH_MAX> text;
   const ssize_t length = ::readlinkat(link, "", text.data(), text.size());
-  if (length < 0) return std::nullopt;
-  if (length == 0 || length == ssize_t{PATH_MAX}) {
-    errno = length == 0 ? ENOENT : ENAMETOOLONG;
-    return std::nullopt;
-  }
+  if (length < 0) return systemError();
+  if (length == 0) return systemError(ENOENT);
+  if (length == ssize_t{PATH_MAX}) return systemError(ENAMETOOLONG);
   return std::string(text.data(), static_cast<std::size_t>(length));
 }
 
@@ -63,38 +56,39 @@ std::string takePart(std::string& path) {
 
 }  // namespace
 
-FileDescriptor openByWalk(int folder, std::string_view path, int flags, Links links) {
+base::Result<FileDescriptor> openByWalk(int folder, std::string_view path, int flags, Links links) {
   Way way(folder);
   std::string rest(path);
   int followed = 0;
   for (;;) {
     const std::string part = takePart(rest);
-    if (part.empty()) return FileDescriptor(::openat(way.here(), ".", flags | O_CLOEXEC));
+    if (part.empty()) return opened(::openat(way.here(), ".", flags | O_CLOEXEC));
     if (part == ".") continue;
     if (part == "..") {
       way.leave();
       continue;
     }
-    FileDescriptor found(::openat(way.here(), part.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
-    if (!found) return {};
+    auto found = opened(::openat(way.here(), part.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC));
+    if (!found) return found;
     struct stat status;
-    if (::fstat(found.get(), &status) != 0) return {};
+    if (::fstat(found->get(), &status) != 0) return systemError();
     if (S_ISLNK(status.st_mode)) {
-      if (links == Links::refused || ++followed > kMaximumLinks) return failure(ELOOP);
-      const auto target = targetOf(found.get());
-      if (!target) return {};
-      if (target->size() + rest.size() > kMaximumPath) return failure(ENAMETOOLONG);
+      if (links == Links::refused || ++followed > kMaxLinks) return systemError(ELOOP);
+      const auto target = targetOf(found->get());
+      if (!target) return target.error();
+      if (target->size() + rest.size() > kMaxPath) return systemError(ENAMETOOLONG);
       if (target->starts_with('/')) way.restart();
       rest.insert(0, *target);
     } else if (!rest.empty() || S_ISDIR(status.st_mode)) {
       // A folder, or what is taken for one by what follows it.
-      if (!S_ISDIR(status.st_mode)) return failure(ENOTDIR);
-      way.enter(std::move(found));
+      if (!S_ISDIR(status.st_mode)) return systemError(ENOTDIR);
+      way.enter(*std::move(found));
     } else if ((flags & O_PATH) != 0) {
-      return (flags & O_DIRECTORY) != 0 ? failure(ENOTDIR) : std::move(found);
+      if ((flags & O_DIRECTORY) != 0) return systemError(ENOTDIR);
+      return found;
     } else {
       // Should a link have taken its place meanwhile, it is refused.
-      return FileDescriptor(::openat(way.here(), part.c_str(), flags | O_NOFOLLOW | O_CLOEXEC));
+      return opened(::openat(way.here(), part.c_str(), flags | O_NOFOLLOW | O_CLOEXEC));
     }
   }
 }

@@ -3,6 +3,7 @@
 
 #include <string_view>
 
+#include "base/Result.h"
 #include "host/files/FileDescriptor.h"
 
 namespace host {
@@ -12,7 +13,7 @@ enum class Links { refused, followed };
 // Opens a path below an open folder, one part after the other. ".." leads no higher than the folder
 // and a link's absolute target begins at it, so that the folder is the root of all that is found.
 // Links are refused (ELOOP), the last part included, or followed, 40 at most. `flags` are openat's,
-// for files that are there. On failure the descriptor is empty and errno says why.
-FileDescriptor openByWalk(int folder, std::string_view path, int flags, Links links);
+// for files that are there.
+base::Result<FileDescriptor> openByWalk(int folder, std::string_view path, int flags, Links links);
 
 }  // namespace host

@@ -3,10 +3,10 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include <cerrno>
 #include <system_error>
 
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "plist/JSON.h"
 #include "plist/PropertyList.h"
 
@@ -14,7 +14,6 @@ namespace host {
 
 namespace {
 
-constexpr char kConfiguration[] = "/device/analytics.plist";
 constexpr char kFolder[] = "/var/spool/morvend";
 constexpr char kName[] = "events.jsonl";
 
@@ -27,17 +26,7 @@ EventSink::~EventSink() { drain(); }
 
 const EventSink::Configuration& EventSink::configuration() {
   std::call_once(configured_, [this] {
-    const FileDescriptor file = root_.openForReading(kConfiguration);
-    if (!file && errno == ENOENT) return;
-    auto bytes =
-        file ? readRegularFile(file.get(), plist::kMaxSize + 1) : base::Error{errorText(errno)};
-    const auto value = std::move(bytes).and_then(plist::read);
-    if (!value) {
-      log_.log(platform::LogLevel::error, "Could not read %s: %s",
-               root_.hostPath(kConfiguration).c_str(), value.error().text.c_str());
-      return;
-    }
-    const auto* entries = value->as<plist::Dictionary>();
+    const plist::Dictionary* entries = file_.dictionary();
     if (entries == nullptr) return;
     if (const plist::Number* available = entries->number("Available")) {
       configuration_.available = available->boolValue();
@@ -63,7 +52,7 @@ bool EventSink::EventraSendEventLazy(std::string_view event, PayloadProducer pro
   if (!offersLazySend() || !EventraIsEventUsed(event)) return false;
   Event sent{std::string(event), clock_.now(), std::move(producer)};
   const std::scoped_lock lock(mutex_);
-  if (queue_.size() >= kMaximumQueued || !isServing()) return false;
+  if (queue_.size() >= kMaxQueued || !isServing()) return false;
   queue_.push_back(std::move(sent));
   changed_.notify_one();
   return true;
@@ -115,43 +104,40 @@ void EventSink::write(const std::vector<Event>& events) {
                    {"event", event.name}, {"time", event.time}, {"payload", event.producer()}});
     lines += '\n';
     if (lines.size() < kBatch && &event != &events.back()) continue;
-    const std::string error = append(lines);
-    if (!error.empty() && !failed_) {
-      log_.log(platform::LogLevel::error, "Could not write %s; events are dropped", error.c_str());
+    const auto appended = append(lines);
+    if (!appended && !failed_) {
+      log_.log(platform::LogLevel::error, "Could not write %s; events are dropped",
+               appended.error().text.c_str());
       failed_ = true;
     }
     lines.clear();
   }
 }
 
-// Both return the empty text, or the path of the file that is in the way, and why.
-std::string EventSink::append(const std::string& lines) {
-  const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
-  int error = errno;
-  if (folder) {
-    const FileLock lock(folder.get());  // another process may roll the file over, too
-    if (std::string why = makeRoom(folder.get(), lines.size()); !why.empty()) return why;
-    error = appendLines(folder.get(), kName, lines);
-  }
-  return error == 0 ? "" : root_.hostPath(kFolder, kName) + ": " + errorText(error);
+base::Result<void> EventSink::append(const std::string& lines) {
+  const std::string path = root_.hostPath(kFolder, kName);
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
+  if (!folder) return folder.error().at(path);
+  const FileLock lock(folder->get());  // another process may roll the file over, too
+  if (auto room = makeRoom(folder->get(), lines.size()); !room) return room;
+  return appendLines(folder->get(), kName, lines).at(path);
 }
 
-std::string EventSink::makeRoom(int folder, std::uint64_t bytes) {
+base::Result<void> EventSink::makeRoom(int folder, std::uint64_t bytes) {
   // What is not a file of ours, or can't be looked at, is the append's to refuse.
   struct stat status;
   if (::fstatat(folder, kName, &status, AT_SYMLINK_NOFOLLOW) != 0) return {};
   const auto size = static_cast<std::uint64_t>(status.st_size);
-  if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaximumFile) return {};
-  const RolledOver rolled = rollOver(folder, kName, kKept);
-  const std::string at = root_.hostPath(kFolder, rolled.at);
-  if (rolled.error != 0) return at + ": " + errorText(rolled.error);
-  if (!rolled.at.empty()) {
+  if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaxFile) return {};
+  const auto rolled = rollOver(folder, root_.hostPath(kFolder), kName, kKept);
+  if (!rolled) return rolled.error();
+  if (!rolled->dropped.empty()) {
     log_.log(platform::LogLevel::standard, "Dropped the events of %s: there are newer ones",
-             at.c_str());
+             root_.hostPath(kFolder, rolled->dropped).c_str());
   }
-  for (const std::string& name : rolled.inTheWay) {
+  for (const std::string& name : rolled->inTheWay) {
     log_.log(platform::LogLevel::error, "Passed over %s: %s", root_.hostPath(kFolder, name).c_str(),
-             errorText(EINVAL));
+             notRegular().text.c_str());
   }
   return {};
 }

@@ -1,5 +1,5 @@
 // The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl. A file that
-// would grow beyond kMaximumFile becomes events.jsonl.1 first, that .2, and so on; of more than
+// would grow beyond kMaxFile becomes events.jsonl.1 first, that .2, and so on; of more than
 // kKept the oldest is removed, with a line in the log. A number that is taken by anything but a
 // file is passed over, with a line too.
 //
@@ -18,7 +18,8 @@
 #include <unordered_set>
 #include <vector>
 
-#include "host/files/DeviceRoot.h"
+#include "base/Result.h"
+#include "host/files/DeviceFile.h"
 #include "platform/Clock.h"
 #include "platform/Eventra.h"
 #include "platform/SystemLog.h"
@@ -29,14 +30,14 @@ namespace host {
 class EventSink final : public platform::Eventra {
  public:
   // Events beyond this number of waiting ones aren't queued.
-  static constexpr std::size_t kMaximumQueued = 65536;
+  static constexpr std::size_t kMaxQueued = 65536;
 
-  static constexpr std::uint64_t kMaximumFile = std::uint64_t{16} << 20;
+  static constexpr std::uint64_t kMaxFile = std::uint64_t{16} << 20;
   static constexpr int kKept = 4;
 
   // All are borrowed; the clock is asked on the sender's thread, the log used on both.
   EventSink(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log)
-      : root_(root), clock_(clock), log_(log) {}
+      : root_(root), clock_(clock), log_(log), file_(root, log, "device/analytics.plist") {}
 
   // Drains.
   ~EventSink() override;
@@ -70,13 +71,14 @@ class EventSink final : public platform::Eventra {
   bool isServing();
   void serve();
   void write(const std::vector<Event>& events);
-  std::string append(const std::string& lines);
-  std::string makeRoom(int folder, std::uint64_t bytes);
+  base::Result<void> append(const std::string& lines);
+  base::Result<void> makeRoom(int folder, std::uint64_t bytes);
 
   const DeviceRoot& root_;
   platform::Clock& clock_;
   platform::SystemLog& log_;
 
+  DeviceFile file_;  // the configuration's
   std::once_flag configured_;
   Configuration configuration_;
 

@@ -1,8 +1,7 @@
 #include "host/outbox/ServitaLogFiles.h"
 
-#include <cerrno>
-
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace host {
 
@@ -15,24 +14,28 @@ constexpr int kOldest = 7;
 }  // namespace
 
 void ServitaLogFiles::rollServitaLogs() {
-  const auto report = [this](const std::string& name, const char* why) {
-    log_.log(platform::LogLevel::error, "Could not roll %s: %s",
-             root_.hostPath(kFolder, name).c_str(), why);
+  const std::string path = root_.hostPath(kFolder);
+  const auto report = [this](const base::Error& error) {
+    log_.log(platform::LogLevel::error, "Could not roll %s", error.text.c_str());
   };
-  const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
   if (!folder) {
-    if (errno != ENOENT) report("", errorText(errno));
+    if (!isMissing(folder.error())) report(folder.error().at(path));
     return;
   }
-  const FileLock lock(folder.get());
-  std::vector<std::string> names;
-  if (const int error = namesInFolder(folder.get(), names)) report("", errorText(error));
-  for (const std::string& log : names) {
+  const FileLock lock(folder->get());
+  const auto names = namesInFolder(folder->get());
+  if (!names) return report(names.error().at(path));
+  for (const std::string& log : *names) {
     if (log.size() <= kSuffix.size() || !log.ends_with(kSuffix)) continue;
-    const RolledOver rolled = rollOver(folder.get(), log, kOldest);
-    if (rolled.error != 0) report(rolled.at, errorText(rolled.error));
-    if (rolled.error != 0) continue;
-    for (const std::string& name : rolled.inTheWay) report(name, errorText(EINVAL));
+    const auto rolled = rollOver(folder->get(), path, log, kOldest);
+    if (!rolled) {
+      report(rolled.error());
+      continue;
+    }
+    for (const std::string& name : rolled->inTheWay) {
+      report(notRegular().at(root_.hostPath(kFolder, name)));
+    }
   }
 }
 

@@ -8,35 +8,37 @@
 #include <map>
 #include <tuple>
 
+#include "host/files/SystemError.h"
+
 namespace host {
 
 namespace {
 
 // A log counts for no more than what makes the folder full, so that no sum overflows.
 std::uint64_t counted(const struct stat& status) {
-  return std::min(static_cast<std::uint64_t>(status.st_size), SpoolFolder::kMaximumBytes + 1);
+  return std::min(static_cast<std::uint64_t>(status.st_size), SpoolFolder::kMaxBytes + 1);
 }
 
 }  // namespace
 
-SpoolFolder::SpoolFolder(const DeviceRoot& root, platform::SystemLog& log)
-    : root_(root),
-      log_(log),
-      folder_(root.openFolder(kPath, DeviceRoot::Missing::create)),
-      error_(folder_ ? 0 : errno),
-      lock_(folder_.get()) {
-  if (error_ == 0) error_ = lookAround();
+base::Result<std::unique_ptr<SpoolFolder>> SpoolFolder::open(const DeviceRoot& root,
+                                                             platform::SystemLog& log) {
+  auto folder = root.openFolder(kPath, DeviceRoot::Missing::create);
+  if (!folder) return folder.error();
+  std::unique_ptr<SpoolFolder> spool(new SpoolFolder(root, log, *std::move(folder)));
+  if (const auto known = spool->lookAround(); !known) return known.error();
+  return spool;
 }
 
-int SpoolFolder::lookAround() {
+base::Result<void> SpoolFolder::lookAround() {
   remove(kUnfinishedLog);
   remove(kUnfinishedOptions);
-  std::vector<std::string> names;
-  if (const int error = namesInFolder(folder_.get(), names)) return error;
+  auto names = namesInFolder(folder_.get());
+  if (!names) return names.error();
   const std::string_view suffix = kOptionsSuffix;
   std::vector<std::pair<std::string, std::uint64_t>> options;  // by the name of their log
   std::map<std::string, Log> logs;
-  for (std::string& name : names) {
+  for (std::string& name : *names) {
     struct stat status;
     const bool regular =
         ::fstatat(folder_.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 &&
@@ -61,14 +63,14 @@ int SpoolFolder::lookAround() {
     logs_.push_back(std::move(log));
   }
   // Logs of one moment differ by the number in their names.
-  std::sort(logs_.begin(), logs_.end(), [](const Log& a, const Log& b) {
+  std::ranges::sort(logs_, [](const Log& a, const Log& b) {
     const auto time = [](const Log& log) {
       return std::tie(log.modified.tv_sec, log.modified.tv_nsec);
     };
     return time(a) != time(b) ? time(a) > time(b)
                               : ::strverscmp(a.name.c_str(), b.name.c_str()) > 0;
   });
-  return 0;
+  return {};
 }
 
 bool SpoolFolder::isFree(const std::string& name) const {
@@ -80,7 +82,7 @@ void SpoolFolder::remove(const std::string& name) {
 }
 
 void SpoolFolder::makeRoom(std::uint64_t bytes) {
-  while (!logs_.empty() && (logs_.size() + 1 > kMaximumLogs || bytes_ + bytes > kMaximumBytes)) {
+  while (!logs_.empty() && (logs_.size() + 1 > kMaxLogs || bytes_ + bytes > kMaxBytes)) {
     const Log oldest = std::move(logs_.back());
     logs_.pop_back();
     bytes_ -= oldest.bytes;
@@ -88,7 +90,7 @@ void SpoolFolder::makeRoom(std::uint64_t bytes) {
     // The log goes first: its options alone are known for a remainder.
     if (::unlinkat(folder_.get(), oldest.name.c_str(), 0) != 0 && errno != ENOENT) {
       log_.log(platform::LogLevel::error, "Could not remove %s: %s", path.c_str(),
-               errorText(errno));
+               systemError().text.c_str());
       continue;
     }
     names_.erase(oldest.name);
@@ -98,22 +100,22 @@ void SpoolFolder::makeRoom(std::uint64_t bytes) {
   }
 }
 
-int SpoolFolder::place(const std::string& stem, const std::string& extension, std::uint64_t bytes,
-                       const Put& put) {
-  if (bytes > kMaximumBytes) return EFBIG;
+base::Result<void> SpoolFolder::place(const std::string& stem, const std::string& extension,
+                                      std::uint64_t bytes, const Put& put) {
+  if (bytes > kMaxBytes) return systemError(EFBIG);
   makeRoom(bytes);
   for (int number = 1;; ++number) {
     std::string name = stem;
     if (number > 1) name.append("-").append(std::to_string(number));
     name += extension;
     if (!isFree(name)) continue;
-    const int error = put(name);
-    if (error == EEXIST) continue;
-    if (error != 0) return error;
+    const auto placed = put(name);
+    if (!placed && placed.error().is(std::errc::file_exists)) continue;
+    if (!placed) return placed;
     names_.insert(name);
     logs_.insert(logs_.begin(), Log{name, {}, bytes});
     bytes_ += bytes;
-    return 0;
+    return {};
   }
 }
 

@@ -2,13 +2,14 @@
 // opened under its lock, cleared of what a killed run left, with its contents known.
 //
 // A log is a regular file; its options, if any, lie beside it under its name and kOptionsSuffix,
-// and come and go with it. Functions that write return 0 or an error number.
+// and come and go with it.
 #pragma once
 
 #include <sys/stat.h>
 
 #include <cstdint>
 #include <functional>
+#include <memory>
 #include <set>
 #include <string>
 #include <string_view>
@@ -26,29 +27,26 @@ class SpoolFolder {
   static constexpr char kOptionsSuffix[] = ".options.plist";
 
   // What the folder may hold. Options count for the bytes.
-  static constexpr std::size_t kMaximumLogs = 1000;
-  static constexpr std::uint64_t kMaximumBytes = std::uint64_t{64} << 20;
+  static constexpr std::size_t kMaxLogs = 1000;
+  static constexpr std::uint64_t kMaxBytes = std::uint64_t{64} << 20;
 
   // Files that aren't logs yet are kept under these names.
   static constexpr char kUnfinishedLog[] = ".log.new";
   static constexpr char kUnfinishedOptions[] = ".options.new";
 
-  // Opens the folder, made when it is missing, waiting for its lock. Both are borrowed. error() is
-  // to be asked before anything else.
-  SpoolFolder(const DeviceRoot& root, platform::SystemLog& log);
-
-  // 0, or why the folder can't be used.
-  int error() const { return error_; }
+  // Opens the folder, made when it is missing, waiting for its lock. Both are borrowed.
+  static base::Result<std::unique_ptr<SpoolFolder>> open(const DeviceRoot& root,
+                                                         platform::SystemLog& log);
 
   int descriptor() const { return folder_.get(); }
 
   // Gives a new log of this size a name: `stem`, with "-2", "-3", … where the log's or its options'
   // name is taken, and `extension`. The oldest logs make room first, each with a line in the log.
-  // `put` moves the files in, synchronises the folder and returns 0 or an error number; EEXIST asks
-  // for the next name.
-  using Put = std::function<int(const std::string& name)>;
-  int place(const std::string& stem, const std::string& extension, std::uint64_t bytes,
-            const Put& put);
+  // `put` moves the files in and synchronises the folder; std::errc::file_exists asks for the next
+  // name.
+  using Put = std::function<base::Result<void>(const std::string& name)>;
+  base::Result<void> place(const std::string& stem, const std::string& extension,
+                           std::uint64_t bytes, const Put& put);
 
   // Removes what stands under a name, if anything does.
   void remove(const std::string& name);
@@ -60,14 +58,15 @@ class SpoolFolder {
     std::uint64_t bytes;
   };
 
-  int lookAround();
+  SpoolFolder(const DeviceRoot& root, platform::SystemLog& log, FileDescriptor folder)
+      : root_(root), log_(log), folder_(std::move(folder)), lock_(folder_.get()) {}
+  base::Result<void> lookAround();
   void makeRoom(std::uint64_t bytes);
   bool isFree(const std::string& name) const;
 
   const DeviceRoot& root_;
   platform::SystemLog& log_;
   const FileDescriptor folder_;
-  int error_;
   const FileLock lock_;
   std::set<std::string> names_;
   std::vector<Log> logs_;  // newest first

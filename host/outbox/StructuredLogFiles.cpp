@@ -6,13 +6,13 @@
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <limits>
 #include <vector>
 
 #include "base/Text.h"
 #include "host/files/FileTime.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "host/outbox/SpoolFolder.h"
 #include "plist/JSON.h"
 
@@ -24,10 +24,10 @@ constexpr char kFolder[] = "/var/spool/morvend/structured";
 constexpr std::string_view kSuffix = ".jsonl";
 
 // What is larger goes to the spool in parts, of whole lines as far as there are any.
-constexpr off_t kLargestPart = off_t{16} << 20;
+constexpr off_t kMaxPart = off_t{16} << 20;
 
 // What one dump may move: the spool keeps room for the day's other logs.
-constexpr off_t kMostMoved = static_cast<off_t>(SpoolFolder::kMaximumBytes) - kLargestPart;
+constexpr off_t kMaxMoved = static_cast<off_t>(SpoolFolder::kMaxBytes) - kMaxPart;
 
 // The end of the last line that ends within [from, to), or `to` where none does.
 off_t lastLineEnd(int file, off_t from, off_t to) {
@@ -47,87 +47,92 @@ off_t lastLineEnd(int file, off_t from, off_t to) {
 // Where the parts of a file begin, from an offset on.
 std::vector<off_t> partsOf(int file, off_t from, off_t size) {
   std::vector<off_t> starts{from};
-  while (size - starts.back() > kLargestPart) {
-    starts.push_back(lastLineEnd(file, starts.back(), starts.back() + kLargestPart));
+  while (size - starts.back() > kMaxPart) {
+    starts.push_back(lastLineEnd(file, starts.back(), starts.back() + kMaxPart));
   }
   return starts;
 }
 
-// 0 or an error number.
-int copyPart(int from, off_t start, off_t end, int to) {
+base::Result<void> copyPart(int from, off_t start, off_t end, int to) {
   std::array<char, 65536> block;
   while (start < end) {
     const auto wanted = static_cast<std::size_t>(std::min<off_t>(end - start, block.size()));
     const ssize_t got = ::pread(from, block.data(), wanted, start);
-    if (got < 0) return errno;
-    if (got == 0) return EIO;
-    if (const int error = writeAll(to, {block.data(), static_cast<std::size_t>(got)})) return error;
+    if (got < 0) return systemError();
+    if (got == 0) return systemError(EIO);
+    auto written = writeAll(to, {block.data(), static_cast<std::size_t>(got)});
+    if (!written) return written;
     start += got;
   }
-  return ::fsync(to) == 0 ? 0 : errno;
+  return checked(::fsync(to));
 }
 
-// Copies a part of a file into the spool. 0 or an error number.
-int submitPart(int file, off_t start, off_t end, const std::string& stem, SpoolFolder& spool) {
-  const FileDescriptor part(::openat(spool.descriptor(), SpoolFolder::kUnfinishedLog,
-                                     O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-  int error = part ? copyPart(file, start, end, part.get()) : errno;
-  if (error == 0) {
-    error = spool.place(stem, std::string(kSuffix), static_cast<std::uint64_t>(end - start),
-                        [&](const std::string& to) {
-                          return renameToFreeName(spool.descriptor(), SpoolFolder::kUnfinishedLog,
-                                                  spool.descriptor(), to);
-                        });
-  }
-  if (error == 0 && ::fsync(spool.descriptor()) != 0) error = errno;
-  if (error != 0) spool.remove(SpoolFolder::kUnfinishedLog);
-  return error;
+// Copies a part of a file into the spool.
+base::Result<void> submitPart(int file, off_t start, off_t end, const std::string& stem,
+                              SpoolFolder& spool) {
+  const auto put = [&](const std::string& to) {
+    return renameToFreeName(spool.descriptor(), SpoolFolder::kUnfinishedLog, spool.descriptor(),
+                            to);
+  };
+  auto submitted = opened(::openat(spool.descriptor(), SpoolFolder::kUnfinishedLog,
+                                   O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600))
+                       .and_then([&](const FileDescriptor& part) {
+                         return copyPart(file, start, end, part.get());
+                       })
+                       .and_then([&] {
+                         return spool.place(stem, std::string(kSuffix),
+                                            static_cast<std::uint64_t>(end - start), put);
+                       })
+                       .and_then([&] { return checked(::fsync(spool.descriptor())); });
+  if (!submitted) spool.remove(SpoolFolder::kUnfinishedLog);
+  return submitted;
 }
 
 // Moves a file from an offset on into the spool, in parts that are numbered in their order: the
-// last one first, each in the spool before it leaves the file. 0 or an error number.
-int cutToSpool(int folder, const std::string& name, off_t from, const std::string& stem,
-               SpoolFolder& spool) {
-  const FileDescriptor file(
+// last one first, each in the spool before it leaves the file.
+base::Result<void> cutToSpool(int folder, const std::string& name, off_t from,
+                              const std::string& stem, SpoolFolder& spool) {
+  const auto file = opened(
       ::openat(folder, name.c_str(), O_RDWR | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  if (!file) return file.error();
   struct stat status;
-  if (!file || ::fstat(file.get(), &status) != 0) return errno;
+  if (::fstat(file->get(), &status) != 0) return systemError();
   off_t end = status.st_size;
-  const off_t reach = std::max<off_t>(from - kLargestPart, 0);
-  const auto starts = partsOf(file.get(), lastLineEnd(file.get(), reach, from), end);
+  const off_t reach = std::max<off_t>(from - kMaxPart, 0);
+  const auto starts = partsOf(file->get(), lastLineEnd(file->get(), reach, from), end);
   for (std::size_t part = starts.size(); part > 0; --part) {
     const std::string number = part > 1 ? "-" + std::to_string(part) : "";
     const off_t start = starts[part - 1];
-    if (const int error = submitPart(file.get(), start, end, stem + number, spool)) return error;
-    if (::ftruncate(file.get(), start) != 0) return errno;
+    auto submitted = submitPart(file->get(), start, end, stem + number, spool);
+    if (!submitted) return submitted;
+    if (::ftruncate(file->get(), start) != 0) return systemError();
     end = start;
   }
-  return ::unlinkat(folder, name.c_str(), 0) == 0 ? 0 : errno;
+  return checked(::unlinkat(folder, name.c_str(), 0));
 }
 
 // The bytes of the regular files among these names; more than there can be count as that.
 off_t sizeOfAll(int folder, const std::vector<std::string>& names) {
-  constexpr off_t kMost = std::numeric_limits<off_t>::max();
+  constexpr off_t kMax = std::numeric_limits<off_t>::max();
   off_t all = 0;
   for (const std::string& name : names) {
     struct stat status;
     if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) continue;
-    if (S_ISREG(status.st_mode)) all += std::min(status.st_size, kMost - all);
+    if (S_ISREG(status.st_mode)) all += std::min(status.st_size, kMax - all);
   }
   return all;
 }
 
 // Moves a file but for its first `dropped` bytes, of which it takes what it drops. `path` is the
-// file's for the log. 0 or an error number.
-int moveToSpool(int folder, const std::string& name, const std::string& path, off_t& dropped,
-                SpoolFolder& spool, platform::SystemLog& log) {
+// file's for the log.
+base::Result<void> moveToSpool(int folder, const std::string& name, const std::string& path,
+                               off_t& dropped, SpoolFolder& spool, platform::SystemLog& log) {
   struct stat status;
-  if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return errno;
-  if (!S_ISREG(status.st_mode)) return EINVAL;
-  if (spool.error() != 0) return spool.error();
+  if (::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return systemError();
+  if (!S_ISREG(status.st_mode)) return notRegular();
   const std::string stem = "structured-" + name.substr(0, name.size() - kSuffix.size());
-  if (dropped > 0 || status.st_size > kLargestPart) {
-    if (status.st_nlink > 1) return EMLINK;
+  if (dropped > 0 || status.st_size > kMaxPart) {
+    if (status.st_nlink > 1) return severalNames();
     const off_t from = std::min<off_t>(dropped, status.st_size);
     dropped -= from;
     log.log(platform::LogLevel::standard, "%s has %lld bytes: %s", path.c_str(),
@@ -136,15 +141,14 @@ int moveToSpool(int folder, const std::string& name, const std::string& path, of
                       : base::format("the first %lld have no room in the spool and are dropped",
                                      static_cast<long long>(from))
                             .c_str());
-    if (from == status.st_size) return ::unlinkat(folder, name.c_str(), 0) == 0 ? 0 : errno;
+    if (from == status.st_size) return checked(::unlinkat(folder, name.c_str(), 0));
     return cutToSpool(folder, name, from, stem, spool);
   }
   return spool.place(stem, std::string(kSuffix), static_cast<std::uint64_t>(status.st_size),
                      [&](const std::string& to) {
-                       const int error = renameToFreeName(folder, name, spool.descriptor(), to);
-                       if (error != 0) return error;
-                       const bool kept = ::fsync(spool.descriptor()) == 0 && ::fsync(folder) == 0;
-                       return kept ? 0 : errno;
+                       return renameToFreeName(folder, name, spool.descriptor(), to)
+                           .and_then([&] { return checked(::fsync(spool.descriptor())); })
+                           .and_then([&] { return checked(::fsync(folder)); });
                      });
 }
 
@@ -156,36 +160,41 @@ void StructuredLogFiles::logStructuredData(std::int32_t type, const plist::Dicti
   plist::appendJSON(line, plist::Dictionary{{"type", type}, {"time", now}, {"data", data}});
   line += '\n';
   const std::string name = fileDay(now.secondsSince1970).append(kSuffix);
-  const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
-  const int error = folder ? appendLines(folder.get(), name, line) : errno;
-  if (error == 0 || !said_.insert(error).second) return;
+  const auto appended = root_.openFolder(kFolder, DeviceRoot::Missing::create)
+                            .and_then([&](const FileDescriptor& folder) {
+                              return appendLines(folder.get(), name, line);
+                            });
+  if (appended || !said_.insert(appended.error().text).second) return;
   log_.log(platform::LogLevel::error, "Could not write %s: %s; structured logs are dropped",
-           root_.hostPath(kFolder, name).c_str(), errorText(error));
+           root_.hostPath(kFolder, name).c_str(), appended.error().text.c_str());
 }
 
 void StructuredLogFiles::dumpAllOldStructuredDataLogs() {
-  const FileDescriptor folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
-  if (!folder && errno == ENOENT) return;
-  std::vector<std::string> names;
-  if (const int error = folder ? namesInFolder(folder.get(), names) : errno) {
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  if (!folder && isMissing(folder.error())) return;
+  auto names = folder ? namesInFolder(folder->get()) : folder.error();
+  if (!names) {
     log_.log(platform::LogLevel::error, "Could not read %s: %s", root_.hostPath(kFolder).c_str(),
-             errorText(error));
+             names.error().text.c_str());
+    return;
   }
   const std::string today = fileDay(clock_.now().secondsSince1970);
-  std::erase_if(names, [&today](const std::string& name) {
+  std::erase_if(*names, [&today](const std::string& name) {
     if (!name.ends_with(kSuffix)) return true;
     const auto day = std::string_view(name).substr(0, name.size() - kSuffix.size());
     return !isFileDay(day) || day >= today;
   });
-  if (names.empty()) return;
-  SpoolFolder spool(root_, log_);
+  if (names->empty()) return;
+  const auto spool = SpoolFolder::open(root_, log_);
   // Of more than the spool has room for, the oldest goes.
-  off_t dropped = std::max<off_t>(sizeOfAll(folder.get(), names) - kMostMoved, 0);
-  for (const std::string& name : names) {
+  off_t dropped = std::max<off_t>(sizeOfAll(folder->get(), *names) - kMaxMoved, 0);
+  for (const std::string& name : *names) {
     const std::string path = root_.hostPath(kFolder, name);
-    if (const int error = moveToSpool(folder.get(), name, path, dropped, spool, log_)) {
+    const auto moved =
+        spool ? moveToSpool(folder->get(), name, path, dropped, **spool, log_) : spool.error();
+    if (!moved) {
       log_.log(platform::LogLevel::error, "Could not move %s to %s: %s", path.c_str(),
-               root_.hostPath(SpoolFolder::kPath).c_str(), errorText(error));
+               root_.hostPath(SpoolFolder::kPath).c_str(), moved.error().text.c_str());
     }
   }
 }

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <set>
+#include <string>
 
 #include "host/files/DeviceRoot.h"
 #include "host/outbox/RandomUUID.h"
@@ -32,7 +33,7 @@ class StructuredLogFiles : public platform::FaultwatchSupport {
   const DeviceRoot& root_;
   platform::Clock& clock_;
   platform::SystemLog& log_;
-  std::set<int> said_;  // error numbers of what couldn't be written
+  std::set<std::string> said_;  // why logs couldn't be written
 };
 
 }  // namespace host

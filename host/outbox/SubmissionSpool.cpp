@@ -2,10 +2,12 @@
 
 #include <fcntl.h>
 
-#include <cerrno>
+#include <optional>
+#include <tuple>
 
 #include "host/files/FileTime.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "host/outbox/SpoolFolder.h"
 #include "plist/PropertyList.h"
 
@@ -14,63 +16,80 @@ namespace host {
 namespace {
 
 // Room for "-2", "-3", …; the spool's own bounds keep the number far below.
-constexpr std::size_t kLongestStem = kLongestFileName -
-                                     std::string_view(SpoolFolder::kOptionsSuffix).size() -
-                                     std::string_view("-1000000000").size();
+constexpr std::size_t kMaxStem = kMaxFileName -
+                                 std::string_view(SpoolFolder::kOptionsSuffix).size() -
+                                 std::string_view("-1000000000").size();
 
-// A file being written; what fails first stays its error.
+// A file being written.
 class OpenLog final : public platform::LogHandle {
  public:
-  OpenLog(int folder, const char* name)
-      : file_(::openat(folder, name, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600)),
-        error_(file_ ? 0 : errno) {}
+  explicit OpenLog(const FileDescriptor& file) : file_(file) {}
 
   bool write(std::string_view bytes) override {
-    if (error_ == 0 && bytes.size() > SpoolFolder::kMaximumBytes - size_) error_ = EFBIG;
-    if (error_ == 0) error_ = writeAll(file_.get(), bytes);
-    if (error_ == 0) size_ += bytes.size();
-    return error_ == 0;
+    if (outcome_ && bytes.size() > SpoolFolder::kMaxBytes - size_) outcome_ = systemError(EFBIG);
+    if (outcome_) outcome_ = writeAll(file_.get(), bytes);
+    if (outcome_) size_ += bytes.size();
+    return static_cast<bool>(outcome_);
   }
 
-  // 0, or why the file isn't whole on disk.
-  int finish() {
-    if (error_ == 0 && ::fsync(file_.get()) != 0) error_ = errno;
-    return error_;
+  // Its size, once it is whole on disk; else what failed first.
+  base::Result<std::uint64_t> finish() {
+    if (!outcome_) return outcome_.error();
+    if (::fsync(file_.get()) != 0) return systemError();
+    return size_;
   }
-
-  std::uint64_t size() const { return size_; }
 
  private:
-  FileDescriptor file_;
-  int error_;
+  const FileDescriptor& file_;
+  base::Result<void> outcome_;
   std::uint64_t size_ = 0;
 };
 
-// Adds what was written to `size`.
-int writeUnfinished(const SpoolFolder& spool, const char* name,
-                    const platform::LogSubmission::Writer& writer, std::uint64_t& size) {
-  OpenLog file(spool.descriptor(), name);
-  writer(file);
-  size += file.size();
-  return file.finish();
+// The size of what was written.
+base::Result<std::uint64_t> writeUnfinished(const SpoolFolder& spool, const char* name,
+                                            const platform::LogSubmission::Writer& writer) {
+  const auto file = opened(::openat(spool.descriptor(), name,
+                                    O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  if (!file) return file.error();
+  OpenLog log(*file);
+  writer(log);
+  return log.finish();
 }
 
 // Gives the unfinished files their names, the log last; takes them back when that fails.
-int publish(int folder, const std::string& name, bool withOptions) {
+base::Result<void> publish(int folder, const std::string& name, bool withOptions) {
   const std::string optionsName = name + SpoolFolder::kOptionsSuffix;
   if (withOptions) {
-    const int error =
-        renameToFreeName(folder, SpoolFolder::kUnfinishedOptions, folder, optionsName);
-    if (error != 0) return error;
+    auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedOptions, folder, optionsName);
+    if (!named) return named;
   }
-  int error = renameToFreeName(folder, SpoolFolder::kUnfinishedLog, folder, name);
-  if (error == 0) {
-    if (::fsync(folder) == 0) return 0;
-    error = errno;
-    renameToFreeName(folder, name, folder, SpoolFolder::kUnfinishedLog);
+  auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedLog, folder, name);
+  if (named) {
+    named = checked(::fsync(folder));
+    if (named) return named;
+    std::ignore = renameToFreeName(folder, name, folder, SpoolFolder::kUnfinishedLog);
   }
-  if (withOptions) renameToFreeName(folder, optionsName, folder, SpoolFolder::kUnfinishedOptions);
-  return error;
+  if (withOptions) {
+    std::ignore = renameToFreeName(folder, optionsName, folder, SpoolFolder::kUnfinishedOptions);
+  }
+  return named;
+}
+
+// Leaves the unfinished files behind when it fails.
+base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
+                                   const std::optional<std::string>& options,
+                                   const platform::LogSubmission::Writer& writer) {
+  auto size = writeUnfinished(spool, SpoolFolder::kUnfinishedLog, writer);
+  if (!size) return size.error();
+  if (options) {
+    const auto more = writeUnfinished(spool, SpoolFolder::kUnfinishedOptions,
+                                      [&](platform::LogHandle& file) { file.write(*options); });
+    if (!more) return more.error();
+    *size += *more;
+  }
+  return spool.place(stem, "", *size, [&](const std::string& name) {
+    return publish(spool.descriptor(), name, options.has_value());
+  });
 }
 
 }  // namespace
@@ -85,47 +104,32 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
                                                const Writer& writer) {
   const std::string stem = std::string(logName) + "." + std::string(logType) + "." +
                            fileTime(clock_.now().secondsSince1970);
-  const auto fail = [&](const char* why) {
-    const std::string what = root_.hostPath(SpoolFolder::kPath, stem) + ": " + why;
-    log_.log(platform::LogLevel::error, "Could not submit %s", what.c_str());
-    if (unsubmitted_.empty()) unsubmitted_ = what;
-    return false;
-  };
-  if (logType.empty() || logName.empty() || logName.starts_with('.') ||
-      !isPlainFileName(stem, kLongestStem)) {
-    return fail("not a file name");
-  }
+  const bool named = !logType.empty() && !logName.empty() && !logName.starts_with('.') &&
+                     isPlainFileName(stem, kMaxStem);
+  auto submitted = named ? submit(stem, options, writer) : base::Error{"not a file name"};
+  submitted = std::move(submitted).at(root_.hostPath(SpoolFolder::kPath, stem));
+  if (submitted) return true;
+  log_.log(platform::LogLevel::error, "Could not submit %s", submitted.error().text.c_str());
+  if (submitted_) submitted_ = submitted;
+  return false;
+}
+
+base::Result<void> SubmissionSpool::submit(const std::string& stem,
+                                           const plist::Dictionary* options, const Writer& writer) {
   std::optional<std::string> optionsText;
   if (options != nullptr) {
     auto text = plist::writeXML(*options);
-    if (!text) return fail(text.error().text.c_str());
-    optionsText = std::move(*text);
+    if (!text) return text.error();
+    optionsText = *std::move(text);
   }
-  SpoolFolder spool(root_, log_);
-  int error = spool.error();
-  if (error == 0) error = submit(spool, stem, optionsText ? &*optionsText : nullptr, writer);
-  return error == 0 || fail(errorText(error));
-}
-
-int SubmissionSpool::submit(SpoolFolder& spool, const std::string& stem, const std::string* options,
-                            const Writer& writer) {
-  std::uint64_t size = 0;
-  int error = writeUnfinished(spool, SpoolFolder::kUnfinishedLog, writer, size);
-  if (error == 0 && options != nullptr) {
-    error = writeUnfinished(
-        spool, SpoolFolder::kUnfinishedOptions,
-        [options](platform::LogHandle& file) { file.write(*options); }, size);
+  const auto spool = SpoolFolder::open(root_, log_);
+  if (!spool) return spool.error();
+  auto published = writeAndPublish(**spool, stem, optionsText, writer);
+  if (!published) {
+    (*spool)->remove(SpoolFolder::kUnfinishedLog);
+    (*spool)->remove(SpoolFolder::kUnfinishedOptions);
   }
-  if (error == 0) {
-    error = spool.place(stem, "", size, [&spool, options](const std::string& name) {
-      return publish(spool.descriptor(), name, options != nullptr);
-    });
-  }
-  if (error != 0) {
-    spool.remove(SpoolFolder::kUnfinishedLog);
-    spool.remove(SpoolFolder::kUnfinishedOptions);
-  }
-  return error;
+  return published;
 }
 
 }  // namespace host

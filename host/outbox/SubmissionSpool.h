@@ -5,6 +5,7 @@
 
 #include <string>
 
+#include "base/Result.h"
 #include "host/files/DeviceRoot.h"
 #include "platform/Clock.h"
 #include "platform/LogSubmission.h"
@@ -13,8 +14,6 @@
 #include "plist/PropertyList.h"
 
 namespace host {
-
-class SpoolFolder;
 
 class SubmissionSpool final : public platform::LogSubmission {
  public:
@@ -31,18 +30,18 @@ class SubmissionSpool final : public platform::LogSubmission {
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                 const plist::Dictionary* options, const Writer& writer) override;
 
-  // The path of the first log that couldn't be submitted, and why; empty when there is none.
-  const std::string& unsubmitted() const { return unsubmitted_; }
+  // Whether every log could be submitted; the error is the first one's, of its path.
+  const base::Result<void>& submitted() const { return submitted_; }
 
  private:
-  static int submit(SpoolFolder& spool, const std::string& stem, const std::string* options,
-                    const Writer& writer);
+  base::Result<void> submit(const std::string& stem, const plist::Dictionary* options,
+                            const Writer& writer);
 
   const DeviceRoot& root_;
   platform::PreferenceStore& preferences_;
   platform::Clock& clock_;
   platform::SystemLog& log_;
-  std::string unsubmitted_;
+  base::Result<void> submitted_;
 };
 
 }  // namespace host

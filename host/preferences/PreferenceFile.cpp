@@ -2,12 +2,11 @@
 
 #include <fcntl.h>
 
-#include <cerrno>
 #include <cstdio>
 #include <limits>
 
-#include "base/Text.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "plist/PropertyList.h"
 
 namespace host {
@@ -57,8 +56,8 @@ void PreferenceFile::flush() {
   if (!set_.empty() || !removed_.empty()) write(nullptr);
 }
 
-std::string PreferenceFile::unwritten() const {
-  return writeError_.empty() ? "" : path() + ": " + writeError_;
+base::Result<void> PreferenceFile::written() const {
+  return base::Result<void>(written_).at(path());
 }
 
 void PreferenceFile::add(std::string_view key, std::int64_t delta) {
@@ -71,68 +70,71 @@ void PreferenceFile::add(std::string_view key, std::int64_t delta) {
 // Reading
 
 void PreferenceFile::load(bool evenIfUnchanged) {
-  const FileDescriptor file = root_.openForReading(folder_ + "/" + name_);
-  struct stat status;
-  if (!file || ::fstat(file.get(), &status) != 0) {
-    if (errno == ENXIO) return fail(State::broken, errorText(EINVAL));  // a socket
-    if (errno != ENOENT) return fail(State::unreadable, errorText(errno));
+  const auto file = root_.openForReading(folder_ + "/" + name_);
+  if (!file) {
+    const bool isSocket = file.error().is(std::errc::no_such_device_or_address);
+    if (isSocket) return fail(State::broken, notRegular());
+    if (!isMissing(file.error())) return fail(State::unreadable, file.error());
     state_ = State::absent;
     stored_ = {};
     return;
   }
+  struct stat status;
+  if (::fstat(file->get(), &status) != 0) return fail(State::unreadable, systemError());
   const bool known =
       (state_ == State::whole || state_ == State::broken) && sameFile(status, status_);
   if (known && !evenIfUnchanged) return;
-  if (!known) readError_.clear();
+  if (!known) readError_.reset();
   status_ = status;
-  if (!S_ISREG(status.st_mode)) return fail(State::broken, errorText(EINVAL));
+  if (!S_ISREG(status.st_mode)) return fail(State::broken, notRegular());
   if (static_cast<std::size_t>(status_.st_size) > plist::kMaxSize) {
-    return fail(State::broken, "larger than 16 MiB");
+    return fail(State::broken, {"larger than 16 MiB"});
   }
-  const auto bytes = readRegularFile(file.get(), plist::kMaxSize);
-  if (!bytes) return fail(State::unreadable, bytes.error().text);
+  const auto bytes = readRegularFile(file->get(), plist::kMaxSize);
+  if (!bytes) return fail(State::unreadable, bytes.error());
   auto value = plist::read(*bytes);
-  if (!value) return fail(State::broken, value.error().text);
+  if (!value) return fail(State::broken, value.error());
   auto* dictionary = value->as<plist::Dictionary>();
-  if (dictionary == nullptr) return fail(State::broken, "the top level is not a dictionary");
+  if (dictionary == nullptr) return fail(State::broken, {"the top level is not a dictionary"});
   state_ = State::whole;
   stored_ = std::move(*dictionary);
 }
 
-void PreferenceFile::fail(State state, const std::string& why) {
+void PreferenceFile::fail(State state, const base::Error& why) {
   state_ = state;
   stored_ = {};
-  if (why == readError_) return;
+  if (readError_ && why.text == readError_->text) return;
   readError_ = why;
   log_.log(platform::LogLevel::error, "Could not read %s: %s; it reads as empty%s", path().c_str(),
-           why.c_str(),
+           why.text.c_str(),
            state == State::broken ? " and is kept as .corrupt when it is replaced" : "");
 }
 
 // Writing
 
 void PreferenceFile::write(const Edit& edit) {
-  const std::string error = merge(edit);
-  if (error.empty()) {
+  auto merged = merge(edit);
+  if (merged) {
     set_ = {};
     removed_.clear();
-  } else if (error != writeError_) {
-    log_.log(platform::LogLevel::error, "Could not write %s: %s", path().c_str(), error.c_str());
+  } else if (written_ || merged.error().text != written_.error().text) {
+    log_.log(platform::LogLevel::error, "Could not write %s: %s", path().c_str(),
+             merged.error().text.c_str());
   }
-  writeError_ = error;
+  written_ = std::move(merged);
 }
 
-// Empty, or why the changes aren't in the file.
-std::string PreferenceFile::merge(const Edit& edit) {
+base::Result<void> PreferenceFile::merge(const Edit& edit) {
   const bool adds = edit != nullptr || !set_.empty();
-  const FileDescriptor folder =
+  const auto folder =
       root_.openFolder(folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
-  if (!folder) return errno == ENOENT && !adds ? "" : errorText(errno);
-  const FileLock lock(folder.get());
-  if (isLink(folder.get(), name_)) return errorText(EINVAL);
+  if (!folder && isMissing(folder.error()) && !adds) return {};
+  if (!folder) return folder.error();
+  const FileLock lock(folder->get());
+  if (isLink(folder->get(), name_)) return notRegular();
   // Another process's writing may leave all that is compared as it was.
   load(true);
-  if (state_ == State::unreadable) return readError_;
+  if (state_ == State::unreadable) return *readError_;
 
   plist::Dictionary merged = stored_;
   for (const std::string& key : removed_) merged.remove(key);
@@ -141,17 +143,16 @@ std::string PreferenceFile::merge(const Edit& edit) {
   // Compared as they are written: values of two types may be equal.
   const auto before = plist::writeXML(stored_);
   const auto after = plist::writeXML(std::move(merged));
-  if (!after) return after.error().text;
+  if (!after) return after.error();
   if (before && *before == *after) return {};
-  if (after->size() > plist::kMaxSize) return "it would be larger than 16 MiB";
+  if (after->size() > plist::kMaxSize) return base::Error{"it would be larger than 16 MiB"};
 
   const std::string kept = name_ + ".corrupt";
   if (state_ == State::broken &&
-      ::renameat(folder.get(), name_.c_str(), folder.get(), kept.c_str()) != 0) {
-    return base::format("it can't be kept as .corrupt: %s", errorText(errno));
+      ::renameat(folder->get(), name_.c_str(), folder->get(), kept.c_str()) != 0) {
+    return systemError().at("it can't be kept as .corrupt");
   }
-  const int error = replaceFile(folder.get(), name_, *after);
-  return error == 0 ? "" : errorText(error);
+  return replaceFile(folder->get(), name_, *after);
 }
 
 }  // namespace host

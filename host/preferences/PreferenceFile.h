@@ -18,6 +18,7 @@
 #include <string>
 #include <string_view>
 
+#include "base/Result.h"
 #include "host/files/DeviceRoot.h"
 #include "platform/SystemLog.h"
 #include "plist/PropertyList.h"
@@ -38,8 +39,8 @@ class PreferenceFile {
   // Brings the changes to the file. What couldn't be written stays a change.
   void flush();
 
-  // Why the last change or addition isn't in the file, the file's path first; empty when all are.
-  std::string unwritten() const;
+  // Whether the last change or addition is in the file; the error is of the file's path.
+  base::Result<void> written() const;
 
   // Flushes, and adds to an integer in the same write: no process's addition is lost. A value that
   // is missing or not a number counts as 0; the sum saturates. An addition that can't be written is
@@ -51,9 +52,9 @@ class PreferenceFile {
   using Edit = std::function<void(plist::Dictionary& values)>;
 
   void load(bool evenIfUnchanged);
-  void fail(State state, const std::string& why);
+  void fail(State state, const base::Error& why);
   void write(const Edit& edit);
-  std::string merge(const Edit& edit);
+  base::Result<void> merge(const Edit& edit);
   std::string path() const { return root_.hostPath(folder_, name_); }
 
   const DeviceRoot& root_;
@@ -69,8 +70,8 @@ class PreferenceFile {
   plist::Dictionary set_;
   std::set<std::string, std::less<>> removed_;
 
-  std::string readError_;
-  std::string writeError_;
+  std::optional<base::Error> readError_;
+  base::Result<void> written_;
 };
 
 }  // namespace host

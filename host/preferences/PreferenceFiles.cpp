@@ -12,27 +12,27 @@ constexpr std::string_view kSystemUser = "mobile";
 constexpr std::string_view kAnalyticsUser = "__quenset__";
 constexpr std::string_view kAnalyticsDomain = "com.norba.Varnhollow";
 
-constexpr std::size_t kLongestDomain = kLongestFileName - std::string_view(".plist.corrupt").size();
+constexpr std::size_t kMaxDomain = kMaxFileName - std::string_view(".plist.corrupt").size();
 
 }  // namespace
 
-PreferenceFiles::~PreferenceFiles() { flushAll(); }
+PreferenceFiles::~PreferenceFiles() { std::ignore = flushAll(); }
 
-std::string PreferenceFiles::flushAll() {
+base::Result<void> PreferenceFiles::flushAll() {
   const std::scoped_lock lock(mutex_);
-  std::string unwritten;
+  base::Result<void> written;
   for (auto& [name, file] : files_) {
     file.flush();
-    if (unwritten.empty()) unwritten = file.unwritten();
+    if (written) written = file.written();
   }
-  return unwritten;
+  return written;
 }
 
 // The file of a domain, or null when there can't be one. The mutex is held.
 PreferenceFile* PreferenceFiles::file(std::string_view user, std::string_view domain) {
   std::string name = std::string(user) + "/" + std::string(domain);
   if (const auto known = files_.find(name); known != files_.end()) return &known->second;
-  if (!isPlainFileName(user, kLongestFileName) || !isPlainFileName(domain, kLongestDomain)) {
+  if (!isPlainFileName(user, kMaxFileName) || !isPlainFileName(domain, kMaxDomain)) {
     log_.log(platform::LogLevel::error,
              "Refused preferences of user \"%s\", domain \"%s\": not a file name",
              shownText(user).c_str(), shownText(domain).c_str());

@@ -24,9 +24,9 @@ class PreferenceFiles final : public platform::PreferenceStore,
   // Flushes everything.
   ~PreferenceFiles() override;
 
-  // Writes what is not yet in the files; every domain is tried. Returns the empty text, or the path
-  // of a file that couldn't be written, and why.
-  std::string flushAll();
+  // Writes what is not yet in the files; every domain is tried. The error is that of the first
+  // file that couldn't be written, of its path.
+  base::Result<void> flushAll();
 
   // Adds to an integer of user "mobile", at once and atomically: see PreferenceFile::add.
   void addToInteger(std::string_view key, std::string_view domain, std::int64_t delta);

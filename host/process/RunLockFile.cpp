@@ -4,9 +4,7 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 
-#include <cerrno>
-
-#include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace host {
 
@@ -15,31 +13,31 @@ namespace {
 constexpr char kFolder[] = "/var/run";
 constexpr char kName[] = "morvend.lock";
 
-// 0 or an error number, with `file` the open and locked file.
-int openLocked(const DeviceRoot& root, FileDescriptor& file) {
-  const FileDescriptor folder =
+base::Result<FileDescriptor> openLocked(const DeviceRoot& root) {
+  const auto folder =
       root.openFolder(kFolder, DeviceRoot::Missing::create, DeviceRoot::Links::followed);
-  if (!folder) return errno;
-  FileDescriptor opened(::openat(folder.get(), kName,
-                                 O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC,
-                                 0600));
-  if (!opened) return errno;
+  if (!folder) return folder.error();
+  auto file =
+      opened(::openat(folder->get(), kName,
+                      O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
+  if (!file) return file;
   struct stat status;
-  if (::fstat(opened.get(), &status) != 0) return errno;
-  if (!S_ISREG(status.st_mode)) return EINVAL;
-  while (::flock(opened.get(), LOCK_EX) != 0) {
-    if (errno != EINTR) return errno;
+  if (::fstat(file->get(), &status) != 0) return systemError();
+  if (!S_ISREG(status.st_mode)) return notRegular();
+  while (::flock(file->get(), LOCK_EX) != 0) {
+    if (errno != EINTR) return systemError();
   }
-  file = std::move(opened);
-  return 0;
+  return file;
 }
 
 }  // namespace
 
 void RunLockFile::lock() {
-  if (const int error = openLocked(root_, file_)) {
+  if (auto file = openLocked(root_)) {
+    file_ = *std::move(file);
+  } else {
     log_.log(platform::LogLevel::error, "Could not lock %s: %s; running without the lock",
-             root_.hostPath(kFolder, kName).c_str(), errorText(error));
+             root_.hostPath(kFolder, kName).c_str(), file.error().text.c_str());
   }
 }
 

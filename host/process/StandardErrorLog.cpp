@@ -1,6 +1,7 @@
 #include "host/process/StandardErrorLog.h"
 
 #include <string>
+#include <tuple>
 
 #include "host/files/Files.h"
 
@@ -48,7 +49,7 @@ void StandardErrorLog::write(platform::LogLevel level, std::string_view message)
     if (end == message.npos) break;
     message.remove_prefix(end + 1);
   }
-  writeAll(file_, text);
+  std::ignore = writeAll(file_, text);
 }
 
 }  // namespace host

@@ -3,6 +3,7 @@
 #include <unistd.h>
 
 #include <string>
+#include <tuple>
 
 #include "host/files/Files.h"
 
@@ -11,9 +12,11 @@ namespace host {
 void StandardStreams::writeError(std::string_view text) {
   std::string line(text);
   if (!line.ends_with('\n')) line += '\n';
-  writeAll(STDERR_FILENO, line);
+  std::ignore = writeAll(STDERR_FILENO, line);
 }
 
-void StandardStreams::writeOutput(std::string_view text) { writeAll(STDOUT_FILENO, text); }
+void StandardStreams::writeOutput(std::string_view text) {
+  std::ignore = writeAll(STDOUT_FILENO, text);
+}
 
 }  // namespace host

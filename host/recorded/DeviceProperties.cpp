@@ -6,17 +6,13 @@
 #include <array>
 
 #include "host/files/DeviceFileSystem.h"
+#include "host/files/Files.h"
 
 namespace host::recorded {
 
 namespace {
 
 constexpr std::uint64_t kNoSuchContainer = 2;
-
-bool isPlainName(std::string_view name) {
-  return !name.empty() && name != "." && name != ".." &&
-         name.find_first_of(std::string_view("/\0", 2)) == name.npos;
-}
 
 // The same on every boot of this machine, and no other program's.
 std::optional<std::string> identifierOfOurs() {
@@ -86,7 +82,7 @@ std::optional<platform::DeviceProperties::DiskUsage> DeviceProperties::diskUsage
 
 std::optional<std::string> DeviceProperties::systemGroupContainerPath(std::string_view identifier,
                                                                       std::uint64_t& error) {
-  if (isPlainName(identifier)) {
+  if (isPlainFileName(identifier, kMaxFileName)) {
     std::string path = "/var/containers/systemgroup/" + std::string(identifier);
     if (root_.openFolder(path, DeviceRoot::Missing::fails, DeviceRoot::Links::followed)) {
       return path;

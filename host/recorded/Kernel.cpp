@@ -13,8 +13,9 @@
 #include <memory>
 #include <vector>
 
-#include "base/Text.h"
+#include "base/ByteWriter.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace host::recorded {
 
@@ -22,7 +23,7 @@ namespace {
 
 constexpr char kEventsFolder[] = "device/ecc-events";
 constexpr char kRejected[] = "rejected";
-constexpr std::size_t kEventSize = 72;  // at most
+constexpr std::size_t kMaxEventSize = 72;
 constexpr std::size_t kSwapUsageSize = 32;
 
 platform::Kernel::ReadResult failure(int error) { return {error, 0}; }
@@ -39,9 +40,7 @@ platform::Kernel::ReadResult deliverText(const std::string& text, std::span<std:
 }
 
 platform::Kernel::ReadResult deliverInteger(std::uint64_t value, std::span<std::byte> buffer) {
-  std::array<std::byte, 8> bytes;
-  for (std::size_t i = 0; i < bytes.size(); ++i)
-    bytes[i] = static_cast<std::byte>(value >> (8 * i));
+  const auto bytes = base::littleEndianBytes(value);
   return deliver(bytes.data(), std::min(bytes.size(), buffer.size()), buffer);
 }
 
@@ -76,16 +75,16 @@ platform::Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
   return deliver(record.data(), buffer.size() < record.size() ? 8 : record.size(), buffer);
 }
 
-// Moves a file of the folder to its rejected ones, under a name that is free. 0 or an error number.
-int reject(int folder, const std::string& name) {
-  if (::mkdirat(folder, kRejected, 0700) != 0 && errno != EEXIST) return errno;
-  const FileDescriptor rejected(
-      ::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
-  if (!rejected) return errno;
+// Moves a file of the folder to its rejected ones, under a name that is free.
+base::Result<void> reject(int folder, const std::string& name) {
+  if (::mkdirat(folder, kRejected, 0700) != 0 && errno != EEXIST) return systemError();
+  const auto rejected =
+      opened(::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+  if (!rejected) return rejected.error();
   for (int number = 1;; ++number) {
     const std::string to = number == 1 ? name : name + "-" + std::to_string(number);
-    const int error = renameToFreeName(folder, name, rejected.get(), to);
-    if (error != EEXIST) return error;
+    auto moved = renameToFreeName(folder, name, rejected->get(), to);
+    if (moved || !moved.error().is(std::errc::file_exists)) return moved;
   }
 }
 
@@ -110,7 +109,7 @@ const plist::Value* Kernel::deviceValue(std::string_view name) {
 
 std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byte> buffer) {
   // Events are taken away, so the folder is one that is written to.
-  const FileDescriptor folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
+  const auto folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
   // The events are asked for until there is none: what is in the way is said once.
   const auto say = [this](const std::string& name, const std::string& what) {
     if (!saidEvents_.insert(name).second) return;
@@ -118,34 +117,34 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
     log_.log(platform::LogLevel::error, "%s: %s", shownText(path).c_str(), what.c_str());
   };
   if (!folder) {
-    if (errno != ENOENT) say("", errorText(errno));
+    if (!isMissing(folder.error())) say("", folder.error().text);
     return std::nullopt;
   }
-  std::vector<std::string> names;
-  if (const int error = namesInFolder(folder.get(), names)) say("", errorText(error));
-  for (const std::string& name : names) {
+  const auto names = namesInFolder(folder->get());
+  if (!names) {
+    say("", names.error().text);
+    return std::nullopt;
+  }
+  for (const std::string& name : *names) {
     if (name == kRejected) continue;
-    const FileDescriptor file = root_.openForReading(kEventsFolder + ("/" + name));
-    const auto bytes =
-        file ? readRegularFile(file.get(), kEventSize + 1) : base::Error{errorText(errno)};
+    const auto bytes = root_.readFile(kEventsFolder + ("/" + name), kMaxEventSize + 1);
     if (!bytes) {
       say(name, bytes.error().text);
       continue;
     }
-    if (bytes->size() > kEventSize) {
-      const int error = reject(folder.get(), name);
-      say(name, error == 0
-                    ? "longer than an event; moved to rejected/"
-                    : base::format("longer than an event, and can't be moved to rejected/: %s",
-                                   errorText(error)));
+    if (bytes->size() > kMaxEventSize) {
+      const auto rejected = reject(folder->get(), name);
+      say(name, rejected ? "longer than an event; moved to rejected/"
+                         : "longer than an event, and can't be moved to rejected/: " +
+                               rejected.error().text);
       continue;
     }
     // It stays for a caller with room for it.
     if (bytes->size() > buffer.size()) return failure(ENOMEM);
     // Removed first: an event that stays would be delivered again and again.
-    if (::unlinkat(folder.get(), name.c_str(), 0) != 0) {
+    if (::unlinkat(folder->get(), name.c_str(), 0) != 0) {
       const int error = errno;
-      say(name, errorText(error));
+      say(name, systemError(error).text);
       return failure(error);
     }
     return deliver(bytes->data(), bytes->size(), buffer);

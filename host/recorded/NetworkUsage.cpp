@@ -9,13 +9,13 @@ namespace host::recorded {
 
 namespace {
 
-constexpr std::int64_t kLongestDelay = std::int64_t{1} << 40;  // milliseconds
+constexpr std::int64_t kMaxDelay = std::int64_t{1} << 40;  // milliseconds
 
 std::chrono::milliseconds replyDelay(const plist::Dictionary* answer) {
   const plist::Number* seconds = answer != nullptr ? answer->number("ReplyDelay") : nullptr;
   if (seconds == nullptr) return {};
   const auto milliseconds = base::saturatingCast<std::int64_t>(seconds->doubleValue() * 1000);
-  return std::chrono::milliseconds(std::clamp<std::int64_t>(milliseconds, 0, kLongestDelay));
+  return std::chrono::milliseconds(std::clamp<std::int64_t>(milliseconds, 0, kMaxDelay));
 }
 
 }  // namespace

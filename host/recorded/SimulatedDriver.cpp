@@ -3,12 +3,13 @@
 #include <sys/stat.h>
 
 #include <algorithm>
-#include <array>
-#include <cerrno>
 #include <cstring>
 
+#include "base/ByteReader.h"
+#include "base/ByteWriter.h"
 #include "base/Text.h"
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace host::recorded {
 
@@ -20,12 +21,11 @@ constexpr std::uint32_t kRecommendsDeletionMethod = 5;
 constexpr std::uint32_t kTunnelMethods[] = {8, 9};
 constexpr std::size_t kTunnelBlockSize = 24;
 
-std::uint32_t wordAt(std::span<const std::byte> bytes, std::size_t offset) {
-  std::uint32_t word = 0;
-  for (std::size_t i = 4; i > 0; --i) {
-    word = word << 8 | std::to_integer<std::uint32_t>(bytes[offset + i - 1]);
-  }
-  return word;
+base::Result<std::uint64_t> sizeOfRegularFile(const FileDescriptor& file) {
+  struct stat status;
+  if (::fstat(file.get(), &status) != 0) return systemError();
+  if (!S_ISREG(status.st_mode)) return notRegular();
+  return static_cast<std::uint64_t>(status.st_size);
 }
 
 CallResult failure(platform::DriverStatus status) { return {status, 0}; }
@@ -36,10 +36,8 @@ CallResult deliver(const void* bytes, std::size_t length, std::span<std::byte> o
   return {0, delivered};
 }
 
-CallResult deliverWord(std::uint64_t value, std::span<std::byte> output) {
-  std::array<std::byte, 4> bytes;
-  for (std::size_t i = 0; i < bytes.size(); ++i)
-    bytes[i] = static_cast<std::byte>(value >> (8 * i));
+CallResult deliverWord(std::uint32_t value, std::span<std::byte> output) {
+  const auto bytes = base::littleEndianBytes(value);
   return deliver(bytes.data(), bytes.size(), output);
 }
 
@@ -76,7 +74,8 @@ CallResult announce(const Answer& answer, DriverFiles& files, std::span<std::byt
     size = answer.data->size();
   }
   if (!size) return failure(kNotSupported);
-  return deliverWord(std::min<std::uint64_t>(*size, UINT32_MAX), output);
+  return deliverWord(static_cast<std::uint32_t>(std::min<std::uint64_t>(*size, UINT32_MAX)),
+                     output);
 }
 
 CallResult deliverData(const Answer& answer, DriverFiles& files, std::span<std::byte> output) {
@@ -91,10 +90,10 @@ CallResult deliverData(const Answer& answer, DriverFiles& files, std::span<std::
 
 }  // namespace
 
-void DriverFiles::say(const std::string& name, const char* problem) {
+void DriverFiles::say(const std::string& name, const std::string& problem) {
   if (!said_.insert(name).second) return;
   log_.log(platform::LogLevel::error, "%s/%s: %s", root_.hostPath("device").c_str(),
-           shownText(name).c_str(), problem);
+           shownText(name).c_str(), problem.c_str());
 }
 
 bool DriverFiles::isBelowDevice(const std::string& name) {
@@ -105,19 +104,16 @@ bool DriverFiles::isBelowDevice(const std::string& name) {
 
 std::optional<std::uint64_t> DriverFiles::size(const std::string& name) {
   if (!isBelowDevice(name)) return std::nullopt;
-  const FileDescriptor file = root_.openForStatus("device/" + name);
-  struct stat status;
-  const int error = !file || ::fstat(file.get(), &status) != 0 ? errno : 0;
-  if (error == 0 && S_ISREG(status.st_mode)) return static_cast<std::uint64_t>(status.st_size);
-  say(name, errorText(error != 0 ? error : EINVAL));
-  return std::nullopt;
+  const auto size = root_.openForStatus("device/" + name).and_then(sizeOfRegularFile);
+  if (!size) say(name, size.error().text);
+  return size ? std::optional(*size) : std::nullopt;
 }
 
 std::optional<std::size_t> DriverFiles::read(const std::string& name, std::span<std::byte> output) {
   if (!isBelowDevice(name)) return std::nullopt;
   const auto bytes = root_.readFile("device/" + name, output.size());
   if (bytes) return deliver(bytes->data(), bytes->size(), output).outputSize;
-  say(name, bytes.error().text.c_str());
+  say(name, bytes.error().text);
   return std::nullopt;
 }
 
@@ -135,7 +131,7 @@ CallResult SimulatedDriver::callStructMethod(std::uint32_t method, std::span<con
 
 CallResult SimulatedDriver::recommendsDeletion(std::span<std::byte> output) const {
   if (const plist::Number* number = answers_.number("RecommendsDeletion")) {
-    return deliverWord(number->uint64Value(), output);
+    return deliverWord(static_cast<std::uint32_t>(number->uint64Value()), output);
   }
   const plist::Data* data = answers_.data("RecommendsDeletion");
   return data != nullptr ? deliver(data->data(), data->size(), output) : failure(kNotSupported);
@@ -151,9 +147,11 @@ const plist::Value* SimulatedDriver::bufferFor(std::uint32_t opType, std::uint32
 CallResult SimulatedDriver::tunnel(std::span<const std::byte> block,
                                    std::span<std::byte> output) const {
   if (block.size() < kTunnelBlockSize) return failure(kNotSupported);
-  const std::uint32_t flags = wordAt(block, 4), word = wordAt(block, 8);
+  base::ByteReader reader(block);
+  const auto opType = *reader.read<std::uint32_t>(), flags = *reader.read<std::uint32_t>(),
+             word = *reader.read<std::uint32_t>();
   const bool asksForSize = (flags & 1) != 0;
-  const plist::Value* value = bufferFor(wordAt(block, 0), word != 0 ? word : flags >> 2 & 0xFF);
+  const plist::Value* value = bufferFor(opType, word != 0 ? word : flags >> 2 & 0xFF);
   if (value == nullptr) return failure(kNotSupported);
   const Answer answer(*value);
   return asksForSize ? announce(answer, files_, output) : deliverData(answer, files_, output);

@@ -31,7 +31,7 @@ class DriverFiles {
 
  private:
   bool isBelowDevice(const std::string& name);
-  void say(const std::string& name, const char* problem);
+  void say(const std::string& name, const std::string& problem);
 
   const DeviceRoot& root_;
   platform::SystemLog& log_;

@@ -10,7 +10,7 @@ namespace {
 
 constexpr std::string_view kVersion = "ProductVersion";
 constexpr std::string_view kBuild = "ProductBuildVersion";
-constexpr std::size_t kMaximumOsRelease = 65536;
+constexpr std::size_t kMaxOsRelease = 65536;
 
 // The value of a shell-like assignment: in quotes or bare, with backslash escapes.
 std::string unquoted(std::string_view text) {
@@ -42,7 +42,7 @@ std::string assigned(std::string_view lines, std::string_view name) {
 
 std::optional<plist::Dictionary> machineVersion(const std::string& osRelease) {
   const FileDescriptor file(::open(osRelease.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC));
-  const base::Result<std::string> lines = readRegularFile(file.get(), kMaximumOsRelease);
+  const auto lines = readRegularFile(file.get(), kMaxOsRelease);
   if (!lines) return std::nullopt;
   const std::string version = assigned(*lines, "VERSION_ID");
   std::string build = assigned(*lines, "BUILD_ID");

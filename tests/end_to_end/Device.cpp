@@ -1,5 +1,7 @@
 #include "end_to_end/Device.h"
 
+#include <gtest/gtest.h>
+
 #include <algorithm>
 #include <filesystem>
 
@@ -54,9 +56,9 @@ void Device::fill() {
   host::Host host({.root = root_->path()});
   for (std::int32_t day = today_ - 3; day < today_; ++day) {
     for (const char* key : {"exact", "family.a", "family.b", "secret"}) {
-      host.counters().set(key, 1000 * (day % 7) + 123, day);
+      EXPECT_TRUE(host.counters().set(key, 1000 * (day % 7) + 123, day));
     }
-    for (int i = 0; i < 40; ++i) host.counters().push("samples", i * 0.5, day, i);
+    for (int i = 0; i < 40; ++i) EXPECT_TRUE(host.counters().push("samples", i * 0.5, day, i));
     if (day == today_ - 3) host.counters().PLClientCheckpoint();
   }
   const Dictionary rounded{{"bucket_interval", 10}, {"sig_fig", 2}};

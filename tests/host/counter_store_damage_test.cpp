@@ -27,7 +27,7 @@ void fill(host::CounterStore& store) {
         }
       }
     }
-    ASSERT_EQ(store.apply(changes), "");
+    ASSERT_TRUE(store.apply(changes));
     if (early) store.PLClientCheckpoint();
   }
 }
@@ -99,15 +99,16 @@ TEST_P(SeededDamage, NeverCrashesTheStoreAndWhatIsReportedIsSetAside) {
     if (whileOpen) {
       folder.write(support::kDatabase, database);
       folder.write(kLog, log);
-      ASSERT_EQ(here.store.add("some.counter.7", 1, 40), "");
+      ASSERT_TRUE(here.store.add("some.counter.7", 1, 40));
     }
     folder.write(support::kDatabase, damagedDatabase);
     folder.write(kLog, damagedLog);
 
     bool newer = false;
-    const auto writes = [&](const std::string& error) {
-      newer = newer || error.find("newer version") != std::string::npos;
-      EXPECT_TRUE(whileOpen || newer || error.empty()) << error;
+    const auto writes = [&](const base::Result<void>& written) {
+      newer =
+          newer || (!written && written.error().text.find("newer version") != std::string::npos);
+      EXPECT_TRUE(whileOpen || newer || written) << written.error().text;
     };
     const int steps = 4;
     for (std::size_t step = mutator.below(steps), i = 0; i < steps; ++i, ++step) {
@@ -132,7 +133,7 @@ TEST_P(SeededDamage, NeverCrashesTheStoreAndWhatIsReportedIsSetAside) {
     if (here.damaged > 0) {
       ++setAside;
       EXPECT_LE(here.damaged, 2);
-      EXPECT_EQ(here.store.set("after", 5, 60), "");
+      EXPECT_TRUE(here.store.set("after", 5, 60));
       EXPECT_EQ(support::rows(*here.store.initWithDefaultPath(), "after"),
                 std::vector<std::string>{"60 after 5"});
     } else {
@@ -150,7 +151,7 @@ TEST(CounterStoreDamage, ASecondDamageReplacesTheFirstThatWasSetAside) {
   for (const char* garbage : {"first", "second"}) {
     folder.write(support::kDatabase, std::string(5000, 'x') + garbage);
     folder.write(kLog, garbage);
-    EXPECT_EQ(here.store.add("k", 1, 1), "");
+    EXPECT_TRUE(here.store.add("k", 1, 1));
     EXPECT_EQ(here.rows(), std::vector<std::string>{"1 k 1"});
     const std::string aside = folder.read(std::string(support::kDatabase) + ".corrupt");
     EXPECT_TRUE(aside.ends_with(garbage));
@@ -164,7 +165,7 @@ TEST(CounterStoreDamage, AHeaderThatForbidsWritingDoesNotDisableTheStoreForever)
     const support::TemporaryFolder folder;
     {
       StoreFixture original(folder.path());
-      original.store.set("k", 1, 1);
+      EXPECT_TRUE(original.store.set("k", 1, 1));
       if (!empty) original.store.PLClientCheckpoint();
     }
     std::string database = folder.read(support::kDatabase);
@@ -172,7 +173,7 @@ TEST(CounterStoreDamage, AHeaderThatForbidsWritingDoesNotDisableTheStoreForever)
     folder.write(support::kDatabase, database);
     folder.write(kLog, "");
     StoreFixture here(folder.path());
-    EXPECT_EQ(here.store.set("k", 2, 1), "") << empty;
+    EXPECT_TRUE(here.store.set("k", 2, 1)) << empty;
     EXPECT_EQ(here.damaged, 1) << empty;
   }
 }
@@ -182,7 +183,7 @@ TEST(CounterStoreDamage, DamageThatCannotBeSetAsideIsSaidAndNotCounted) {
   StoreFixture here(folder.path());
   folder.write(support::kDatabase, std::string(5000, 'x'));
   folder.write(std::string(support::kDatabase) + ".corrupt/in the way", "");
-  EXPECT_NE(here.store.set("k", 1, 1), "");
+  EXPECT_FALSE(here.store.set("k", 1, 1));
   EXPECT_EQ(here.rows(), std::vector<std::string>{});
   EXPECT_EQ(here.damaged, 0);
   EXPECT_GE(here.log.count("can't be set aside"), 1);

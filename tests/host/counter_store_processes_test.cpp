@@ -33,8 +33,8 @@ TEST(CounterStoreProcesses, NoWriteIsLostBetweenWritersAndACheckpointer) {
     children.push_back(inChild([&] {
       StoreFixture there(folder.path());
       for (int i = 0; i < rounds; ++i) {
-        if (!there.store.add("sum", 1, 1).empty()) return false;
-        if (!there.store.push("series", i, 1, writer).empty()) return false;
+        if (!there.store.add("sum", 1, 1)) return false;
+        if (!there.store.push("series", i, 1, writer)) return false;
       }
       return there.damaged == 0;
     }));
@@ -72,7 +72,7 @@ TEST(CounterStoreProcesses, OneOfSeveralSetsADamagedDatabaseAside) {
       children.push_back(inChild([&] {
         StoreFixture there(folder.path());
         there.rows();
-        const bool sound = there.store.add("sum", 1, 1).empty();
+        const auto sound = there.store.add("sum", 1, 1);
         if (there.damaged > 0) folder.write("found/" + std::to_string(::getpid()), "");
         return sound && there.damaged <= 1;
       }));
@@ -97,7 +97,7 @@ TEST(CounterStoreProcesses, AKilledWriterLosesNoAcknowledgedWrite) {
     const pid_t child = inChild([&] {
       StoreFixture there(folder.path());
       for (int i = 0;; ++i) {
-        if (!there.store.push("k", 1, 1, 0).empty()) return false;
+        if (!there.store.push("k", 1, 1, 0)) return false;
         if (::write(ends[1], "+", 1) != 1) return false;
         if (i % 5 == 4) there.store.PLClientCheckpoint();
       }

@@ -40,8 +40,8 @@ TEST_F(CounterStoreRows, SumsSaturateInsteadOfWrapping) {
       {1, 2, 3},           {kMost, 1, kMost},    {kMost - 1, 1, kMost}, {kLeast, -1, kLeast},
       {kMost, kLeast, -1}, {-1, kLeast, kLeast}, {kLeast, kMost, -1},   {5, -7, -2}};
   for (const auto& row : cases) {
-    EXPECT_EQ(here.store.set("k", row.start, 1), "");
-    EXPECT_EQ(here.store.add("k", row.added, 1), "");
+    EXPECT_TRUE(here.store.set("k", row.start, 1));
+    EXPECT_TRUE(here.store.add("k", row.added, 1));
     EXPECT_EQ(here.rows(), Lines{"1 k " + std::to_string(row.sum)});
   }
 }
@@ -68,9 +68,9 @@ TEST_F(CounterStoreRows, ClientsRecordForTodayAndAFailureIsSaidOnce) {
 
 TEST_F(CounterStoreRows, RowsComeByDayThenBytesOfTheKeyWithinTheBounds) {
   for (const std::string_view key : {"b", "\xC3\xA4", "B", "a", ""}) here.store.set(key, 1, -3);
-  here.store.set("ab", 2, -3);
-  here.store.set("a", 3, INT32_MAX);
-  here.store.set("a", 4, INT32_MIN);
+  EXPECT_TRUE(here.store.set("ab", 2, -3));
+  EXPECT_TRUE(here.store.set("a", 3, INT32_MAX));
+  EXPECT_TRUE(here.store.set("a", 4, INT32_MIN));
   EXPECT_EQ(here.rows(), (Lines{"-2147483648 a 4", "-3  1", "-3 B 1", "-3 a 1", "-3 ab 2", "-3 b 1",
                                 "-3 \xC3\xA4 1", "2147483647 a 3"}));
   const auto history = here.store.initWithDefaultPath();
@@ -90,13 +90,13 @@ TEST_F(CounterStoreRows, SamplesKeepTheirOrderAcrossCheckpointsAndBlocks) {
                        .sample = 5000.5 - i,
                        .seconds = i % 86400});
     if (i % 700 == 699 || i == 2999) {
-      EXPECT_EQ(here.store.apply(changes), "");
-      EXPECT_EQ(here.store.push("j", i, 7, 1), "");
+      EXPECT_TRUE(here.store.apply(changes));
+      EXPECT_TRUE(here.store.push("j", i, 7, 1));
       changes.clear();
       if (i < 2900) here.store.PLClientCheckpoint();
     }
   }
-  here.store.push("z", std::numeric_limits<double>::infinity(), 6, 2);
+  EXPECT_TRUE(here.store.push("z", std::numeric_limits<double>::infinity(), 6, 2));
   EXPECT_EQ(here.rows(), (Lines{"6 z 2:inf", "7 j 1:699 1:1399 1:2099 1:2799 1:2999", expected}));
   EXPECT_EQ(here.log.lines(), Lines{});
 }
@@ -104,8 +104,8 @@ TEST_F(CounterStoreRows, SamplesKeepTheirOrderAcrossCheckpointsAndBlocks) {
 TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsTheRows) {
   for (int i = 0; i < 600; ++i) here.store.push(i % 2 == 0 ? "a" : "b", i, 1, 0);
   here.store.PLClientCheckpoint();
-  here.store.push("a", 600, 1, 0);
-  here.store.push("c", 1, 1, 0);
+  EXPECT_TRUE(here.store.push("a", 600, 1, 0));
+  EXPECT_TRUE(here.store.push("c", 1, 1, 0));
   Lines seen;
   here.store.history()->distributionsForKeyPrefix(
       "", 0, 9,
@@ -115,7 +115,7 @@ TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsThe
         if (key == "b") {
           EXPECT_EQ(here.rows().size(), 3u);
           seen.push_back("b" + base::doubleText(samples.getNextValues().values.front()));
-          EXPECT_EQ(here.store.push("c", 2, 1, 0), "");
+          EXPECT_TRUE(here.store.push("c", 2, 1, 0));
         } else {
           seen.emplace_back(key);
         }
@@ -150,10 +150,10 @@ TEST_F(CounterStoreRows, ASeriesTellsOnTheLastDayButOneWhetherItComesAgain) {
 TEST_F(CounterStoreRows, ACheckpointKeepsTheNewestSixtyDaysThatHoldRowsOfAnyKind) {
   for (int i = 0; i < 70; ++i) {
     const std::int32_t day = i * 500 - 14500;
-    EXPECT_EQ(i % 2 == 0 ? here.store.set("k", i, day) : here.store.push("k", i, day, 0), "");
+    EXPECT_TRUE(i % 2 == 0 ? here.store.set("k", i, day) : here.store.push("k", i, day, 0));
   }
   // Days to come neither count nor go.
-  for (std::int32_t i = 1; i <= 70; ++i) EXPECT_EQ(here.store.set("k", i, 20779 + i), "");
+  for (std::int32_t i = 1; i <= 70; ++i) EXPECT_TRUE(here.store.set("k", i, 20779 + i));
   here.store.PLClientCheckpoint();
   const auto lines = here.rows();
   ASSERT_EQ(lines.size(), 130u);
@@ -172,11 +172,11 @@ TEST_F(CounterStoreRows, ReadsAndCheckpointsOfNothingCreateNothing) {
   }
   EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
   here.home.reset();
-  EXPECT_NE(here.store.set("k", 1, 1), "");
+  EXPECT_FALSE(here.store.set("k", 1, 1));
 }
 
 TEST_F(CounterStoreRows, FilesAreForTheirOwnerOnly) {
-  here.store.set("k", 1, 1);
+  EXPECT_TRUE(here.store.set("k", 1, 1));
   for (const char* suffix : {"", "-wal", "-shm"}) {
     const auto file = folder / (std::string(support::kDatabase) + suffix);
     EXPECT_EQ(std::filesystem::status(file).permissions(), perms{0600}) << suffix;
@@ -188,7 +188,7 @@ TEST_F(CounterStoreRows, AChangeThatCannotBeRecordedTakesTheOthersWithIt) {
   const CounterChange changes[] = {
       {.kind = CounterChange::Kind::set, .key = "k", .day = 1, .amount = 1},
       {.kind = CounterChange::Kind::push, .key = "k", .day = 1, .sample = NAN}};
-  EXPECT_NE(here.store.apply(changes), "");
+  EXPECT_FALSE(here.store.apply(changes));
   EXPECT_EQ(here.rows(), Lines{});
 }
 
@@ -198,11 +198,15 @@ TEST_F(CounterStoreRows, AnythingButARegularFileInAPlaceOfTheDatabaseIsRefused) 
       const support::TemporaryFolder device, outside;
       const auto path = device / (std::string(support::kDatabase) + suffix);
       StoreFixture there(device.path());
-      if (*suffix != '\0') there.store.set("k", 1, 1);
+      if (*suffix != '\0') {
+        EXPECT_TRUE(there.store.set("k", 1, 1));
+      }
       std::filesystem::remove(path);
       support::put(kind, path, outside / "target");
       StoreFixture fresh(device.path());
-      EXPECT_NE(fresh.store.set("k", 1, 1).find("not a regular file"), std::string::npos) << path;
+      EXPECT_NE(fresh.store.set("k", 1, 1).error().text.find("not a regular file"),
+                std::string::npos)
+          << path;
       EXPECT_EQ(fresh.rows(), Lines{}) << path;
       EXPECT_EQ(fresh.log.lines().size(), 1u) << path;
       EXPECT_EQ(fresh.damaged, 0);
@@ -231,9 +235,11 @@ TEST_F(CounterStoreRows, WhatIsNotTheStoresOwnIsReadAndLeftAsItIs) {
       const bool log = row.from.ends_with("-wal");
       {
         StoreFixture original(device.path());
-        original.store.set("k", 1, 1);
-        original.store.settle();
-        if (row.to != "db" && !log) original.store.set("k", 2, 1);  // in the write-ahead log
+        EXPECT_TRUE(original.store.set("k", 1, 1));
+        EXPECT_TRUE(original.store.settle());
+        if (row.to != "db" && !log) {  // in the write-ahead log
+          EXPECT_TRUE(original.store.set("k", 2, 1));
+        }
       }
       if (damaged) device.write(support::kDatabase, std::string(5000, 'x'));
       if (log) device.write(row.from, "");
@@ -245,7 +251,7 @@ TEST_F(CounterStoreRows, WhatIsNotTheStoresOwnIsReadAndLeftAsItIs) {
       }
       const std::string before = device.read(support::kDatabase);
       StoreFixture linked(device.path());
-      EXPECT_NE(linked.store.set("k", 9, 1).find(row.refusal), std::string::npos);
+      EXPECT_NE(linked.store.set("k", 9, 1).error().text.find(row.refusal), std::string::npos);
       EXPECT_EQ(device.read(support::kDatabase), before);
       const char* value = row.to == "db" || log ? "1 k 1" : "1 k 2";
       EXPECT_EQ(linked.rows(), damaged ? Lines{} : Lines{value});
@@ -259,8 +265,8 @@ TEST_F(CounterStoreRows, WhatIsNotTheStoresOwnIsReadAndLeftAsItIs) {
 }
 
 TEST_F(CounterStoreRows, RowsOfWrongTypesAndHalfRecordsAreSkipped) {
-  here.store.set("k", 1, 1);
-  here.store.push("k", 2.5, 1, 3);
+  EXPECT_TRUE(here.store.set("k", 1, 1));
+  EXPECT_TRUE(here.store.push("k", 2.5, 1, 3));
   here.store.PLClientCheckpoint();
   sql("UPDATE packed SET samples = CAST(samples || x'0102030405' AS BLOB)");
   sql("INSERT INTO packed VALUES(1, 'l', x''), (1, 'm', x'00'), (99999999999, 'n', x'')");
@@ -272,8 +278,8 @@ TEST_F(CounterStoreRows, RowsOfWrongTypesAndHalfRecordsAreSkipped) {
 TEST_F(CounterStoreRows, KeysThatBecomeTheSameWhenTheyAreWrittenAreOne) {
   const std::string key = "a\xEF\xBF\xBD";
   for (const char* added : {"a\x01", "a\x1F", "a\xFF", "a\xEF\xBF\xBE"}) {
-    EXPECT_EQ(here.store.add(added, 1, 1), "");
-    EXPECT_EQ(here.store.push(added, 2, 1, 3), "");
+    EXPECT_TRUE(here.store.add(added, 1, 1));
+    EXPECT_TRUE(here.store.push(added, 2, 1, 3));
   }
   EXPECT_EQ(here.rows(), (Lines{"1 " + key + " 4", "1 " + key + " 3:2 3:2 3:2 3:2"}));
   here.store.PLClientCheckpoint();
@@ -290,10 +296,10 @@ TEST_F(CounterStoreRows, KeysThatBecomeTheSameWhenTheyAreWrittenAreOne) {
 }
 
 TEST_F(CounterStoreRows, ANewerDatabaseIsRefusedAndLeftAlone) {
-  here.store.set("k", 1, 1);
+  EXPECT_TRUE(here.store.set("k", 1, 1));
   sql("PRAGMA user_version = 2");
   StoreFixture fresh(folder.path());
-  EXPECT_NE(fresh.store.set("k", 2, 1).find("newer version"), std::string::npos);
+  EXPECT_NE(fresh.store.set("k", 2, 1).error().text.find("newer version"), std::string::npos);
   EXPECT_EQ(fresh.rows(), Lines{});
   EXPECT_EQ(fresh.log.count("newer version"), 1);
   EXPECT_EQ(fresh.damaged, 0);
@@ -303,14 +309,14 @@ TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
   for (const char* change :
        {"CREATE TRIGGER t AFTER INSERT ON scalars BEGIN DELETE FROM scalars; END",
         "DROP TABLE staged", "PRAGMA user_version = -1", "PRAGMA user_version = 0"}) {
-    here.store.set("k", 1, 1);
+    EXPECT_TRUE(here.store.set("k", 1, 1));
     sql(change);
     StoreFixture fresh(folder.path());
-    EXPECT_EQ(fresh.store.add("k", 5, 1), "") << change;
+    EXPECT_TRUE(fresh.store.add("k", 5, 1)) << change;
     EXPECT_EQ(fresh.rows(), Lines{"1 k 5"}) << change;
     EXPECT_EQ(fresh.damaged, 1) << change;
     // The other store notices that the file is another.
-    EXPECT_EQ(here.store.add("k", 1, 1), "");
+    EXPECT_TRUE(here.store.add("k", 1, 1));
     EXPECT_EQ(here.rows(), Lines{"1 k 6"}) << change;
     EXPECT_EQ(here.damaged, 0);
   }
@@ -325,7 +331,7 @@ TEST_F(CounterStoreRows, ADeviceThatCannotBeWrittenIsStillRead) {
     }
   };
   for (const Lines& gone : {Lines{"-wal", "-shm"}, Lines{"-shm"}, Lines{}}) {
-    here.store.set("k", 1, 1);
+    EXPECT_TRUE(here.store.set("k", 1, 1));
     here.store.PLClientCheckpoint();
     for (const std::string& suffix : gone) {
       std::filesystem::remove(folder / (support::kDatabase + suffix));
@@ -336,7 +342,7 @@ TEST_F(CounterStoreRows, ADeviceThatCannotBeWrittenIsStillRead) {
       if (::geteuid() == 0 && ::setresuid(65534, 65534, 65534) != 0) ::_exit(9);
       StoreFixture reader(folder.path());
       if (reader.rows() != Lines{"1 k 1"}) ::_exit(1);
-      if (reader.store.set("k", 2, 1).empty()) ::_exit(2);
+      if (reader.store.set("k", 2, 1)) ::_exit(2);
       ::_exit(reader.damaged == 0 ? 0 : 3);
     }
     int status = 0;

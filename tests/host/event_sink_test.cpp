@@ -48,7 +48,7 @@ TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
 TEST_F(EventSinkTest, AFullFileMakesRoomAndTheOldestOfFourIsDropped) {
   const std::string name = kEvents;
   for (int round = 0; round < 6; ++round) {
-    folder.write(kEvents, std::string(EventSink::kMaximumFile - 1, 'x') + '\n');
+    folder.write(kEvents, std::string(EventSink::kMaxFile - 1, 'x') + '\n');
     send();
     send();
     EXPECT_EQ(lines(), 2) << round;
@@ -95,10 +95,10 @@ TEST_F(EventSinkTest, TheQueueIsBounded) {
   });
   begun.get_future().wait();
   std::size_t queued = 0;
-  while (queued <= EventSink::kMaximumQueued && sink.EventraSendEventLazy("event", nothing)) {
+  while (queued <= EventSink::kMaxQueued && sink.EventraSendEventLazy("event", nothing)) {
     ++queued;
   }
-  EXPECT_EQ(queued, EventSink::kMaximumQueued);
+  EXPECT_EQ(queued, EventSink::kMaxQueued);
   go.set_value();
   sink.drain();
   EXPECT_EQ(lines(), static_cast<std::ptrdiff_t>(queued) + 1);
@@ -124,7 +124,7 @@ TEST_F(EventSinkTest, NoEventIsLostBetweenSendersProducersAndDrains) {
 }
 
 TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
-  const std::string name = kEvents, full(EventSink::kMaximumFile, '\n');
+  const std::string name = kEvents, full(EventSink::kMaxFile, '\n');
   const struct {
     std::vector<const char*> folders;
     bool secondName;

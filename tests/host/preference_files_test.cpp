@@ -206,7 +206,7 @@ TEST_F(PreferenceFilesTest, NamesThatAreNoFileNamesAreRefused) {
     EXPECT_EQ(files.getPreference("key", name), std::nullopt);
     EXPECT_EQ(log.count("error: Refused preferences"), refused += 4);
   }
-  files.flushAll();
+  EXPECT_TRUE(files.flushAll());
   EXPECT_FALSE(std::filesystem::exists(folder / "var"));
   files.setPreference("key", "mobile", std::string(241, 'x'), &value);
   EXPECT_TRUE(std::filesystem::exists(

@@ -37,8 +37,9 @@ struct Maker {
   std::string make(const fs::path& folder, const Sample& sample, int days = 0) {
     warnings = 0;
     const MakingOptions options{folder.string(), sample, days, "/nowhere/module.so"};
-    return makeDevice(options, {.progress = [](const std::string&) {},
-                                .warning = [this](const std::string&) { ++warnings; }});
+    const auto made = makeDevice(options, {.progress = [](const std::string&) {},
+                                           .warning = [this](const std::string&) { ++warnings; }});
+    return made ? "" : made.error().text;
   }
   int warnings = 0;
 };

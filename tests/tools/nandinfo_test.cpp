@@ -36,7 +36,7 @@ class Nandinfo : public testing::Test {
     std::ostringstream outStream, errStream;
     support::freshErrors();
     const int status =
-        nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60, ""},
+        nandinfo::runNandinfo({device.platform, outStream, errStream, terminal, terminal, 60},
                               static_cast<int>(argv.size()), argv.data());
     out = outStream.str();
     err = errStream.str();

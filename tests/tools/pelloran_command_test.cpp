@@ -106,11 +106,11 @@ TEST_F(PelloranCommand, AnImportIsRecordedWholeOrNamesTheLineThatStoppedIt) {
 }
 
 TEST_F(PelloranCommand, ShowOrdersScalarsAndDistributionsTogether) {
-  here.store.set("b", 2, 1);
-  here.store.set("a\n\xc2\x9b\"", 1, 1);
-  here.store.set("c", 3, 0);
-  here.store.push("b", 4, 1, 9);
-  here.store.push("b", 1e22, 1, 8);
+  EXPECT_TRUE(here.store.set("b", 2, 1));
+  EXPECT_TRUE(here.store.set("a\n\xc2\x9b\"", 1, 1));
+  EXPECT_TRUE(here.store.set("c", 3, 0));
+  EXPECT_TRUE(here.store.push("b", 4, 1, 9));
+  EXPECT_TRUE(here.store.push("b", 1e22, 1, 8));
   EXPECT_EQ(run({"show", "--json"}), 0);
   EXPECT_EQ(out,
             "{\"day\": 0, \"key\": \"c\", \"value\": 3}\n"
@@ -123,8 +123,9 @@ TEST_F(PelloranCommand, ShowOrdersScalarsAndDistributionsTogether) {
             "1    1970-01-02  a??\"  1\n"
             "1    1970-01-02  b     2\n"
             "1    1970-01-02  b     count 2  min 4  mean 5e+21  max 1e+22\n");
-  here.store.set("\xe8\xa8\x88", 1, 2);        // two columns wide
-  here.store.set("u\xcc\x88\xc2\x9b!", 2, 2);  // combined with the one before; a control
+  EXPECT_TRUE(here.store.set("\xe8\xa8\x88", 1, 2));  // two columns wide
+  EXPECT_TRUE(
+      here.store.set("u\xcc\x88\xc2\x9b!", 2, 2));  // combined with the one before; a control
   EXPECT_EQ(run({"show", "--day", "1970-01-03"}), 0);
   EXPECT_EQ(out,
             "DAY  DATE        KEY  VALUE\n"

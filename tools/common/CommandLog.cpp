@@ -67,7 +67,7 @@ void CommandLog::write(LogLevel level, std::string_view message) {
 }
 
 void CommandLog::say(const std::string& line) {
-  host::writeAll(STDERR_FILENO, command_ + ": " + printable(line) + '\n');
+  std::ignore = host::writeAll(STDERR_FILENO, command_ + ": " + printable(line) + '\n');
 }
 
 }  // namespace tools

@@ -2,7 +2,6 @@
 
 #include <unistd.h>
 
-#include <cerrno>
 #include <csignal>
 #include <string_view>
 
@@ -18,9 +17,9 @@ int StandardOutput::Buffer::sync() {
   const std::string_view text(pbase(), static_cast<std::size_t>(pptr() - pbase()));
   setp(bytes_.data(), bytes_.data() + bytes_.size());
   if (readerIsGone_) return 0;
-  const int error = host::writeAll(STDOUT_FILENO, text);
-  readerIsGone_ = error == EPIPE;
-  return error == 0 || readerIsGone_ ? 0 : -1;
+  const auto written = host::writeAll(STDOUT_FILENO, text);
+  readerIsGone_ = !written && written.error().is(std::errc::broken_pipe);
+  return written || readerIsGone_ ? 0 : -1;
 }
 
 StandardOutput::Buffer::int_type StandardOutput::Buffer::overflow(int_type next) {

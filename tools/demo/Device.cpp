@@ -2,10 +2,8 @@
 
 #include <fcntl.h>
 
-#include <cerrno>
-#include <cstring>
-
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 #include "platform/SystemLog.h"
 #include "plist/PropertyList.h"
 
@@ -21,9 +19,10 @@ namespace {
 constexpr std::size_t kMaxFileSize = std::size_t{64} << 20;
 
 Result<std::string> readHostFile(const std::string& path) {
-  const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK));
-  if (!file) return Error{std::strerror(errno)};
-  return host::readRegularFile(file.get(), kMaxFileSize);
+  return host::opened(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK))
+      .and_then([](const FileDescriptor& file) {
+        return host::readRegularFile(file.get(), kMaxFileSize);
+      });
 }
 
 }  // namespace
@@ -75,10 +74,11 @@ Recorded Device::recorded(std::int32_t firstDay, std::int32_t lastDay) {
 }
 
 std::vector<std::string> Device::namesIn(const std::string& folder) {
-  std::vector<std::string> names;
-  const FileDescriptor opened = host_.root().openFolder(folder, host::DeviceRoot::Missing::fails);
-  if (opened) host::namesInFolder(opened.get(), names);
-  return names;
+  return host_.root()
+      .openFolder(folder, host::DeviceRoot::Missing::fails)
+      .and_then([](const FileDescriptor& opened) { return host::namesInFolder(opened.get()); })
+      .orNone()
+      .value_or(std::vector<std::string>());
 }
 
 std::optional<std::string> Device::bytes(const std::string& path) {

@@ -4,6 +4,7 @@
 #include <functional>
 #include <string>
 
+#include "base/Result.h"
 #include "platform/SystemLog.h"
 #include "tools/mkdevice/Sample.h"
 
@@ -25,9 +26,8 @@ struct Listener {
 };
 
 // Makes the root. With days to play, makes it as it was before them; on each of them the device is
-// used, its daily run comes due, and then its counters are recorded. Returns the empty text, or
-// what went wrong and where. A folder that holds anything is refused and left as it is; one that
-// couldn't be filled to the end is left half-made.
-std::string makeDevice(const MakingOptions& options, const Listener& listener);
+// used, its daily run comes due, and then its counters are recorded. A folder that holds anything
+// is refused and left as it is; one that couldn't be filled to the end is left half-made.
+base::Result<void> makeDevice(const MakingOptions& options, const Listener& listener);
 
 }  // namespace mkdevice

@@ -80,7 +80,7 @@ int main(int argc, char** argv) {
 
   tools::Progress progress(std::cerr, ::isatty(STDERR_FILENO) == 1);
   options.sample.today = base::dayNumber(host::SystemClock().now().secondsSince1970);
-  const std::string error = mkdevice::makeDevice(
+  const auto made = mkdevice::makeDevice(
       options, {.progress = [&](const std::string& text) { progress.show(text); },
                 .warning =
                     [&](const std::string& text) {
@@ -88,7 +88,7 @@ int main(int argc, char** argv) {
                       std::cerr << "mkdevice: " << text << '\n';
                     }});
   progress.clear();
-  if (error.empty()) return kDone;
-  std::cerr << "mkdevice: " << error << '\n';
+  if (made) return kDone;
+  std::cerr << "mkdevice: " << made.error().text << '\n';
   return kFailed;
 }

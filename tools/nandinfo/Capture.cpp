@@ -45,20 +45,16 @@ class Capture {
       : invocation_(invocation), services_(invocation.services) {}
 
   CommandResult run() {
-    if (std::string error = capture(); !error.empty()) return base::Error{error};
+    if (const auto captured = capture(); !captured) return captured.error();
     folder_.finish();
     return std::move(manifest_);
   }
 
  private:
-  // These return the empty text, or what went wrong.
-
-  std::string capture() {
-    if (std::string error = folder_.open(invocation_.arguments.folder); !error.empty()) {
-      return error;
-    }
+  base::Result<void> capture() {
+    if (auto done = folder_.open(invocation_.arguments.folder); !done) return done;
     ControllerCapture controller(invocation_, folder_);
-    if (std::string error = controller.run(); !error.empty()) return error;
+    if (auto done = controller.run(); !done) return done;
     const std::pair<const char*, std::optional<Value>> files[] = {
         {"properties.plist", properties()},
         {"system-version.plist", services_.systemVersion.systemVersionDictionary()},
@@ -71,16 +67,14 @@ class Capture {
     for (const auto& [name, content] : files) {
       if (!content) continue;
       const auto bytes = plist::writeXML(*content);
-      if (!bytes) return invocation_.arguments.folder + "/" + name + ": " + bytes.error().text;
-      if (std::string error = folder_.write(name, *bytes); !error.empty()) return error;
+      if (!bytes) return bytes.error().at(invocation_.arguments.folder + "/" + name);
+      if (auto done = folder_.write(name, *bytes); !done) return done;
     }
     if (const auto snapshot =
             services_.snapshots.capture(platform::KernelSnapshots::kChunkedData)) {
       const std::string_view bytes(reinterpret_cast<const char*>(snapshot->data()),
                                    snapshot->size());
-      if (std::string error = folder_.write("kernel-snapshot.bin", bytes); !error.empty()) {
-        return error;
-      }
+      if (auto done = folder_.write("kernel-snapshot.bin", bytes); !done) return done;
     }
     manifest_ = Dictionary{{"tool", "nandinfo " MORVEND_VERSION},
                            {"time", services_.clock.now()},

@@ -3,30 +3,28 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include <cerrno>
-#include <cstring>
-
 #include "host/files/Files.h"
+#include "host/files/SystemError.h"
 
 namespace nandinfo {
 
-std::string CaptureFolder::open(const std::string& path) {
+base::Result<void> CaptureFolder::open(const std::string& path) {
   path_ = path;
-  made_ = ::mkdir(path.c_str(), 0700) == 0;
-  if (!made_ && errno != EEXIST) return path + ": " + std::strerror(errno);
-  folder_ = host::FileDescriptor(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (!folder_) return path + ": " + std::strerror(errno);
-  std::vector<std::string> names;
-  if (const int error = host::namesInFolder(folder_.get(), names)) {
-    return path + ": " + std::strerror(error);
-  }
-  return names.empty() ? "" : path + ": the folder is not empty";
+  const auto made = host::checked(::mkdir(path.c_str(), 0700));
+  made_ = static_cast<bool>(made);
+  if (!made && !made.error().is(std::errc::file_exists)) return made.error().at(path);
+  auto folder = host::opened(::open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!folder) return folder.error().at(path);
+  folder_ = *std::move(folder);
+  const auto names = host::namesInFolder(folder_.get());
+  if (!names) return names.error().at(path);
+  if (!names->empty()) return base::Error{"the folder is not empty"}.at(path);
+  return {};
 }
 
-std::string CaptureFolder::write(const std::string& name, std::string_view bytes) {
+base::Result<void> CaptureFolder::write(const std::string& name, std::string_view bytes) {
   files_.push_back(name);  // a failure may come after the file got its name
-  const int error = host::replaceFile(folder_.get(), name, bytes);
-  return error == 0 ? "" : path_ + "/" + name + ": " + host::errorText(error);
+  return host::replaceFile(folder_.get(), name, bytes).at(path_ + "/" + name);
 }
 
 CaptureFolder::~CaptureFolder() {

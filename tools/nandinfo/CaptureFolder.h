@@ -5,6 +5,7 @@
 #include <string_view>
 #include <vector>
 
+#include "base/Result.h"
 #include "host/files/FileDescriptor.h"
 
 namespace nandinfo {
@@ -13,13 +14,11 @@ class CaptureFolder {
  public:
   ~CaptureFolder();
 
-  // The functions return the empty text, or what is wrong with which file.
-
   // Opens the folder: an empty one, or one that is made, with mode 0700.
-  std::string open(const std::string& path);
+  base::Result<void> open(const std::string& path);
 
   // Writes a file whole, with mode 0600.
-  std::string write(const std::string& name, std::string_view bytes);
+  base::Result<void> write(const std::string& name, std::string_view bytes);
 
   // The files stay.
   void finish() { finished_ = true; }

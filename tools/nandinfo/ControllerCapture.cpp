@@ -58,34 +58,30 @@ std::string statusText(DriverStatus status) {
 
 }  // namespace
 
-std::string ControllerCapture::run() {
+base::Result<void> ControllerCapture::run() {
   // The library takes the first controller that can be opened, and at some places the first one.
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && exporter_ == nullptr; ++row) {
     auto service = DriverService::matching(services_, row->className);
     if (!service.isPresent()) continue;
-    if (std::string error = captureController(*row, std::move(service), true); !error.empty()) {
-      return error;
-    }
+    if (auto done = captureController(*row, std::move(service), true); !done) return done;
   }
   // Where none is registered, it takes the first one of a walk.
   for (const auto* row = NANDInfo::nand_exporters_tunnel;
        row->className != nullptr && entries.empty(); ++row) {
     auto service = DriverService::walkedTo(services_, row->className);
     if (!service.isPresent()) continue;
-    if (std::string error = captureController(*row, std::move(service), false); !error.empty()) {
-      return error;
-    }
+    if (auto done = captureController(*row, std::move(service), false); !done) return done;
   }
-  if (entries.empty()) return "no storage controller found";
-  if (exporter_ == nullptr) return "no storage controller can be opened";
+  if (entries.empty()) return base::Error{"no storage controller found"};
+  if (exporter_ == nullptr) return base::Error{"no storage controller can be opened"};
   captureEAN();
   captureNVRAM();
   return {};
 }
 
-std::string ControllerCapture::captureController(const nand_exporter_t& exporter,
-                                                 DriverService service, bool registered) {
+base::Result<void> ControllerCapture::captureController(const nand_exporter_t& exporter,
+                                                        DriverService service, bool registered) {
   Dictionary entry{{"Class", exporter.className}}, driver;
   if (!registered) entry.set("Registered", false);
   if (service.open() != 0 || !service.isOpen()) {
@@ -95,7 +91,7 @@ std::string ControllerCapture::captureController(const nand_exporter_t& exporter
     exporter_ = &exporter;
     className = exporter.className;
     for (const BufferKind& kind : kKinds) {
-      if (std::string error = captureBuffers(service, kind); !error.empty()) return error;
+      if (auto done = captureBuffers(service, kind); !done) return done;
     }
     driver.set("Buffers", std::move(answers_));
     captureRecommendation(service, driver);
@@ -107,8 +103,8 @@ std::string ControllerCapture::captureController(const nand_exporter_t& exporter
   return {};
 }
 
-std::string ControllerCapture::captureBuffers(const DriverService& service,
-                                              const BufferKind& kind) {
+base::Result<void> ControllerCapture::captureBuffers(const DriverService& service,
+                                                     const BufferKind& kind) {
   const NANDInfo::SelectorGetter getter = exporter_->*kind.selectors;
   const NANDInfo::SelectorPair* selectors = getter != nullptr ? getter() : nullptr;
   if (selectors == nullptr) {
@@ -117,15 +113,16 @@ std::string ControllerCapture::captureBuffers(const DriverService& service,
   }
   for (std::uint32_t argument = 0; argument < kind.arguments; ++argument) {
     invocation_.progress(base::format("%s %u", kind.name, argument));
-    if (std::string error = captureBuffer(service, kind, *selectors, argument); !error.empty())
+    if (auto done = captureBuffer(service, kind, *selectors, argument); !error.empty())
       return error;
   }
   return {};
 }
 
-std::string ControllerCapture::captureBuffer(const DriverService& service, const BufferKind& kind,
-                                             const NANDInfo::SelectorPair& selectors,
-                                             std::uint32_t argument) {
+base::Result<void> ControllerCapture::captureBuffer(const DriverService& service,
+                                                    const BufferKind& kind,
+                                                    const NANDInfo::SelectorPair& selectors,
+                                                    std::uint32_t argument) {
   const std::string key = base::format("%u:%u", selectors.dataOpType, argument);
   const bool inFlags = kind.argumentIn == ArgumentIn::flags;
   const NANDInfo::TunnelAnswer fetched =
@@ -158,7 +155,7 @@ std::string ControllerCapture::captureBuffer(const DriverService& service, const
   std::string& file = files_[digest];
   if (file.empty()) {
     file = base::format("%s-%u.bin", kind.name, argument);
-    if (std::string error = folder_.write(file, bytes); !error.empty()) return error;
+    if (std::string error = folder_.write(file, bytes); !done) return done;
   }
   buffers.push_back(Dictionary{{"name", kind.name},
                                {"opType", std::uint64_t{selectors.dataOpType}},

@@ -8,20 +8,20 @@
 
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/DriverService.h"
+#include "base/Result.h"
 #include "tools/nandinfo/CaptureFolder.h"
 #include "tools/nandinfo/Commands.h"
 
 namespace nandinfo {
 
-// Files of the captured folder are written as the answers come. The functions return the empty
-// text, or what went wrong.
+// Files of the captured folder are written as the answers come.
 class ControllerCapture {
  public:
   ControllerCapture(const Invocation& invocation, CaptureFolder& folder)
       : invocation_(invocation), services_(invocation.services), folder_(folder) {}
 
   // Asks all that a command can ask. There must be a controller that can be opened.
-  std::string run();
+  base::Result<void> run();
 
   // What came of it: the registry's entries, the class of the controller that was asked; what was
   // captured and what was not, for the manifest.
@@ -35,11 +35,11 @@ class ControllerCapture {
   // How a command's argument is given to the driver.
   enum class ArgumentIn { word, flags };
 
-  std::string captureController(const NANDInfo::nand_exporter_t& exporter,
-                                NANDInfo::DriverService service, bool registered);
-  std::string captureBuffers(const NANDInfo::DriverService& service, const BufferKind& kind);
-  std::string captureBuffer(const NANDInfo::DriverService& service, const BufferKind& kind,
-                            const NANDInfo::SelectorPair& selectors, std::uint32_t argument);
+  base::Result<void> captureController(const NANDInfo::nand_exporter_t& exporter,
+                                       NANDInfo::DriverService service, bool registered);
+  base::Result<void> captureBuffers(const NANDInfo::DriverService& service, const BufferKind& kind);
+  base::Result<void> captureBuffer(const NANDInfo::DriverService& service, const BufferKind& kind,
+                                   const NANDInfo::SelectorPair& selectors, std::uint32_t argument);
   void captureRecommendation(const NANDInfo::DriverService& service, plist::Dictionary& driver);
   void captureCharacteristics(const NANDInfo::DriverService& service, plist::Dictionary& entry);
   void captureEAN();

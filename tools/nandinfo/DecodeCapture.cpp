@@ -121,9 +121,7 @@ class Capture {
       : services_(invocation.services), folder_(invocation.arguments.folder) {}
 
   CommandResult decode() {
-    if (!folder_.problem().empty()) {
-      return Error{folder_.problem("the folder")};
-    }
+    if (const auto there = folder_.isThere("the folder"); !there) return there.error();
     constexpr char kRegistry[] = "registry.plist";
     const auto bytes = read(kRegistry);
     if (!bytes) return bytes.error().at(folder_.hostPath(kRegistry));

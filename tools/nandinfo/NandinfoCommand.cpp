@@ -112,8 +112,8 @@ class Run {
                                      : ControllerWatch::DirectTexts::kept) {}
 
   int run(const Arguments& arguments, Form form) {
-    if (command_.needs != Needs::noDevice && !services_.rootProblem.empty()) {
-      return failed(services_.rootProblem);
+    if (command_.needs != Needs::noDevice && !services_.root) {
+      return failed(services_.root.error().text);
     }
     const CommandResult result = resultOf(arguments);
     const std::string problem = command_.needs == Needs::answer ? watch_.problem() : "";

@@ -17,7 +17,7 @@ struct CommandServices {
   bool outIsTerminal = false;        // then results are tables for people, else JSON
   bool errIsTerminal = false;        // then long work shows its progress there
   std::size_t width = 80;            // of the terminal, in columns
-  std::string rootProblem = {};      // why the device root can't be used, if it can't
+  base::Result<void> root = {};      // whether the device root is there
   tools::CommandLog* log = nullptr;  // the services', for the reasons of a failure
 };
 

@@ -19,7 +19,7 @@ int run(std::ostream& out, int argc, char** argv) {
                                            .outIsTerminal = ::isatty(STDOUT_FILENO) == 1,
                                            .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
                                            .width = tools::terminalWidth(),
-                                           .rootProblem = host.root().problem(),
+                                           .root = host.root().isThere(),
                                            .log = &log};
   return nandinfo::runNandinfo(services, argc, argv);
 }

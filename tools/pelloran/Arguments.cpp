@@ -38,13 +38,13 @@ bool isUTF8(std::string_view text) {
 
 }  // namespace
 
-std::string keyProblem(std::string_view key) {
-  if (key.empty()) return "the key is empty";
+Result<void> checkKey(std::string_view key) {
+  if (key.empty()) return Error{"the key is empty"};
   if (key.size() > kMaxKeySize) {
-    return base::format("the key has %zu bytes, more than %zu", key.size(), kMaxKeySize);
+    return Error{base::format("the key has %zu bytes, more than %zu", key.size(), kMaxKeySize)};
   }
-  if (key.find('\0') != std::string_view::npos) return "the key holds a NUL";
-  if (!isUTF8(key)) return "the key is not UTF-8";
+  if (key.find('\0') != std::string_view::npos) return Error{"the key holds a NUL"};
+  if (!isUTF8(key)) return Error{"the key is not UTF-8"};
   return {};
 }
 

@@ -10,8 +10,8 @@
 
 namespace pelloran {
 
-// What is wrong with a key, or the empty text. A key is 1 to 1,024 bytes of UTF-8 without a NUL.
-std::string keyProblem(std::string_view key);
+// Whether a key is sound: 1 to 1,024 bytes of UTF-8 without a NUL.
+base::Result<void> checkKey(std::string_view key);
 
 // A day number, a date such as "2026-11-22", or "today" or "yesterday"; none before 1970.
 base::Result<std::int32_t> parseDay(std::string_view text, std::int32_t today);

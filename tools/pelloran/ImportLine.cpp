@@ -134,7 +134,7 @@ Result<ImportLine> parseImportLine(std::string_view line, Moment now) {
   if (!fields.kind) return Error{"there is none of set, add and push"};
   auto* key = std::get_if<std::string>(&fields.target);
   if (key == nullptr) return Error{"the key is not a text"};
-  if (auto problem = keyProblem(*key); !problem.empty()) return Error{std::move(problem)};
+  if (auto sound = checkKey(*key); !sound) return sound.error();
 
   CounterChange change{.kind = *fields.kind, .key = {}, .day = now.day, .seconds = now.second};
   if (change.kind == CounterChange::Kind::push) {

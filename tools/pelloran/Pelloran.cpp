@@ -52,7 +52,7 @@ class Command {
   int change(CounterChange::Kind kind) {
     CounterChange change{
         .kind = kind, .key = arguments_.key, .day = now_.day, .seconds = now_.second};
-    if (const std::string problem = keyProblem(change.key); !problem.empty()) return usage(problem);
+    if (const auto sound = checkKey(change.key); !sound) return usage(sound.error().text);
     if (arguments_.day && !given(parseDay(*arguments_.day, now_.day), change.day)) return kUsage;
     if (kind == CounterChange::Kind::push) {
       if (!given(parseReal(arguments_.value), change.sample)) return kUsage;
@@ -105,9 +105,9 @@ class Command {
     const auto readings = base::saturatingCast<std::int64_t>(lasting / every) + 1;
     tools::Progress progress(environment_.err, environment_.errIsTerminal);
     for (std::int64_t reading = 1; reading <= readings; ++reading) {
-      if (const std::string error = record(environment_.figures()); !error.empty()) {
+      if (const auto recorded = record(environment_.figures()); !recorded) {
         progress.clear();
-        return failed(error);
+        return failed(recorded.error().text);
       }
       if (reading == readings) break;
       progress.show("reading " + std::to_string(reading) + " of " + std::to_string(readings));
@@ -135,7 +135,7 @@ class Command {
     value = *result;
     return true;
   }
-  int outcome(const std::string& error) { return error.empty() ? kDone : failed(error); }
+  int outcome(const base::Result<void>& done) { return done ? kDone : failed(done.error().text); }
 
   // Reads everything before anything is written: nobody else waits while lines trickle in.
   int import(std::istream& in, const std::string& place) {
@@ -168,12 +168,12 @@ class Command {
     if (number >= kLinesBetweenProgress) {
       progress.show("writing " + std::to_string(changes.size()) + " changes");
     }
-    const std::string error = environment_.store.apply(changes);
+    const auto applied = environment_.store.apply(changes);
     progress.clear();
-    return outcome(error);
+    return outcome(applied);
   }
 
-  std::string record(const host::machine::MachineFigures& figures) {
+  base::Result<void> record(const host::machine::MachineFigures& figures) {
     const Moment now = momentOf(environment_.clock.now());
     std::vector<CounterChange> changes;
     for (const auto& [key, count] : figures.counts) {
@@ -187,7 +187,7 @@ class Command {
                          .sample = value,
                          .seconds = now.second});
     }
-    if (changes.empty()) return "this machine shows no figures";
+    if (changes.empty()) return base::Error{"this machine shows no figures"};
     return environment_.store.apply(changes);
   }
 
@@ -279,8 +279,8 @@ int runPelloran(const Environment& environment, int argc, const char* const* arg
     return named.empty() ? wrongUsage(environment.err, withoutCommand(app, error), "")
                          : wrongUsage(environment.err, error.what(), " " + named[0]->get_name());
   }
-  if (!environment.rootProblem.empty()) {
-    environment.err << "pelloran: " << environment.rootProblem << '\n';
+  if (!environment.root) {
+    environment.err << "pelloran: " << environment.root.error().text << '\n';
     return kFailed;
   }
   Command command(environment, arguments);

@@ -21,7 +21,7 @@ struct Environment {
   bool errIsTerminal;  // then long work shows its progress there
   std::function<host::machine::MachineFigures()> figures;  // of this machine
   std::function<void(std::chrono::steady_clock::time_point)> waitUntil;
-  std::string rootProblem = {};  // why the device root can't be used, if it can't
+  base::Result<void> root = {};  // whether the device root is there
 };
 
 // Runs one command line. Returns the exit status: 0 done; 1 the work failed, with one line on `err`

@@ -25,7 +25,7 @@ int run(std::ostream& out, int argc, char** argv) {
        .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
        .figures = host::machine::readMachineFigures,
        .waitUntil = [](auto moment) { std::this_thread::sleep_until(moment); },
-       .rootProblem = host.root().problem()},
+       .root = host.root().isThere()},
       argc, argv);
 }
 
