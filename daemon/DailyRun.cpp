@@ -8,6 +8,7 @@
 #include "platform/CountersService.h"
 #include "platform/FaultwatchSupport.h"
 #include "platform/LogSubmission.h"
+#include "platform/Names.h"
 #include "platform/PreferenceStore.h"
 #include "platform/RunLock.h"
 #include "platform/ServitaLogs.h"
@@ -19,7 +20,6 @@ using platform::LogLevel;
 
 namespace {
 
-constexpr char kDomain[] = "com.norba.pellorand.morvend";
 constexpr char kGateRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
 
 struct Day {
@@ -67,15 +67,15 @@ void RunDailyTasksIfDue(const Services& services, DeviceContext& context,
   const std::scoped_lock lock(services.runLock);
   const std::int32_t yesterday = base::dayBefore(services.counters.PLDaysSince1970());
   const std::int64_t last =
-      services.preferences.QNSPreferencesGetIntegerValue(kGateRecord, kDomain);
+      services.preferences.QNSPreferencesGetIntegerValue(kGateRecord, platform::kDaemonName);
   if (last >= yesterday) {
     services.log.log(LogLevel::standard, "Day unchanged since last run");
     return;
   }
   runSequence(services, context, {yesterday, appInfo});
   const plist::Value record(yesterday);
-  services.preferences.QNSPreferencesSetValue(kGateRecord, &record, kDomain);
-  services.preferences.QNSPreferencesSynchronize(kDomain);
+  services.preferences.QNSPreferencesSetValue(kGateRecord, &record, platform::kDaemonName);
+  services.preferences.QNSPreferencesSynchronize(platform::kDaemonName);
 }
 
 void RunDailyTasks(const Services& services, DeviceContext& context, std::int32_t day,

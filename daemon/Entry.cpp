@@ -7,6 +7,7 @@
 #include "daemon/ServiceListener.h"
 #include "platform/CountersService.h"
 #include "platform/EventLoop.h"
+#include "platform/Names.h"
 #include "platform/SystemLog.h"
 
 namespace morvend {
@@ -16,12 +17,11 @@ using platform::LogLevel;
 
 namespace {
 
-constexpr char kServiceName[] = "com.norba.pellorand.morvend";
 constexpr double kIdleSeconds = 10.0;
 
 void serve(const Services& services, DeviceContext& context) {
   ServiceState state;
-  const auto listener = services.namedServices.listen(kServiceName);
+  const auto listener = services.namedServices.listen(platform::kDaemonName);
   if (listener != nullptr) {
     listener->start([&](const plist::Dictionary* message) {
       HandleServiceMessage(services, context, state, message);

@@ -9,6 +9,7 @@
 #include "platform/DeviceProperties.h"
 #include "platform/EventLoop.h"
 #include "platform/Eventra.h"
+#include "platform/Names.h"
 #include "platform/PreferenceStore.h"
 #include "platform/SystemLog.h"
 
@@ -22,15 +23,14 @@ using plist::Value;
 
 namespace {
 
-constexpr char kDomain[] = "com.norba.pellorand.morvend";
 constexpr char kConfigurationDomain[] = "com.norba.Varnhollow";
 
 std::optional<Value> record(platform::PreferenceStore& preferences, const char* key) {
-  return preferences.QNSPreferencesGetValue(key, kDomain);
+  return preferences.QNSPreferencesGetValue(key, platform::kDaemonName);
 }
 
 void setRecord(platform::PreferenceStore& preferences, const char* key, const Value* value) {
-  preferences.QNSPreferencesSetValue(key, value, kDomain);
+  preferences.QNSPreferencesSetValue(key, value, platform::kDaemonName);
 }
 
 template <typename T>
@@ -134,7 +134,7 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
       for (const char* key : {"TaskingID", "TaskingDigest", "TaskingPayload"}) {
         setRecord(services.preferences, key, nullptr);
       }
-      domainsToSync.add(kDomain);
+      domainsToSync.add(platform::kDaemonName);
     }
   }
   if (const Value* payload = tasking->find("TaskingPayload")) {
@@ -143,7 +143,7 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
     setRecord(services.preferences, "TaskingOS", os ? &*os : nullptr);
     setRecord(services.preferences, "TaskingDigest", tasking->find("TaskingDigest"));
     setRecord(services.preferences, "TaskingPayload", payload);
-    domainsToSync.add(kDomain);
+    domainsToSync.add(platform::kDaemonName);
   }
   domainsToSync.synchronize(services.preferences);
   services.notifications.postNotification("com.norba.da.tasking_changed");

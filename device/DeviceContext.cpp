@@ -1,6 +1,7 @@
 #include "device/DeviceContext.h"
 
 #include "platform/FaultwatchSupport.h"
+#include "platform/Names.h"
 
 namespace morvend {
 
@@ -14,7 +15,6 @@ constexpr char kSystemGroupContainer[] = "systemgroup.com.norba.quenset";
 constexpr char kSingleUserHome[] = "/var/mobile";
 constexpr char kDatabaseBelowHome[] = "/Library/Pelloran/PLDataStore.sqlitedb";
 constexpr char kCorruptionCount[] = "DatabaseCorruptionCount";
-constexpr char kCorruptionDomain[] = "com.norba.pellorand";
 
 }  // namespace
 
@@ -98,9 +98,9 @@ void DeviceContext::LoadPreferenceFunctions() {
 std::int64_t DeviceContext::ReadAndResetDatabaseCorruptionCount() {
   if (readInteger_ == nullptr || writeValue_ == nullptr) LoadPreferenceFunctions();
   if (readInteger_ == nullptr || writeValue_ == nullptr) return 0;
-  const std::int64_t count = readInteger_(kCorruptionCount, kCorruptionDomain, nullptr);
+  const std::int64_t count = readInteger_(kCorruptionCount, platform::kPellorandDomain, nullptr);
   const plist::Value zero(0);
-  writeValue_(kCorruptionCount, &zero, kCorruptionDomain);
+  writeValue_(kCorruptionCount, &zero, platform::kPellorandDomain);
   return count;
 }
 

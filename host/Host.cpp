@@ -25,6 +25,7 @@
 #include "host/recorded/PurgeableSpace.h"
 #include "host/recorded/ReportingChannels.h"
 #include "host/recorded/SystemVersion.h"
+#include "platform/Names.h"
 
 namespace host {
 
@@ -46,7 +47,7 @@ struct Host::Assembly {
         played(options.played) {}
 
   void countDamagedDatabase() {
-    preferences.addToInteger("DatabaseCorruptionCount", "com.norba.pellorand", 1);
+    preferences.addToInteger("DatabaseCorruptionCount", platform::kPellorandDomain, 1);
   }
 
   DeviceRoot root;

@@ -6,6 +6,7 @@
 #include "platform/CountersService.h"
 #include "platform/DeviceProperties.h"
 #include "platform/LogSubmission.h"
+#include "platform/Names.h"
 #include "platform/PreferenceStore.h"
 #include "platform/SystemLog.h"
 
@@ -16,7 +17,6 @@ using plist::Value;
 
 namespace {
 
-constexpr char kDomain[] = "com.norba.pellorand.morvend";
 constexpr char kLastOSVersion[] = "LastOSVersion";
 constexpr std::int32_t kCrashLogVersion = 1;
 
@@ -24,7 +24,8 @@ constexpr std::int32_t kCrashLogVersion = 1;
 
 LogHeader headerForDay(const Services& services, std::int32_t day, std::string whitelistDigest) {
   const auto preference = [&](const char* key, Value otherwise) {
-    return services.preferences.QNSPreferencesGetValue(key, kDomain).value_or(std::move(otherwise));
+    return services.preferences.QNSPreferencesGetValue(key, platform::kDaemonName)
+        .value_or(std::move(otherwise));
   };
   Value taskID = preference("TaskingID", "(no tasking id)");
   Value taskDigest = preference("TaskingDigest", "(no tasking digest)");
@@ -56,11 +57,12 @@ Dictionary buildLog(LogHeader header, Sections sections, const ActivatedAppInfo*
 
 void submitLog(const Services& services, const std::string& log) {
   Dictionary options;
-  const auto stored = services.preferences.QNSPreferencesGetValue(kLastOSVersion, kDomain);
+  const auto stored =
+      services.preferences.QNSPreferencesGetValue(kLastOSVersion, platform::kDaemonName);
   const Value current = services.systemVersion.operatingSystemVersion();
   if (!stored || !(*stored == current)) {
-    services.preferences.QNSPreferencesSetValue(kLastOSVersion, &current, kDomain);
-    services.preferences.QNSPreferencesSynchronize(kDomain);
+    services.preferences.QNSPreferencesSetValue(kLastOSVersion, &current, platform::kDaemonName);
+    services.preferences.QNSPreferencesSynchronize(platform::kDaemonName);
     options.set("previous_os_version", stored.value_or("<unknown>"));
   }
   const bool submitted = services.submission.QNSWriteLogForSubmission(

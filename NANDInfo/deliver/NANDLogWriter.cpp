@@ -9,6 +9,7 @@
 #include "platform/FaultwatchSupport.h"
 #include "platform/Kernel.h"
 #include "platform/LogSubmission.h"
+#include "platform/Names.h"
 #include "platform/PreferenceStore.h"
 #include "platform/SystemLog.h"
 
@@ -20,14 +21,13 @@ using plist::Value;
 
 namespace {
 
-constexpr char kDomain[] = "com.norba.pellorand.morvend";
 constexpr char kLastLoggedKey[] = "SSLastLoggedAt";
 constexpr double kInterval = 604800;  // seconds
 
 // A time in the future counts as recent. What is skipped is logged.
 bool wasWrittenRecently(platform::PreferenceStore& preferences, platform::SystemLog& systemLog,
                         Date now) {
-  const auto stored = preferences.QNSPreferencesGetValue(kLastLoggedKey, kDomain);
+  const auto stored = preferences.QNSPreferencesGetValue(kLastLoggedKey, platform::kDaemonName);
   const Date* last = stored ? stored->as<Date>() : nullptr;
   if (last == nullptr || !(now.secondsSince1970 - last->secondsSince1970 < kInterval)) return false;
   systemLog.log(LogLevel::standard, "NANDLogWriter:Last written at %s current %s :skipped",
@@ -59,8 +59,8 @@ void writeNANDLog(const Services& services, std::string_view logType,
         logType, "StorageStatus", nullptr,
         [&text](platform::LogHandle& handle) { handle.write(text); });
     const Value written(now);
-    services.preferences.QNSPreferencesSetValue(kLastLoggedKey, &written, kDomain);
-    services.preferences.QNSPreferencesSynchronize(kDomain);
+    services.preferences.QNSPreferencesSetValue(kLastLoggedKey, &written, platform::kDaemonName);
+    services.preferences.QNSPreferencesSynchronize(platform::kDaemonName);
   } catch (const std::exception& exception) {
     services.log.log(LogLevel::standard, "An exception occurred: %s", exception.what());
   }
