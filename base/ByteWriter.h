@@ -1,24 +1,17 @@
-// Numbers as little-endian bytes: what ByteReader reads.
+// Numbers appended as little-endian bytes: what ByteReader reads.
 #pragma once
 
 #include <array>
 #include <bit>
 #include <cstddef>
-#include <type_traits>
 
 namespace base {
 
-template <typename Number>
-requires std::is_arithmetic_v<Number> std::array<std::byte, sizeof(Number)> littleEndianBytes(
-    Number value) {
-  static_assert(std::endian::native == std::endian::little);
-  return std::bit_cast<std::array<std::byte, sizeof(Number)>>(value);
-}
-
-// To bytes of any type: std::byte, char, std::uint8_t.
+// An integer or a real number, to bytes of any type: std::byte, char, std::uint8_t.
 template <typename Bytes, typename Number>
 void appendLittleEndian(Bytes& bytes, Number value) {
-  for (const std::byte byte : littleEndianBytes(value)) {
+  static_assert(std::endian::native == std::endian::little);
+  for (const std::byte byte : std::bit_cast<std::array<std::byte, sizeof(Number)>>(value)) {
     bytes.push_back(static_cast<typename Bytes::value_type>(byte));
   }
 }

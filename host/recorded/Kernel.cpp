@@ -13,7 +13,7 @@
 #include <memory>
 #include <vector>
 
-#include "base/ByteWriter.h"
+#include "base/ByteReader.h"
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"
 

@@ -113,8 +113,7 @@ base::Result<void> ControllerCapture::captureBuffers(const DriverService& servic
   }
   for (std::uint32_t argument = 0; argument < kind.arguments; ++argument) {
     invocation_.progress(base::format("%s %u", kind.name, argument));
-    if (auto done = captureBuffer(service, kind, *selectors, argument); !error.empty())
-      return error;
+    if (auto done = captureBuffer(service, kind, *selectors, argument); !done) return done;
   }
   return {};
 }
@@ -155,7 +154,7 @@ base::Result<void> ControllerCapture::captureBuffer(const DriverService& service
   std::string& file = files_[digest];
   if (file.empty()) {
     file = base::format("%s-%u.bin", kind.name, argument);
-    if (std::string error = folder_.write(file, bytes); !done) return done;
+    if (auto done = folder_.write(file, bytes); !done) return done;
   }
   buffers.push_back(Dictionary{{"name", kind.name},
                                {"opType", std::uint64_t{selectors.dataOpType}},
