@@ -16,7 +16,8 @@ std::int64_t floorDivide(std::int64_t a, std::int64_t b) { return a / b - (a % b
 
 }  // namespace
 
-// Years are counted from March, so that the leap day is the last of its year.
+// By hand, because a clock may be off by more than the 32,767 years that <chrono> can name. Years
+// are counted from March, so that the leap day is the last of its year.
 CivilDate civilFromDays(std::int64_t daysSince1970) {
   const std::int64_t shifted = daysSince1970 + kEpochShift;
   const std::int64_t era = floorDivide(shifted, kDaysPerEra);
