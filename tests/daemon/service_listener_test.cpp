@@ -85,7 +85,7 @@ TEST_F(ServiceTest, ActsOnMessagesAsTheHandshakeSays) {
       {{Dictionary{}, delivery}, {kWaiting, kRequested, kSequence}, 1},
       {{Dictionary{{"operation", "2"}}, delivery}, {kWaiting, kRequested, kSequence}, 1},
       {{Dictionary{{"operation", 1}, {"value", 2.0}}}, {"daily tasks for day 0"}, 0},
-      {{Dictionary{{"operation", true}, {"value", 7}}}, {"daily tasks for day 7"}, 0},
+      {{Dictionary{{"operation", true}, {"value", 20000}}}, {kSequence}, 0},
       // Only the low 32 bits count.
       {{Dictionary{{"operation", ~std::uint64_t{0} - 0xfffffffe}}}, {"daily tasks for day 0"}, 0},
       {{run(0x7'0000'0000 - 1)}, {"daily tasks for day -1"}, 0},
@@ -109,7 +109,7 @@ TEST_F(ServiceTest, HandsTheDeliveredApplicationsToTheReport) {
                         {"orlo_id", std::int64_t{7}},
                         {"arch", std::uint64_t{2}},
                         {"uuid", Data{0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 255}}};
-  const Dictionary wrong{{"version", 5}, {"uuid", Data{1, 2}}, {"orlo_id", true}, {"arch", 9.0}};
+  const Dictionary wrong{{"version", 5}, {"uuid", Data{1, 2}}, {"orlo_id", "7"}, {"arch", 9.0}};
   const auto lines = serve({operation(0), deliver({sent, "not a dictionary", wrong, sent})});
   const Dictionary taken{{"bundle", "com.b"},
                          {"version", "1.0"},
