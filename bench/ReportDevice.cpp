@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <random>
 #include <stdexcept>
+#include <system_error>
 
 #include "base/CivilDate.h"
 #include "plist/PropertyList.h"

@@ -4,7 +4,6 @@
 #include <cstdlib>
 #include <stdexcept>
 #include <string>
-#include <utility>
 
 #include "base/CivilDate.h"
 #include "bench/Process.h"

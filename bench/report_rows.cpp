@@ -1,5 +1,6 @@
 // The whitelist lookup, and the statistics of a distribution.
 
+#include <algorithm>
 #include <random>
 #include <string>
 #include <vector>

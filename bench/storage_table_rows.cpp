@@ -1,10 +1,10 @@
 // The storage library's tables: expanded once, then asked for every counter.
 #include <cstring>
 #include <string>
-#include <string_view>
 #include <unordered_map>
 #include <vector>
 
+#include "NANDInfo/KeyMap.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/NameTable.h"
 #include "NANDInfo/Whitelists.h"

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <string>
 
 #include "base/ByteReader.h"
 

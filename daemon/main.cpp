@@ -1,7 +1,5 @@
 // morvend: turns the device's counters into its daily report, and exits.
 
-#include <string>
-
 #include "base/Result.h"
 #include "daemon/Entry.h"
 #include "host/Host.h"

@@ -4,7 +4,6 @@
 #include <cstdlib>
 #include <span>
 
-#include "NANDInfo/NANDInfo.h"
 #include "tools/nandinfo/DecodedBuffer.h"
 #include "tools/nandinfo/TableText.h"
 

@@ -3,6 +3,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <span>
 #include <string>
 
 #include "PropertyListRoundTrip.h"

@@ -1,7 +1,6 @@
 // The system log.
 #pragma once
 
-#include <cstdarg>
 #include <string_view>
 
 #include "base/Exported.h"

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <variant>
 
 #include "base/Text.h"
 #include "base/Timestamp.h"

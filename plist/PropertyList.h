@@ -1,12 +1,12 @@
-// Property lists as bytes.
+// Property lists as bytes: read, and by XMLWriter.h written.
 #pragma once
 
 #include <cstddef>
-#include <string>
 #include <string_view>
 
 #include "base/Result.h"
 #include "plist/Value.h"
+#include "plist/XMLWriter.h"
 
 namespace plist {
 
@@ -17,10 +17,5 @@ inline constexpr std::size_t kMaxSize = std::size_t{16} << 20;
 // the place: a line or an offset. Integers become int64, or uint64 where they are larger; reals of
 // four bytes float, others double.
 base::Result<Value> read(std::string_view bytes);
-
-// Writes XML, version 1.0. What can't stand in XML (characters that it forbids, text that is not
-// UTF-8) becomes U+FFFD; dates are in whole seconds. Fails on nesting deeper than kMaxDepth. `read`
-// reads an equal value from it.
-base::Result<std::string> writeXML(const Value& value);
 
 }  // namespace plist

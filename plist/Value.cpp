@@ -1,9 +1,8 @@
 #include "plist/Value.h"
 
 #include <algorithm>
-#include <array>
-#include <cmath>
 #include <cstring>
+#include <initializer_list>
 
 #include "base/CivilDate.h"
 #include "base/Convert.h"

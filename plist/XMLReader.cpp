@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <memory>
 #include <optional>
+#include <system_error>
+#include <utility>
 
 #include "base/Text.h"
 #include "base/Timestamp.h"

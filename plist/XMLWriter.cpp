@@ -1,9 +1,10 @@
-#include "plist/PropertyList.h"
+#include "plist/XMLWriter.h"
 
 #include <algorithm>
 #include <array>
 #include <cstring>
 #include <optional>
+#include <variant>
 
 #include "base/Text.h"
 #include "base/Timestamp.h"

@@ -1,7 +1,6 @@
 #include "report/Collectors.h"
 
 #include <array>
-#include <cmath>
 #include <cstddef>
 #include <limits>
 #include <optional>

@@ -1,5 +1,6 @@
 #include "report/OptionsTable.h"
 
+#include <cstdint>
 #include <utility>
 
 namespace report {

@@ -11,6 +11,10 @@ sources | xargs clang-format --dry-run --Werror || failed=1
 echo "== manual pages"
 tools/check_pages.sh || failed=1
 
+echo "== sources"
+tools/check_sources.py || failed=1
+tools/check_includes.py || failed=1
+
 echo "== rooms"
 cmake --preset release -DMORVEND_TESTS=ON >/dev/null
 cmake --build --preset release -- --quiet

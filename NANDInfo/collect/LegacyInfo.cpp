@@ -3,6 +3,7 @@
 #include <array>
 #include <string_view>
 
+#include "NANDInfo/KeyMap.h"
 #include "NANDInfo/Keys.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/decode/Weeks.h"

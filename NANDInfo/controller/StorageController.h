@@ -3,7 +3,6 @@
 
 #include <cstdint>
 #include <optional>
-#include <span>
 
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/DriverService.h"

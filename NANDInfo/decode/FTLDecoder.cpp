@@ -4,6 +4,7 @@
 #include <array>
 #include <charconv>
 #include <string_view>
+#include <system_error>
 
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/decode/Complaint.h"

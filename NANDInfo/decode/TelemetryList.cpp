@@ -2,7 +2,7 @@
 
 #include <algorithm>
 #include <iterator>
-#include <string>
+#include <tuple>
 
 #include "NANDInfo/decode/Hex.h"
 #include "base/ByteReader.h"

@@ -1,8 +1,10 @@
 #include "NANDInfo/CounterDictionary.h"
 
+#include <algorithm>
 #include <unordered_set>
 
 #include "NANDInfo/Events.h"
+#include "NANDInfo/KeyMap.h"
 #include "NANDInfo/Whitelists.h"
 #include "NANDInfo/vocabulary/CounterLists.h"
 

@@ -1,4 +1,8 @@
-#include "NANDInfo/Whitelists.h"
+#include "NANDInfo/KeyMap.h"
+
+#include <optional>
+#include <string>
+#include <string_view>
 #include "NANDInfo/vocabulary/CounterLists.h"
 
 namespace NANDInfo {

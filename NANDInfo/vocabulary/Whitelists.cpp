@@ -3,6 +3,7 @@
 #include <array>
 #include <bit>
 #include <cmath>
+#include <string_view>
 
 #include "NANDInfo/vocabulary/CounterLists.h"
 #include "base/Convert.h"

@@ -13,7 +13,6 @@
 
 #include <chrono>
 #include <memory>
-#include <string>
 #include <string_view>
 
 #include "platform/EventLoop.h"

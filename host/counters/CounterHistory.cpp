@@ -3,7 +3,6 @@
 #include <array>
 #include <bit>
 #include <cstring>
-#include <limits>
 #include <string>
 
 #include "base/UTF8.h"

@@ -3,6 +3,7 @@
 #include <array>
 #include <cmath>
 #include <functional>
+#include <optional>
 #include <vector>
 
 #include "base/ByteWriter.h"

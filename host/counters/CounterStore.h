@@ -1,8 +1,12 @@
 // The counters service and the history store: an SQLite database below the device root.
 #pragma once
 
+#include <functional>
+#include <memory>
 #include <mutex>
+#include <optional>
 #include <span>
+#include <string>
 
 #include "host/counters/CounterHistory.h"
 #include "platform/Clock.h"

@@ -1,5 +1,7 @@
 #include "host/files/DeviceFile.h"
 
+#include <system_error>
+
 #include "host/files/SystemError.h"
 #include "plist/PropertyList.h"
 

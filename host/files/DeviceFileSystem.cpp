@@ -1,5 +1,10 @@
 #include "host/files/DeviceFileSystem.h"
 
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
 #include <sys/stat.h>
 #include <sys/statvfs.h>
 

@@ -1,5 +1,8 @@
 #include "host/files/DeviceRoot.h"
 
+#include <cstdint>
+#include <system_error>
+
 #include <fcntl.h>
 #include <linux/openat2.h>
 #include <sys/stat.h>

@@ -9,6 +9,7 @@
 #include <array>
 #include <cstdio>
 #include <memory>
+#include <system_error>
 #include <tuple>
 
 #include "host/files/SystemError.h"

@@ -1,6 +1,7 @@
 #include "host/files/SystemError.h"
 
 #include <cstring>
+#include <system_error>
 
 namespace host {
 

@@ -6,7 +6,10 @@
 #include <cerrno>
 #include <cstring>
 #include <map>
+#include <string_view>
+#include <system_error>
 #include <tuple>
+#include <utility>
 
 #include "host/files/SystemError.h"
 

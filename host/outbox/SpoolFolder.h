@@ -12,7 +12,6 @@
 #include <memory>
 #include <set>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include "host/files/DeviceRoot.h"

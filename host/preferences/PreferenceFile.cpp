@@ -4,6 +4,7 @@
 
 #include <cstdio>
 #include <limits>
+#include <system_error>
 
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"

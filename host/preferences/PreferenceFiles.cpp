@@ -1,6 +1,9 @@
 #include "host/preferences/PreferenceFiles.h"
 
+#include <cstdint>
+#include <optional>
 #include <tuple>
+#include <utility>
 
 #include "host/files/Files.h"
 

@@ -1,5 +1,7 @@
 #include "host/process/LibraryLoader.h"
 
+#include <string_view>
+
 #include <dlfcn.h>
 #include <sys/stat.h>
 

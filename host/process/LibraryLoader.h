@@ -1,6 +1,7 @@
 // Libraries of the device, loaded into this process.
 #pragma once
 
+#include <functional>
 #include <map>
 #include <string>
 

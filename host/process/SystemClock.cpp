@@ -1,6 +1,7 @@
 #include "host/process/SystemClock.h"
 
 #include <cmath>
+#include <cstdint>
 #include <ctime>
 
 #include "base/Convert.h"

@@ -1,5 +1,8 @@
 #include "host/recorded/Applications.h"
 
+#include <functional>
+#include <string>
+
 namespace host::recorded {
 
 void Applications::enumerateBundles(const std::function<void(BundleType type)>& handler) {

@@ -4,6 +4,8 @@
 #include <systemd/sd-id128.h>
 
 #include <array>
+#include <cstdint>
+#include <optional>
 
 #include "host/files/DeviceFileSystem.h"
 #include "host/files/Files.h"

@@ -1,6 +1,11 @@
 #include "host/recorded/DeviceRegistry.h"
 
 #include <algorithm>
+#include <cstddef>
+#include <span>
+#include <string>
+#include <string_view>
+#include <utility>
 
 namespace host::recorded {
 

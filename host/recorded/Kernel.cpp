@@ -10,8 +10,7 @@
 #include <cerrno>
 #include <cstring>
 #include <ctime>
-#include <memory>
-#include <vector>
+#include <system_error>
 
 #include "base/ByteReader.h"
 #include "host/files/Files.h"

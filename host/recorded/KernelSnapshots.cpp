@@ -1,5 +1,10 @@
 #include "host/recorded/KernelSnapshots.h"
 
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <vector>
+
 namespace host::recorded {
 
 std::optional<std::vector<std::byte>> KernelSnapshots::capture(std::uint32_t flags) {

@@ -2,6 +2,8 @@
 // this machine's environment.
 #pragma once
 
+#include <string_view>
+
 #include "host/files/DeviceFile.h"
 #include "platform/LocaleService.h"
 

@@ -1,6 +1,7 @@
 #include "host/recorded/NetworkUsage.h"
 
 #include <algorithm>
+#include <cstdint>
 #include <system_error>
 
 #include "base/Convert.h"

@@ -1,5 +1,7 @@
 #include "host/recorded/PurgeableSpace.h"
 
+#include <optional>
+
 namespace host::recorded {
 
 bool PurgeableSpace::isPresent() { return file_.value() != nullptr; }

@@ -1,5 +1,11 @@
 #include "host/recorded/ReportingChannels.h"
 
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
 namespace host::recorded {
 
 namespace {

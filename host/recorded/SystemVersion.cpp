@@ -1,5 +1,8 @@
 #include "host/recorded/SystemVersion.h"
 
+#include <algorithm>
+#include <optional>
+
 #include <fcntl.h>
 
 #include "host/files/Files.h"

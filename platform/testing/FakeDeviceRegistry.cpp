@@ -1,6 +1,8 @@
 #include "platform/testing/FakeDeviceRegistry.h"
 
 #include <algorithm>
+#include <span>
+#include <string_view>
 
 #include "base/Text.h"
 

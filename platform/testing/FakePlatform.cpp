@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <span>
+#include <string_view>
 #include <thread>
 
 #include "base/Text.h"

@@ -1,6 +1,7 @@
 #include "platform/testing/RecordingLog.h"
 
 #include <algorithm>
+#include <string_view>
 
 namespace platform::fakes {
 

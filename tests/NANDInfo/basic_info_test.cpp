@@ -4,6 +4,9 @@
 
 #include "support/StorageDevice.h"
 
+#include <cstdint>
+#include <optional>
+
 namespace NANDInfo {
 namespace {
 

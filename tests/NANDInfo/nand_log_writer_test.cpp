@@ -4,7 +4,9 @@
 
 #include <gtest/gtest.h>
 
+#include <limits>
 #include <stdexcept>
+#include <vector>
 
 #include "NANDInfo/deliver/NANDLog.h"
 #include "support/TestPlatform.h"

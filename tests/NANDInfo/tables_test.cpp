@@ -12,6 +12,7 @@
 
 #include "NANDInfo/CounterRecords.h"
 #include "NANDInfo/Events.h"
+#include "NANDInfo/KeyMap.h"
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Whitelists.h"
 #include "base/Text.h"

@@ -2,7 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <initializer_list>
 #include <limits>
+#include <optional>
+#include <vector>
 
 #include "daemon/Entry.h"
 #include "platform/EventLoop.h"

@@ -1,5 +1,9 @@
 #include "daemon/ServiceListener.h"
 
+#include <cstdint>
+#include <optional>
+#include <vector>
+
 #include <gtest/gtest.h>
 
 #include "daemon/Entry.h"

@@ -1,5 +1,8 @@
 #include "daemon/Tasking.h"
 
+#include <optional>
+#include <vector>
+
 #include <gtest/gtest.h>
 
 #include "support/TestPlatform.h"

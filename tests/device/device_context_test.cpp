@@ -1,5 +1,7 @@
 #include "device/DeviceContext.h"
 
+#include <vector>
+
 #include <gtest/gtest.h>
 
 #include "support/TestPlatform.h"

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <system_error>
 
 #include "base/CivilDate.h"
 #include "base/Text.h"

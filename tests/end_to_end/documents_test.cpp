@@ -9,10 +9,12 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <regex>
 #include <set>
 #include <sstream>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "end_to_end/Device.h"
@@ -68,7 +70,8 @@ TEST(Documents, ManualPagesNameWhatTheHelpNames) {
 // A counter, an event, a notification or a preference domain that the day uses in silence.
 TEST(Documents, TheDayAndItsDataNameEveryKey) {
   const std::string documents = contentOf("docs/DATA.md") + contentOf("docs/DAY.md");
-  std::vector<std::filesystem::path> sources = {"NANDInfo/include/NANDInfo/Events.h", "NANDInfo/deliver/NANDLogWriter.cpp",
+  std::vector<std::filesystem::path> sources = {"NANDInfo/include/NANDInfo/Events.h",
+                                                "NANDInfo/deliver/NANDLogWriter.cpp",
                                                 "NANDInfo/deliver/StructuredLogs.cpp"};
   for (const char* room : {"daemon", "report"}) {
     for (const auto& file : std::filesystem::directory_iterator(kSource / room)) {

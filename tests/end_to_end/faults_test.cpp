@@ -4,6 +4,7 @@
 #include <signal.h>
 
 #include <algorithm>
+#include <cstddef>
 #include <filesystem>
 #include <nlohmann/json.hpp>
 

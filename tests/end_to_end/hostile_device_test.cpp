@@ -5,7 +5,9 @@
 
 #include <filesystem>
 #include <functional>
+#include <iterator>
 #include <random>
+#include <utility>
 
 #include "NANDInfo/APIErrorMessage.h"
 #include "NANDInfo/Controller.h"

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <utility>
 
 #include "faults/FaultRun.h"
 #include "support/TemporaryFolder.h"

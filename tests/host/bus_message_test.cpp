@@ -1,5 +1,9 @@
 #include "host/bus/BusMessage.h"
 
+#include <cstdint>
+#include <string>
+#include <vector>
+
 #include <gtest/gtest.h>
 
 #include "support/SealedMessage.h"

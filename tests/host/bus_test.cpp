@@ -4,7 +4,8 @@
 
 #include <atomic>
 #include <chrono>
-#include <ctime>
+#include <cstdint>
+#include <iterator>
 #include <thread>
 
 #include "platform/testing/RecordingLog.h"

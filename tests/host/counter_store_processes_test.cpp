@@ -3,7 +3,10 @@
 #include <sys/wait.h>
 
 #include <algorithm>
+#include <cstdint>
+#include <filesystem>
 #include <functional>
+#include <iterator>
 #include <random>
 #include <sstream>
 

@@ -3,7 +3,10 @@
 #include <sys/wait.h>
 
 #include <cmath>
+#include <filesystem>
+#include <fstream>
 #include <limits>
+#include <optional>
 
 #include "counter_store_support.h"
 #include "platform/PLHistory.h"

@@ -1,7 +1,8 @@
 // A counters store over a temporary device root, and what a history holds as text.
 #pragma once
 
-#include <map>
+#include <filesystem>
+#include <optional>
 #include <string>
 #include <vector>
 

@@ -4,14 +4,18 @@
 #include <sys/stat.h>
 #include <systemd/sd-id128.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <future>
+#include <limits>
 #include <regex>
 #include <set>
+#include <span>
 #include <thread>
+#include <utility>
 
 #include "host/files/DeviceFile.h"
 #include "host/files/DeviceFileSystem.h"

@@ -1,7 +1,7 @@
 // The registry and its drivers, over one registry file.
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <filesystem>
 
 #include "HostServices.h"
 #include "host/files/DeviceFileSystem.h"

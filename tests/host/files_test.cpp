@@ -1,5 +1,8 @@
 #include "host/files/Files.h"
 
+#include <filesystem>
+#include <utility>
+
 #include <fcntl.h>
 #include <gtest/gtest.h>
 

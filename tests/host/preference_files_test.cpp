@@ -1,5 +1,7 @@
 #include "host/preferences/PreferenceFiles.h"
 
+#include <filesystem>
+
 #include <gtest/gtest.h>
 #include <sys/wait.h>
 #include <unistd.h>

@@ -2,7 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <map>
+#include <string_view>
+#include <utility>
 
 #include "HostServices.h"
 

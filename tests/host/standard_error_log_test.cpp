@@ -6,6 +6,7 @@
 #include <stdlib.h>
 
 #include <array>
+#include <string>
 
 #include "host/files/FileDescriptor.h"
 

@@ -5,6 +5,9 @@
 #include <unistd.h>
 
 #include "HostServices.h"
+
+#include <array>
+#include <filesystem>
 #include "host/files/DeviceFileSystem.h"
 #include "host/process/StandardStreams.h"
 #include "host/recorded/DeviceProperties.h"

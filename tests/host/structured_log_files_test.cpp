@@ -1,5 +1,9 @@
 #include "host/outbox/StructuredLogFiles.h"
 
+#include <cstdint>
+#include <filesystem>
+#include <utility>
+
 #include <gtest/gtest.h>
 
 #include "HostServices.h"

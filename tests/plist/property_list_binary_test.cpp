@@ -1,7 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <limits>
 #include <tuple>
+#include <utility>
 
 #include "plist/BinaryReader.h"
 #include "plist/PropertyList.h"

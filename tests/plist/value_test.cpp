@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <limits>
+#include <type_traits>
 
 #include "base/Convert.h"
 #include "base/Text.h"

@@ -2,8 +2,10 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
+#include <cstdint>
+#include <optional>
 #include <random>
+#include <vector>
 
 #include "support/TestPlatform.h"
 

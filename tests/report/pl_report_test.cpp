@@ -3,7 +3,10 @@
 #include <gtest/gtest.h>
 
 #include <functional>
+#include <initializer_list>
+#include <map>
 #include <new>
+#include <vector>
 
 #include "platform/InstalledApplications.h"
 #include "platform/Kernel.h"

@@ -4,7 +4,6 @@
 
 #include <bit>
 #include <cstdint>
-#include <initializer_list>
 #include <string>
 #include <string_view>
 #include <vector>

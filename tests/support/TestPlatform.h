@@ -1,6 +1,7 @@
 // The fakes, and shorthands for what tests set up again and again.
 #pragma once
 
+#include <initializer_list>
 #include <string>
 
 #include "platform/SystemLog.h"

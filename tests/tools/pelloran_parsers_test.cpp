@@ -2,6 +2,9 @@
 
 #include "tools/pelloran/ImportLine.h"
 
+#include <utility>
+#include <vector>
+
 namespace {
 
 using Kind = host::CounterChange::Kind;

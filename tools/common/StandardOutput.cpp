@@ -4,6 +4,7 @@
 
 #include <csignal>
 #include <string_view>
+#include <system_error>
 
 #include "host/files/Files.h"
 

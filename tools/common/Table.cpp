@@ -9,7 +9,6 @@
 #include <memory>
 #include <new>
 #include <string_view>
-#include <utility>
 
 #include "base/UTF8.h"
 #include "tools/common/TerminalText.h"

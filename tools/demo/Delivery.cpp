@@ -2,7 +2,9 @@
 
 #include <systemd/sd-bus.h>
 
+#include <algorithm>
 #include <chrono>
+#include <cstdint>
 #include <cstring>
 #include <memory>
 #include <thread>

@@ -1,7 +1,6 @@
 // By which rule of the whitelist a counter is reported.
 #pragma once
 
-#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>

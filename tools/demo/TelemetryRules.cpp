@@ -3,6 +3,7 @@
 #include <set>
 
 #include "NANDInfo/Events.h"
+#include "NANDInfo/KeyMap.h"
 #include "NANDInfo/Whitelists.h"
 #include "base/Text.h"
 

@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 #include <iostream>
+#include <vector>
 
 #include "tools/demo/Delivery.h"
 #include "tools/demo/ShowKept.h"

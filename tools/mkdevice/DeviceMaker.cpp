@@ -5,8 +5,7 @@
 
 #include <array>
 #include <filesystem>
-#include <memory>
-#include <optional>
+#include <system_error>
 
 #include "base/CivilDate.h"
 #include "base/Text.h"

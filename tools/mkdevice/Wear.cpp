@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <string>
 
 #include "base/CivilDate.h"
 #include "base/Convert.h"

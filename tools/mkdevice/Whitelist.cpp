@@ -1,6 +1,7 @@
 #include "tools/mkdevice/Whitelist.h"
 
 #include <cmath>
+#include <string_view>
 
 #include "tools/mkdevice/SampleCounters.h"
 #include "tools/mkdevice/Vocabulary.h"

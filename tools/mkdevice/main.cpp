@@ -8,6 +8,7 @@
 #include <iostream>
 #include <span>
 #include <string>
+#include <system_error>
 #include <vector>
 
 #include "base/CivilDate.h"

@@ -1,9 +1,12 @@
 #include "tools/nandinfo/Capture.h"
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <cstddef>
+#include <initializer_list>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "NANDInfo/Events.h"

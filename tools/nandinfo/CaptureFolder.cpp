@@ -1,5 +1,7 @@
 #include "tools/nandinfo/CaptureFolder.h"
 
+#include <system_error>
+
 #include <fcntl.h>
 #include <sys/stat.h>
 

@@ -4,7 +4,6 @@
 
 #include <map>
 #include <string>
-#include <string_view>
 
 #include "NANDInfo/Controller.h"
 #include "NANDInfo/DriverService.h"

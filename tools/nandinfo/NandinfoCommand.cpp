@@ -7,6 +7,7 @@
 #include <optional>
 #include <span>
 #include <string_view>
+#include <system_error>
 
 #include "NANDInfo/NANDInfo.h"
 #include "base/Text.h"

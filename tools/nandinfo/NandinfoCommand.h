@@ -3,7 +3,6 @@
 
 #include <cstddef>
 #include <ostream>
-#include <string>
 
 #include "NANDInfo/Services.h"
 #include "tools/common/CommandLog.h"

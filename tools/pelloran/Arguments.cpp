@@ -3,6 +3,7 @@
 #include <charconv>
 #include <cmath>
 #include <limits>
+#include <system_error>
 
 #include "base/CivilDate.h"
 #include "base/Convert.h"

@@ -1,8 +1,8 @@
 #include "tools/pelloran/ImportLine.h"
 
-#include <cmath>
 #include <nlohmann/json.hpp>
 #include <optional>
+#include <utility>
 #include <variant>
 
 #include "base/CivilDate.h"

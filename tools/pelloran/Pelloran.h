@@ -4,7 +4,7 @@
 #include <chrono>
 #include <functional>
 #include <iosfwd>
-#include <string>
+#include <ostream>
 
 #include "host/counters/CounterStore.h"
 #include "host/machine/MachineFigures.h"

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <iosfwd>
+#include <ostream>
 #include <string_view>
 
 #include "platform/PLHistory.h"

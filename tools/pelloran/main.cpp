@@ -6,7 +6,6 @@
 #include <thread>
 
 #include "host/Host.h"
-#include "platform/Clock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/StandardOutput.h"
 #include "tools/pelloran/Pelloran.h"

@@ -6,7 +6,6 @@
 // is called from one thread at a time.
 #pragma once
 
-#include <cstdint>
 #include <optional>
 
 #include "NANDInfo/APIErrorMessage.h"

@@ -1,7 +1,6 @@
 // Small dictionary, number and text helpers of the storage library.
 #pragma once
 
-#include <cstddef>
 #include <cstdint>
 #include <string_view>
 

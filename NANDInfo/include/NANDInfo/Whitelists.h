@@ -2,9 +2,6 @@
 #pragma once
 
 #include <cstdint>
-#include <optional>
-#include <string_view>
-#include <vector>
 
 #include "NANDInfo/NameTable.h"
 #include "base/Exported.h"
@@ -23,15 +20,6 @@ const NameTable& PrivacyApprovedSMagNANDFTLCounters_SigDigDict();
 
 // The derived fields that go with the MSP and storage statistics, in order.
 const NameTable& FTLStats4MSPStats();
-
-// The counters service's key of a legacy counter ("com.norba.NANDInfo." and a suffix), or none.
-std::optional<std::string_view> keyMapKey(std::string_view counter);
-
-// Every legacy counter that has such a key.
-struct KeyMapEntry {
-  std::string_view counter, key;
-};
-std::vector<KeyMapEntry> keyMapEntries();
 
 // The entries whose key the collection holds, in their order; null lets everything through.
 plist::Dictionary CreateFilteredDict(plist::Dictionary dictionary, const NameTable* allowed);

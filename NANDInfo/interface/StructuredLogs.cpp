@@ -1,7 +1,6 @@
-// What is logged, under the names of the library's interface.
+#include "NANDInfo/StructuredLogs.h"
 
 #include "NANDInfo/NANDLogWriter.h"
-#include "NANDInfo/StructuredLogs.h"
 #include "NANDInfo/Utilities.h"
 #include "NANDInfo/collect/BasicInfo.h"
 #include "NANDInfo/collect/LegacyInfo.h"
