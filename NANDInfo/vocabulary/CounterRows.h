@@ -43,7 +43,7 @@ enum CounterList : std::uint16_t {
 inline constexpr std::uint8_t kNoDigits = 0xFF;
 
 // Keys of the counters service: none, or the counter's own name.
-inline constexpr const char* kNone = nullptr;
+inline constexpr char kNone[] = "-";
 inline constexpr char kSame[] = "";
 
 // A counter of the FTL statistics. Names of an array's elements end in "_" and the index, those of
@@ -56,7 +56,9 @@ struct FTLCounter : FTLKey {
         digits(significantDigits),
         lists(static_cast<std::uint16_t>(goesTo | (digits != kNoDigits ? kFTL : 0) |
                                          (goesTo & (kAccum | kDynamic) ? kMagazine : 0))),
-        serviceKey(suffix != kNone && *suffix == *kSame ? itsName : suffix),
+        serviceKey(*suffix == *kNone   ? nullptr
+                   : *suffix == *kSame ? itsName
+                                       : suffix),
         only(part) {}
 
   std::uint8_t digits;  // a counter that has some is in the whitelist

@@ -70,7 +70,8 @@ TEST_F(CounterStoreRows, ClientsRecordForTodayAndAFailureIsSaidOnce) {
 }
 
 TEST_F(CounterStoreRows, RowsComeByDayThenBytesOfTheKeyWithinTheBounds) {
-  for (const std::string_view key : {"b", "\xC3\xA4", "B", "a", ""}) here.store.set(key, 1, -3);
+  for (const std::string_view key : {"b", "\xC3\xA4", "B", "a", ""})
+    EXPECT_TRUE(here.store.set(key, 1, -3));
   EXPECT_TRUE(here.store.set("ab", 2, -3));
   EXPECT_TRUE(here.store.set("a", 3, INT32_MAX));
   EXPECT_TRUE(here.store.set("a", 4, INT32_MIN));
@@ -105,7 +106,7 @@ TEST_F(CounterStoreRows, SamplesKeepTheirOrderAcrossCheckpointsAndBlocks) {
 }
 
 TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsTheRows) {
-  for (int i = 0; i < 600; ++i) here.store.push(i % 2 == 0 ? "a" : "b", i, 1, 0);
+  for (int i = 0; i < 600; ++i) EXPECT_TRUE(here.store.push(i % 2 == 0 ? "a" : "b", i, 1, 0));
   here.store.PLClientCheckpoint();
   EXPECT_TRUE(here.store.push("a", 600, 1, 0));
   EXPECT_TRUE(here.store.push("c", 1, 1, 0));
@@ -134,7 +135,8 @@ TEST_F(CounterStoreRows, ASeriesTellsOnTheLastDayButOneWhetherItComesAgain) {
     const char* keys;
   } days[] = {{0, "c"}, {5, "abcd"}, {6, "bde"}};
   for (const auto& [day, keys] : days) {
-    for (const char* key = keys; *key != '\0'; ++key) here.store.push({key, 1}, 1, day, 0);
+    for (const char* key = keys; *key != '\0'; ++key)
+      EXPECT_TRUE(here.store.push({key, 1}, 1, day, 0));
   }
   here.store.PLClientCheckpoint();
   const auto again = [&](std::int32_t first, std::int32_t last) {

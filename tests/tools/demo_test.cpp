@@ -59,7 +59,7 @@ TEST(DemoLeft, NamesEachThingThatLeftAndReadsOnOverWhatIsBroken) {
   host::Host host({.root = root.path()});
   for (const char* key : {"com.norba.NANDInfo.BandsPerInternalFlow3", "datausage.wifiInKB.a",
                           "com.norba.tarvenn.numAllInstalledApps", "host.loadavg.1m"}) {
-    host.counters().set(key, 1, host.services().counters.PLDaysSince1970());
+    EXPECT_TRUE(host.counters().set(key, 1, host.services().counters.PLDaysSince1970()));
   }
   demo::Device device(root.path().string());
   const std::string text = demo::showLeft(device, false);
