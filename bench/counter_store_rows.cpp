@@ -165,8 +165,8 @@ void addAppendRow(bench::Table& table) {
       "adding a sample, one transaction each", "bare SQLite append", 1.5, kAppends,
       [&] {
         for (int i = 0; i < kAppends; ++i) {
-          const auto error = device.store.push(key, i * 0.37, kDays, i);
-          if (!error.empty()) throw std::runtime_error(applied.error().text);
+          const auto pushed = device.store.push(key, i * 0.37, kDays, i);
+          if (!pushed) throw std::runtime_error(pushed.error().text);
         }
       },
       [&] {

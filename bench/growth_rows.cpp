@@ -25,11 +25,11 @@ class SampleDevice {
                                       mkdevice::distributionTable().size()) *
                   scale) {
     const std::int32_t today = base::dayNumber(host::SystemClock().now().secondsSince1970);
-    const std::string error = mkdevice::makeDevice({.folder = folder_.path(),
-                                                    .sample = {.scale = scale, .today = today},
-                                                    .module = FAULTWATCH_SUPPORT_MODULE},
-                                                   {[](const auto&) {}, [](const auto&) {}});
-    if (!error.empty()) throw std::runtime_error(error);
+    const auto made = mkdevice::makeDevice({.folder = folder_.path(),
+                                            .sample = {.scale = scale, .today = today},
+                                            .module = FAULTWATCH_SUPPORT_MODULE},
+                                           {[](const auto&) {}, [](const auto&) {}});
+    if (!made) throw std::runtime_error(made.error().text);
   }
 
   double counters() const { return counters_; }

@@ -62,30 +62,25 @@ std::map<std::string, double> figuresOfKernel() {
   return figures;
 }
 
-// A figure under another's key: one that is the same before and after is compared, until each has
-// been, which takes many looks at a busy machine.
+// A figure under another's key. They change while one looks: those of disks grow, those of memory
+// go up and down by less than the twentieth part of all.
 TEST(MachineFigures, OfDisksAndMemoryAreTheKernels) {
-  std::map<std::string, bool> compared;
-  const auto isDone = [&] {
-    return !compared.empty() &&
-           std::ranges::all_of(compared, [](const auto& row) { return row.second; });
-  };
-  for (int looks = 0; looks < 1000 && !isDone(); ++looks) {
-    const auto before = figuresOfKernel();
-    MachineFigures figures = host::machine::readMachineFigures();
-    const auto after = figuresOfKernel();
-    figures.measurements.insert(figures.measurements.end(), figures.counts.begin(),
-                                figures.counts.end());
-    for (const auto& [key, value] : figures.measurements) {
-      if (!key.starts_with("host.meminfo.") && !key.starts_with("host.disk.")) continue;
-      ASSERT_TRUE(before.contains(key)) << key;
-      const bool isStill = before.at(key) == after.at(key);
-      EXPECT_TRUE(!isStill || value == before.at(key)) << key << " " << value;
-      compared[key] |= isStill;
-    }
+  const auto before = figuresOfKernel();
+  MachineFigures figures = host::machine::readMachineFigures();
+  const auto after = figuresOfKernel();
+  figures.measurements.insert(figures.measurements.end(), figures.counts.begin(),
+                              figures.counts.end());
+  int compared = 0;
+  for (const auto& [key, value] : figures.measurements) {
+    const bool ofMemory = key.starts_with("host.meminfo.");
+    if (!ofMemory && !key.starts_with("host.disk.")) continue;
+    ASSERT_TRUE(before.contains(key) && after.contains(key)) << key;
+    const auto [low, high] = std::minmax(before.at(key), after.at(key));
+    const double slack = ofMemory ? before.at("host.meminfo.MemTotal") / 20 : 0;
+    EXPECT_TRUE(low - slack <= value && value <= high + slack) << key << " " << value;
+    ++compared;
   }
-  EXPECT_GE(compared.size(), 14u);
-  for (const auto& [key, was] : compared) EXPECT_TRUE(was) << key;
+  EXPECT_GE(compared, 14);
 }
 
 }  // namespace
