@@ -17,9 +17,7 @@ if(MORVEND_SANITIZE)
     -fsanitize=${MORVEND_SANITIZE} -fno-sanitize-recover=all -fno-omit-frame-pointer
     # Instrumented moves of variants look uninitialized to GCC 12; the release build keeps the check.
     $<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
-  target_link_options(morvend_options INTERFACE -fsanitize=${MORVEND_SANITIZE}
-    # A test's own allocation function goes before that of clang's sanitizers.
-    $<$<CXX_COMPILER_ID:Clang>:-Wl,-z,muldefs>)
+  target_link_options(morvend_options INTERFACE -fsanitize=${MORVEND_SANITIZE})
 endif()
 
 # room_headers(TARGET FOLDER): shows the headers of FOLDER (as in the source tree) to TARGET's users.

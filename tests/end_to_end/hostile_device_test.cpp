@@ -40,7 +40,7 @@ std::string runDay(
   NANDInfo::ResetExporters();
   support::freshErrors();
   NANDInfo::gForceCollectionSet = false;
-  const auto files = entriesOf("/proc/self/fd"), threads = entriesOf("/proc/self/task");
+  const auto files = entriesOf("/proc/self/fd");
   ::testing::internal::CaptureStderr();
   {
     host::Host host({.root = device.root().path()});
@@ -52,7 +52,8 @@ std::string runDay(
   }
   const std::string said = ::testing::internal::GetCapturedStderr();
   EXPECT_EQ(entriesOf("/proc/self/fd"), files) << said;
-  EXPECT_EQ(entriesOf("/proc/self/task"), threads) << said;
+  // The test's own, and one that the thread sanitizer starts with the first other one.
+  EXPECT_LE(entriesOf("/proc/self/task"), 2) << said;
   EXPECT_EQ(said.find("were not released"), std::string::npos) << said;
   EXPECT_EQ(linesOf(said).back(), "morvend ended");
   EXPECT_EQ(device.record("LastCrashLogSerializationDateInDaysSince1970"),

@@ -66,7 +66,7 @@ TEST(BusMessage, EachTypeBecomesItsCounterpartAndOthersAreLeftOut) {
       {"ay", variant("ay", 2, 1, 2), plist::Value(plist::Data{1, 2})},
       {"empty ay", variant("ay", 0), plist::Value(plist::Data{})},
       {"as", variant("as", 2, "a", "b"), plist::Value(plist::Array{"a", "b"})},
-      {"aai", variant("aai", 1, 1, 5), plist::Value(plist::Array{plist::Array{std::int64_t{5}}})},
+      {"aai", variant("aai", 1, 1, 5), plist::Array{plist::Value(plist::Array{std::int64_t{5}})}},
       {"av with a struct", variant("av", 2, "(is)", 1, "x", "s", "y"),
        plist::Value(plist::Array{"y"})},
       {"v in v", variant("v", "v", "i", 5), plist::Value(std::int64_t{5})},
