@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Little-endian numbers and runs of bytes out of foreign bytes, one after the other.
 #pragma once
 

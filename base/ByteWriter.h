@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Numbers appended as little-endian bytes: what ByteReader reads.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Day numbers and calendar dates: the proleptic Gregorian calendar in UTC, any year.
 #pragma once
 

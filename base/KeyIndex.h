@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Finds the places of keys in a list of entries that somebody else keeps: open addressing over the
 // keys' hashes.
 #pragma once

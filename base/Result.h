@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The one way to fail: a function that can fail returns a Result, which nobody may overlook.
 //
 // Who fails says why and hands that back; who stops handing it on logs it, or shows it. Nobody does

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Instants as text, in UTC: 2026-11-22T04:00:00Z. Years beyond 9999 have more digits, years before
 // year 0 a minus.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Text as UTF-8, and its way into formats that can't hold every character.
 #pragma once
 

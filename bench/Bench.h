@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Side-by-side measurement: our way of doing a thing beside a yardstick, in turns, in one run.
 #pragma once
 

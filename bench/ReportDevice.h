@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A device root with as many counters as a measurement wants.
 #pragma once
 

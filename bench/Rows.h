@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What is measured, by theme: each function adds its rows to the table.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The counters store beside bare SQLite: querying two of sixty days, and adding a sample.
 #include <sqlite3.h>
 

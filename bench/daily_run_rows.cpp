@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A whole day on a device with everything, for each kind of storage controller, and what its steps
 // take.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // How the cost of a day grows with its counters: the sample device with 1, 10 and 100 times its
 // counters.
 

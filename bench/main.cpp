@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Prints every measurement beside its yardstick, and which ones miss their goal.
 //
 // morvend_bench [GROUP...]: those of the groups alone.

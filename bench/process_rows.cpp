@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // morvend as a whole process: its start, the closed gate, and whole reports of two sizes.
 
 #include <cstdlib>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The property-list codec beside bare expat, and beside a loop that appends the same pieces.
 #include <expat.h>
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The whitelist lookup, and the statistics of a distribution.
 
 #include <algorithm>

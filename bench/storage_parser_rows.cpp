@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The parsers of the controller's counter buffers, beside what a list of separately allocated
 // records costs before it holds anything.
 #include <array>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The storage library's tables: expanded once, then asked for every counter.
 #include <cstring>
 #include <string>

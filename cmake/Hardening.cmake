@@ -1,3 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
+
 # What makes a fault harder to exploit, in the builds that are installed; tests/hardened.sh looks for
 # each in what was built.
 include(CheckPIESupported)

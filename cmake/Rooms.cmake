@@ -1,3 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
+
 # A room is a folder that is one target. Its users see its headers and nothing else: each room's
 # headers stand, as links, in an include folder of their own, so that an include which a target's
 # dependencies don't allow finds no file.

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The once-a-day gate and the daily sequence.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What each process has sent and received since the day before, from counters that only grow.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The messages of the named service "com.norba.pellorand.morvend".
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the daemon's own steps ask of the world outside, with what the report and the storage
 // library ask. References: whoever makes it keeps the services alive for as long.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Tasking: records of operating-system changes, preference changes that the analytics configuration
 // schedules, and the report of log types that are switched off.
 #pragma once

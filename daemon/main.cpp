@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // morvend: turns the device's counters into its daily report, and exits.
 
 #include "base/Result.h"

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Probes that tell what kind of device this is and where its counters data lie.
 //
 // What doesn't change during the life of the process is asked once and kept here.

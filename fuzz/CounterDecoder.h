@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What holds of every decoder of counter buffers, whatever the bytes.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Bus messages with arbitrary bodies: the input follows the header of a call with the body
 // signature a{sv}, and comes through a connection as a peer's bytes do.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Captured buffers as the command decodes them: whatever they are, each decoder says what came of
 // them, and nothing that it prints can move a terminal's cursor.
 #include <cstdint>

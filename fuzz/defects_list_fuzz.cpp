@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Defects lists: as many records as are claimed and fit.
 #include <algorithm>
 #include <cstdint>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Kernel snapshots. What is found is the payload of one of the snapshot's statistics items.
 #include <cstdint>
 #include <cstdlib>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // FTL statistics in their legacy form, beside the named decoder over the same bytes.
 
 #include <algorithm>

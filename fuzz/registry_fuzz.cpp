@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Bytes as the registry file, and then every question to every entry and driver.
 #include <unistd.h>
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Telemetry lists: the first six bytes say what the characteristics would, the rest is the list.
 #include <cstdint>
 #include <cstdlib>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Validity lists: what is kept came from records that lie within the buffer.
 #include <cstdint>
 #include <cstdlib>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The Linux host: every service of the platform, assembled over one device root.
 #pragma once
 

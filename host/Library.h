@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The Linux host, for programs that load the storage library.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A run at another time than now, as a device's past is made of.
 #pragma once
 

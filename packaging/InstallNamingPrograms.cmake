@@ -1,3 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
+
 # Run at the time of installation: writes the file `source` to `destination`, with `bindir` become the
 # programs' full path and the text of `hardening_file` where it asks for it.
 get_filename_component(prefix "${CMAKE_INSTALL_PREFIX}" ABSOLUTE)

@@ -1,3 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
+
 # NANDInfo::NANDInfo, the storage library: shared, or static if NANDInfo_USE_STATIC_LIBS is set.
 if(NOT NANDInfo_USE_STATIC_LIBS)
   include(${CMAKE_CURRENT_LIST_DIR}/NANDInfoShared.cmake)

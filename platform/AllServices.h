@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Every service of the world outside, by name: what a host has made, and what a program's main
 // hands on. No room takes it: each has a struct of what it uses, which picks that out of this one.
 #pragma once

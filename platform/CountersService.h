@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The device's counters service, as its clients see it. Values may be recorded from any thread.
 #pragma once
 

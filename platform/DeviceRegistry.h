@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The device registry and the drivers behind its entries.
 //
 // Entries, iterators and connections are counted handles: each one that a call hands out is given

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The process's event loop, and what is delivered through it: messages to a named service.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The crash-reporting support library: structured-data logs, the identifiers of logs, and the two
 // preference functions that it offers to those who load it at run time.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The files of the device. Paths are absolute paths of the device.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Values that the kernel holds under names, its clock, and this process as it knows it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The log-submission service, and the user's consent to it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The counters history store: what the counters service recorded, by day and key.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The preference services: values by key and domain.
 //
 // Preferences belong to a user. PreferenceStore is the system's own view, AnalyticsConfiguration

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The kernel's reporting facility: figures that it keeps in channels.
 #pragma once
 

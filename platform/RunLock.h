@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The lock that lets one daily sequence run at a time on a device.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Texts that go to the process's standard streams directly, without a level.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Bytes as base64 text, with padding and without line breaks.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Property lists from their binary encoding, version 00.
 //
 // A file is a header, objects, a table of the objects' offsets, and a trailer that says how wide

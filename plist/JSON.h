@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Values as JSON text. Written by hand: in the order of the entries, at the speed of appending.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The property-list value: what reports, options, messages, events and preferences are made of.
 //
 // A value is a number, a text, an array, a dictionary, a date or data; it owns what it holds.

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Dictionaries in which a key stands once when they are written.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The arithmetic of the report: rounding of scalars, statistics and histograms of distributions.
 // Pure functions; doubles are computed in the order given here on every machine.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The values that the report collects itself, in the order in which they are added: each function
 // reads one source and adds what the whitelist lets through.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // How a whitelisted counter is treated: one entry of the whitelist.
 #pragma once
 

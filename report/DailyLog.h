@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The daily log: a report's sections under their header, and the way out.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The kernel values that the report reads as they are: the counter's key, the kernel's name for it.
 // Rows stand in the order of the report.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Keys, or key prefixes, each with its options: one section of the whitelist.
 #pragma once
 

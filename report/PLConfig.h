@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The whitelist: which counters go into the daily report, and how each is treated.
 //
 // Data come from the file "/Library/Application Support/Pelloran/Whitelist_Vrn.plist" and from the

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The daily counters report: yesterday's whitelisted counters, rounded, with what the report
 // collects itself, submitted as one property-list log.
 //

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A set of key prefixes, each with its options, in which the longest prefix of a key is found in
 // time proportional to the key's length, however many prefixes there are.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What a report holds of counters and texts, and the way into it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the report asks of the world outside, and nothing more. References: whoever makes it keeps
 // the services alive for as long.
 #pragma once

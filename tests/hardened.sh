@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 # Looks in every program and library that a build installs for what hardens it, and first at a program
 # made without, to know that it would be seen. Usage: hardened.sh BUILD CC
 set -euo pipefail

@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 # Formatting, the manual pages' form, how the rooms know each other, and clang-tidy, over the release build.
 set -euo pipefail
 cd "$(dirname "$0")/.."

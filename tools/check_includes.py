@@ -1,4 +1,6 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 """Whether includes are what is used. check_includes.py, in the project's folder; prints what is amiss. Exit
 status 1 if anything is.
 

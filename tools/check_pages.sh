@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 # The manual pages' form, as mandoc sees it, and that the pages of ours that they name are there. A
 # page of others may not be installed where this runs.
 set -euo pipefail

@@ -1,4 +1,6 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 """Whether includes, targets and calls follow the order of the rooms, and no calls go in a circle.
 
 check_rooms.py BUILD, in the project's folder: BUILD is a build whose objects are there. The order is

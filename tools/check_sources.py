@@ -1,4 +1,6 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 """The form of the sources that a tool for all projects doesn't know. check_sources.py, in the project's
 folder; prints what is amiss, and the share of comments. Exit status 1 if anything is.
 """

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The basic dictionary, for the counters service: the legacy statistics under its keys.
 #pragma once
 

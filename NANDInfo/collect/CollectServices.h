@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the collectors ask: the controller, and the rest of the device.
 #pragma once
 

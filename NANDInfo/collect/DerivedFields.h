@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The fields that are derived from FTL counters, all of them sums and copies.
 #pragma once
 

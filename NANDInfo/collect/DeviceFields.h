@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The fields that go with the counters but come from the rest of the device.
 #pragma once
 

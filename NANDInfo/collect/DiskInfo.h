@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The user data volume: its size, and how full it is.
 #pragma once
 

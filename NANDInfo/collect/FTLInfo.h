@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The FTL statistics as they are handed on.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The FTL statistics as they come from the controller: one buffer, decoded.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The health figures of the FTL statistics, and who gets which of them.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The legacy statistics under the counters service's keys.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The arithmetic of the stats magazine, over snapshots that somebody else has fetched.
 #pragma once
 

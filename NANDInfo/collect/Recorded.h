@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Where a failure ends that a result goes on without.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The storage statistics: a few derived fields, and the EAN service's images.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The writes of the kernel's swap-out thread.
 #pragma once
 

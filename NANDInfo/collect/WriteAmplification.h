@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // How much more the flash was written than the host asked for.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The library's first error message, for one part of the process's life. Programs that use the
 // library can't reach it.
 #pragma once

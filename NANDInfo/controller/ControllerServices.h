@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What it takes to find the storage controller, to ask it, and to say so.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The storage controller: the driver that exports its counters, and what it is asked.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What is wrong with a buffer that is decoded all the same.
 #pragma once
 

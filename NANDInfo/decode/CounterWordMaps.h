@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Where the words of the common counter layout lie in each vendor's block.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The records of an FTL statistics buffer: a header word (key in the low half, number of values in
 // the high half), then that many 64-bit values.
 #pragma once

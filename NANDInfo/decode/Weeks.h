@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Whole weeks since 2000, in which the time of the last format is reported.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Sends events of the analytics sink for one step of the extraction, and logs what comes of it.
 #pragma once
 

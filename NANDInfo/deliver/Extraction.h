@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The extraction: the steps of its table, one after the other.
 #pragma once
 

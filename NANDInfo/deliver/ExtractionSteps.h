@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the steps of the extraction send of what the collectors made. Each returns what was sent.
 #pragma once
 

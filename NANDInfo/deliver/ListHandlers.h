@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What becomes of each list that the storage controller's driver delivers.
 //
 // A handler gets the list as large as the driver announced it. It fails, with what is to be said on

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The NAND log: a header of named lines, then one line with all entries.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Submits storage health values as a log, at most once in seven days.
 #pragma once
 

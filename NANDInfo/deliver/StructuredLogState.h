@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What a dump of the diagnostic lists works out before it fetches them, and hands to their
 // handlers.
 #pragma once

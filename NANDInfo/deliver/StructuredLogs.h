@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The dump of the storage controller's diagnostic lists.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The collectors under the names of the library's interface.
 
 #include "NANDInfo/Collectors.h"

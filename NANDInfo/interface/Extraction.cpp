@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The extraction, under the names of the library's interface.
 
 #include "NANDInfo/Extraction.h"

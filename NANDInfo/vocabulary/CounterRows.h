@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The tables of the counters: one row says all that the system knows of one. Every list of names
 // that may leave the device is derived from them (CounterLists.h); their order says nothing unless
 // it is said here.

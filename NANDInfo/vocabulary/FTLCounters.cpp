@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // key, elements, name, significant digits, where it goes, its key of the counters service, the
 // elements that may go; what is missing at the end, a counter doesn't have.
 #include <algorithm>

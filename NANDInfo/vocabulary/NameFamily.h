@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Names that begin alike, and how the tables write them: "padSizes_{0..3}" is a stem and, in its
 // braces, what may follow: a text, or a text and each number of a range. "{A0..2, B}" after a stem
 // stands for four names.

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The counters that no buffer holds under a key of their own: name, significant digits, where it
 // goes.
 #include <algorithm>

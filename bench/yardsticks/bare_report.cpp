@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The parts of a report, done bare in one program: the scan of two days' rows, Welford over the
 // samples, the appending of the XML, one durable write. No whitelist, no rounding, no other
 // service.

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Runs a program and prints the most memory, in KiB, that it had at once. A process's figure begins
 // with that of the one that started it, so that this one is kept small.
 //

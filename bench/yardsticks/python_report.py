@@ -1,3 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
+
 """The report in Python: the same rows, whitelist, rounding and statistics, with sqlite3 and plistlib.
 
 python_report.py DATABASE DAY WHITELIST OUTPUT

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The message bus and the event loop of the process: sd-bus attached to sd-event.
 //
 // The bus is the system bus, or the one that DBUS_SYSTEM_BUS_ADDRESS names. It is connected to by

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Messages of the bus as dictionaries.
 //
 // A message comes from anyone, so what it may cost is bounded, whatever its size and its types.

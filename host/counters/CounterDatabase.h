@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Where the counters database lies, and one connection to it.
 //
 // Every process that opens the database, writes to it or checkpoints it holds the store's lock: a

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The history of the counters: reads the counters database by day.
 #pragma once
 

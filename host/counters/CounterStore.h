@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The counters service and the history store: an SQLite database below the device root.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // SQLite, thinly: a connection, and the use of one of its prepared statements.
 //
 // A connection that failed is of no further use: closing it takes back what was not committed.

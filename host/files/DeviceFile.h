@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A property list below device/: what the device itself answers for one of its services.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The device's files as the core sees them: below the device root, links followed within it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The device root: the directory that stands for a device's file system.
 //
 // Every path of the device is resolved below it, ".." and links included, so that nothing outside

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Times in the names of files, in UTC. They have the same form, and sort as they follow each other,
 // for every time: what lies before year 0 or after year 9999 is named by the first or last second.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the host does with single files: read one whole, replace one whole, append a line; and with
 // their names.
 //

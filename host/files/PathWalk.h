@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Opens a path below a folder without openat2, which older kernels lack and some sandboxes refuse.
 #pragma once
 

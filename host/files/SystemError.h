@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the system refuses, as errors: the one place that translates error numbers.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // This machine's own figures.
 //
 // libproc2 reads the disks, the memory and the load. By hand are read /proc/vmstat, where the

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The module that a device root carries at the place of the crash-reporting support library. It
 // acts on the preferences of the process that loads it, so that both see one state of every domain.
 

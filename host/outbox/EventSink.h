@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl. A file that
 // would grow beyond kMaxFile becomes events.jsonl.1 first, that .2, and so on; of more than
 // kKept the oldest is removed, with a line in the log. A number that is taken by anything but a

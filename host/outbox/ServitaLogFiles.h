@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The support service's logs: var/log/servita/<name>.log, with the old ones as <name>.log.1 (the
 // latest) to <name>.log.7.
 #pragma once

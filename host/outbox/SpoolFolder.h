@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The folder of submitted logs, var/spool/morvend/submitted, as one process has it to itself:
 // opened under its lock, cleared of what a killed run left, with its contents known.
 //

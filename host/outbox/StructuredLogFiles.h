@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Structured-data logs as JSON Lines, a file for each day:
 // var/spool/morvend/structured/<day>.jsonl.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Log submission into a spool folder: var/spool/morvend/submitted/<log name>.<log type>.<time>,
 // with the options beside it (see SpoolFolder). Consent is the user's preference
 // "DiagnosticLogSubmissionEnabled".

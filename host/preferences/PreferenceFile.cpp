@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 #include "host/preferences/PreferenceFile.h"
 
 #include <fcntl.h>

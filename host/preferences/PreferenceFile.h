@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // One preference file: a domain of a user, var/preferences/<user>/<domain>.plist, and the changes
 // that this process has yet to write to it.
 //

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The preference services over files, one for each domain of a user (see PreferenceFile). The
 // system's own preferences are those of user "mobile", the analytics configuration's those of user
 // "__quenset__".

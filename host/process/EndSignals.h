@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The signals that ask the process to end, SIGTERM and SIGINT, for a process that ends only between
 // one piece of work and the next.
 #pragma once

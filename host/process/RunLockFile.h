@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The run lock as an advisory lock on var/run/morvend.lock. The system gives it back with the
 // process, however that ends; the file stays.
 #pragma once

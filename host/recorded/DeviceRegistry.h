@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The device registry and its drivers: device/registry.plist, which is read at the first question.
 // Without the file, or with anything but a dictionary at its top, there is no registry.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Kernel values: a recorded device's device/kernel.plist and device/ecc-events/, or what this
 // machine has a true equivalent of.
 #pragma once

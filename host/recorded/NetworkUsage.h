@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The network usage service: device/network-usage.plist, answered on a thread of its own.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The purgeable-space service: device/purgeable-space.plist.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The kernel's reporting channels: device/report-channels.plist.
 #pragma once
 

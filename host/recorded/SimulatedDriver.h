@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A driver as its dictionary in the registry file describes it.
 #pragma once
 

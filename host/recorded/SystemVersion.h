@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The version of the operating system: a recorded device's
 // device/system-version.plist, or this machine's os-release.
 #pragma once

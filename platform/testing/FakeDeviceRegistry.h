@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A device registry in memory, whose drivers follow a script.
 //
 // A test sets the entries and either the script (every driver call in order, with its answer) or

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A platform in memory, for tests: every service answers from plain members and writes down what
 // was asked of it.
 #pragma once

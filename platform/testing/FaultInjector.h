@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A decorator of a whole platform that makes the n-th call which can fail do so.
 #pragma once
 

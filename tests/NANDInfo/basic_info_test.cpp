@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The basic dictionary: its keys, the fields that make one, the exchange, and its days.
 
 #include <gtest/gtest.h>

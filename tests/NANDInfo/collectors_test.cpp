@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // MSP and storage statistics, disk information; and every collector with each call failing in turn.
 
 #include <gtest/gtest.h>

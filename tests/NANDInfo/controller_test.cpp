@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The exporter table, finding drivers, tunnel commands, the EAN service: each exchange by its
 // failures, and no handle left open by any.
 
@@ -136,9 +139,7 @@ TEST_F(ControllerTest, TunnelCommandsByTheirFailures) {
       {{{size, {.claimedSize = 99}}, {data, {}}}, "NA", {}},
       {{{size, announce(kMaxBuffer)}, {data, {.output = sent}}}, "NA", sent},
       {{{size, {kError, announce(3).output}}}, call + " size", {}},
-      {{{size, announce(kMaxBuffer + 1)}},
-       "executeTunnelCommand: Could not allocate buffer",
-       old},
+      {{{size, announce(kMaxBuffer + 1)}}, "executeTunnelCommand: Could not allocate buffer", old},
       {{{size, announce(3)}, {data, {kError, sent}}}, call, old},
   };
   for (const auto& row : cases) {

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The extraction: what each event may carry, and whole runs of the steps over a device that has it
 // all, or lacks one thing.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The FTL statistics: the exchange, the fields that are derived from them, the whitelist.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The health figures and their three subsets.
 
 #include <gtest/gtest.h>

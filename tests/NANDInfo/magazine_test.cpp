@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The stats magazine: its arithmetic by hand-computed cases, then whole windows over a controller
 // that lacks one snapshot or the other.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The NAND log: its text, and when one is written.
 
 #include "NANDInfo/NANDLogWriter.h"

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Kernel snapshots: nesting, cuts, lies about sizes, and the one counter that is read from them.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The controller's diagnostic lists: each parser with valid lists that are then cut or altered, the
 // handlers by what they refuse, and the whole dump by the failures of every call.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The tables against golden/, which has a line for each name, key and word of them: what they must
 // be, whatever rows they are derived from.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The small tools of the whitelists: name tables, filters, rounding.
 
 #include "NANDInfo/Whitelists.h"

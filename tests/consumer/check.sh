@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 # Installs a build elsewhere, looks at what its units start, builds a program against it in every way
 # that is offered, and compares what they print. Usage: check.sh BUILD LIBDIR CXX
 set -euo pipefail

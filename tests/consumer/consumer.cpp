@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A program of somebody else's that loads the storage library.
 #include <NANDInfo/NANDInfo.h>
 #include <host/Library.h>

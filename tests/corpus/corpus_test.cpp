@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Replays the seeds of the fuzz targets, and every input that ever crashed one.
 #include <gtest/gtest.h>
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A small device with something of everything that a daily run reads or writes, and the built
 // programs to run on it.
 #pragma once

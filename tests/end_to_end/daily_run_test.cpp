@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The built programs, run by hand or by a timer.
 
 #include <gtest/gtest.h>

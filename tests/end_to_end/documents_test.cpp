@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The documents, against what they are about: the programs and their help, and the names in the
 // source.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A whole day, with a fault at each of its state-changing calls.
 
 #include <gtest/gtest.h>

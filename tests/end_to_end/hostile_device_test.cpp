@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Whatever the device's services answer, the day ends with its record written, and nothing is left
 // of it in the process.
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // nandinfo as a process, on a device root with a controller.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // morvend as a service of a real message bus.
 
 #include <fcntl.h>

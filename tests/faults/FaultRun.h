@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Runs a program with a fault at the n-th of its state-changing calls; see FaultShim.c for what is
 // counted and for the kinds.
 #pragma once

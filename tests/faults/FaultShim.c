@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A library to preload into a program under test: it counts the program's state-changing calls to
 // the C library, and makes the n-th fail or kills the program there.
 //

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the shim is tried on: calls in a folder that is named on the command line. The exit status
 // says whether every one succeeded (0) or not (1).
 

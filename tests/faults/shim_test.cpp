@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The shim itself: a fault that it doesn't make would make every fault test pass.
 
 #include <gtest/gtest.h>

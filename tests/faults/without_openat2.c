@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Runs a program in a sandbox that refuses openat2, as systemd's RestrictSUIDSGID= does:
 // without_openat2 PROGRAM [ARGUMENT...]
 #include <errno.h>

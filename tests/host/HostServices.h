@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What a test of a file-backed service needs: a device root of its own, a clock to set, a log to
 // ask.
 #pragma once

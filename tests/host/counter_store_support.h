@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A counters store over a temporary device root, and what a history holds as text.
 #pragma once
 

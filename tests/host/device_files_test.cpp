@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The services of a recorded device, which answer from files below device/, and of this machine.
 
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The registry and its drivers, over one registry file.
 #include <gtest/gtest.h>
 

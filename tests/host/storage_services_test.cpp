@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The small services beside the registry: snapshots, purgeable space, disk usage, file systems,
 // standard streams.
 #include <gtest/gtest.h>

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Writes binary property lists for tests: values (a truth value as a number), or objects given byte
 // by byte, which makes lists that no honest writer would.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Counter buffers put together by hand, and a look at what their parsers made of them.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Lists as the storage controller delivers them, put together by hand.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A device root with a controller that answers: every counter that has a name, three MSPs, lists,
 // EAN images; and with a disk whose figures stay the same.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The library's first error message, as it is when a process begins.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A message bus of a test's own, and a client of it.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A device in memory with a storage controller whose buffers a test names field by field.
 #pragma once
 

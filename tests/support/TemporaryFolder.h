@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A folder that lives as long as its object: the device root of a test.
 #pragma once
 

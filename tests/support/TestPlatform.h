@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The fakes, and shorthands for what tests set up again and again.
 #pragma once
 

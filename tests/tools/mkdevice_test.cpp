@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -19,8 +22,8 @@
 #include "tools/mkdevice/ControllerBuffers.h"
 #include "tools/mkdevice/DeviceMaker.h"
 #include "tools/mkdevice/Sample.h"
-#include "tools/mkdevice/SampleCounters.h"
 #include "tools/mkdevice/SampleController.h"
+#include "tools/mkdevice/SampleCounters.h"
 #include "tools/mkdevice/SampleDay.h"
 #include "tools/mkdevice/SampleFiles.h"
 #include "tools/mkdevice/SampleUsage.h"

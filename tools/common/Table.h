@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Tables for people, laid out by libsmartcols.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Texts from elsewhere on a terminal: nothing in them moves the cursor.
 #pragma once
 

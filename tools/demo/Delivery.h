@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A client of the running daemon: announces activated applications and delivers them.
 #pragma once
 

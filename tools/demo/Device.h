@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A device root that a daily run has gone over, opened to be shown.
 #pragma once
 

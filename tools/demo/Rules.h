@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // By which rule of the whitelist a counter is reported.
 #pragma once
 

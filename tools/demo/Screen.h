@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Text for people: headings, names and bars, as wide as the terminal.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // By which rule a value of the telemetry or of an analytics event leaves the device.
 #pragma once
 

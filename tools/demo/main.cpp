@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The demo's helper: delivers applications to a running daemon, and shows what was submitted.
 
 #include <CLI/CLI.hpp>

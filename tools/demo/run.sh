@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# Copyright the morvend authors
 # The demo: a sample device's way through one day, from the message on the bus to what left it.
 # run.sh BIN_DIR, in the project's folder; everything it makes lies in build/demo.
 set -euo pipefail

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Writes the binary formats of the controller and the kernel. All numbers are little-endian.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The buffers that a sample controller's driver answers with, as the controller writes them.
 #pragma once
 

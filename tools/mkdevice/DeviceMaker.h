@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Makes a sample device root in a folder, and plays days of its past.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // key, group, options {histogram bounds}, typical value, spread, shape, samples a day, day by day
 #include "tools/mkdevice/Vocabulary.h"
 

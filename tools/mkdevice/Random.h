@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Numbers that look random and are the same everywhere: splitmix64. The distributions of <random>
 // differ between libraries.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Which sample device: all that is in its root is made from a seed and a day.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The files of a sample device that belong to its storage controller.
 #pragma once
 

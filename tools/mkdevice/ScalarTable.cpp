@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // key, group, options {bucket interval, significant figures}, typical value, day by day
 #include "tools/mkdevice/Vocabulary.h"
 

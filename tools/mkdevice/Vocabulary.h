@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The vocabulary of a sample device: the counters that it keeps, and what its whitelist says of
 // them. The tables stand in files of their own, which hold nothing but rows.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The life of an imaginary flash device: what its controller counts. A device is formatted on a
 // day that its seed decides, and wears a little every hour; whatever is counted at an earlier hour
 // is never more than at a later one.

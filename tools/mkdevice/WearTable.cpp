@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // name, base, what it grows with, multiplier, divisor, most; part of a name, growth, figure
 #include "tools/mkdevice/Wear.h"
 

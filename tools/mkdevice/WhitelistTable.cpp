@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // group, section, key or prefix, options
 #include "tools/mkdevice/Vocabulary.h"
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What a captured buffer is, as far as its bytes tell.
 #pragma once
 

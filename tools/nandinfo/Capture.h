@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Saves what the storage controller answers, so that it can be asked again on any device root.
 //
 // The folder has the form of a root's device/ folder: registry.plist with the controller and the

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The folder that a capture fills. What was written is taken back unless the capture is finished.
 #pragma once
 

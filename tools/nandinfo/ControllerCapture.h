@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What the storage controller and its neighbours answer to the commands, as entries of a device
 // registry that answers the same.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Watches what the storage library asks the storage controller for, so that a command can tell an
 // answer from a result that only looks like one.
 #pragma once

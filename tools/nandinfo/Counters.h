@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The dictionary of counters, for people who meet a name.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Captured buffers, decoded without a controller.
 //
 // FILE is an ordinary path of the calling process, "-" its standard input; at most 16 MiB are read.

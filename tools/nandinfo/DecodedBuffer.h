@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Captured buffers as dictionaries.
 //
 // Each has "ok", whether the bytes are a buffer of its kind and could be read, and "error", the

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The command nandinfo: calls the storage library and prints what it returns.
 #pragma once
 

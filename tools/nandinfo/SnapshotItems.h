@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The items of a kernel snapshot in chunked-data format, one after the other.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Results as tables for people: numbers in groups of three digits, keys aligned, nothing in a text
 // that could move a terminal's cursor.
 #pragma once

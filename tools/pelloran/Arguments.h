@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The texts that a user names counters, days and values with. Pure functions; errors say what was
 // wrong with which text.
 #pragma once

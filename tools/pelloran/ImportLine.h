@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // One line of an import: a JSON object that sets, adds to or pushes to a counter.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The library's one error channel: the first message that the process ever recorded.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The steps between the controller's buffers and the library's results.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Access to the storage controller: which driver exports counters, its tunnel commands, its
 // services.
 #pragma once

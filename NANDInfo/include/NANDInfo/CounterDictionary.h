@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The dictionary of counters: under which names the controller's statistics and the fields derived
 // from them go, and where each of them may go.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A channel's counter block in one vendor's layout, converted into the layout common to all.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The defects list: the number of defects from the factory, and a record of every defect since.
 //
 // Little-endian words: one that isn't read, the factory's count, the number of records; then the

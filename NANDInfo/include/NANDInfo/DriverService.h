@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // A service of the device registry and the connection to its driver. The one owner of both handles:
 // whatever becomes of a call, they are given back when the object goes.
 #pragma once

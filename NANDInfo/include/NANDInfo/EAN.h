@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The EAN service's images: which are asked for, and under which key each answer is reported.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The analytics events of the storage library.
 //
 // An event is sent under its event name; the view name is what the sink's configuration calls it.

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The extraction: storage health as events of the analytics sink, one step after another. Steps are
 // independent: what fails in one is logged, and the next one runs.
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // FTL statistics as a function of the bytes alone: the buffer and the fields are those of
 // ZMCFTLParseBufferToCxt, but what it would record as a message is handed back.
 #pragma once

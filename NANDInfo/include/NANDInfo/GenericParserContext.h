@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // What every decoder of a counter buffer fills: an ordered list of named unsigned 64-bit values.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Which legacy counters the counters service knows, and under which key.
 #pragma once
 

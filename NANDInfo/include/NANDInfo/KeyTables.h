@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The vocabulary of the counter buffers: which key or tag stands for which name, and how many
 // elements it is configured for.
 #pragma once

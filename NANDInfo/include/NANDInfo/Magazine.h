@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The stats magazine: what the FTL counters came to over a window of time.
 //
 // A controller that keeps a magazine answers for the snapshot of its counters that lies a number of

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Storage health: what the flash controller counts, as dictionaries that are whitelisted and
 // rounded as far as their names say.
 //

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Tables of names in compact form: a family such as "padSizes_{0..3}" stands for one name per
 // number in its braces ("{0..2, 4}" for four of them), any other text for itself.
 #pragma once

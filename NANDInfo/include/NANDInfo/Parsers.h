@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The decoders of the controller's counter buffers. All only append to the context; what is wrong
 // with a buffer goes to SetAPIErrorMessage.
 #pragma once

@@ -1,5 +1,8 @@
-// What the storage library asks of the world outside, and nothing more but the drivers that it knows.
-// References: whoever makes it keeps the services alive for as long.
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
+// What the storage library asks of the world outside, and nothing more but the drivers that it
+// knows. References: whoever makes it keeps the services alive for as long.
 #pragma once
 
 #include "base/Exported.h"

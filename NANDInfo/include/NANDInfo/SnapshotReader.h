@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Reads kernel snapshots in chunked-data format: items with a 16-byte header (type, payload size,
 // flags), nested in containers.
 #pragma once

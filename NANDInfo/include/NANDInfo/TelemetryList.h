@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The telemetry list: for each channel of the controller a block of raw counters in its vendor's
 // layout (4,096 bytes, all blocks first), and a summary of seven words (32 bytes).
 #pragma once

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Small dictionary, number and text helpers of the storage library.
 #pragma once
 

@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // The flash validity list: how much of the flash still holds valid data, as sixteen short lists.
 //
 // Little-endian: the number of records and the place of the first one in units of 8 bytes, 32 bits

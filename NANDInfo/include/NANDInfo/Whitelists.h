@@ -1,3 +1,6 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copyright the morvend authors
+
 // Which counters may leave the device, how coarse, and under which name.
 #pragma once
 
