@@ -18,7 +18,7 @@ failures = []
 names = subprocess.check_output(["git", "ls-files"], text=True).split("\n")[:-1]
 files = {}
 for name in names:
-    if re.search(r"\.(cpp|h|c|py|sh|cmake)$|(^|/)(CMakeLists\.txt|dev|run)$", name):
+    if re.search(r"\.(cpp|h|c|py|sh|cmake)$|(^|/)CMakeLists\.txt$|^(dev|\.ci/run)$", name):
         with open(name, encoding="utf-8") as text:
             files[name] = text.read()
 product = {name: text for name, text in files.items()

@@ -4,6 +4,7 @@
 #include "host/files/Files.h"
 
 #include <filesystem>
+#include <system_error>
 #include <utility>
 
 #include <fcntl.h>
