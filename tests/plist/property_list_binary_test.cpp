@@ -12,15 +12,8 @@
 #include "plist/PropertyList.h"
 #include "support/BinaryPropertyList.h"
 
-namespace host {
+namespace plist {
 namespace {
-
-using plist::Array;
-using plist::Data;
-using plist::Date;
-using plist::Dictionary;
-using plist::Number;
-using plist::Value;
 
 using support::BinaryPropertyList;
 using namespace std::string_view_literals;
@@ -28,7 +21,7 @@ using namespace std::string_view_literals;
 base::Result<Value> readObject(std::string_view object) {
   BinaryPropertyList list;
   const std::size_t top = list.object(object);
-  return plist::readBinary(list.finish(top));
+  return readBinary(list.finish(top));
 }
 
 TEST(PropertyListBinary, ReadsEveryObject) {
@@ -67,9 +60,8 @@ TEST(PropertyListBinary, ReadsEveryObject) {
            Row{"\xD0"sv, Dictionary{}},
        }) {
     const base::Result<Value> result = readObject(row.object);
-    ASSERT_TRUE(result) << plist::description(row.value) << ": " << result.error().text;
-    EXPECT_TRUE(*result == row.value)
-        << plist::description(*result) << " " << plist::description(row.value);
+    ASSERT_TRUE(result) << description(row.value) << ": " << result.error().text;
+    EXPECT_TRUE(*result == row.value) << description(*result) << " " << description(row.value);
     EXPECT_EQ(result->variant().index(), row.value.variant().index());
   }
   EXPECT_EQ(readObject("\x22\x3F\0\0\0"sv)->as<Number>()->type(), Number::Type::float32);
@@ -100,7 +92,7 @@ TEST(PropertyListBinary, RefusesOtherObjectsAndSaysWhereAndWhy) {
   for (const auto& [why, objects] : refused) {
     for (const std::string_view object : objects) {
       const base::Result<Value> result = readObject(object);
-      EXPECT_FALSE(result) << plist::description(*result);
+      EXPECT_FALSE(result) << description(*result);
       EXPECT_TRUE(
           result.error().text.starts_with(std::string("binary property list, offset 8: ") + why))
           << result.error().text << " " << why;
@@ -115,7 +107,7 @@ TEST(PropertyListBinary, AcceptsEveryWidthOfReferences) {
     BinaryPropertyList list(width);
     const std::size_t one = list.add(1), text = list.add("t");
     const std::size_t top = list.container(0xD, {text, one});
-    EXPECT_EQ(*plist::readBinary(list.finish(top)), Value(Dictionary{{"t", 1}}));
+    EXPECT_EQ(*readBinary(list.finish(top)), Value(Dictionary{{"t", 1}}));
   }
 }
 
@@ -125,9 +117,9 @@ TEST(PropertyListBinary, KeysAreTextsAndTheLaterCounts) {
   const std::size_t twice = list.container(0xD, {key, key, one, two});
   const std::size_t asWritten = list.container(0xD, {list.add("\x01"), list.add("\xFF"), one, two});
   const std::size_t wrong = list.container(0xD, {one, key});
-  EXPECT_EQ(*plist::readBinary(list.finish(twice)), Value(Dictionary{{"k", 2}}));
-  EXPECT_EQ(*plist::readBinary(list.finish(asWritten)), Value(Dictionary{{"\xEF\xBF\xBD", 2}}));
-  EXPECT_FALSE(plist::readBinary(list.finish(wrong)));
+  EXPECT_EQ(*readBinary(list.finish(twice)), Value(Dictionary{{"k", 2}}));
+  EXPECT_EQ(*readBinary(list.finish(asWritten)), Value(Dictionary{{"\xEF\xBF\xBD", 2}}));
+  EXPECT_FALSE(readBinary(list.finish(wrong)));
 }
 
 TEST(PropertyListBinary, NamesTheContainerThatHoldsItself) {
@@ -138,22 +130,22 @@ TEST(PropertyListBinary, NamesTheContainerThatHoldsItself) {
   list.container(0xD, {3, 1});
   list.add("key");
   EXPECT_EQ(
-      plist::readBinary(list.finish(0)).error().text,
+      readBinary(list.finish(0)).error().text,
       "binary property list, offset " + std::to_string(offset) + ": the container holds itself");
 }
 
 TEST(PropertyListBinary, DepthIsLimited) {
   BinaryPropertyList list;
   std::size_t top = list.container(0xA, {});
-  for (int depth = 2; depth <= plist::kMaxDepth; ++depth) top = list.container(0xA, {top});
-  EXPECT_TRUE(plist::readBinary(list.finish(top)));
+  for (int depth = 2; depth <= kMaxDepth; ++depth) top = list.container(0xA, {top});
+  EXPECT_TRUE(readBinary(list.finish(top)));
   top = list.container(0xA, {top});
-  EXPECT_FALSE(plist::readBinary(list.finish(top)));
+  EXPECT_FALSE(readBinary(list.finish(top)));
 }
 
 TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
   const auto errorOf = [](BinaryPropertyList& list, std::size_t top) {
-    const std::string error = plist::readBinary(list.finish(top)).error().text;
+    const std::string error = readBinary(list.finish(top)).error().text;
     return error.substr(std::min(error.size(), error.find(": ") + 2));
   };
   BinaryPropertyList laughs;
@@ -179,20 +171,20 @@ TEST(PropertyListBinary, SurvivesCutsAndAlterations) {
                  {"data", Data(20)},
                  {"date", Date{0}}};
   const std::string whole = BinaryPropertyList::of(value);
-  ASSERT_EQ(*plist::read(whole), value);
+  ASSERT_EQ(*read(whole), value);
   for (std::size_t length = 6; length < whole.size(); ++length) {
-    EXPECT_FALSE(plist::read(whole.substr(0, length))) << length;
-    std::ignore = plist::read("bplist00" + whole.substr(whole.size() - length));
+    EXPECT_FALSE(read(whole.substr(0, length))) << length;
+    std::ignore = read("bplist00" + whole.substr(whole.size() - length));
   }
   for (std::size_t i = 0; i < whole.size(); ++i) {
     for (const int byte : {0x00, 0x01, 0x0F, 0x10, 0x7F, 0x80, 0xA1, 0xD1, 0xFF}) {
       std::string altered = whole;
       altered[i] = static_cast<char>(byte);
-      const base::Result<Value> result = plist::read(altered);
-      EXPECT_TRUE(!result || plist::read(*plist::writeXML(*result))) << i;
+      const base::Result<Value> result = read(altered);
+      EXPECT_TRUE(!result || read(*writeXML(*result))) << i;
     }
   }
 }
 
 }  // namespace
-}  // namespace host
+}  // namespace plist

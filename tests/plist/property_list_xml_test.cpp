@@ -11,23 +11,13 @@
 #include "base/Text.h"
 #include "plist/PropertyList.h"
 
-namespace host {
+namespace plist {
 namespace {
-
-using plist::Array;
-using plist::Data;
-using plist::Date;
-using plist::Dictionary;
-using plist::Number;
-using plist::Value;
 
 std::string document(std::string_view content) {
   return "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<plist version=\"1.0\">" +
          std::string(content) + "</plist>\n";
 }
-
-base::Result<Value> read(std::string_view bytes) { return plist::read(bytes); }
-base::Result<std::string> write(const Value& value) { return plist::writeXML(value); }
 
 Value nested(int depth) {
   Value value = Array();
@@ -70,7 +60,7 @@ TEST(PropertyListXML, ReadsEveryForm) {
        }) {
     const base::Result<Value> result = read(document(row.content));
     ASSERT_TRUE(result) << row.content << ": " << result.error().text;
-    EXPECT_TRUE(*result == row.value) << row.content << ": " << plist::description(*result);
+    EXPECT_TRUE(*result == row.value) << row.content << ": " << description(*result);
     EXPECT_EQ(result->variant().index(), row.value.variant().index()) << row.content;
   }
   EXPECT_EQ(read(document("<integer>5</integer>"))->as<Number>()->type(), Number::Type::int64);
@@ -154,15 +144,15 @@ TEST(PropertyListXML, DepthIsLimitedBothWays) {
     for (int i = 0; i < depth; ++i) content += "</array>";
     return document(content);
   };
-  EXPECT_TRUE(read(deep(plist::kMaxDepth)));
-  EXPECT_FALSE(read(deep(plist::kMaxDepth + 1)));
+  EXPECT_TRUE(read(deep(kMaxDepth)));
+  EXPECT_FALSE(read(deep(kMaxDepth + 1)));
   EXPECT_FALSE(read(deep(500000)));
-  EXPECT_EQ(*read(*write(nested(plist::kMaxDepth))), nested(plist::kMaxDepth));
-  EXPECT_FALSE(write(nested(plist::kMaxDepth + 1)));
+  EXPECT_EQ(*read(*writeXML(nested(kMaxDepth))), nested(kMaxDepth));
+  EXPECT_FALSE(writeXML(nested(kMaxDepth + 1)));
 }
 
 TEST(PropertyListXML, ACutDocumentIsNeverAValue) {
-  const std::string whole = *write(Dictionary{{"a", Array{1, "\xE2\x82\xAC", Data{1}}}});
+  const std::string whole = *writeXML(Dictionary{{"a", Array{1, "\xE2\x82\xAC", Data{1}}}});
   for (std::size_t length = 0; length + 1 < whole.size(); ++length) {
     EXPECT_FALSE(read(std::string_view(whole).substr(0, length))) << length;
   }
@@ -175,7 +165,7 @@ TEST(PropertyListXML, WritesThisAndNothingElse) {
       {"list", Array{std::uint64_t{1} << 63, -1, 0.1, 100.0, -0.0, -NAN, 0.5f, true, false,
                      Date{0.9}, Data{0, 1, 2, 3}, std::string("<\r\n\t\0\xFF>", 7)}},
   };
-  EXPECT_EQ(*write(value),
+  EXPECT_EQ(*writeXML(value),
             "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
             "<plist version=\"1.0\">\n"
             "<dict>\n"
@@ -222,8 +212,9 @@ TEST(PropertyListXML, WhatCantBeTextIsReplaced) {
            Row{"\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80",
                "\xF4\x8F\xBF\xBF\xF0\x90\x80\x80\xEE\x80\x80\xED\x9F\xBF\xDF\xBF\xE0\xA0\x80"},
        }) {
-    EXPECT_EQ(*read(*write(row.bytes)), Value(row.text)) << row.text;
-    EXPECT_EQ(*write(Dictionary{{row.bytes, 1}, {row.text, 2}}), *write(Dictionary{{row.text, 2}}));
+    EXPECT_EQ(*read(*writeXML(row.bytes)), Value(row.text)) << row.text;
+    EXPECT_EQ(*writeXML(Dictionary{{row.bytes, 1}, {row.text, 2}}),
+              *writeXML(Dictionary{{row.text, 2}}));
   }
 }
 
@@ -236,18 +227,18 @@ TEST(PropertyListXML, AwkwardValuesComeBackEqual) {
                         0x1p63, 0.1f, 1.0 / 7, -Limits::infinity()}},
       {"dates", Array{Date{-3e13}, Date{-62167219201}, Date{-1}, Date{951782400}, Date{3e13}}},
       {"data", Array{Data{}, Data{255}, Data{1, 254}, Data(100, 77)}}};
-  const std::string text = *write(value);
+  const std::string text = *writeXML(value);
   const base::Result<Value> again = read(text);
   ASSERT_TRUE(again) << again.error().text << "\n" << text;
   EXPECT_TRUE(*again == value) << text;
-  EXPECT_EQ(*write(*again), text);
+  EXPECT_EQ(*writeXML(*again), text);
 }
 
 TEST(PropertyListCodec, RefusesNothingAndTooMuch) {
   EXPECT_EQ(read("").error().text, "the property list is empty");
-  const std::string tooMuch(plist::kMaxSize + 1, ' ');
+  const std::string tooMuch(kMaxSize + 1, ' ');
   EXPECT_EQ(read(tooMuch).error().text, "the property list has 16777217 bytes, more than 16777216");
 }
 
 }  // namespace
-}  // namespace host
+}  // namespace plist

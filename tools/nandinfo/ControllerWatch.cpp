@@ -53,45 +53,18 @@ bool asksForSize(std::span<const std::byte> input) {
   return input.size() > kFlags && (input[kFlags] & std::byte{1}) != std::byte{0};
 }
 
-// The library's services as it is to see them.
-struct Watched {
-  platform::SystemLog& log;
+// The services as the library is to see them: these four stand before the device's own.
+struct Watched : NANDInfo::Services {
   platform::StandardStreams& streams;
-  platform::Clock& clock;
-  platform::FileSystem& files;
-  platform::PreferenceStore& preferences;
-  platform::LogSubmission& submission;
-  platform::FaultwatchSupport& faultwatch;
   platform::Eventra& eventra;
-  platform::DeviceProperties& deviceProperties;
-  platform::SystemVersion& systemVersion;
-  platform::Kernel& kernel;
-  platform::KernelSnapshots& snapshots;
   platform::DeviceRegistry& registry;
   platform::DriverConnections& drivers;
-  platform::PurgeableSpace& purgeableSpace;
 };
 
 }  // namespace
 
 ControllerWatch::ControllerWatch(const NANDInfo::Services& inner, DirectTexts texts)
-    : inner_(inner),
-      directTexts_(texts),
-      services_(Watched{.log = inner.log,
-                        .streams = *this,
-                        .clock = inner.clock,
-                        .files = inner.files,
-                        .preferences = inner.preferences,
-                        .submission = inner.submission,
-                        .faultwatch = inner.faultwatch,
-                        .eventra = *this,
-                        .deviceProperties = inner.deviceProperties,
-                        .systemVersion = inner.systemVersion,
-                        .kernel = inner.kernel,
-                        .snapshots = inner.snapshots,
-                        .registry = *this,
-                        .drivers = *this,
-                        .purgeableSpace = inner.purgeableSpace}) {}
+    : inner_(inner), directTexts_(texts), services_(Watched{inner, *this, *this, *this, *this}) {}
 
 std::string ControllerWatch::problem() {
   if (!lookedUp_) {
