@@ -233,24 +233,15 @@ TEST(DailyRun, KnowsAKeyAgainThatIsNotWrittenAsItCame) {
 // A link in the place of a file or a folder that is written must lead nothing out of the root, and
 // a FIFO must not stop the run.
 TEST(DailyRun, TouchesNothingOutsideItsRoot) {
-  const std::string written[] = {"var/run/morvend.lock",
-                                 "var/run",
-                                 "var/preferences/mobile/com.norba.pellorand.morvend.plist",
-                                 "var/preferences/mobile/com.norba.quenset.morvend.plist",
-                                 "var/preferences/mobile",
-                                 "var/preferences/guest/com.example.plist",
-                                 "var/preferences/guest",
-                                 "var/spool/morvend/events.jsonl",
-                                 "var/spool/morvend/submitted",
-                                 "var/spool/morvend",
-                                 "var/spool",
-                                 "var/spool/morvend/structured",
-                                 "device/ecc-events",
-                                 "var/log/servita/a.log",
-                                 "var/log/servita/a.log.2",
-                                 support::kCountersDatabase,
-                                 std::string(support::kCountersDatabase) + "-wal",
-                                 "var/mobile/Library/Pelloran"};
+  const Lines written = linesOf(
+      "var/run/morvend.lock\nvar/run\nvar/preferences/mobile\nvar/preferences/guest\n"
+      "var/preferences/mobile/com.norba.pellorand.morvend.plist\n"
+      "var/preferences/mobile/com.norba.quenset.morvend.plist\n"
+      "var/preferences/guest/com.example.plist\nvar/spool\nvar/spool/morvend\n"
+      "var/spool/morvend/events.jsonl\nvar/spool/morvend/submitted\n"
+      "var/spool/morvend/structured\ndevice/ecc-events\nvar/log/servita/a.log\n"
+      "var/log/servita/a.log.2\nvar/mobile/Library/Pelloran\n" +
+      std::string(support::kCountersDatabase) + "\n" + support::kCountersDatabase + "-wal");
   Device filled;
   filled.fill();
   for (const std::string& path : written) {

@@ -377,6 +377,11 @@ TEST_F(Nandinfo, GivesNoVerdictWithoutAnAnswer) {
   registry.add({.className = "ZMCStorage"});
   EXPECT_EQ(run({"recommends-deletion"}), 1);
   EXPECT_NE(err.find("ZMCStorage answers no command (status 0x2d)"), std::string::npos) << err;
+  registry.root->children.back().openStatus = 13;
+  EXPECT_EQ(run({"capture", folder / "capture"}), 1);
+  EXPECT_EQ(err, "nandinfo: capture: no storage controller can be opened\n");
+  EXPECT_FALSE(std::filesystem::exists(folder / "capture"));
+  registry.root->children.back().openStatus = 0;
   EXPECT_EQ(run({"msp"}), 1);
   EXPECT_NE(out.find("Controller does not support MSP data"), std::string::npos) << out;
   registry.root->children.resize(1);
