@@ -25,13 +25,6 @@ T littleEndian(std::span<const std::byte, sizeof(T)> bytes) {
   return value;
 }
 
-// The number's bytes.
-template <std::unsigned_integral T>
-std::array<std::byte, sizeof(T)> littleEndianBytes(T value) {
-  static_assert(std::endian::native == std::endian::little);
-  return std::bit_cast<std::array<std::byte, sizeof(T)>>(value);
-}
-
 // The number that one to eight bytes hold.
 inline std::uint64_t littleEndianOfAnyWidth(std::span<const std::byte> bytes) {
   std::array<std::byte, sizeof(std::uint64_t)> extended = {};

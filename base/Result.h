@@ -57,7 +57,8 @@ class [[nodiscard]] Result {
     return *this ? std::optional<T>(*std::move(*this)) : std::nullopt;
   }
 
-  // What the next step makes of the value: a Result of its own.
+  // What the next step makes of the value: a Result of its own. After a failure there is no next
+  // step, and the error goes on as it is.
   template <typename Next>
   auto and_then(Next next) && -> std::invoke_result_t<Next, T> {
     if (!*this) return error();
@@ -74,7 +75,7 @@ class [[nodiscard]] Result {
   std::variant<T, Error> content_;
 };
 
-// Success has nothing to say.
+// For what is done for its effect: a success has nothing to say, a failure says why.
 template <>
 class [[nodiscard]] Result<void> {
  public:

@@ -47,23 +47,23 @@ std::string doubleText(double value) {
 }
 
 char* writeInteger(char* to, std::int64_t value) {
-  return std::to_chars(to, to + kLongestNumber, value).ptr;
+  return std::to_chars(to, to + kMaxNumberLength, value).ptr;
 }
 char* writeInteger(char* to, std::uint64_t value) {
-  return std::to_chars(to, to + kLongestNumber, value).ptr;
+  return std::to_chars(to, to + kMaxNumberLength, value).ptr;
 }
 
 char* writeReal(char* to, double value) {
   // Not-a-number has a sign that nobody wants to read.
   if (std::isnan(value)) return std::copy_n("nan", 3, to);
-  return std::to_chars(to, to + kLongestNumber, value).ptr;
+  return std::to_chars(to, to + kMaxNumberLength, value).ptr;
 }
 
 namespace {
 
 template <typename Number>
 void append(std::string& text, Number value, char* (*write)(char*, Number)) {
-  std::array<char, kLongestNumber> digits;
+  std::array<char, kMaxNumberLength> digits;
   text.append(digits.data(), write(digits.data(), value));
 }
 

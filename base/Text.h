@@ -21,9 +21,9 @@ std::string vformat(const char* format, std::va_list arguments)
 std::string doubleText(double value);
 
 // Writes the decimal digits of an integer, or the shortest text that reads back as the same double
-// ("inf", "-inf", "nan" for the rest), where there is room for kLongestNumber characters. Returns
+// ("inf", "-inf", "nan" for the rest), where there is room for kMaxNumberLength characters. Returns
 // the end.
-inline constexpr std::size_t kLongestNumber = 32;
+inline constexpr std::size_t kMaxNumberLength = 32;
 char* writeInteger(char* to, std::int64_t value);
 char* writeInteger(char* to, std::uint64_t value);
 char* writeReal(char* to, double value);

@@ -20,12 +20,12 @@ void appendTimestamp(std::string& out, double secondsSince1970) {
 
 std::optional<double> secondsFromTimestamp(std::string_view text) {
   constexpr std::string_view kTail = "-00-00T00:00:00Z";
-  constexpr std::size_t kFewestDigits = 4, kMostDigits = 7;  // of the year
+  constexpr std::size_t kMinYearDigits = 4, kMaxYearDigits = 7;  // of the year
   const bool negative = text.starts_with('-');
   if (negative) text.remove_prefix(1);
-  if (text.size() < kTail.size() + kFewestDigits) return std::nullopt;
+  if (text.size() < kTail.size() + kMinYearDigits) return std::nullopt;
   const std::size_t tail = text.size() - kTail.size();
-  if (tail > kMostDigits) return std::nullopt;
+  if (tail > kMaxYearDigits) return std::nullopt;
   for (std::size_t i = 0; i < text.size(); ++i) {
     const char expected = i < tail ? '0' : kTail[i - tail];
     const bool digit = text[i] >= '0' && text[i] <= '9';

@@ -7,6 +7,7 @@
 #include <cstring>
 #include <stdexcept>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "bench/Rows.h"
@@ -96,7 +97,7 @@ void addQueryRows(bench::Table& table) {
       "history query, scalars of 2 of 60 days", "bare scan of those rows, per row", 1.2,
       2.0 * kScalars,
       [&] {
-        history->scalarsForKeyPrefix(
+        std::ignore = history->scalarsForKeyPrefix(
             "", kDays - 2, kDays - 1,
             [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
               sum += value + day + static_cast<std::int64_t>(key.size());
@@ -123,13 +124,13 @@ void addQueryRows(bench::Table& table) {
       "history query, samples of 2 of 60 days", "bare scan of those rows, per sample", 1.5,
       2.0 * kDistributions * kSamples,
       [&] {
-        history->distributionsForKeyPrefix(
+        std::ignore = history->distributionsForKeyPrefix(
             "", kDays - 2, kDays - 1,
             [&](std::string_view, std::int32_t, platform::PLHistoryDistributionEnumerator& samples,
                 bool&) {
-              for (auto block = samples.getNextValues(); !block.values.empty();
+              for (auto block = samples.getNextValues(); block && !block->values.empty();
                    block = samples.getNextValues()) {
-                for (const double value : block.values) total += value;
+                for (const double value : block->values) total += value;
               }
             });
         bench::keep(total);

@@ -13,6 +13,7 @@
 
 #include "NANDInfo/KeyTables.h"
 #include "NANDInfo/Parsers.h"
+#include "base/ByteWriter.h"
 #include "bench/Rows.h"
 
 namespace bench {
@@ -22,7 +23,7 @@ namespace {
 using Bytes = std::vector<std::byte>;
 
 void put(Bytes& bytes, std::uint64_t number, unsigned width) {
-  for (unsigned i = 0; i < width; ++i) bytes.push_back(static_cast<std::byte>(number >> (8 * i)));
+  base::appendLittleEndian(bytes, number, width);
 }
 
 // Counters of all magnitudes.

@@ -50,8 +50,7 @@ std::optional<std::string> DeviceContext::homeOfCounters() {
   if (!(multiUser_ ? *multiUser_ : isForcedToMultiUserMode() || isMultiUserDevice())) {
     return kSingleUserHome;
   }
-  std::uint64_t error = 1;
-  return properties_.systemGroupContainerPath(kSystemGroupContainer, error);
+  return properties_.systemGroupContainerPath(kSystemGroupContainer).path;
 }
 
 const std::string* DeviceContext::GetHomeDirectoryPath() {
@@ -59,13 +58,13 @@ const std::string* DeviceContext::GetHomeDirectoryPath() {
   if (home_) return &*home_;
   if (!multiUser_) multiUser_ = determineMultiUserMode();
   if (*multiUser_) {
-    std::uint64_t error = 1;
-    home_ = properties_.systemGroupContainerPath(kSystemGroupContainer, error);
-    if (!home_) {
+    auto container = properties_.systemGroupContainerPath(kSystemGroupContainer);
+    if (!container.path) {
       log_.log(LogLevel::standard, "Error getting system group container: %llu",
-               static_cast<unsigned long long>(error));
+               static_cast<unsigned long long>(container.error));
       return nullptr;
     }
+    home_ = std::move(container.path);
   } else {
     home_ = kSingleUserHome;
   }

@@ -89,7 +89,7 @@ struct Cost {
   std::size_t values = 0, bytes = 0;
 
   void add(const plist::Dictionary& dictionary, int depth) {
-    require(dictionary.size() <= kMaximumElements && depth <= kMaximumNesting);
+    require(dictionary.size() <= kMaxElements && depth <= kMaxNesting);
     for (const auto& entry : dictionary) {
       bytes += entry.key.size();
       add(entry.value, depth);
@@ -101,7 +101,7 @@ struct Cost {
     if (const auto* data = value.as<plist::Data>()) bytes += data->size();
     if (const auto* dictionary = value.as<plist::Dictionary>()) add(*dictionary, depth + 1);
     if (const auto* array = value.as<plist::Array>()) {
-      require(array->size() <= kMaximumElements && depth < kMaximumNesting);
+      require(array->size() <= kMaxElements && depth < kMaxNesting);
       for (const plist::Value& element : *array) add(element, depth + 1);
     }
   }
@@ -122,7 +122,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   if (const auto read = readDictionary(message)) {
     Cost cost;
     cost.add(read->dictionary, 1);
-    require(cost.values <= kMaximumValues && cost.bytes <= kMaximumBytes);
+    require(cost.values <= kMaxValues && cost.bytes <= kMaxBytes);
   }
   sd_bus_message_unref(message);
   return 0;

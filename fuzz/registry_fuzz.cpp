@@ -10,6 +10,7 @@
 #include <string>
 
 #include "PropertyListRoundTrip.h"
+#include "base/ByteWriter.h"
 #include "host/recorded/DeviceRegistry.h"
 #include "plist/PropertyList.h"
 
@@ -20,7 +21,7 @@ using namespace platform;
 using fuzz::require;
 using host::recorded::DeviceRegistry;
 
-constexpr std::size_t kMostEntries = 200, kLargestOutput = 4096;
+constexpr std::size_t kMaxEntries = 200, kMaxOutput = 4096;
 
 // A root in memory, with one file for drivers to answer from and one outside device/.
 struct Folder {
@@ -54,7 +55,7 @@ class CountingLog : public SystemLog {
 };
 
 void put(std::span<std::byte> block, std::size_t offset, std::uint32_t word) {
-  for (std::size_t i = 0; i < 4; ++i) block[offset + i] = static_cast<std::byte>(word >> (8 * i));
+  std::ranges::copy(base::littleEndianBytes(word), block.subspan(offset).begin());
 }
 
 // One struct call: nothing is written behind what the call says that it delivered.
@@ -78,7 +79,7 @@ void askDriver(host::recorded::DeviceRegistry& registry, DriverConnection connec
     for (const std::uint32_t argument : {0u, 1u, 24u, 1u << 31}) {
       for (const std::uint32_t flags : {0u, 1u, 4u, 5u}) {
         put(block, 0, opType), put(block, 4, flags), put(block, 8, argument);
-        callStruct(registry, connection, 8 + flags % 2, block, flags % 2 == 1 ? 4 : kLargestOutput);
+        callStruct(registry, connection, 8 + flags % 2, block, flags % 2 == 1 ? 4 : kMaxOutput);
       }
     }
   }
@@ -104,7 +105,7 @@ void askEverything(host::recorded::DeviceRegistry& registry) {
     }
     const auto [status, connection] = registry.DrvServiceOpen(entry, 0);
     require((status == 0) == (connection != 0), "a connection, or an error");
-    if (connection != 0 && ++entries <= kMostEntries) askDriver(registry, connection);
+    if (connection != 0 && ++entries <= kMaxEntries) askDriver(registry, connection);
     registry.DrvServiceClose(connection);
     require(registry.DrvServiceClose(connection) != 0, "a closed connection is gone");
     registry.release(entry);

@@ -33,9 +33,13 @@ class DeviceProperties {
   };
   virtual std::optional<DiskUsage> diskUsage() = 0;
 
-  // The path of a system group container. None when there is none, with the error code set.
-  virtual std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
-                                                              std::uint64_t& error) = 0;
+  // Where a system group container is, or the device's own code for why it is nowhere; 1 when the
+  // device gave none.
+  struct GroupContainer {
+    std::optional<std::string> path{};
+    std::uint64_t error = 1;
+  };
+  virtual GroupContainer systemGroupContainerPath(std::string_view identifier) = 0;
 };
 
 // The version of the operating system.

@@ -10,6 +10,8 @@
 #include <span>
 #include <string_view>
 
+#include "base/Result.h"
+
 namespace platform {
 
 // The samples of one key and day, in the order in which they were recorded.
@@ -23,13 +25,11 @@ class PLHistoryDistributionEnumerator {
 
   virtual ~PLHistoryDistributionEnumerator() = default;
 
-  // The next samples, as many as the store has at hand; empty at the end, and after a failure. They
-  // are borrowed until the next call. Samples come in blocks because a call for each would double
-  // the cost of reading; those that nobody asks for aren't read.
-  virtual Samples getNextValues() = 0;
-
-  // Whether samples couldn't be read: what came is not all of them.
-  virtual bool failed() const { return false; }
+  // The next samples, as many as the store has at hand; empty at the end. They are borrowed until
+  // the next call. Samples come in blocks because a call for each would double the cost of reading;
+  // those that nobody asks for aren't read. After an error what came is not all of them; the query
+  // ends with the same error.
+  virtual base::Result<Samples> getNextValues() = 0;
 
   // Whether the query has a row of the same key for its last day too; known on the day before that.
   virtual bool comesAgain() { return false; }
@@ -48,16 +48,15 @@ class PLHistory {
   virtual ~PLHistory() = default;
 
   // The rows whose key begins with the prefix, from the first to the last day, both included,
-  // ordered by day and then by key (bytewise). A store that fails delivers no further row.
-  virtual void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
-                                   std::int32_t maxDaysSince1970,
-                                   const ScalarRowHandler& rowHandler) = 0;
-  virtual void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
-                                         std::int32_t maxDaysSince1970,
-                                         const DistributionRowHandler& rowHandler) = 0;
-
-  // Whether a query failed so far: what it delivered is not all that there is.
-  virtual bool failed() const = 0;
+  // ordered by day and then by key (bytewise). After an error there is no further row: what was
+  // delivered is not all that there is.
+  virtual base::Result<void> scalarsForKeyPrefix(std::string_view keyPrefix,
+                                                 std::int32_t minDaysSince1970,
+                                                 std::int32_t maxDaysSince1970,
+                                                 const ScalarRowHandler& rowHandler) = 0;
+  virtual base::Result<void> distributionsForKeyPrefix(
+      std::string_view keyPrefix, std::int32_t minDaysSince1970, std::int32_t maxDaysSince1970,
+      const DistributionRowHandler& rowHandler) = 0;
 };
 
 class HistoryStore {

@@ -23,13 +23,13 @@ constexpr double kSecondsFrom1970To2001 = 978307200;
 
 // What a file may expand to: shared objects are read once for each reference.
 constexpr std::uint64_t kFreeObjects = 4096;  // plus one for each byte of the file
-constexpr std::uint64_t kMaximumObjects = std::uint64_t{4} << 20;
-constexpr std::uint64_t kMaximumContent = std::uint64_t{64} << 20;  // bytes of text and data
+constexpr std::uint64_t kMaxObjects = std::uint64_t{4} << 20;
+constexpr std::uint64_t kMaxContent = std::uint64_t{64} << 20;  // bytes of text and data
 
 class Reader {
  public:
   explicit Reader(std::string_view bytes)
-      : bytes_(bytes), objectsLeft_(std::min(kFreeObjects + bytes.size(), kMaximumObjects)) {}
+      : bytes_(bytes), objectsLeft_(std::min(kFreeObjects + bytes.size(), kMaxObjects)) {}
 
   base::Result<Value> read() {
     std::optional<Value> value;
@@ -303,7 +303,7 @@ class Reader {
   std::string_view bytes_;
   std::uint64_t offsetSize_ = 0, referenceSize_ = 0, count_ = 0, top_ = 0, table_ = 0;
   std::uint64_t objectsLeft_;
-  std::uint64_t contentLeft_ = kMaximumContent;
+  std::uint64_t contentLeft_ = kMaxContent;
   std::array<std::uint64_t, kMaxDepth> path_{};  // offsets of the open containers
   std::uint64_t errorOffset_ = 0;
   std::string error_;

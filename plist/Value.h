@@ -79,6 +79,7 @@ class Number {
   };
 };
 
+// A moment. The XML form holds whole seconds, rounded down; the binary one all of it.
 struct Date {
   double secondsSince1970;
   bool operator==(const Date&) const = default;
@@ -148,6 +149,8 @@ class Dictionary {
   std::unique_ptr<Index> index_;  // null while the dictionary is small
 };
 
+// One value of any of the six kinds, made of it without a cast; a null pointer is none of them.
+// Copies are deep, moves are cheap and leave an empty value behind.
 class Value {
  public:
   using Variant = std::variant<Number, std::string, Array, Dictionary, Date, Data>;
@@ -182,6 +185,8 @@ class Value {
   Variant variant_;
 };
 
+// A key with its value. The order of a dictionary's entries is theirs; a key is never changed
+// where it stands.
 struct Dictionary::Entry {
   // Of anything that a text and a value can be made of.
   template <typename Key, typename Content>

@@ -92,11 +92,11 @@ std::optional<Number> integerFrom(std::string_view text) {
   const char* end = text.data() + text.size();
   const auto parsed = std::from_chars(text.data(), end, magnitude, base);
   if (parsed.ec != std::errc{} || parsed.ptr != end) return std::nullopt;
-  constexpr std::uint64_t kLargest = INT64_MAX;
+  constexpr std::uint64_t kMax = INT64_MAX;
   if (!negative) {
-    return magnitude <= kLargest ? Number(static_cast<std::int64_t>(magnitude)) : Number(magnitude);
+    return magnitude <= kMax ? Number(static_cast<std::int64_t>(magnitude)) : Number(magnitude);
   }
-  if (magnitude > kLargest + 1) return std::nullopt;
+  if (magnitude > kMax + 1) return std::nullopt;
   return Number(static_cast<std::int64_t>(0 - magnitude));
 }
 

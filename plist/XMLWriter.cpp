@@ -80,9 +80,10 @@ class Writer {
 
  private:
   static constexpr std::size_t kBlock = 4096;
-  static constexpr std::size_t kLongestTag = 16;
+  static constexpr std::size_t kMaxTagLength = 16;
   // Of an element without its text or data: indentation, tags and a number.
-  static constexpr std::size_t kLongestElement = kMaxDepth + 2 * kLongestTag + base::kLongestNumber;
+  static constexpr std::size_t kMaxElementLength =
+      kMaxDepth + 2 * kMaxTagLength + base::kMaxNumberLength;
 
   // `depth` is the number of containers around the value; it is the indentation too.
   void write(const Value& value, std::size_t depth) {
@@ -163,14 +164,14 @@ class Writer {
 
   // Makes room for an element and indents it.
   void begin(std::size_t depth) {
-    if (static_cast<std::size_t>(end_ - block_.data()) > kBlock - kLongestElement) flush();
+    if (static_cast<std::size_t>(end_ - block_.data()) > kBlock - kMaxElementLength) flush();
     end_ = std::fill_n(end_, depth, '\t');
   }
 
   // Leaves room for an end tag.
   void putText(std::string_view text) {
     const auto used = static_cast<std::size_t>(end_ - block_.data());
-    if (text.size() <= kBlock - kLongestTag - used && kEscaped.isPlain(text)) {
+    if (text.size() <= kBlock - kMaxTagLength - used && kEscaped.isPlain(text)) {
       end_ = std::copy(text.begin(), text.end(), end_);
     } else {
       flush();

@@ -7,6 +7,7 @@
 
 namespace report {
 
+// Both names end with a NUL; a value is whatever the kernel has at the time of the report.
 struct KernelCounter {
   const char* key;
   const char* name;

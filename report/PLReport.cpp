@@ -33,11 +33,11 @@ Sections PLReport::sectionsOfDay(std::int32_t day) const {
   const auto refuse = [&](std::string_view key) {
     if (sections.empty()) refused.emplace(key);
   };
-  bool unread = false;
+  base::Result<void> read;
   if (config_ != nullptr) {
     const auto history = services_.history.initWithDefaultPath();
     const std::int32_t first = base::dayBefore(day);
-    history->scalarsForKeyPrefix(
+    read = history->scalarsForKeyPrefix(
         "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
           if (const auto* options = config_->configOptionsForScalarKey(key)) {
             sections.addScalar(value, key, *options);
@@ -45,25 +45,27 @@ Sections PLReport::sectionsOfDay(std::int32_t day) const {
             refuse(key);
           }
         });
-    history->distributionsForKeyPrefix(
-        "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
-          if (const auto* options = config_->configOptionsForDistributionKey(key)) {
-            if (samples.comesAgain()) {
-              sections.keepPlace(key, *options);
+    if (read) {
+      read = history->distributionsForKeyPrefix(
+          "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
+            if (const auto* options = config_->configOptionsForDistributionKey(key)) {
+              if (samples.comesAgain()) {
+                sections.keepPlace(key, *options);
+              } else {
+                sections.computeAndAddDistribution(samples, key, *options);
+              }
             } else {
-              sections.computeAndAddDistribution(samples, key, *options);
+              refuse(key);
             }
-          } else {
-            refuse(key);
-          }
-        });
+          });
+    }
     sections.dropKeptPlaces();
-    unread = history->failed();
+    if (!read) services_.log.log(LogLevel::error, "%s", read.error().text.c_str());
   }
   if (sections.empty()) {
     const std::string why =
         config_ == nullptr ? "the whitelist couldn't be read"
-        : unread           ? "the counters can't be read"
+        : !read            ? "the counters can't be read"
         : refused.empty()
             ? "no counter was recorded on that day or the day before"
             : base::format("the whitelist names none of the %zu counters", refused.size());

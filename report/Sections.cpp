@@ -49,11 +49,11 @@ void Sections::computeAndAddDistribution(platform::PLHistoryDistributionEnumerat
               "Couldn't allocate histCounts for key %.*s. Will not calculate histogram values",
               static_cast<int>(key.size()), key.data());
   }
-  for (auto block = samples.getNextValues(); !block.values.empty();
-       block = samples.getNextValues()) {
-    distribution.add(block.values);
+  auto block = samples.getNextValues();
+  for (; block && !block->values.empty(); block = samples.getNextValues()) {
+    distribution.add(block->values);
   }
-  if (samples.failed()) return;
+  if (!block) return;
   if (intervals != nullptr && !distribution.histogramFailed()) {
     if (auto histogram = distribution.histogram()) {
       histograms.set(key, std::move(*histogram));

@@ -22,6 +22,9 @@ class SystemVersion;
 
 namespace report {
 
+// `history` and `counters` hold what was recorded; `clock`, `kernel`, `systemVersion`,
+// `applications`, `locale` and `files` say what the report adds by itself; `preferences` keep the
+// version and the tasking; `submission` is where the log leaves, `eventra` where events do.
 struct Services {
   platform::SystemLog& log;
   platform::Clock& clock;

@@ -9,6 +9,7 @@
 #include <utility>
 
 #include "base/ByteReader.h"
+#include "base/ByteWriter.h"
 
 namespace NANDInfo {
 

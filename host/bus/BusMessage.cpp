@@ -56,15 +56,15 @@ class Reader {
   }
 
   sd_bus_message* message_;
-  std::size_t bytes_ = kMaximumBytes;
-  std::size_t values_ = kMaximumValues;
+  std::size_t bytes_ = kMaxBytes;
+  std::size_t values_ = kMaxValues;
   std::size_t dropped_ = 0;
 };
 
 bool Reader::readEntries(plist::Dictionary& dictionary, int depth) {
   std::string room;
   for (std::size_t count = 0; !atEnd(); ++count) {
-    if (count >= kMaximumElements) {
+    if (count >= kMaxElements) {
       ++dropped_;
       if (!skip()) return false;
       continue;
@@ -86,7 +86,7 @@ bool Reader::readEntries(plist::Dictionary& dictionary, int depth) {
 
 bool Reader::readArray(plist::Array& array, int depth) {
   for (std::size_t count = 0; !atEnd(); ++count) {
-    if (count >= kMaximumElements) {
+    if (count >= kMaxElements) {
       ++dropped_;
       if (!skip()) return false;
       continue;
@@ -102,7 +102,7 @@ bool Reader::readValue(std::optional<plist::Value>& value, int depth) {
   char type = 0;
   const char* contents = nullptr;
   if (sd_bus_message_peek_type(message_, &type, &contents) <= 0) return false;
-  if (depth >= kMaximumNesting) {
+  if (depth >= kMaxNesting) {
     ++dropped_;
     return skip();
   }

@@ -15,11 +15,10 @@
 
 namespace host {
 
-inline constexpr std::size_t kMaximumElements = 4096;  // of one array or dictionary
-inline constexpr std::size_t kMaximumValues = 65536;   // of a message, in all
-inline constexpr std::size_t kMaximumBytes = std::size_t{1}
-                                             << 20;  // of texts, keys and data, in all
-inline constexpr int kMaximumNesting = 64;           // of arrays, dictionaries, variants
+inline constexpr std::size_t kMaxElements = 4096;               // of one array or dictionary
+inline constexpr std::size_t kMaxValues = 65536;                // of a message, in all
+inline constexpr std::size_t kMaxBytes = std::size_t{1} << 20;  // of texts, keys and data, in all
+inline constexpr int kMaxNesting = 64;                          // of arrays, dictionaries, variants
 
 struct BusDictionary {
   plist::Dictionary dictionary;

@@ -112,29 +112,27 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
   std::int32_t day() const { return day_; }
   std::string_view key() const { return key_; }
 
-  Samples getNextValues() override {
+  base::Result<Samples> getNextValues() override {
     for (; packedRows_.isAt(day_, key_); packedRows_.next(), unpacked_ = 0) {
       if (const std::size_t count = unpack(packedRows_.column(2).integer())) return block(count);
-      if (failed()) return {};
+      if (!unpacking_) break;
     }
     std::size_t count = 0;
-    for (; count < kBlock && stagedRows_.isAt(day_, key_); stagedRows_.next(), ++count) {
+    for (; unpacking_ && count < kBlock && stagedRows_.isAt(day_, key_);
+         stagedRows_.next(), ++count) {
       values_[count] = stagedRows_.column(3).real();
       seconds_[count] = static_cast<std::int32_t>(stagedRows_.column(2).integer());
     }
+    if (!outcome()) return outcome().error();
     return block(count);
   }
 
   // How the reading went so far.
-  base::Result<void> outcome() const {
+  const base::Result<void>& outcome() const {
     for (const Rows* rows : {&packedRows_, &stagedRows_, &lastDayRows_}) {
       if (!rows->outcome()) return rows->outcome();
     }
     return unpacking_;
-  }
-  bool failed() const override {
-    return !(packedRows_.outcome() && stagedRows_.outcome() && lastDayRows_.outcome() &&
-             unpacking_);
   }
 
   bool comesAgain() override {
@@ -148,7 +146,7 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
   static constexpr std::size_t kBlock = 512;
 
   void arrive() {
-    valid_ = !failed() && (packedRows_.valid() || stagedRows_.valid());
+    valid_ = outcome() && (packedRows_.valid() || stagedRows_.valid());
     if (!valid_) return;
     const bool staged =
         !packedRows_.valid() || stagedRows_.isBefore(packedRows_.day(), packedRows_.key());
@@ -200,19 +198,13 @@ class StoredSamples : public platform::PLHistoryDistributionEnumerator {
 
 }  // namespace
 
-void CounterHistory::read(const CounterDatabase::Work& work) {
-  if (failed_) return;
-  const auto done = database_.read(work);
-  failed_ = !done;
-  if (failed_) log_.log(platform::LogLevel::error, "%s", done.error().text.c_str());
-}
-
-void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
-                                         std::int32_t maxDaysSince1970,
-                                         const ScalarRowHandler& rowHandler) {
+base::Result<void> CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix,
+                                                       std::int32_t minDaysSince1970,
+                                                       std::int32_t maxDaysSince1970,
+                                                       const ScalarRowHandler& rowHandler) {
   std::string prefixRoom, room;
   const std::string_view prefix = base::writable(keyPrefix, prefixRoom);
-  read([&](sqlite::Connection& connection) {
+  return database_.read([&](sqlite::Connection& connection) {
     sqlite::Statement rows(connection,
                            "SELECT day, key, value FROM scalars WHERE day BETWEEN ? AND ? "
                            "ORDER BY day, key",
@@ -229,13 +221,12 @@ void CounterHistory::scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_
   });
 }
 
-void CounterHistory::distributionsForKeyPrefix(std::string_view keyPrefix,
-                                               std::int32_t minDaysSince1970,
-                                               std::int32_t maxDaysSince1970,
-                                               const DistributionRowHandler& rowHandler) {
+base::Result<void> CounterHistory::distributionsForKeyPrefix(
+    std::string_view keyPrefix, std::int32_t minDaysSince1970, std::int32_t maxDaysSince1970,
+    const DistributionRowHandler& rowHandler) {
   std::string prefixRoom, room;
   const std::string_view prefix = base::writable(keyPrefix, prefixRoom);
-  read([&](sqlite::Connection& connection) -> base::Result<void> {
+  return database_.read([&](sqlite::Connection& connection) -> base::Result<void> {
     sqlite::Transaction snapshot(connection);
     if (auto begun = snapshot.begin(sqlite::Transaction::Kind::read); !begun) return begun;
     StoredSamples samples(connection, prefix, minDaysSince1970, maxDaysSince1970);

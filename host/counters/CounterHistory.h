@@ -17,28 +17,23 @@ class CounterHistory : public platform::PLHistory {
  public:
   // The place is borrowed.
   explicit CounterHistory(const CounterPlace& place)
-      : log_(place.log), database_(place, DeviceRoot::Links::followed) {}
+      : database_(place, DeviceRoot::Links::followed) {}
 
-  // Each query sees the database as it was when the query began. After a failure, which the log
-  // tells, this history is empty. A handler may query this history and write to the store.
+  // Each query sees the database as it was when the query began. A handler may query this history
+  // and write to the store.
   //
   // A stored key that can't be written, which this store doesn't make, comes as it is written, in
   // the place of what is stored. Rows whose keys become the same each come: the last counts.
-  void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
-                           std::int32_t maxDaysSince1970,
-                           const ScalarRowHandler& rowHandler) override;
-  void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
-                                 std::int32_t maxDaysSince1970,
-                                 const DistributionRowHandler& rowHandler) override;
-
-  bool failed() const override { return failed_; }
+  base::Result<void> scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDaysSince1970,
+                                         std::int32_t maxDaysSince1970,
+                                         const ScalarRowHandler& rowHandler) override;
+  base::Result<void> distributionsForKeyPrefix(std::string_view keyPrefix,
+                                               std::int32_t minDaysSince1970,
+                                               std::int32_t maxDaysSince1970,
+                                               const DistributionRowHandler& rowHandler) override;
 
  private:
-  void read(const CounterDatabase::Work& work);
-
-  platform::SystemLog& log_;
   CounterDatabase database_;
-  bool failed_ = false;
 };
 
 }  // namespace host

@@ -28,6 +28,8 @@ namespace host::sqlite {
 inline constexpr std::errc kDamaged = std::errc::bad_message;
 inline constexpr std::errc kUnwritable = std::errc::read_only_file_system;
 
+// One open database with its prepared statements. Every failure comes back as an error with
+// SQLite's own words, and as kDamaged or kUnwritable where it is that; nothing is logged here.
 class Connection {
  public:
   // readOnly: leaves the file and its log as they are. immutable: reads the file alone, as it

@@ -85,16 +85,15 @@ std::optional<platform::DeviceProperties::DiskUsage> DeviceProperties::diskUsage
                    bytes(*usage, "AmountDataAvailable")};
 }
 
-std::optional<std::string> DeviceProperties::systemGroupContainerPath(std::string_view identifier,
-                                                                      std::uint64_t& error) {
+DeviceProperties::GroupContainer DeviceProperties::systemGroupContainerPath(
+    std::string_view identifier) {
   if (isPlainFileName(identifier, kMaxFileName)) {
     std::string path = "/var/containers/systemgroup/" + std::string(identifier);
     if (root_.openFolder(path, DeviceRoot::Missing::fails, DeviceRoot::Links::followed)) {
-      return path;
+      return {.path = std::move(path)};
     }
   }
-  error = kNoSuchContainer;
-  return std::nullopt;
+  return {.error = kNoSuchContainer};
 }
 
 }  // namespace host::recorded

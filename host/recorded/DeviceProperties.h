@@ -29,8 +29,7 @@ class DeviceProperties : public platform::DeviceProperties {
 
   // /var/containers/systemgroup/<identifier>, a path of the device, where that folder exists; else
   // error 2. An identifier that is not a plain name has no container.
-  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
-                                                      std::uint64_t& error) override;
+  GroupContainer systemGroupContainerPath(std::string_view identifier) override;
 
  private:
   const plist::Number* number(std::string_view name);

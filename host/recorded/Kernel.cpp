@@ -11,11 +11,13 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <cstdint>
 #include <cstring>
 #include <ctime>
+#include <optional>
 #include <system_error>
 
-#include "base/ByteReader.h"
+#include "base/ByteWriter.h"
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"
 

@@ -12,8 +12,8 @@ namespace host::recorded {
 
 std::optional<std::vector<std::byte>> KernelSnapshots::capture(std::uint32_t flags) {
   if ((flags & kChunkedData) == 0) return std::nullopt;
-  const auto bytes = root_.readFile("device/kernel-snapshot.bin", kLargestSnapshot + 1);
-  if (!bytes || bytes->size() > kLargestSnapshot) return std::nullopt;
+  const auto bytes = root_.readFile("device/kernel-snapshot.bin", kMaxSnapshot + 1);
+  if (!bytes || bytes->size() > kMaxSnapshot) return std::nullopt;
   const auto* first = reinterpret_cast<const std::byte*>(bytes->data());
   return std::vector<std::byte>(first, first + bytes->size());
 }

@@ -9,7 +9,7 @@
 
 namespace host::recorded {
 
-inline constexpr std::size_t kLargestSnapshot = std::size_t{64} << 20;
+inline constexpr std::size_t kMaxSnapshot = std::size_t{64} << 20;
 
 class KernelSnapshots : public platform::KernelSnapshots {
  public:

@@ -9,6 +9,7 @@
 #include <cstring>
 
 #include "base/ByteReader.h"
+#include "base/ByteWriter.h"
 #include "base/Text.h"
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"

@@ -7,6 +7,8 @@
 #include <span>
 #include <string_view>
 
+#include "base/ByteReader.h"
+#include "base/ByteWriter.h"
 #include "base/Text.h"
 
 namespace platform::fakes {
@@ -35,11 +37,7 @@ std::vector<const Entry*> walkOf(const std::optional<Entry>& root) {
 }
 
 std::uint32_t word(std::span<const std::byte> bytes, std::size_t offset) {
-  std::uint32_t value = 0;
-  for (std::size_t i = 4; i-- > 0;) {
-    value = value << 8 | std::to_integer<std::uint32_t>(bytes[offset + i]);
-  }
-  return value;
+  return base::littleEndian<std::uint32_t>(bytes.subspan(offset).first<sizeof(std::uint32_t)>());
 }
 
 }  // namespace
@@ -50,7 +48,7 @@ Entry& FakeDeviceRegistry::add(Entry entry) {
 
 FakeDeviceRegistry::Answer FakeDeviceRegistry::announce(std::uint32_t size) {
   Answer answer;
-  for (int i = 0; i < 4; ++i) answer.output.push_back(static_cast<std::byte>(size >> 8 * i & 0xFF));
+  base::appendLittleEndian(answer.output, size);
   return answer;
 }
 

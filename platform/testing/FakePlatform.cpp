@@ -9,6 +9,7 @@
 #include <string_view>
 #include <thread>
 
+#include "base/ByteWriter.h"
 #include "base/Text.h"
 
 namespace platform::fakes {
@@ -41,11 +42,11 @@ class BlockEnumerator : public PLHistoryDistributionEnumerator {
         blockSize_(blockSize),
         comesAgain_(comesAgain) {}
 
-  Samples getNextValues() override {
+  base::Result<Samples> getNextValues() override {
     const std::size_t count = std::min(blockSize_, left_.size());
     const auto values = left_.first(count);
     left_ = left_.subspan(count);
-    return {values, std::span(offsets_).first(count)};
+    return Samples{values, std::span(offsets_).first(count)};
   }
 
   bool comesAgain() override { return comesAgain_; }
@@ -61,18 +62,20 @@ class OpenHistory : public PLHistory {
  public:
   explicit OpenHistory(FakeHistory& store) : store_(store) {}
 
-  void scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay, std::int32_t maxDay,
-                           const ScalarRowHandler& rowHandler) override {
+  base::Result<void> scalarsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay,
+                                         std::int32_t maxDay,
+                                         const ScalarRowHandler& rowHandler) override {
     bool stop = false;
     for (const auto& [row, value] : store_.scalars) {
       if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
       rowHandler(row.second, row.first, value, stop);
     }
+    return store_.outcome;
   }
 
-  void distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay,
-                                 std::int32_t maxDay,
-                                 const DistributionRowHandler& rowHandler) override {
+  base::Result<void> distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay,
+                                               std::int32_t maxDay,
+                                               const DistributionRowHandler& rowHandler) override {
     bool stop = false;
     for (const auto& [row, samples] : store_.distributions) {
       if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
@@ -81,9 +84,8 @@ class OpenHistory : public PLHistory {
       BlockEnumerator enumerator(samples, store_.blockSize, comesAgain);
       rowHandler(row.second, row.first, enumerator, stop);
     }
+    return store_.outcome;
   }
-
-  bool failed() const override { return store_.failed; }
 
  private:
   static bool covers(const FakeHistory::RowKey& row, std::string_view keyPrefix,
@@ -253,11 +255,9 @@ std::optional<std::string> FakeDevice::textProperty(std::string_view name) {
   return found != texts.end() ? std::optional(found->second) : std::nullopt;
 }
 
-std::optional<std::string> FakeDevice::systemGroupContainerPath(std::string_view,
-                                                                std::uint64_t& error) {
+DeviceProperties::GroupContainer FakeDevice::systemGroupContainerPath(std::string_view) {
   ++containerQueries;
-  if (!container) error = containerError;
-  return container;
+  return {container, containerError};
 }
 
 void FakeDevice::enumerateBundles(const std::function<void(BundleType)>& handler) {
@@ -289,9 +289,7 @@ Kernel::ReadResult FakeKernel::sysctlbyname(std::string_view name, std::span<std
   const auto found = integers.find(name);
   if (found == integers.end()) return {ENOENT, 0};
   const std::size_t length = std::min<std::size_t>(buffer.size(), 8);
-  for (std::size_t i = 0; i < length; ++i) {
-    buffer[i] = static_cast<std::byte>(found->second >> (8 * i));
-  }
+  std::copy_n(base::littleEndianBytes(found->second).begin(), length, buffer.begin());
   return {0, length};
 }
 

@@ -16,6 +16,7 @@
 #include <utility>
 #include <vector>
 
+#include "base/Result.h"
 #include "platform/AllServices.h"
 #include "platform/Clock.h"
 #include "platform/CountersService.h"
@@ -99,8 +100,8 @@ class FakeHistory : public HistoryStore {
   using RowKey = std::pair<std::int32_t, std::string>;
   std::map<RowKey, std::int64_t> scalars;
   std::map<RowKey, std::vector<double>> distributions;
-  std::size_t blockSize = 3;  // samples handed over at a time
-  bool failed = false;
+  std::size_t blockSize = 3;   // samples handed over at a time
+  base::Result<void> outcome;  // of a query, after its rows
 
   std::unique_ptr<PLHistory> initWithDefaultPath() override;
 };
@@ -244,8 +245,7 @@ class FakeDevice : public DeviceProperties,
   bool booleanProperty(std::string_view name) override;
   std::optional<std::string> textProperty(std::string_view name) override;
   std::optional<std::uint32_t> multiUserIndicator() override { return multiUser; }
-  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
-                                                      std::uint64_t& error) override;
+  GroupContainer systemGroupContainerPath(std::string_view identifier) override;
   std::optional<plist::Dictionary> systemVersionDictionary() override { return version; }
   std::string operatingSystemVersion() override { return versionText; }
   void enumerateBundles(const std::function<void(BundleType)>& handler) override;

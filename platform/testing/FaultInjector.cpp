@@ -54,11 +54,14 @@ struct Files : FileSystem {
 };
 
 struct FailedHistory : PLHistory {
-  void scalarsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
-                           const ScalarRowHandler&) override {}
-  void distributionsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
-                                 const DistributionRowHandler&) override {}
-  bool failed() const override { return true; }
+  base::Result<void> scalarsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
+                                         const ScalarRowHandler&) override {
+    return base::Error{"injected"};
+  }
+  base::Result<void> distributionsForKeyPrefix(std::string_view, std::int32_t, std::int32_t,
+                                               const DistributionRowHandler&) override {
+    return base::Error{"injected"};
+  }
 };
 
 struct Histories : HistoryStore {
@@ -137,10 +140,9 @@ struct Device : DeviceProperties, SystemVersion, LibraryLoader {
   std::optional<DiskUsage> diskUsage() override {
     return plan.fails() ? std::nullopt : inner.deviceProperties.diskUsage();
   }
-  std::optional<std::string> systemGroupContainerPath(std::string_view identifier,
-                                                      std::uint64_t& error) override {
-    if (plan.fails()) return std::nullopt;
-    return inner.deviceProperties.systemGroupContainerPath(identifier, error);
+  GroupContainer systemGroupContainerPath(std::string_view identifier) override {
+    if (plan.fails()) return {};
+    return inner.deviceProperties.systemGroupContainerPath(identifier);
   }
   std::optional<plist::Dictionary> systemVersionDictionary() override {
     return plan.fails() ? std::nullopt : inner.systemVersion.systemVersionDictionary();

@@ -14,7 +14,7 @@ namespace {
 
 using support::Bytes, support::Fields, support::fieldsOf, support::RefusingMemory;
 
-constexpr std::uint64_t kLargest = ~std::uint64_t{0};
+constexpr std::uint64_t kMax = ~std::uint64_t{0};
 
 TEST(GenericParserContext, AddsElementsOfEveryWidth) {
   const Bytes source = support::words({0x8182838485868788, 0x9192939495969798});
@@ -46,17 +46,17 @@ TEST(GenericParserContext, CutsLongNamesAndKeepsEqualOnes) {
   GenericParserCxt context;
   const std::string longName(120, 'x'), name97(97, 'y');
   AddSingleValueToGenericContext(&context, longName, "suffix", 1);
-  AddSingleValueToGenericContext(&context, name97, "12", kLargest);
+  AddSingleValueToGenericContext(&context, name97, "12", kMax);
   AddSingleValueToGenericContext(&context, "", "boots", 2);
   AddSingleValueToGenericContext(&context, "bo", "ots", 4);
   EXPECT_EQ(
       fieldsOf(context),
-      (Fields{{longName.substr(0, 98), 1}, {name97 + "1", kLargest}, {"boots", 2}, {"boots", 4}}));
+      (Fields{{longName.substr(0, 98), 1}, {name97 + "1", kMax}, {"boots", 2}, {"boots", 4}}));
   const auto dictionary = CreateDictFromCxt(context);
   EXPECT_EQ(dictionary.size(), 3u);
   EXPECT_EQ(dictionary.number("boots")->uint64Value(), 4u);
   EXPECT_EQ(dictionary.number("boots")->type(), plist::Number::Type::uint64);
-  EXPECT_EQ(dictionary.number(name97 + "1")->uint64Value(), kLargest);
+  EXPECT_EQ(dictionary.number(name97 + "1")->uint64Value(), kMax);
   const NameRow allowed[] = {{"boots", 0}, {"absent", 0}};
   const NameTable table(allowed);
   EXPECT_EQ(CreateDictFromCxt(context, &table), (plist::Dictionary{{"boots", std::uint64_t{4}}}));

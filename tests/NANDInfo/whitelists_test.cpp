@@ -70,7 +70,7 @@ TEST(Filter, KeepsTheNamedInOrderAndRoundsOnlyNumbersOnDemand) {
 }
 
 TEST(RoundSig, RoundsHalfUpAtTheDigitsOfTheLogarithm) {
-  constexpr std::uint64_t kMost = std::numeric_limits<std::uint64_t>::max();
+  constexpr std::uint64_t kMax = std::numeric_limits<std::uint64_t>::max();
   const struct {
     std::uint64_t value, digits, rounded;
   } rows[] = {{0, 0, 0},
@@ -85,10 +85,10 @@ TEST(RoundSig, RoundsHalfUpAtTheDigitsOfTheLogarithm) {
               {123456, 3, 123000},
               {999999999999999999, 18, 1000000000000000000},
               {999999999999999999, 19, 999999999999999999},
-              {kMost, 1, 0},
-              {kMost, 2, 18000000000000000000u},
-              {kMost, 20, kMost},
-              {kMost, kMost, kMost}};
+              {kMax, 1, 0},
+              {kMax, 2, 18000000000000000000u},
+              {kMax, 20, kMax},
+              {kMax, kMax, kMax}};
   for (const auto& [value, digits, rounded] : rows) {
     EXPECT_EQ(roundSig(value, digits), rounded) << value << " to " << digits;
   }

@@ -192,9 +192,9 @@ class DataUsageThreads : public ::testing::Test {
   std::int64_t recorded() {
     host::Host host({.root = folder.path()});
     std::int64_t sum = 0;
-    host.services().history.initWithDefaultPath()->scalarsForKeyPrefix(
+    EXPECT_TRUE(host.services().history.initWithDefaultPath()->scalarsForKeyPrefix(
         "", INT32_MIN, INT32_MAX,
-        [&](std::string_view, std::int32_t, std::int64_t value, bool&) { sum += value; });
+        [&](std::string_view, std::int32_t, std::int64_t value, bool&) { sum += value; }));
     return sum;
   }
 

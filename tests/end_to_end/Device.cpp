@@ -217,20 +217,22 @@ Lines Device::rows(std::int32_t first, std::int32_t last) const {
   host::Host host({.root = root_->path()});
   Lines rows;
   const auto history = host.services().history.initWithDefaultPath();
-  history->scalarsForKeyPrefix(
+  auto read = history->scalarsForKeyPrefix(
       "", first, last, [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
         rows.push_back(
             format("%d %s %lld", day, std::string(key).c_str(), static_cast<long long>(value)));
       });
-  history->distributionsForKeyPrefix(
+  EXPECT_TRUE(read);
+  read = history->distributionsForKeyPrefix(
       "", first, last, [&](std::string_view key, std::int32_t day, auto& samples, bool&) {
         std::string row = format("%d %s", day, std::string(key).c_str());
-        for (auto block = samples.getNextValues(); !block.values.empty();
+        for (auto block = samples.getNextValues(); block && !block->values.empty();
              block = samples.getNextValues()) {
-          for (const double value : block.values) row += format(" %g", value);
+          for (const double value : block->values) row += format(" %g", value);
         }
         rows.push_back(row);
       });
+  EXPECT_TRUE(read);
   return rows;
 }
 

@@ -131,8 +131,8 @@ TEST(BusMessage, NestingEndsAtItsLimit) {
       for (int i = 0; i < depth; ++i) sd_bus_message_close_container(m);
     };
   };
-  EXPECT_NE(readEntry(nested(kMaximumNesting - 3))->dictionary.number("k"), nullptr);
-  const auto deep = readEntry(nested(kMaximumNesting));
+  EXPECT_NE(readEntry(nested(kMaxNesting - 3))->dictionary.number("k"), nullptr);
+  const auto deep = readEntry(nested(kMaxNesting));
   EXPECT_EQ(deep->dictionary.size(), 0u);
   EXPECT_EQ(deep->dropped, 1u);
 }

@@ -140,7 +140,7 @@ TEST_P(SeededDamage, NeverCrashesTheStoreAndWhatIsReportedIsSetAside) {
       ++setAside;
       EXPECT_LE(here.damaged, 2);
       EXPECT_TRUE(here.store.set("after", 5, 60));
-      EXPECT_EQ(support::rows(*here.store.initWithDefaultPath(), "after"),
+      EXPECT_EQ(support::rows(*here.store.initWithDefaultPath(), here.log, "after"),
                 std::vector<std::string>{"60 after 5"});
     } else {
       ++kept;

@@ -21,7 +21,7 @@ using support::StoreFixture;
 using Lines = std::vector<std::string>;
 using std::filesystem::perms;
 
-constexpr std::int64_t kMost = std::numeric_limits<std::int64_t>::max();
+constexpr std::int64_t kMax = std::numeric_limits<std::int64_t>::max();
 constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
 
 class CounterStoreRows : public testing::Test {
@@ -43,8 +43,8 @@ TEST_F(CounterStoreRows, SumsSaturateInsteadOfWrapping) {
   struct {
     std::int64_t start, added, sum;
   } const cases[] = {
-      {1, 2, 3},           {kMost, 1, kMost},    {kMost - 1, 1, kMost}, {kLeast, -1, kLeast},
-      {kMost, kLeast, -1}, {-1, kLeast, kLeast}, {kLeast, kMost, -1},   {5, -7, -2}};
+      {1, 2, 3},          {kMax, 1, kMax},      {kMax - 1, 1, kMax}, {kLeast, -1, kLeast},
+      {kMax, kLeast, -1}, {-1, kLeast, kLeast}, {kLeast, kMax, -1},  {5, -7, -2}};
   for (const auto& row : cases) {
     EXPECT_TRUE(here.store.set("k", row.start, 1));
     EXPECT_TRUE(here.store.add("k", row.added, 1));
@@ -81,9 +81,9 @@ TEST_F(CounterStoreRows, RowsComeByDayThenBytesOfTheKeyWithinTheBounds) {
   EXPECT_EQ(here.rows(), (Lines{"-2147483648 a 4", "-3  1", "-3 B 1", "-3 a 1", "-3 ab 2", "-3 b 1",
                                 "-3 \xC3\xA4 1", "2147483647 a 3"}));
   const auto history = here.store.initWithDefaultPath();
-  EXPECT_EQ(support::rows(*history, "a", -3, 5), (Lines{"-3 a 1", "-3 ab 2"}));
-  EXPECT_EQ(support::rows(*history, "", -2, -3), Lines{});
-  EXPECT_EQ(support::rows(*history, "", -4, -3).size(), 6u);
+  EXPECT_EQ(support::rows(*history, here.log, "a", -3, 5), (Lines{"-3 a 1", "-3 ab 2"}));
+  EXPECT_EQ(support::rows(*history, here.log, "", -2, -3), Lines{});
+  EXPECT_EQ(support::rows(*history, here.log, "", -4, -3).size(), 6u);
 }
 
 TEST_F(CounterStoreRows, SamplesKeepTheirOrderAcrossCheckpointsAndBlocks) {
@@ -114,20 +114,20 @@ TEST_F(CounterStoreRows, ASkippedSeriesNeitherLosesNorMixesTheNextAndStopEndsThe
   EXPECT_TRUE(here.store.push("a", 600, 1, 0));
   EXPECT_TRUE(here.store.push("c", 1, 1, 0));
   Lines seen;
-  here.store.history()->distributionsForKeyPrefix(
+  EXPECT_TRUE(here.store.history()->distributionsForKeyPrefix(
       "", 0, 9,
       [&](std::string_view key, std::int32_t, platform::PLHistoryDistributionEnumerator& samples,
           bool& stop) {
         // A handler may query, and write to the store.
         if (key == "b") {
           EXPECT_EQ(here.rows().size(), 3u);
-          seen.push_back("b" + base::doubleText(samples.getNextValues().values.front()));
+          seen.push_back("b" + base::doubleText(samples.getNextValues()->values.front()));
           EXPECT_TRUE(here.store.push("c", 2, 1, 0));
         } else {
           seen.emplace_back(key);
         }
         stop = key == "b";
-      });
+      }));
   EXPECT_EQ(seen, (Lines{"a", "b1"}));
   EXPECT_EQ(here.rows().back(), "1 c 0:1 0:2");
 }
@@ -144,10 +144,10 @@ TEST_F(CounterStoreRows, ASeriesTellsOnTheLastDayButOneWhetherItComesAgain) {
   here.store.PLClientCheckpoint();
   const auto again = [&](std::int32_t first, std::int32_t last) {
     std::string seen;
-    here.store.history()->distributionsForKeyPrefix(
+    EXPECT_TRUE(here.store.history()->distributionsForKeyPrefix(
         "", first, last,
         [&](std::string_view key, std::int32_t, platform::PLHistoryDistributionEnumerator& samples,
-            bool&) { seen.append(key).append(samples.comesAgain() ? "+" : ""); });
+            bool&) { seen.append(key).append(samples.comesAgain() ? "+" : ""); }));
     return seen;
   };
   EXPECT_EQ(again(5, 6), "ab+cd+bde");
@@ -300,7 +300,8 @@ TEST_F(CounterStoreRows, KeysThatBecomeTheSameWhenTheyAreWrittenAreOne) {
   EXPECT_EQ(here.rows(), lines);
   here.store.PLClientCheckpoint();
   EXPECT_EQ(here.rows(), lines);
-  EXPECT_EQ(support::rows(*here.store.history(), "a\x03").size(), 4u) << "as the keys are written";
+  EXPECT_EQ(support::rows(*here.store.history(), here.log, "a\x03").size(), 4u)
+      << "as the keys are written";
 }
 
 TEST_F(CounterStoreRows, ANewerDatabaseIsRefusedAndLeftAlone) {

@@ -18,36 +18,39 @@ namespace support {
 
 inline constexpr char kDatabase[] = "var/mobile/Library/Pelloran/PLDataStore.sqlitedb";
 
-// The rows of a history, one line each: "day key value", "day key second:value second:value".
-inline std::vector<std::string> rows(platform::PLHistory& history, std::string_view prefix = "",
-                                     std::int32_t first = INT32_MIN,
+// The rows of a history, one line each: "day key value", "day key second:value second:value". The
+// log says why some can't be read.
+inline std::vector<std::string> rows(platform::PLHistory& history, platform::SystemLog& log,
+                                     std::string_view prefix = "", std::int32_t first = INT32_MIN,
                                      std::int32_t last = INT32_MAX) {
   std::vector<std::string> lines;
-  history.scalarsForKeyPrefix(
+  auto read = history.scalarsForKeyPrefix(
       prefix, first, last, [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
         lines.push_back(std::to_string(day) + " " + std::string(key) + " " + std::to_string(value));
       });
-  history.distributionsForKeyPrefix(
-      prefix, first, last,
-      [&](std::string_view key, std::int32_t day,
-          platform::PLHistoryDistributionEnumerator& samples, bool&) {
-        std::string line = std::to_string(day) + " " + std::string(key);
-        for (auto block = samples.getNextValues(); !block.values.empty();
-             block = samples.getNextValues()) {
-          for (std::size_t i = 0; i < block.values.size(); ++i) {
-            line += base::format(" %d:", block.secondsInDayOffsets[i]) +
-                    base::doubleText(block.values[i]);
+  if (read)
+    read = history.distributionsForKeyPrefix(
+        prefix, first, last,
+        [&](std::string_view key, std::int32_t day,
+            platform::PLHistoryDistributionEnumerator& samples, bool&) {
+          std::string line = std::to_string(day) + " " + std::string(key);
+          for (auto block = samples.getNextValues(); block && !block->values.empty();
+               block = samples.getNextValues()) {
+            for (std::size_t i = 0; i < block->values.size(); ++i) {
+              line += base::format(" %d:", block->secondsInDayOffsets[i]) +
+                      base::doubleText(block->values[i]);
+            }
           }
-        }
-        lines.push_back(line);
-      });
+          lines.push_back(line);
+        });
+  if (!read) log.log(platform::LogLevel::error, "%s", read.error().text.c_str());
   return lines;
 }
 
 struct StoreFixture {
   explicit StoreFixture(const std::filesystem::path& path) : root(path.string()) {}
 
-  std::vector<std::string> rows() { return support::rows(*store.initWithDefaultPath()); }
+  std::vector<std::string> rows() { return support::rows(*store.initWithDefaultPath(), log); }
 
   host::DeviceRoot root;
   SetClock clock;

@@ -197,15 +197,12 @@ TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
   EXPECT_EQ(properties.multiUserIndicator(), 1u);
 
   folder.write("var/containers/systemgroup/there/file", "");
-  std::uint64_t error = 1;
-  EXPECT_EQ(properties.systemGroupContainerPath("there", error),
-            "/var/containers/systemgroup/there");
-  EXPECT_EQ(error, 1u);
+  EXPECT_EQ(properties.systemGroupContainerPath("there").path, "/var/containers/systemgroup/there");
   for (const auto name : {std::string_view("absent"), std::string_view(), std::string_view("."),
                           std::string_view(".."), std::string_view("there/file"),
                           std::string_view("../systemgroup"), std::string_view("there\0x", 7)}) {
-    error = 1;
-    EXPECT_EQ(properties.systemGroupContainerPath(name, error), std::nullopt) << name;
+    const auto [path, error] = properties.systemGroupContainerPath(name);
+    EXPECT_EQ(path, std::nullopt) << name;
     EXPECT_EQ(error, 2u) << name;
   }
 }

@@ -35,7 +35,7 @@ TEST_F(StorageServices, ASnapshotIsTheFileOrAFailure) {
   EXPECT_EQ(*captured, (std::vector{std::byte{'a'}, std::byte{0}, std::byte{'b'}}));
   EXPECT_EQ(snapshots.capture(1), std::nullopt);
   std::filesystem::resize_file(folder / "device/kernel-snapshot.bin",
-                               host::recorded::kLargestSnapshot + 1);
+                               host::recorded::kMaxSnapshot + 1);
   EXPECT_EQ(snapshots.capture(platform::KernelSnapshots::kChunkedData), std::nullopt);
   std::filesystem::remove(folder / "device/kernel-snapshot.bin");
   std::filesystem::create_directory(folder / "device/kernel-snapshot.bin");

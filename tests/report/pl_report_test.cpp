@@ -142,9 +142,9 @@ TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
     std::map<platform::fakes::FakeHistory::RowKey, std::int64_t> scalars;
     std::map<platform::fakes::FakeHistory::RowKey, std::vector<double>> distributions;
     const char* why;
-    bool failed = false;
+    base::Result<void> outcome{};
   } rows[] = {
-      {{}, {}, "the counters can't be read", true},
+      {{}, {}, "the counters can't be read", base::Error{"broken"}},
       {{{{kDay - 2, "exact"}, 1}, {{kDay + 1, "exact"}, 1}},
        {},
        "no counter was recorded on that day or the day before"},
@@ -155,13 +155,13 @@ TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
   for (const auto& row : rows) {
     platform.history.scalars = row.scalars;
     platform.history.distributions = row.distributions;
-    platform.history.failed = row.failed;
+    platform.history.outcome = row.outcome;
     platform.log.clear();
     write();
-    EXPECT_EQ(
-        platform.log.lines(),
-        (std::vector<std::string>{"info: writing pellorand log. yesterday=20000",
-                                  std::string("default: no report for day 20000: ") + row.why}));
+    std::vector<std::string> lines{"info: writing pellorand log. yesterday=20000"};
+    if (!row.outcome) lines.push_back("error: broken");
+    lines.push_back(std::string("default: no report for day 20000: ") + row.why);
+    EXPECT_EQ(platform.log.lines(), lines);
   }
   platform.files.contents.clear();
   write();

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "NANDInfo/GenericParserContext.h"
+#include "base/ByteWriter.h"
 
 namespace support {
 
@@ -22,7 +23,7 @@ using Fields = std::vector<std::pair<std::string, std::uint64_t>>;
 
 // Appends the low `width` bytes of a number, lowest first.
 inline void put(Bytes& bytes, std::uint64_t number, unsigned width) {
-  for (unsigned i = 0; i < width; ++i) bytes.push_back(static_cast<std::byte>(number >> (8 * i)));
+  base::appendLittleEndian(bytes, number, width);
 }
 
 // The header word of an FTL record.

@@ -86,9 +86,9 @@ TEST(Mkdevice, TheSameSeedOnTheSameDayMakesTheSameDevice) {
 
     host::Host host({.root = folder / "a"});
     std::vector<std::int32_t> recorded;
-    host.counters().history()->scalarsForKeyPrefix(
+    EXPECT_TRUE(host.counters().history()->scalarsForKeyPrefix(
         scalarTable().front().key, INT32_MIN, INT32_MAX,
-        [&](auto, auto day, auto, bool&) { recorded.push_back(day); });
+        [&](auto, auto day, auto, bool&) { recorded.push_back(day); }));
     EXPECT_EQ(recorded.size(), static_cast<std::size_t>((kDaysOfCounters + days) * scale));
     EXPECT_EQ(recorded.front(), kToday - days - kDaysOfCounters);
     EXPECT_EQ(recorded.back(), kToday - 1);
@@ -186,9 +186,9 @@ TEST(Mkdevice, PlayedDaysLeaveWhatTheirRunsWouldHave) {
   for (const std::int32_t day : {kToday - 2, kToday - 1}) {
     expected[day] = (received(day) - received(day - 1)) / 1024;
   }
-  host.counters().history()->scalarsForKeyPrefix(
+  EXPECT_TRUE(host.counters().history()->scalarsForKeyPrefix(
       "datausage.wifiInKB.com.norba.netconfigd", INT32_MIN, INT32_MAX,
-      [&](auto, auto day, auto value, bool&) { recorded[day] = value; });
+      [&](auto, auto day, auto value, bool&) { recorded[day] = value; }));
   EXPECT_EQ(recorded, expected);
 }
 

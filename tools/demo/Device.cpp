@@ -65,14 +65,17 @@ Result<SubmittedLog> Device::readLog(const std::string& path) {
 Recorded Device::recorded(std::int32_t firstDay, std::int32_t lastDay) {
   Recorded recorded;
   const auto history = host_.counters().initWithDefaultPath();
-  history->scalarsForKeyPrefix("", firstDay, lastDay,
-                               [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
-                                 recorded.scalars.insert_or_assign(std::string(key), value);
-                               });
-  history->distributionsForKeyPrefix("", firstDay, lastDay,
-                                     [&](std::string_view key, std::int32_t, auto&, bool&) {
-                                       recorded.distributions.emplace(key);
-                                     });
+  auto read = history->scalarsForKeyPrefix(
+      "", firstDay, lastDay, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
+        recorded.scalars.insert_or_assign(std::string(key), value);
+      });
+  if (read) {
+    read = history->distributionsForKeyPrefix(
+        "", firstDay, lastDay, [&](std::string_view key, std::int32_t, auto&, bool&) {
+          recorded.distributions.emplace(key);
+        });
+  }
+  if (!read) host_.services().log.log(platform::LogLevel::error, "%s", read.error().text.c_str());
   return recorded;
 }
 

@@ -9,13 +9,15 @@
 #include <string>
 #include <string_view>
 
+#include "base/ByteWriter.h"
+
 namespace mkdevice {
 
 class BufferWriter {
  public:
   // The low `width` bytes of a number; counters saturate before they are written.
   void number(std::uint64_t value, unsigned width) {
-    for (unsigned i = 0; i < width; ++i) bytes_ += static_cast<char>(value >> (8 * i));
+    base::appendLittleEndian(bytes_, value, width);
   }
   void word(std::uint64_t value) { number(value, 4); }
   void zeros(std::size_t count) { bytes_.append(count, '\0'); }

@@ -3,6 +3,7 @@
 
 #include "tools/mkdevice/SampleDay.h"
 
+#include "base/ByteWriter.h"
 #include "base/CivilDate.h"
 #include "base/Text.h"
 #include "base/Timestamp.h"
@@ -52,16 +53,11 @@ Data swapUsage(Random& random) {
   const auto total = static_cast<std::uint64_t>(random.between(1, 4) * kGiB);
   const std::uint64_t used = total / 16 * (random.next() % 16);
   Data record;
-  const auto append = [&record](std::uint64_t value, int bytes) {
-    for (int i = 0; i < bytes; ++i) {
-      record.push_back(static_cast<std::uint8_t>(value >> (8 * i)));
-    }
-  };
-  append(total, 8);
-  append(total - used, 8);
-  append(used, 8);
-  append(static_cast<std::uint64_t>(kPageSize), 4);
-  append(1, 4);
+  for (const std::uint64_t bytes : {total, total - used, used}) {
+    base::appendLittleEndian(record, bytes);
+  }
+  base::appendLittleEndian(record, static_cast<std::uint32_t>(kPageSize));
+  base::appendLittleEndian(record, std::uint32_t{1});
   return record;
 }
 

@@ -85,11 +85,11 @@ class Command {
       shown.lastDay = shown.firstDay;
     }
     const auto history = environment_.store.history();
-    (arguments_.json ? showJsonLines : showTable)(*history, shown, environment_.out);
+    const auto read =
+        (arguments_.json ? showJsonLines : showTable)(*history, shown, environment_.out);
     environment_.out.flush();
     if (!environment_.out) return failed("the output can't be written");
-    // The log has said why.
-    return history->failed() ? kFailed : kDone;
+    return outcome(read);
   }
 
   int sample() {

@@ -26,23 +26,31 @@ struct Row {
   std::string key, text;
 };
 
-// The rows with their values as text, ordered.
-template <typename ScalarText, typename DistributionText>
-std::vector<Row> rowsOf(platform::PLHistory& history, const Shown& shown, ScalarText scalarText,
-                        DistributionText distributionText) {
+// The rows that can be read, with their values as text, ordered.
+struct Rows {
   std::vector<Row> rows;
-  history.scalarsForKeyPrefix(
+  base::Result<void> outcome;
+};
+
+template <typename ScalarText, typename DistributionText>
+Rows rowsOf(platform::PLHistory& history, const Shown& shown, ScalarText scalarText,
+            DistributionText distributionText) {
+  std::vector<Row> rows;
+  auto outcome = history.scalarsForKeyPrefix(
       shown.prefix, shown.firstDay, shown.lastDay,
       [&](std::string_view key, std::int32_t day, std::int64_t value, bool&) {
         rows.push_back({day, std::string(key), scalarText(value)});
       });
-  history.distributionsForKeyPrefix(
-      shown.prefix, shown.firstDay, shown.lastDay,
-      [&](std::string_view key, std::int32_t day, PLHistoryDistributionEnumerator& samples, bool&) {
-        rows.push_back({day, std::string(key), distributionText(samples)});
-      });
+  if (outcome) {
+    outcome = history.distributionsForKeyPrefix(
+        shown.prefix, shown.firstDay, shown.lastDay,
+        [&](std::string_view key, std::int32_t day, PLHistoryDistributionEnumerator& samples,
+            bool&) {
+          rows.push_back({day, std::string(key), distributionText(samples)});
+        });
+  }
   std::ranges::stable_sort(rows, {}, [](const Row& row) { return std::tie(row.day, row.key); });
-  return rows;
+  return {std::move(rows), std::move(outcome)};
 }
 
 std::string jsonText(std::string_view text) {
@@ -57,12 +65,12 @@ std::string scalarText(std::int64_t value) { return std::to_string(value); }
 
 std::string samplesAsJson(PLHistoryDistributionEnumerator& samples) {
   std::string text = "[";
-  for (auto block = samples.getNextValues(); !block.values.empty();
+  for (auto block = samples.getNextValues(); block && !block->values.empty();
        block = samples.getNextValues()) {
-    for (std::size_t i = 0; i < block.values.size(); ++i) {
+    for (std::size_t i = 0; i < block->values.size(); ++i) {
       if (text.size() > 1) text += ", ";
-      text.append("[").append(std::to_string(block.secondsInDayOffsets[i])).append(", ");
-      text.append(jsonReal(block.values[i])).append("]");
+      text.append("[").append(std::to_string(block->secondsInDayOffsets[i])).append(", ");
+      text.append(jsonReal(block->values[i])).append("]");
     }
   }
   return text + "]";
@@ -71,9 +79,9 @@ std::string samplesAsJson(PLHistoryDistributionEnumerator& samples) {
 std::string summary(PLHistoryDistributionEnumerator& samples) {
   std::uint64_t count = 0;
   double least = 0, most = 0, mean = 0;
-  for (auto block = samples.getNextValues(); !block.values.empty();
+  for (auto block = samples.getNextValues(); block && !block->values.empty();
        block = samples.getNextValues()) {
-    for (const double value : block.values) {
+    for (const double value : block->values) {
       least = count == 0 ? value : std::min(least, value);
       most = count == 0 ? value : std::max(most, value);
       mean += (value - mean) / static_cast<double>(++count);
@@ -91,17 +99,19 @@ std::string dateText(std::int32_t day) {
 
 }  // namespace
 
-void showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
+base::Result<void> showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
   tools::Table table({{"DAY"}, {"DATE"}, {"KEY"}, {"VALUE"}});
-  auto rows = rowsOf(history, shown, scalarText, summary);
+  auto [rows, outcome] = rowsOf(history, shown, scalarText, summary);
   for (auto& [day, key, value] : rows) {
     table.addRow({std::to_string(day), dateText(day), std::move(key), std::move(value)});
   }
   if (!rows.empty()) out << table.text();
+  return outcome;
 }
 
-void showJsonLines(platform::PLHistory& history, const Shown& shown, std::ostream& out) {
-  const auto rows = rowsOf(
+base::Result<void> showJsonLines(platform::PLHistory& history, const Shown& shown,
+                                 std::ostream& out) {
+  const auto [rows, outcome] = rowsOf(
       history, shown, [](std::int64_t value) { return "\"value\": " + std::to_string(value); },
       [](PLHistoryDistributionEnumerator& samples) {
         return "\"samples\": " + samplesAsJson(samples);
@@ -110,6 +120,7 @@ void showJsonLines(platform::PLHistory& history, const Shown& shown, std::ostrea
     out << "{\"day\": " << row.day << ", \"key\": " << jsonText(row.key) << ", " << row.text
         << "}\n";
   }
+  return outcome;
 }
 
 }  // namespace pelloran

@@ -8,6 +8,7 @@
 #include <ostream>
 #include <string_view>
 
+#include "base/Result.h"
 #include "platform/PLHistory.h"
 
 namespace pelloran {
@@ -17,8 +18,10 @@ struct Shown {
   std::int32_t firstDay, lastDay;
 };
 
-// Both order the rows by day and key, a scalar before a distribution of the same name.
-void showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out);
-void showJsonLines(platform::PLHistory& history, const Shown& shown, std::ostream& out);
+// Both order the rows by day and key, a scalar before a distribution of the same name. They show
+// what can be read, and return why the rest can't.
+base::Result<void> showTable(platform::PLHistory& history, const Shown& shown, std::ostream& out);
+base::Result<void> showJsonLines(platform::PLHistory& history, const Shown& shown,
+                                 std::ostream& out);
 
 }  // namespace pelloran

@@ -18,6 +18,8 @@
 
 namespace MORVEND_EXPORTED NANDInfo {
 
+// Where a block went bad, and why: bus, chip enable and unit of the chip, the block in it and the
+// page; the block's cycles, and the temperature in degrees Celsius.
 struct Defect {
   std::uint16_t bus, CE;
   std::uint32_t CAU, block, cycle, reason, page;
@@ -48,6 +50,7 @@ class DefectsList {
 // What a defect mode adds to the reason; none for a mode that isn't known.
 std::optional<std::uint32_t> reasonOffset(std::uint32_t mode);
 
+// The defect as the structured log holds it, each figure under its name.
 plist::Dictionary defectLog(const Defect& defect);
 
 }  // namespace NANDInfo

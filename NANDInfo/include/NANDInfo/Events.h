@@ -14,6 +14,7 @@
 
 namespace MORVEND_EXPORTED NANDInfo {
 
+// The names under which events leave; "SM" ones hold what a window of the magazine adds up to.
 inline constexpr char kEventName_massStorage_NANDInfo_FTLCounters_1[] =
     "com.norba.massStorage.NANDInfo.FTLCounters_1";
 inline constexpr char kEventName_massStorage_NANDInfo_FTLHistograms_1[] =

@@ -6,7 +6,7 @@
 
 namespace NANDInfo {
 
-// The basic dictionary.
+// The basic dictionary: numbers of 32 or 64 bits, as the controller counts them.
 inline constexpr char kNANDInfoExportVersionKey[] = "com.norba.NANDInfo.ExportVersion";
 inline constexpr char kNANDInfoDriverVersionKey[] = "com.norba.NANDInfo.DriverVersion";
 inline constexpr char kNANDInfoDemoModeKey[] = "com.norba.NANDInfo.DemoMode";

@@ -32,6 +32,10 @@ struct nand_exporter_t;
 // The process's table of controller drivers: nand_exporters_tunnel.
 nand_exporter_t* exporterTable();
 
+// What goes in and out by each: `log` and `streams` take messages; `clock`, `kernel`, `snapshots`,
+// `deviceProperties`, `systemVersion` and `purgeableSpace` say how the device stands; `files` and
+// `preferences` keep what outlives the process; `registry` and `drivers` lead to the controller;
+// `submission`, `faultwatch` and `eventra` are where telemetry leaves.
 struct Services {
   platform::SystemLog& log;
   platform::StandardStreams& streams;
