@@ -9,7 +9,6 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
-#include <span>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -73,12 +72,6 @@ constexpr std::size_t familySize(const NameRow& row) {
   std::size_t size = 0;
   visitItems(row, [&size](const FamilyItem& item) { size += std::max(item.count, 1u); });
   return size;
-}
-
-constexpr std::size_t countNames(std::span<const NameRow> rows) {
-  std::size_t count = 0;
-  for (const NameRow& row : rows) count += familySize(row);
-  return count;
 }
 
 // The names of one row, in its order.

@@ -36,20 +36,29 @@ char* writeNames(const NameRow& row, char* out, Visit visit) {
   return out;
 }
 
-std::size_t mostBytes(const NameRow& row) {
-  std::size_t bytes = 0;
-  visitItems(row, [&](const FamilyItem& item) {
-    bytes += std::max(item.count, 1u) *
-             (familyStem(row.family).size() + 1 + item.text.size() + kMaxDigits);
-  });
-  return bytes;
+// How many names rows stand for, and how many bytes they take at most.
+struct Extent {
+  std::size_t names = 0, bytes = 0;
+};
+
+Extent extentOf(std::span<const NameRow> rows) {
+  Extent extent;
+  for (const NameRow& row : rows) {
+    const std::size_t stem = familyStem(row.family).size();
+    visitItems(row, [&](const FamilyItem& item) {
+      const std::size_t names = std::max(item.count, 1u);
+      extent.names += names;
+      extent.bytes += names * (stem + 1 + item.text.size() + kMaxDigits);
+    });
+  }
+  return extent;
 }
 
 }  // namespace
 
 std::vector<std::string> expandNames(const NameRow& row) {
   std::vector<std::string> names;
-  std::string text(mostBytes(row), 0);
+  std::string text(extentOf({&row, 1}).bytes, 0);
   writeNames(row, text.data(), [&names](std::string_view name) {
     names.emplace_back(name);
     return false;
@@ -57,11 +66,11 @@ std::vector<std::string> expandNames(const NameRow& row) {
   return names;
 }
 
-NameTable::NameTable(std::span<const NameRow> rows) : index_(countNames(rows)) {
-  std::size_t bytes = 0;
-  for (const NameRow& row : rows) bytes += mostBytes(row);
-  text_ = std::make_unique_for_overwrite<char[]>(bytes);
-  entries_.reserve(countNames(rows));
+NameTable::NameTable(std::span<const NameRow> rows) {
+  const Extent extent = extentOf(rows);
+  index_ = base::KeyIndex(extent.names);
+  entries_.reserve(extent.names);
+  text_ = std::make_unique_for_overwrite<char[]>(extent.bytes);
   char* end = text_.get();
   for (const NameRow& row : rows) {
     end = writeNames(row, end, [&](std::string_view name) {
