@@ -38,22 +38,13 @@ std::uint32_t keyHash(std::string_view key) {
   return static_cast<std::uint32_t>(mix(hash, seed | 1));
 }
 
-void KeyIndex::fill(Slot slot) {
-  const std::size_t mask = slots_.size() - 1;
-  std::size_t i = slot.hash & mask;
-  while (slots_[i].placeAfter != 0) i = (i + 1) & mask;
-  slots_[i] = slot;
-}
-
-void KeyIndex::insert(std::uint32_t hash, std::uint32_t place) {
-  if (2 * ++taken_ > slots_.size()) {
-    std::vector<Slot> old(2 * slots_.size(), Slot{0, 0});
-    old.swap(slots_);
-    for (const Slot& slot : old) {
-      if (slot.placeAfter != 0) fill(slot);
-    }
+void KeyIndex::grow() {
+  std::vector<Slot> old(2 * slots_.size(), Slot{0, 0});
+  old.swap(slots_);
+  taken_ = 0;
+  for (const Slot& slot : old) {
+    if (slot.placeAfter != 0) insert(slot.hash, slot.placeAfter - 1);
   }
-  fill({hash, place + 1});
 }
 
 }  // namespace base

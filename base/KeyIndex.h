@@ -36,8 +36,24 @@ class KeyIndex {
     return kNone;
   }
 
+  // The same; a key that isn't there is added, with this place.
+  template <typename IsAt>
+  std::uint32_t findOrInsert(std::uint32_t hash, std::uint32_t place, IsAt isAt) {
+    makeRoom();
+    const std::size_t mask = slots_.size() - 1;
+    std::size_t i = hash & mask;
+    for (; slots_[i].placeAfter != 0; i = (i + 1) & mask) {
+      if (slots_[i].hash == hash && isAt(slots_[i].placeAfter - 1)) return slots_[i].placeAfter - 1;
+    }
+    slots_[i] = {hash, place + 1};
+    ++taken_;
+    return kNone;
+  }
+
   // Adds a key that is not there.
-  void insert(std::uint32_t hash, std::uint32_t place);
+  void insert(std::uint32_t hash, std::uint32_t place) {
+    findOrInsert(hash, place, [](std::uint32_t) { return false; });
+  }
 
  private:
   struct Slot {
@@ -45,7 +61,11 @@ class KeyIndex {
     std::uint32_t placeAfter;  // the place plus one; 0 is a free slot
   };
 
-  void fill(Slot slot);
+  // Doubles the slots when one more would take over half of them.
+  void makeRoom() {
+    if (2 * (taken_ + 1) > slots_.size()) grow();
+  }
+  void grow();
 
   std::vector<Slot> slots_;  // a power of two, at most half of them taken
   std::size_t taken_ = 0;

@@ -74,21 +74,19 @@ NameTable::NameTable(std::span<const NameRow> rows) {
   char* end = text_.get();
   for (const NameRow& row : rows) {
     end = writeNames(row, end, [&](std::string_view name) {
-      const std::uint32_t hash = base::keyHash(name);
-      if (place(name, hash) != base::KeyIndex::kNone) return false;
-      index_.insert(hash, static_cast<std::uint32_t>(entries_.size()));
+      const auto found =
+          index_.findOrInsert(base::keyHash(name), static_cast<std::uint32_t>(entries_.size()),
+                              [&](std::uint32_t at) { return entries_[at].name == name; });
+      if (found != base::KeyIndex::kNone) return false;
       entries_.push_back({name, row.number});
       return true;
     });
   }
 }
 
-std::uint32_t NameTable::place(std::string_view name, std::uint32_t hash) const {
-  return index_.find(hash, [&](std::uint32_t at) { return entries_[at].name == name; });
-}
-
 const NameTable::Entry* NameTable::find(std::string_view name) const {
-  const std::uint32_t found = place(name, base::keyHash(name));
+  const std::uint32_t found =
+      index_.find(base::keyHash(name), [&](std::uint32_t at) { return entries_[at].name == name; });
   return found == base::KeyIndex::kNone ? nullptr : &entries_[found];
 }
 

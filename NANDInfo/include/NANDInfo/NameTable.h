@@ -47,8 +47,6 @@ class NameTable {
   const Entry* end() const { return entries_.data() + entries_.size(); }
 
  private:
-  std::uint32_t place(std::string_view name, std::uint32_t hash) const;
-
   std::unique_ptr<char[]> text_;  // the names, one after the other
   std::vector<Entry> entries_;
   base::KeyIndex index_;
