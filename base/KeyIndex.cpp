@@ -10,9 +10,10 @@ namespace base {
 
 namespace {
 
-std::uint64_t load(const char* bytes, std::size_t count) {
-  std::uint64_t word = 0;
-  std::memcpy(&word, bytes, count);
+template <typename Word>
+Word load(const char* bytes) {
+  Word word;
+  std::memcpy(&word, bytes, sizeof word);
   return word;
 }
 
@@ -32,9 +33,18 @@ std::uint32_t keyHash(std::string_view key) {
   constexpr std::uint64_t kFactor = 0x9e3779b97f4a7c15u;
   std::uint64_t hash = seed ^ key.size();
   const char* bytes = key.data();
-  std::size_t left = key.size();
-  for (; left >= 8; left -= 8, bytes += 8) hash = mix(hash ^ load(bytes, 8), kFactor);
-  if (left > 0) hash = mix(hash ^ load(bytes, left), kFactor);
+  const char* const end = bytes + key.size();
+  for (; end - bytes > 8; bytes += 8) hash = mix(hash ^ load<std::uint64_t>(bytes), kFactor);
+  // The rest, in words that may overlap: a copy of so many bytes as there are costs more.
+  std::uint64_t rest = 0;
+  if (key.size() >= 8) {
+    rest = load<std::uint64_t>(end - 8);
+  } else if (key.size() >= 4) {
+    rest = load<std::uint32_t>(bytes) | std::uint64_t{load<std::uint32_t>(end - 4)} << 32;
+  } else {
+    for (; bytes != end; ++bytes) rest = rest << 8 | static_cast<unsigned char>(*bytes);
+  }
+  hash = mix(hash ^ rest, kFactor);
   return static_cast<std::uint32_t>(mix(hash, seed | 1));
 }
 
