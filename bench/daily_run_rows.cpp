@@ -7,8 +7,6 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
-#include <cstdlib>
-#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -111,10 +109,7 @@ void printSteps(const ReportDevice& device) {
 
 }  // namespace
 
-// In memory where there is a folder for it: a day synchronises some twenty times, the bare work
-// three times, and on a disk hardly anything else would be measured.
 void addDailyRunRows(Table& table) {
-  if (std::filesystem::is_directory("/dev/shm")) ::setenv("TMPDIR", "/dev/shm", 0);
   constexpr struct {
     const char* name;
     mkdevice::ControllerKind kind;
