@@ -6,8 +6,11 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <array>
 #include <climits>
+#include <string_view>
+#include <vector>
 
 #include "base/Text.h"
 #include "host/counters/SQLite.h"
@@ -40,11 +43,46 @@ constexpr char kSchema[] =
     "value REAL NOT NULL) STRICT;"
     "CREATE TABLE packed(day INTEGER NOT NULL, key TEXT NOT NULL, samples BLOB NOT NULL) STRICT;"
     "CREATE INDEX packed_by_day ON packed(day, key);";
+// What the schema says of those; the names of a column may come in any case.
+constexpr char kOwn[] =
+    "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL AND type IN ('table', 'index') AND "
+    "lower(name) IN ('scalars', 'staged', 'packed', 'packed_by_day') ORDER BY rowid";
+// What somebody added: it is left as it is, but for indexes that have a say in what is written.
+constexpr char kAddedIndexes[] =
+    "SELECT name, sql FROM sqlite_schema WHERE type = 'index' AND sql IS NOT NULL AND "
+    "lower(tbl_name) IN ('scalars', 'staged', 'packed') AND name <> 'packed_by_day'";
 constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
 
 const Error kNotRegular{"it, or a file beside it, is not a regular file"};
 const Error kShared{"it, or a file beside it, is a file with several names"};
 constexpr char kNoPath[] = "its path can't be read from /proc";
+
+// Whether an index, as SQLite keeps its text, does no more than order rows by columns: a unique or
+// partial one, and one of an expression, could refuse what is written, or make it costly.
+bool onlyOrders(std::string_view sql) {
+  constexpr std::string_view kLetters =
+      "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789_\"`[]";
+  const std::size_t list = sql.find('(');
+  if (!sql.starts_with("CREATE INDEX ") || list == sql.npos || !sql.ends_with(')')) return false;
+  std::string_view columns = sql.substr(list + 1, sql.size() - list - 2);
+  for (bool more = true; more;) {
+    const std::size_t end = columns.find(',');
+    std::string_view column = columns.substr(0, end);
+    const auto skipBlanks = [&column] {
+      column.remove_prefix(std::min(column.find_first_not_of(" \t\n"), column.size()));
+    };
+    skipBlanks();
+    const std::size_t name = std::min(column.find_first_not_of(kLetters), column.size());
+    if (name == 0) return false;
+    column.remove_prefix(name);
+    skipBlanks();
+    while (column.ends_with(' ')) column.remove_suffix(1);
+    if (!column.empty() && column != "ASC" && column != "DESC") return false;
+    more = end != columns.npos;
+    if (more) columns.remove_prefix(end + 1);
+  }
+  return true;
+}
 
 // Where an open file or folder lies on the host.
 Result<std::string> pathOfOpen(int file) {
@@ -263,26 +301,29 @@ Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connectio
 // Makes sure that what was opened is a database of this store, and makes it one if it is empty;
 // false when it isn't to be made.
 Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
-  std::int64_t version = 0;
+  std::int64_t version = 0, entries = 0;
   std::string schema;
   {
     sqlite::Transaction transaction(connection);
     const auto begun = transaction.begin(sqlite::Transaction::Kind::read);
     if (!begun) return begun.error();
-    sqlite::Statement userVersion(connection, "PRAGMA user_version");
-    sqlite::Statement texts(connection,
-                            "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL ORDER BY rowid");
-    const auto known = userVersion
-                           .forEach([&] {
-                             version = userVersion.column(0).integer();
-                             return false;
-                           })
-                           .and_then([&] {
-                             return texts.forEach([&] {
-                               schema.append(texts.column(0).bytes()).append(";");
-                               return true;
-                             });
-                           });
+    const auto number = [&connection](const char* sql, std::int64_t& value) {
+      sqlite::Statement statement(connection, sql);
+      return statement.forEach([&] {
+        value = statement.column(0).integer();
+        return false;
+      });
+    };
+    sqlite::Statement own(connection, kOwn);
+    const auto known =
+        number("PRAGMA user_version", version)
+            .and_then([&] { return number("SELECT count(*) FROM sqlite_schema", entries); })
+            .and_then([&] {
+              return own.forEach([&] {
+                schema.append(own.column(0).bytes()).append(";");
+                return true;
+              });
+            });
     if (!known) return known.error();
   }
   if (version > kVersion) {
@@ -293,7 +334,7 @@ Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
     return Error{"its header forbids writing", sqlite::kDamaged};
   }
   Result<void> ready;
-  if (version == 0 && schema.empty()) {
+  if (version == 0 && entries == 0) {
     if (use != Use::create) return false;
     ready = connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE")
                 .and_then([&] { return connection.execute(kSchema); })
@@ -301,10 +342,34 @@ Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
   } else if (version != kVersion || schema != kSchema) {
     return Error{"its tables are not the store's", sqlite::kDamaged};
   } else if (use != Use::read) {
-    ready = connection.execute("PRAGMA journal_mode = WAL");
+    ready = connection.execute("PRAGMA journal_mode = WAL").and_then([&] {
+      return dropMeddling(connection);
+    });
   }
   if (!ready) return ready.error();
   return true;
+}
+
+// Drops the indexes that have a say in what is written. Triggers have none: the connection runs
+// none.
+Result<void> CounterDatabase::dropMeddling(Connection& connection) {
+  std::vector<std::string> names;
+  sqlite::Statement added(connection, kAddedIndexes);
+  auto dropped = added.forEach([&] {
+    if (!onlyOrders(added.column(1).bytes())) names.emplace_back(added.column(0).bytes());
+    return true;
+  });
+  for (const std::string& name : names) {
+    if (!dropped) break;
+    std::string quoted;
+    for (const char c : name) quoted.append(c == '"' ? 2 : 1, c);
+    dropped = connection.execute(("DROP INDEX \"" + quoted + "\"").c_str());
+    if (!dropped) break;
+    place_.log.log(platform::LogLevel::error,
+                   "%s: the index %s, which has a say in what is written, is dropped",
+                   path().c_str(), shownText(name).c_str());
+  }
+  return dropped;
 }
 
 // With the lock held. What is to be said of it; none when another process was first.

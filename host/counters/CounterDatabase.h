@@ -71,7 +71,8 @@ class CounterDatabase {
   base::Result<void> create();
   base::Result<void> connect(Use use);
   base::Result<void> openAs(Use use, const std::string& path, sqlite::Connection::Access access);
-  static base::Result<bool> verify(sqlite::Connection& connection, Use use);
+  base::Result<bool> verify(sqlite::Connection& connection, Use use);
+  base::Result<void> dropMeddling(sqlite::Connection& connection);
   std::optional<base::Error> setAside(const base::Error& why);
   std::string path() const;
 

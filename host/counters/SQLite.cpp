@@ -65,6 +65,11 @@ base::Result<std::unique_ptr<Connection>> Connection::open(const std::string& pa
   sqlite3_busy_timeout(made->database_, kBusyMilliseconds);
   sqlite3_db_config(made->database_, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
   sqlite3_db_config(made->database_, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
+  // Nothing that the file brings along runs.
+  for (const int foreign :
+       {SQLITE_DBCONFIG_ENABLE_TRIGGER, SQLITE_DBCONFIG_ENABLE_VIEW, SQLITE_DBCONFIG_ENABLE_FKEY}) {
+    sqlite3_db_config(made->database_, foreign, 0, nullptr);
+  }
   sqlite3_db_config(made->database_, SQLITE_DBCONFIG_NO_CKPT_ON_CLOSE, 1, nullptr);
   // Takes the place of the automatic checkpoint.
   sqlite3_wal_hook(

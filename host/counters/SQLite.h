@@ -38,7 +38,8 @@ class Connection {
   enum class Checkpoint { passive, truncate };
 
   // Opens an existing file; a link anywhere in its path is refused. The connection distrusts the
-  // file, and checkpoints only when told to. For one thread.
+  // file: none of its triggers, views and references does anything. It checkpoints only when told
+  // to. For one thread.
   static base::Result<std::unique_ptr<Connection>> open(const std::string& path, Access access);
   ~Connection();
   Connection(const Connection&) = delete;

@@ -2,7 +2,6 @@
 // Copyright the morvend authors
 
 #include <gtest/gtest.h>
-#include <sqlite3.h>
 #include <sys/wait.h>
 
 #include <cmath>
@@ -26,14 +25,7 @@ constexpr std::int64_t kLeast = std::numeric_limits<std::int64_t>::min();
 
 class CounterStoreRows : public testing::Test {
  protected:
-  // Runs SQL on the database behind the store's back.
-  void sql(const char* text) {
-    sqlite3* database = nullptr;
-    ASSERT_EQ(sqlite3_open((folder / support::kDatabase).c_str(), &database), SQLITE_OK);
-    EXPECT_EQ(sqlite3_exec(database, text, nullptr, nullptr, nullptr), SQLITE_OK)
-        << sqlite3_errmsg(database);
-    sqlite3_close(database);
-  }
+  void sql(const char* text) { support::sql(folder / support::kDatabase, text); }
 
   support::TemporaryFolder folder;
   StoreFixture here{folder.path()};
@@ -315,9 +307,8 @@ TEST_F(CounterStoreRows, ANewerDatabaseIsRefusedAndLeftAlone) {
 }
 
 TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
-  for (const char* change :
-       {"CREATE TRIGGER t AFTER INSERT ON scalars BEGIN DELETE FROM scalars; END",
-        "DROP TABLE staged", "PRAGMA user_version = -1", "PRAGMA user_version = 0"}) {
+  for (const char* change : {"DROP TABLE staged", "ALTER TABLE staged ADD COLUMN x TEXT",
+                             "PRAGMA user_version = -1", "PRAGMA user_version = 0"}) {
     EXPECT_TRUE(here.store.set("k", 1, 1));
     sql(change);
     StoreFixture fresh(folder.path());
@@ -328,6 +319,47 @@ TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
     EXPECT_TRUE(here.store.add("k", 1, 1));
     EXPECT_EQ(here.rows(), Lines{"1 k 6"}) << change;
     EXPECT_EQ(here.damaged, 0);
+  }
+}
+
+// None of it is taken for damage, and none has a say in what is written.
+TEST_F(CounterStoreRows, WhatSomebodyAddedToTheDatabaseIsLeftAloneAndNeverRun) {
+  const struct {
+    const char* sql;
+    bool left;
+  } rows[] = {
+      {"CREATE INDEX a ON scalars(key, day DESC)", true},
+      {"CREATE INDEX \"b c\" ON staged (\"key\",value)", true},
+      {"ANALYZE", true},
+      {"CREATE VIEW v AS SELECT * FROM scalars", true},
+      {"CREATE TABLE t(k REFERENCES scalars(key) ON DELETE CASCADE)", true},
+      {"CREATE TRIGGER t AFTER INSERT ON scalars BEGIN DELETE FROM scalars; END", true},
+      {"CREATE TRIGGER scalars BEFORE INSERT ON staged BEGIN SELECT RAISE(FAIL, 'no'); END", true},
+      {"CREATE UNIQUE INDEX u ON scalars(value)", false},
+      {"CREATE INDEX \"q\"\"(x)\" ON staged(lower(key))", false},
+      {"CREATE INDEX o ON scalars(day % value)", false},
+      {"CREATE INDEX p ON scalars(day) WHERE abs(value) > 1", false},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.sql);
+    const support::TemporaryFolder device;
+    EXPECT_TRUE(StoreFixture(device.path()).store.set("k", 5, 1));
+    support::sql(device / support::kDatabase, row.sql);
+    const auto schema = [&] {
+      return support::sql(device / support::kDatabase,
+                          "SELECT group_concat(name || coalesce(sql, '')) FROM sqlite_schema");
+    };
+    const std::string before = schema();
+    StoreFixture fresh(device.path());
+    EXPECT_EQ(fresh.rows(), Lines{"1 k 5"});
+    EXPECT_EQ(schema(), before);
+    EXPECT_TRUE(fresh.store.set("l", 5, 1));
+    for (int i = 0; i < 2; ++i) EXPECT_TRUE(fresh.store.push("no json", 2, 1, 3));
+    fresh.store.PLClientCheckpoint();
+    EXPECT_EQ(fresh.rows(), (Lines{"1 k 5", "1 l 5", "1 no json 3:2 3:2"}));
+    EXPECT_EQ(schema() == before, row.left);
+    EXPECT_EQ(fresh.log.count("has a say in what is written, is dropped"), row.left ? 0 : 1);
+    EXPECT_EQ(fresh.damaged, 0);
   }
 }
 

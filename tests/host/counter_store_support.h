@@ -4,6 +4,9 @@
 // A counters store over a temporary device root, and what a history holds as text.
 #pragma once
 
+#include <gtest/gtest.h>
+#include <sqlite3.h>
+
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -45,6 +48,23 @@ inline std::vector<std::string> rows(platform::PLHistory& history, platform::Sys
         });
   if (!read) log.log(platform::LogLevel::error, "%s", read.error().text.c_str());
   return lines;
+}
+
+// Runs SQL on a database behind the store's back; the text of the last value that it delivers.
+inline std::string sql(const std::filesystem::path& file, const char* text) {
+  sqlite3* database = nullptr;
+  EXPECT_EQ(sqlite3_open(file.c_str(), &database), SQLITE_OK);
+  std::string last;
+  const auto keep = [](void* into, int count, char** values, char**) {
+    if (count > 0 && values[count - 1] != nullptr) {
+      *static_cast<std::string*>(into) = values[count - 1];
+    }
+    return 0;
+  };
+  EXPECT_EQ(sqlite3_exec(database, text, keep, &last, nullptr), SQLITE_OK)
+      << sqlite3_errmsg(database);
+  sqlite3_close(database);
+  return last;
 }
 
 struct StoreFixture {
