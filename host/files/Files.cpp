@@ -5,7 +5,6 @@
 
 #include <dirent.h>
 #include <fcntl.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -171,7 +170,8 @@ base::Result<RolledOver> rollOver(int folder, const std::string& path, const std
   return rolled;
 }
 
-base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines) {
+base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines,
+                               const LockWait& wait) {
   const auto file = opened(
       ::openat(folder, name.c_str(),
                O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
@@ -180,7 +180,8 @@ base::Result<void> appendLines(int folder, const std::string& name, std::string_
                        file.error().is(std::errc::is_a_directory);
     return other ? notRegular() : file.error();
   }
-  const FileLock lock(file->get());
+  const auto lock = FileLock::take(file->get(), wait);
+  if (!lock) return lock.error();
   struct stat status;
   if (::fstat(file->get(), &status) != 0) return systemError();
   if (!S_ISREG(status.st_mode)) return notRegular();
@@ -192,12 +193,5 @@ base::Result<void> appendLines(int folder, const std::string& name, std::string_
   if (!appended) std::ignore = ::ftruncate(file->get(), whole);
   return appended;
 }
-
-FileLock::FileLock(int file) : file_(file) {
-  while (::flock(file_, LOCK_EX) != 0 && errno == EINTR) {
-  }
-}
-
-FileLock::~FileLock() { ::flock(file_, LOCK_UN); }
 
 }  // namespace host

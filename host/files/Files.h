@@ -16,6 +16,7 @@
 
 #include "base/Result.h"
 #include "host/files/FileDescriptor.h"
+#include "host/files/FileLock.h"
 
 namespace host {
 
@@ -66,20 +67,8 @@ base::Result<RolledOver> rollOver(int folder, const std::string& path, const std
 // Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
 // file when it is missing. A line is in the file whole or not at all: what a failed write left is
 // taken back, all of this call's lines, and a line that an earlier failure left unfinished is
-// removed first.
-base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines);
-
-// An exclusive lock on an open file or folder, waiting for it; released at the end of the scope.
-// The descriptor is borrowed.
-class FileLock {
- public:
-  explicit FileLock(int file);
-  ~FileLock();
-  FileLock(const FileLock&) = delete;
-  FileLock& operator=(const FileLock&) = delete;
-
- private:
-  int file_;
-};
+// removed first. The file is locked meanwhile.
+base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines,
+                               const LockWait& wait);
 
 }  // namespace host

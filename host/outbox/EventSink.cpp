@@ -121,9 +121,11 @@ base::Result<void> EventSink::append(const std::string& lines) {
   const std::string path = root_.hostPath(kFolder, kName);
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
   if (!folder) return folder.error().at(path);
-  const FileLock lock(folder->get());  // another process may roll the file over, too
+  // Another process may roll the file over, too.
+  const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(kFolder)});
+  if (!lock) return lock.error().at(path);
   if (auto room = makeRoom(folder->get(), lines.size()); !room) return room;
-  return appendLines(folder->get(), kName, lines).at(path);
+  return appendLines(folder->get(), kName, lines, {log_, path}).at(path);
 }
 
 base::Result<void> EventSink::makeRoom(int folder, std::uint64_t bytes) {

@@ -26,7 +26,8 @@ void ServitaLogFiles::rollServitaLogs() {
     if (!isMissing(folder.error())) report(folder.error().at(path));
     return;
   }
-  const FileLock lock(folder->get());
+  const auto lock = FileLock::take(folder->get(), {log_, path});
+  if (!lock) return report(lock.error().at(path));
   const auto names = namesInFolder(folder->get());
   if (!names) return report(names.error().at(path));
   for (const std::string& log : *names) {

@@ -31,7 +31,10 @@ base::Result<std::unique_ptr<SpoolFolder>> SpoolFolder::open(const DeviceRoot& r
                                                              platform::SystemLog& log) {
   auto folder = root.openFolder(kPath, DeviceRoot::Missing::create);
   if (!folder) return folder.error();
-  std::unique_ptr<SpoolFolder> spool(new SpoolFolder(root, log, *std::move(folder)));
+  auto lock = FileLock::take(folder->get(), {log, root.hostPath(kPath)});
+  if (!lock) return lock.error();
+  std::unique_ptr<SpoolFolder> spool(
+      new SpoolFolder(root, log, *std::move(folder), *std::move(lock)));
   if (const auto known = spool->lookAround(); !known) return known.error();
   return spool;
 }

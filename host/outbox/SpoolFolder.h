@@ -60,8 +60,9 @@ class SpoolFolder {
     std::uint64_t bytes;
   };
 
-  SpoolFolder(const DeviceRoot& root, platform::SystemLog& log, FileDescriptor folder)
-      : root_(root), log_(log), folder_(std::move(folder)), lock_(folder_.get()) {}
+  SpoolFolder(const DeviceRoot& root, platform::SystemLog& log, FileDescriptor folder,
+              FileLock lock)
+      : root_(root), log_(log), folder_(std::move(folder)), lock_(std::move(lock)) {}
   base::Result<void> lookAround();
   void makeRoom(std::uint64_t bytes);
   bool isFree(const std::string& name) const;

@@ -163,10 +163,11 @@ void StructuredLogFiles::logStructuredData(std::int32_t type, const plist::Dicti
   plist::appendJSON(line, plist::Dictionary{{"type", type}, {"time", now}, {"data", data}});
   line += '\n';
   const std::string name = fileDay(now.secondsSince1970).append(kSuffix);
-  const auto appended = root_.openFolder(kFolder, DeviceRoot::Missing::create)
-                            .and_then([&](const FileDescriptor& folder) {
-                              return appendLines(folder.get(), name, line);
-                            });
+  const auto appended =
+      root_.openFolder(kFolder, DeviceRoot::Missing::create)
+          .and_then([&](const FileDescriptor& folder) {
+            return appendLines(folder.get(), name, line, {log_, root_.hostPath(kFolder, name)});
+          });
   if (appended || !said_.insert(appended.error().text).second) return;
   log_.log(platform::LogLevel::error, "Could not write %s: %s; structured logs are dropped",
            root_.hostPath(kFolder, name).c_str(), appended.error().text.c_str());

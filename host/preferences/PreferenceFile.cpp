@@ -134,7 +134,8 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
       root_.openFolder(folder_, adds ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
   if (!folder && isMissing(folder.error()) && !adds) return {};
   if (!folder) return folder.error();
-  const FileLock lock(folder->get());
+  const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(folder_)});
+  if (!lock) return lock.error().at("its folder");
   if (isLink(folder->get(), name_)) return notRegular();
   // Another process's writing may leave all that is compared as it was.
   load(true);

@@ -4,7 +4,6 @@
 #include "host/process/RunLockFile.h"
 
 #include <fcntl.h>
-#include <sys/file.h>
 #include <sys/stat.h>
 
 #include "host/files/SystemError.h"
@@ -16,7 +15,7 @@ namespace {
 constexpr char kFolder[] = "/var/run";
 constexpr char kName[] = "morvend.lock";
 
-base::Result<FileDescriptor> openLocked(const DeviceRoot& root) {
+base::Result<FileDescriptor> openLockFile(const DeviceRoot& root) {
   const auto folder =
       root.openFolder(kFolder, DeviceRoot::Missing::create, DeviceRoot::Links::followed);
   if (!folder) return folder.error();
@@ -27,23 +26,31 @@ base::Result<FileDescriptor> openLocked(const DeviceRoot& root) {
   struct stat status;
   if (::fstat(file->get(), &status) != 0) return systemError();
   if (!S_ISREG(status.st_mode)) return notRegular();
-  while (::flock(file->get(), LOCK_EX) != 0) {
-    if (errno != EINTR) return systemError();
-  }
   return file;
 }
 
 }  // namespace
 
-void RunLockFile::lock() {
-  if (auto file = openLocked(root_)) {
-    file_ = *std::move(file);
-  } else {
-    log_.log(platform::LogLevel::error, "Could not lock %s: %s; running without the lock",
-             root_.hostPath(kFolder, kName).c_str(), file.error().text.c_str());
-  }
+base::Result<void> RunLockFile::take() {
+  auto file = openLockFile(root_);
+  if (!file) return file.error();
+  auto lock = FileLock::take(file->get(), {log_, root_.hostPath(kFolder, kName), kMaxWait, pause_});
+  if (!lock) return lock.error();
+  file_ = *std::move(file);
+  lock_.emplace(*std::move(lock));
+  return {};
 }
 
-void RunLockFile::unlock() { file_ = FileDescriptor(); }
+void RunLockFile::lock() {
+  const auto taken = take();
+  if (taken) return;
+  log_.log(platform::LogLevel::error, "Could not lock %s: %s; running without the lock",
+           root_.hostPath(kFolder, kName).c_str(), taken.error().text.c_str());
+}
+
+void RunLockFile::unlock() {
+  lock_.reset();
+  file_ = FileDescriptor();
+}
 
 }  // namespace host

@@ -67,13 +67,14 @@ TEST(DeviceRoot, FoldersAreMadePrivateAndNeverThroughLinks) {
 }
 
 TEST(Files, NothingButARegularFileIsWritten) {
+  platform::fakes::RecordingLog log;
   for (const support::Kind kind : support::kOtherKinds) {
     for (const bool append : {false, true}) {
       const TemporaryFolder root;
       const auto at = root / "folder/file", target = root / "target";
       support::put(kind, at, target);
       const auto folder = DeviceRoot(root.path().string()).openFolder("/folder", Missing::fails);
-      const auto written = append ? appendLines(folder->get(), "file", "x\n")
+      const auto written = append ? appendLines(folder->get(), "file", "x\n", {log, "file"})
                                   : replaceFile(folder->get(), "file", "x");
       EXPECT_TRUE(!written && written.error().text == "not a regular file");
       EXPECT_TRUE(support::untouched(kind, at, target));
@@ -82,6 +83,7 @@ TEST(Files, NothingButARegularFileIsWritten) {
 }
 
 TEST(Files, AnUnfinishedLineIsRemovedBeforeOneIsAppended) {
+  platform::fakes::RecordingLog log;
   const std::string line(5000, 'l'), torn(10000, 't');
   const std::pair<std::string, std::string> rows[] = {
       {"", ""},         {"one\n", "one\n"},
@@ -92,7 +94,7 @@ TEST(Files, AnUnfinishedLineIsRemovedBeforeOneIsAppended) {
     const TemporaryFolder root;
     root.write("file", before);
     const FileDescriptor folder(::open(root.path().c_str(), O_RDONLY | O_DIRECTORY));
-    EXPECT_TRUE(appendLines(folder.get(), "file", "new\nlines\n"));
+    EXPECT_TRUE(appendLines(folder.get(), "file", "new\nlines\n", {log, "file"}));
     EXPECT_EQ(root.read("file"), kept + "new\nlines\n");
   }
 }

@@ -6,8 +6,11 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <chrono>
 #include <filesystem>
+#include <string>
 #include <thread>
+#include <vector>
 
 #include "HostServices.h"
 #include "host/process/RunLockFile.h"
@@ -46,6 +49,27 @@ TEST(RunLockFile, AProcessThatEndsGivesItBack) {
   ASSERT_EQ(::waitpid(child, nullptr, 0), child);
   RunLockFile(host.root, host.log).lock();
   EXPECT_TRUE(std::filesystem::exists(host.folder / kLock));
+}
+
+// The holder is stopped, or means harm: who waits says so once, and goes on in the end.
+TEST(RunLockFile, NoHolderStopsTheRun) {
+  support::HostServices host;
+  std::chrono::milliseconds waited{0};
+  RunLockFile holder(host.root, host.log),
+      waiting(host.root, host.log, [&](auto pause) { waited += pause; });
+  holder.lock();
+  waiting.lock();
+  EXPECT_GE(waited, std::chrono::minutes(10));
+  EXPECT_LE(waited, std::chrono::minutes(11));
+  const std::string path = host.root.hostPath(kLock), who = "process " + std::to_string(::getpid());
+  EXPECT_EQ(
+      host.log.lines(),
+      (std::vector<std::string>{"default: Waiting for " + who + ", which holds the lock on " + path,
+                                "error: Could not lock " + path + ": locked by " + who +
+                                    " for more than 600 s; running without the lock"}));
+  waiting.unlock();
+  holder.unlock();
+  holder.lock();
 }
 
 TEST(RunLockFile, WithoutTheFileTheRunGoesOn) {
