@@ -5,6 +5,7 @@
 
 #include <csignal>
 #include <cstdlib>
+#include <string_view>
 
 #include "host/PlayedServices.h"
 #include "host/bus/Bus.h"
@@ -38,6 +39,8 @@ HostOptions HostOptions::fromEnvironment() {
     options.root = root;
   }
   options.lowestLevel = StandardErrorLog::levelNamed(std::getenv("MORVEND_LOG"));
+  const char* runModules = std::getenv("MORVEND_RUN_MODULES");
+  options.runModules = runModules != nullptr && std::string_view(runModules) == "1";
   return options;
 }
 
@@ -47,7 +50,10 @@ struct Host::Assembly {
       : root(options.root),
         ownLog(options.lowestLevel),
         log(options.log != nullptr ? *options.log : ownLog),
-        played(options.played) {}
+        played(options.played),
+        libraries(root, preferences, log,
+                  options.runModules ? LibraryLoader::Trusted::root
+                                     : LibraryLoader::Trusted::installed) {}
 
   void countDamagedDatabase() {
     preferences.addToInteger("DatabaseCorruptionCount", platform::kPellorandDomain, 1);
@@ -65,7 +71,7 @@ struct Host::Assembly {
   DeviceFileSystem files{root, propertiesFile};
   PreferenceFiles preferences{root, log};
   recorded::DeviceProperties deviceProperties{root, propertiesFile};
-  LibraryLoader libraries{root, preferences};
+  LibraryLoader libraries;
   morvend::DeviceContext context{deviceProperties, files, libraries, log};
   CounterStore counters{root, clock, log, [this] { return context.homeOfCounters(); },
                         [this] { countDamagedDatabase(); }};

@@ -21,10 +21,11 @@ namespace host {
 struct HostOptions {
   std::string root = "/";  // the device root, a path of the host
   platform::LogLevel lowestLevel = platform::LogLevel::standard;
+  bool runModules = false;               // of this root, whatever they are: it is trusted
   std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
   platform::SystemLog* log = nullptr;    // borrowed; instead of the one on standard error
 
-  // As the environment says: MORVEND_ROOT and MORVEND_LOG.
+  // As the environment says: MORVEND_ROOT, MORVEND_LOG and MORVEND_RUN_MODULES.
   static HostOptions fromEnvironment();
 };
 

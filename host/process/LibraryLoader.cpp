@@ -3,12 +3,51 @@
 
 #include "host/process/LibraryLoader.h"
 
-#include <string_view>
-
 #include <dlfcn.h>
+#include <fcntl.h>
 #include <sys/stat.h>
 
+#include <filesystem>
+#include <string_view>
+#include <system_error>
+#include <utility>
+
+#include "host/files/Files.h"
+#include "host/files/SystemError.h"
+
 namespace host {
+
+namespace {
+
+constexpr std::size_t kMaxModule = std::size_t{64} << 20;
+
+}  // namespace
+
+std::string installedModule() {
+  std::error_code error;
+  const auto program = std::filesystem::read_symlink("/proc/self/exe", error);
+  return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
+}
+
+base::Result<FileDescriptor> LibraryLoader::installedInstead(const FileDescriptor& file) const {
+  const std::string path = installedModule();
+  auto installed = opened(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  if (!installed) return installed.error().at(path);
+  struct stat theirs, ours;
+  if (::fstat(file.get(), &theirs) != 0 || ::fstat(installed->get(), &ours) != 0) {
+    return systemError();
+  }
+  bool same = theirs.st_size == ours.st_size;
+  if (same) {
+    const auto bytes = readRegularFile(file.get(), kMaxModule);
+    if (!bytes) return bytes.error();
+    const auto expected = readRegularFile(installed->get(), kMaxModule);
+    if (!expected) return expected.error().at(path);
+    same = *bytes == *expected;
+  }
+  if (!same) return base::Error{"it is not the installed module, " + path};
+  return installed;
+}
 
 void* LibraryLoader::load(std::string_view path) {
   if (const auto loaded = libraries_.find(path); loaded != libraries_.end()) {
@@ -17,6 +56,16 @@ void* LibraryLoader::load(std::string_view path) {
   auto file = root_.openForReading(path);
   struct stat status;
   if (!file || ::fstat(file->get(), &status) != 0 || !S_ISREG(status.st_mode)) return nullptr;
+  if (trusted_ == Trusted::installed) {
+    auto installed = installedInstead(*file);
+    if (!installed) {
+      log_.log(platform::LogLevel::error,
+               "Not loading %s: %s; MORVEND_RUN_MODULES=1 would say that this root is trusted",
+               root_.hostPath(path).c_str(), installed.error().text.c_str());
+      return nullptr;
+    }
+    file = std::move(installed);
+  }
   // The file stays open, because the dynamic linker knows the library under this name from now on.
   const std::string name = "/proc/self/fd/" + std::to_string(file->get());
   void* library = ::dlopen(name.c_str(), RTLD_LAZY | RTLD_LOCAL);

@@ -1,27 +1,40 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-// Libraries of the device, loaded into this process.
+// Libraries of the device, loaded into this process. A device root may be anybody's: it runs no
+// code here but what is installed with this program, unless this root is said to be trusted.
 #pragma once
 
 #include <functional>
 #include <map>
 #include <string>
 
+#include "base/Result.h"
 #include "host/files/DeviceRoot.h"
+#include "host/files/FileDescriptor.h"
 #include "platform/LibraryLoader.h"
 #include "platform/PreferenceStore.h"
+#include "platform/SystemLog.h"
 
 namespace host {
 
+// Where the module that device roots carry is installed: in the folder lib beside the one that this
+// program stands in, as the build has it too.
+std::string installedModule();
+
 class LibraryLoader : public platform::LibraryLoader {
  public:
-  // The store is what the crash-reporting support library acts on; it outlives every use of it.
-  LibraryLoader(const DeviceRoot& root, platform::PreferenceStore& preferences)
-      : root_(root), preferences_(preferences) {}
+  enum class Trusted { installed, root };
+
+  // The store is what the crash-reporting support library acts on; all are borrowed.
+  LibraryLoader(const DeviceRoot& root, platform::PreferenceStore& preferences,
+                platform::SystemLog& log, Trusted trusted)
+      : root_(root), preferences_(preferences), log_(log), trusted_(trusted) {}
 
   // The path is resolved below the root like every other: a link to a file outside of it leads
   // nowhere, so that a root carries its libraries as files (copies or hard links) or links within.
+  // Unless the root is trusted, what is loaded is the installed module, and only where the root's
+  // file is the same byte for byte; any other is not loaded, with an error line.
   // A library that has "FaultwatchSupportUsePreferences" is given the preference store.
   void* load(std::string_view path) override;
   void* symbol(void* library, const char* name) override;
@@ -32,8 +45,12 @@ class LibraryLoader : public platform::LibraryLoader {
     void* handle;
   };
 
+  base::Result<FileDescriptor> installedInstead(const FileDescriptor& file) const;
+
   const DeviceRoot& root_;
   platform::PreferenceStore& preferences_;
+  platform::SystemLog& log_;
+  const Trusted trusted_;
   std::map<std::string, Library, std::less<>> libraries_;  // by path; stay loaded
 };
 

@@ -455,7 +455,7 @@ struct CountingPreferences : platform::PreferenceStore {
 
 TEST_F(DeviceFiles, ALibraryOfTheDeviceActsOnThisProcessesPreferences) {
   CountingPreferences preferences;
-  LibraryLoader loader(root, preferences);
+  LibraryLoader loader(root, preferences, log, LibraryLoader::Trusted::installed);
   EXPECT_EQ(loader.load(platform::kFaultwatchSupportPath), nullptr);
   const auto place = folder / std::string_view(platform::kFaultwatchSupportPath).substr(1);
   std::filesystem::create_directories(place.parent_path());
@@ -483,6 +483,29 @@ TEST_F(DeviceFiles, ALibraryOfTheDeviceActsOnThisProcessesPreferences) {
   set("key", &zero, "domain");
   EXPECT_EQ(preferences.value, zero);
   EXPECT_EQ(loader.symbol(library, "QNSPreferencesSynchronize"), nullptr);
+}
+
+TEST_F(DeviceFiles, ARootRunsNoCodeOfItsOwnUnlessItIsTrusted) {
+  const std::string path = platform::kFaultwatchSupportPath;
+  const auto place = folder / path.substr(1);
+  std::filesystem::create_directories(place.parent_path());
+  std::filesystem::copy_file(FAULTWATCH_SUPPORT_MODULE, place);
+  const auto size = std::filesystem::file_size(place);
+  for (const bool longer : {true, false}) {
+    // What stands behind the library's end is nothing to the linker.
+    std::fstream file(place, std::ios::in | std::ios::out);
+    file.seekp(longer ? std::streamoff(size) : std::streamoff(size) - 1) << '!';
+    file.close();
+    if (!longer) std::filesystem::resize_file(place, size);
+    for (const auto trusted : {LibraryLoader::Trusted::installed, LibraryLoader::Trusted::root}) {
+      log.clear();
+      CountingPreferences preferences;
+      LibraryLoader loader(root, preferences, log, trusted);
+      const bool loads = trusted == LibraryLoader::Trusted::root;
+      EXPECT_EQ(loader.load(path) != nullptr, loads) << longer;
+      EXPECT_EQ(log.count("error: Not loading " + root.hostPath(path)), loads ? 0 : 1);
+    }
+  }
 }
 
 TEST(MD5, TheVectorsOfItsDefinition) {

@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "base/CivilDate.h"
+#include "host/process/LibraryLoader.h"
 #include "host/process/SystemClock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/Terminal.h"
@@ -22,13 +23,6 @@
 #include "tools/mkdevice/SampleController.h"
 
 namespace {
-
-// In the folder lib beside the one that this program stands in.
-std::string moduleBesideProgram() {
-  std::error_code error;
-  const auto program = std::filesystem::read_symlink("/proc/self/exe", error);
-  return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
-}
 
 std::vector<std::string> textsOf(std::span<const char* const> names) {
   return {names.begin(), names.end()};
@@ -39,7 +33,7 @@ std::vector<std::string> textsOf(std::span<const char* const> names) {
 int main(int argc, char** argv) {
   constexpr int kDone = 0, kFailed = 1, kUsage = 2;
   mkdevice::MakingOptions options;
-  options.module = moduleBesideProgram();
+  options.module = host::installedModule();
   tools::CommandLog log("mkdevice");
   options.log = &log;
 
