@@ -69,15 +69,21 @@ void RunDailyTasksIfDue(const Services& services, DeviceContext& context,
                         const ActivatedAppInfo* appInfo) {
   const std::scoped_lock lock(services.runLock);
   const std::int32_t yesterday = base::dayBefore(services.counters.PLDaysSince1970());
-  const std::int64_t last =
-      services.preferences.QNSPreferencesGetIntegerValue(kGateRecord, platform::kDaemonName);
-  if (last >= yesterday) {
+  const auto record = services.preferences.readValue(kGateRecord, platform::kDaemonName);
+  if (!record) {
+    services.log.log(LogLevel::error,
+                     "The record of the last day can't be read, so no day is run: %s",
+                     record.error().text.c_str());
+    return;
+  }
+  const auto* last = *record ? (*record)->as<plist::Number>() : nullptr;
+  if ((last != nullptr ? last->int64Value() : 0) >= yesterday) {
     services.log.log(LogLevel::standard, "Day unchanged since last run");
     return;
   }
   runSequence(services, context, {yesterday, appInfo});
-  const plist::Value record(yesterday);
-  services.preferences.QNSPreferencesSetValue(kGateRecord, &record, platform::kDaemonName);
+  const plist::Value done(yesterday);
+  services.preferences.QNSPreferencesSetValue(kGateRecord, &done, platform::kDaemonName);
   services.preferences.QNSPreferencesSynchronize(platform::kDaemonName);
 }
 

@@ -16,6 +16,7 @@ using report::ActivatedAppInfo;
 
 // Runs the daily sequence for yesterday, unless the gate record in the preferences says that it has
 // already run for yesterday or a later day; the record is written once the sequence is through.
+// While a record is there that can't be read, nothing is run, and an error line says why.
 // `appInfo` may be null. Holds the run lock, so that of two processes one runs and the other finds
 // the gate closed.
 void RunDailyTasksIfDue(const Services& services, DeviceContext& context,

@@ -126,9 +126,11 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
   const auto storedID = record(services.preferences, "TaskingID");
   const auto storedOS = record(services.preferences, "TaskingOS");
   const auto os = build ? std::optional<Value>(*build) : std::nullopt;
+  if (storedID && *storedID == *newID && os && storedOS == os) return;
   DomainSet domainsToSync;
+  // A domain of which many settings change is written once.
+  services.preferences.holdWrites();
   if (storedID) {
-    if (*storedID == *newID && os && storedOS == os) return;
     services.log.log(LogLevel::standard, "Tasking update (%s -> %s, %s -> %s)",
                      description(storedID).c_str(), description(newID).c_str(),
                      description(storedOS).c_str(), description(os).c_str());
@@ -148,6 +150,7 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
     setRecord(services.preferences, "TaskingPayload", payload);
     domainsToSync.add(platform::kDaemonName);
   }
+  services.preferences.writeHeld();
   domainsToSync.synchronize(services.preferences);
   services.notifications.postNotification("com.norba.da.tasking_changed");
 }

@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "base/Exported.h"
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace MORVEND_EXPORTED platform {
@@ -32,6 +33,17 @@ class PreferenceStore {
 
   // Brings the domain's writes to storage; without it they get there when the process ends.
   virtual void QNSPreferencesSynchronize(std::string_view domain) = 0;
+
+  // The value of a key, or none, for whom none and one that can't be read are not the same.
+  virtual base::Result<std::optional<plist::Value>> readValue(std::string_view key,
+                                                              std::string_view domain) {
+    return QNSPreferencesGetValue(key, domain);
+  }
+
+  // Between the two, what the other two views are to bring to storage at once waits for the end,
+  // and is then written once for each domain of a user. Not nested.
+  virtual void holdWrites() {}
+  virtual void writeHeld() {}
 
   // The value as a number or as a truth value; 0 or false when it is absent or not a number.
   // `found`, if given, tells whether there was a number.

@@ -29,6 +29,30 @@ base::Result<void> refuseOtherKinds(int folder, const std::string& name) {
   return {};
 }
 
+std::string numbered(const std::string& name, int number) {
+  return number == 1 ? name : name + "-" + std::to_string(number);
+}
+
+struct NewFile {
+  std::string name;
+  FileDescriptor file;
+};
+
+// An empty file under the first of the names beside that is free or can be made so.
+base::Result<NewFile> makeBeside(int folder, const std::string& name) {
+  for (int number = 1;; ++number) {
+    std::string beside = numbered("." + name + ".new", number);
+    auto file = ::unlinkat(folder, beside.c_str(), 0) == 0 || errno == ENOENT
+                    ? opened(::openat(folder, beside.c_str(),
+                                      O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600))
+                    : systemError();
+    if (file) return NewFile{std::move(beside), *std::move(file)};
+    struct stat status;
+    const bool taken = ::fstatat(folder, beside.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0;
+    if (!taken || number == kMaxNamesBeside) return file.error();
+  }
+}
+
 // The size of the file without the unfinished line at its end.
 off_t sizeOfWholeLines(int file, off_t size) {
   std::array<char, 4096> block;
@@ -112,21 +136,27 @@ base::Result<void> writeAll(int file, std::string_view bytes) {
 
 base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
   if (auto free = refuseOtherKinds(folder, name); !free) return free;
-  const std::string beside = "." + name + ".new";
-  if (::unlinkat(folder, beside.c_str(), 0) != 0 && errno != ENOENT) return systemError();
-  const auto file = opened(
-      ::openat(folder, beside.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
-  if (!file) return file.error();
+  const auto beside = makeBeside(folder, name);
+  if (!beside) return beside.error();
+  const int file = beside->file.get();
+  const char* from = beside->name.c_str();
   const auto replaced =
-      writeAll(file->get(), bytes)
-          .and_then([&] { return checked(::fsync(file->get())); })
-          .and_then(
-              [&] { return checked(::renameat(folder, beside.c_str(), folder, name.c_str())); });
+      writeAll(file, bytes).and_then([&] { return checked(::fsync(file)); }).and_then([&] {
+        return checked(::renameat(folder, from, folder, name.c_str()));
+      });
   if (!replaced) {
-    ::unlinkat(folder, beside.c_str(), 0);
+    ::unlinkat(folder, from, 0);
     return replaced;
   }
   return checked(::fsync(folder));
+}
+
+base::Result<void> keepBeside(int folder, const std::string& name, const std::string& kept) {
+  for (int number = 1;; ++number) {
+    auto renamed =
+        checked(::renameat(folder, name.c_str(), folder, numbered(kept, number).c_str()));
+    if (renamed || number == kMaxNamesBeside) return renamed;
+  }
 }
 
 base::Result<void> renameToFreeName(int fromFolder, const std::string& from, int toFolder,

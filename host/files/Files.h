@@ -41,9 +41,19 @@ std::string shownText(std::string_view text);
 // Writes all the bytes, going on after short writes and signals.
 base::Result<void> writeAll(int file, std::string_view bytes);
 
+// How many names beside a file are tried, for what is to stand there for a while or be kept: in the
+// way of each may be something that is not ours.
+inline constexpr int kMaxNamesBeside = 8;
+
 // Writes `name` beside, synchronises it and renames it over: the file is the old or the new one,
-// whole, whatever happens. Callers serialise: two replacements of one name use one name beside.
+// whole, whatever happens. It is written as .<name>.new, .<name>.new-2, and so on: what can't be
+// removed from there is passed by. Callers serialise: two replacements of one name use one name
+// beside.
 base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes);
+
+// Renames a file to `kept`, over a file that has that name; where something else has it, to
+// <kept>-2, and so on.
+base::Result<void> keepBeside(int folder, const std::string& name, const std::string& kept);
 
 // Renames a file, within a folder or from one to another; std::errc::file_exists when the new name
 // is taken, by whatever it is.

@@ -38,10 +38,11 @@ PreferenceFile::PreferenceFile(const DeviceRoot& root, platform::SystemLog& log,
       folder_("/var/preferences/" + std::string(user)),
       name_(std::string(domain) + ".plist") {}
 
-std::optional<plist::Value> PreferenceFile::value(std::string_view key) {
+base::Result<std::optional<plist::Value>> PreferenceFile::value(std::string_view key) {
   if (const plist::Value* value = set_.find(key)) return *value;
   if (removed_.contains(key)) return std::nullopt;
   load(false);
+  if (state_ == State::unreadable) return readError_->at(path());
   const plist::Value* value = stored_.find(key);
   return value != nullptr ? std::optional(*value) : std::nullopt;
 }
@@ -152,10 +153,9 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
   if (before && *before == *after) return {};
   if (after->size() > plist::kMaxSize) return base::Error{"it would be larger than 16 MiB"};
 
-  const std::string kept = name_ + ".corrupt";
-  if (state_ == State::broken &&
-      ::renameat(folder->get(), name_.c_str(), folder->get(), kept.c_str()) != 0) {
-    return systemError().at("it can't be kept as .corrupt");
+  if (state_ == State::broken) {
+    auto kept = keepBeside(folder->get(), name_, name_ + ".corrupt");
+    if (!kept) return std::move(kept).at("it can't be kept as .corrupt");
   }
   return replaceFile(folder->get(), name_, *after);
 }

@@ -34,7 +34,8 @@ class PreferenceFile {
   PreferenceFile(const DeviceRoot& root, platform::SystemLog& log, std::string_view user,
                  std::string_view domain);
 
-  std::optional<plist::Value> value(std::string_view key);
+  // The value of a key, or none; the error, of the file's path, says why the file can't be read.
+  base::Result<std::optional<plist::Value>> value(std::string_view key);
 
   // Sets a key, or removes it (null); to be written by the next flush.
   void change(std::string_view key, const plist::Value* value);

@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <set>
 #include <tuple>
 #include <utility>
 
@@ -50,11 +51,18 @@ PreferenceFile* PreferenceFiles::file(std::string_view user, std::string_view do
               .first->second;
 }
 
-std::optional<plist::Value> PreferenceFiles::get(std::string_view user, std::string_view domain,
-                                                 std::string_view key) {
+base::Result<std::optional<plist::Value>> PreferenceFiles::read(std::string_view user,
+                                                                std::string_view domain,
+                                                                std::string_view key) {
   const std::scoped_lock lock(mutex_);
   PreferenceFile* known = file(user, domain);
-  return known != nullptr ? known->value(key) : std::nullopt;
+  if (known == nullptr) return std::nullopt;
+  return known->value(key);
+}
+
+std::optional<plist::Value> PreferenceFiles::get(std::string_view user, std::string_view domain,
+                                                 std::string_view key) {
+  return read(user, domain, key).orNone().value_or(std::nullopt);
 }
 
 void PreferenceFiles::set(std::string_view user, std::string_view domain, std::string_view key,
@@ -63,7 +71,26 @@ void PreferenceFiles::set(std::string_view user, std::string_view domain, std::s
   PreferenceFile* known = file(user, domain);
   if (known == nullptr) return;
   known->change(key, value);
-  if (synchronize) known->flush();
+  if (!synchronize) return;
+  if (holding_) {
+    held_.push_back(known);
+  } else {
+    known->flush();
+  }
+}
+
+void PreferenceFiles::holdWrites() {
+  const std::scoped_lock lock(mutex_);
+  holding_ = true;
+}
+
+void PreferenceFiles::writeHeld() {
+  const std::scoped_lock lock(mutex_);
+  holding_ = false;
+  std::set<PreferenceFile*> tried;
+  for (PreferenceFile* file : std::exchange(held_, {})) {
+    if (tried.insert(file).second) file->flush();
+  }
 }
 
 void PreferenceFiles::addToInteger(std::string_view key, std::string_view domain,
@@ -75,6 +102,11 @@ void PreferenceFiles::addToInteger(std::string_view key, std::string_view domain
 std::optional<plist::Value> PreferenceFiles::QNSPreferencesGetValue(std::string_view key,
                                                                     std::string_view domain) {
   return get(kSystemUser, domain, key);
+}
+
+base::Result<std::optional<plist::Value>> PreferenceFiles::readValue(std::string_view key,
+                                                                     std::string_view domain) {
+  return read(kSystemUser, domain, key);
 }
 
 void PreferenceFiles::QNSPreferencesSetValue(std::string_view key, const plist::Value* value,

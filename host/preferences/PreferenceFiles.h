@@ -11,6 +11,7 @@
 #include <map>
 #include <mutex>
 #include <string>
+#include <vector>
 
 #include "host/preferences/PreferenceFile.h"
 #include "platform/PreferenceStore.h"
@@ -40,6 +41,10 @@ class PreferenceFiles final : public platform::PreferenceStore,
   void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                               std::string_view domain) override;
   void QNSPreferencesSynchronize(std::string_view domain) override;
+  base::Result<std::optional<plist::Value>> readValue(std::string_view key,
+                                                      std::string_view domain) override;
+  void holdWrites() override;
+  void writeHeld() override;
 
   // AnalyticsConfiguration
   std::optional<plist::Value> getPreference(std::string_view key, std::string_view domain) override;
@@ -47,8 +52,8 @@ class PreferenceFiles final : public platform::PreferenceStore,
                      bool synchronize) override;
   std::vector<std::string> logBlocklist() override;
 
-  // PrivilegedPreferences. Both write at once: the user's own processes shall see the change, and
-  // the interface has no later moment to ask for it.
+  // PrivilegedPreferences. Both write at once, or when held writes are: the user's own processes
+  // shall see the change, and the interface has no later moment to ask for it.
   void setPreference(std::string_view key, std::string_view user, std::string_view domain,
                      const plist::Value* value) override;
   void deletePreference(std::string_view key, std::string_view user,
@@ -56,6 +61,8 @@ class PreferenceFiles final : public platform::PreferenceStore,
 
  private:
   PreferenceFile* file(std::string_view user, std::string_view domain);
+  base::Result<std::optional<plist::Value>> read(std::string_view user, std::string_view domain,
+                                                 std::string_view key);
   std::optional<plist::Value> get(std::string_view user, std::string_view domain,
                                   std::string_view key);
   void set(std::string_view user, std::string_view domain, std::string_view key,
@@ -65,6 +72,8 @@ class PreferenceFiles final : public platform::PreferenceStore,
   platform::SystemLog& log_;
   std::mutex mutex_;
   std::map<std::string, PreferenceFile, std::less<>> files_;  // by "<user>/<domain>"
+  bool holding_ = false;
+  std::vector<PreferenceFile*> held_;  // to be written then, in the order of the changes
 };
 
 }  // namespace host

@@ -139,6 +139,12 @@ void FakePreferences::QNSPreferencesSynchronize(std::string_view domain) {
   journal_.push_back("synchronize " + std::string(domain));
 }
 
+base::Result<std::optional<plist::Value>> FakePreferences::readValue(std::string_view key,
+                                                                     std::string_view domain) {
+  if (!readable) return base::Error{"unreadable"};
+  return mobile(domain, key);
+}
+
 std::optional<plist::Value> FakePreferences::getPreference(std::string_view key,
                                                            std::string_view domain) {
   const auto found = values.find({"__quenset__", std::string(domain), std::string(key)});

@@ -123,6 +123,9 @@ class FakePreferences : public PreferenceStore,
   void QNSPreferencesSetValue(std::string_view key, const plist::Value* value,
                               std::string_view domain) override;
   void QNSPreferencesSynchronize(std::string_view domain) override;
+  bool readable = true;  // for who asks whether a value can be read
+  base::Result<std::optional<plist::Value>> readValue(std::string_view key,
+                                                      std::string_view domain) override;
   std::optional<plist::Value> getPreference(std::string_view key, std::string_view domain) override;
   void setPreference(std::string_view key, const plist::Value* value, std::string_view domain,
                      bool synchronize) override;

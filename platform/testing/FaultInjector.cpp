@@ -89,6 +89,13 @@ struct Preferences : PreferenceStore {
   void QNSPreferencesSynchronize(std::string_view domain) override {
     inner.QNSPreferencesSynchronize(domain);
   }
+  base::Result<std::optional<plist::Value>> readValue(std::string_view key,
+                                                      std::string_view domain) override {
+    if (plan.fails()) return base::Error{"injected"};
+    return inner.readValue(key, domain);
+  }
+  void holdWrites() override { inner.holdWrites(); }
+  void writeHeld() override { inner.writeHeld(); }
 };
 
 struct Submissions : LogSubmission {

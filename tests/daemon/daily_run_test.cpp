@@ -118,6 +118,15 @@ TEST_F(DailyRunTest, OpensTheGateOnceADayWhateverTheClockDoes) {
   }
 }
 
+TEST_F(DailyRunTest, RunsNoDayWhileTheRecordCannotBeRead) {
+  platform.preferences.readable = false;
+  run({"morvend", "-d"});
+  EXPECT_EQ(platform.journal, Lines{});
+  EXPECT_EQ(platform.log.count("error: The record of the last day can't be read, so no day is run: "
+                               "unreadable"),
+            1);
+}
+
 TEST_F(DailyRunTest, ActsOnItsFirstArgumentOnly) {
   platform.preferences.setMobile(kDomain, kRecord, 20000);
   const struct {

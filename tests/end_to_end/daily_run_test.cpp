@@ -232,6 +232,31 @@ TEST(DailyRun, KnowsAKeyAgainThatIsNotWrittenAsItCame) {
 
 // A link in the place of a file or a folder that is written must lead nothing out of the root, and
 // a FIFO must not stop the run.
+// A tasking of many settings costs what its size says: the calls are those of a small one.
+TEST(DailyRun, WritesEachDomainOfATaskingOnce) {
+  if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
+  Device filled;
+  filled.fill();
+  const auto calls = [&filled](int settings) {
+    Device device;
+    device.become(filled);
+    Array payload;
+    for (int i = 0; i < settings; ++i) {
+      const char* const users[] = {"mobile", "__quenset__", "guest"};
+      payload.push_back(Dictionary{{"Domain", "com.example"},
+                                   {"User", users[i % 3]},
+                                   {"Key", std::to_string(i)},
+                                   {"Value", i}});
+    }
+    device.writePropertyList(
+        "var/preferences/__quenset__/com.norba.Varnhollow.plist",
+        Dictionary{{"ScheduledTasking",
+                    Dictionary{{"TaskingID", "T2"}, {"TaskingPayload", std::move(payload)}}}});
+    return device.countCalls("morvend", {"-d"});
+  };
+  EXPECT_LE(calls(300), calls(3) + 3) << "and what more blocks of a file take";
+}
+
 TEST(DailyRun, TouchesNothingOutsideItsRoot) {
   const Lines written = linesOf(
       "var/run/morvend.lock\nvar/run\nvar/preferences/mobile\nvar/preferences/guest\n"

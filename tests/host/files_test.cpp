@@ -82,6 +82,28 @@ TEST(Files, NothingButARegularFileIsWritten) {
   }
 }
 
+TEST(Files, WhatStandsInTheWayOfAFileBesideIsPassedBy) {
+  const TemporaryFolder root;
+  const auto folder = DeviceRoot(root.path().string()).openFolder("/", Missing::fails);
+  root.write("target", "kept");
+  std::filesystem::create_symlink("target", root / ".file.new");
+  for (int number = 1; number <= kMaxNamesBeside; ++number) {
+    const std::string text = std::to_string(number), suffix = number > 1 ? "-" + text : "";
+    EXPECT_TRUE(replaceFile(folder->get(), "file", text));
+    EXPECT_EQ(root.read("file"), text);
+    std::filesystem::copy_file(root / "file", root / "damaged");
+    EXPECT_TRUE(keepBeside(folder->get(), "damaged", "kept"));
+    EXPECT_EQ(root.read("kept" + suffix), text);
+    root.write(".file.new" + suffix + "/in the way", "");
+    std::filesystem::remove(root / ("kept" + suffix));
+    std::filesystem::create_directory(root / ("kept" + suffix));
+  }
+  EXPECT_FALSE(replaceFile(folder->get(), "file", "new"));
+  EXPECT_FALSE(keepBeside(folder->get(), "file", "kept"));
+  EXPECT_EQ(root.read("file"), std::to_string(kMaxNamesBeside));
+  EXPECT_EQ(root.read("target"), "kept");
+}
+
 TEST(Files, AnUnfinishedLineIsRemovedBeforeOneIsAppended) {
   platform::fakes::RecordingLog log;
   const std::string line(5000, 'l'), torn(10000, 't');

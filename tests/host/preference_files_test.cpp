@@ -185,6 +185,35 @@ TEST_F(PreferenceFilesTest, AFailedWriteIsSaidOnceStaysVisibleAndIsTriedAgain) {
   EXPECT_EQ(folder.read(kFile), xml({{"key", 1}}));
 }
 
+TEST_F(PreferenceFilesTest, AbsentAndUnreadableAreNotTheSame) {
+  PreferenceFiles files(root, log);
+  EXPECT_TRUE(files.readValue("key", kDomain));
+  folder.write(kFile, "damaged");
+  EXPECT_TRUE(files.readValue("key", kDomain)) << "it is kept aside, and reads as empty";
+  std::filesystem::remove_all(folder / "var");
+  folder.write("var/preferences/mobile", "in the way");
+  const auto read = files.readValue("key", kDomain);
+  ASSERT_FALSE(read);
+  EXPECT_TRUE(read.error().text.starts_with(root.hostPath(kFile) + ": "));
+}
+
+TEST_F(PreferenceFilesTest, HeldWritesAreOneForEachDomain) {
+  const plist::Value value(1);
+  PreferenceFiles files(root, log);
+  files.holdWrites();
+  for (int i = 0; i < 3; ++i) {
+    files.setPreference(std::to_string(i), &value, kDomain, true);
+    files.setPreference(std::to_string(i), "root", kDomain, &value);
+  }
+  files.deletePreference("1", "root", kDomain);
+  EXPECT_FALSE(std::filesystem::exists(folder / "var"));
+  files.writeHeld();
+  EXPECT_EQ(stored("var/preferences/__quenset__/com.example.plist")->size(), 3u);
+  EXPECT_EQ(stored("var/preferences/root/com.example.plist")->size(), 2u);
+  files.deletePreference("0", "root", kDomain);
+  EXPECT_EQ(stored("var/preferences/root/com.example.plist")->size(), 1u) << "at once again";
+}
+
 TEST_F(PreferenceFilesTest, AValueThatWouldMakeTheFileUnreadableIsRefused) {
   folder.write(kFile, xml({{"key", 1}}));
   plist::Value deep("leaf");
