@@ -42,7 +42,10 @@ base::Result<std::optional<plist::Value>> PreferenceFile::value(std::string_view
   if (const plist::Value* value = set_.find(key)) return *value;
   if (removed_.contains(key)) return std::nullopt;
   load(false);
-  if (state_ == State::unreadable) return readError_->at(path());
+  // Where a folder should be and is none, there is certainly no file.
+  if (state_ == State::unreadable && !readError_->is(std::errc::not_a_directory)) {
+    return readError_->at(path());
+  }
   const plist::Value* value = stored_.find(key);
   return value != nullptr ? std::optional(*value) : std::nullopt;
 }

@@ -192,6 +192,10 @@ TEST_F(PreferenceFilesTest, AbsentAndUnreadableAreNotTheSame) {
   EXPECT_TRUE(files.readValue("key", kDomain)) << "it is kept aside, and reads as empty";
   std::filesystem::remove_all(folder / "var");
   folder.write("var/preferences/mobile", "in the way");
+  EXPECT_TRUE(files.readValue("key", kDomain));
+  std::filesystem::remove(folder / "var/preferences/mobile");
+  std::filesystem::create_directory(folder / "var/preferences/mobile");
+  std::filesystem::create_symlink("com.example.plist", folder / kFile);
   const auto read = files.readValue("key", kDomain);
   ASSERT_FALSE(read);
   EXPECT_TRUE(read.error().text.starts_with(root.hostPath(kFile) + ": "));
