@@ -17,8 +17,10 @@ inline constexpr std::chrono::seconds kUsageServicePatience(10);
 
 // Asks the usage service and waits for its reply to be dealt with, for at most `patience`. The
 // reply adds to today's counters and replaces the baseline: "netUsageBaseline" in the domain
-// "com.norba.quenset.morvend". A late one does so too, on the service's thread, while the process
-// lives; counters and preferences are all that it uses, and must live as long as the service.
+// "com.norba.quenset.morvend". Both or neither: what a run that was ended in between has counted is
+// not counted again, and where the counters can't be recorded the baseline stays. A late one does
+// so too, on the service's thread, while the process lives; counters, preferences and log are all
+// that it uses, and must live as long as the service.
 void CollectDataUsage(platform::NetworkUsage& networkUsage, platform::CountersService& counters,
                       platform::PreferenceStore& preferences, platform::SystemLog& log,
                       std::chrono::nanoseconds patience = kUsageServicePatience);

@@ -12,6 +12,7 @@
 #include "platform/DeviceProperties.h"
 #include "platform/EventLoop.h"
 #include "platform/Eventra.h"
+#include "platform/LogSubmission.h"
 #include "platform/Names.h"
 #include "platform/PreferenceStore.h"
 #include "platform/SystemLog.h"
@@ -127,6 +128,7 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
   const auto storedOS = record(services.preferences, "TaskingOS");
   const auto os = build ? std::optional<Value>(*build) : std::nullopt;
   if (storedID && *storedID == *newID && os && storedOS == os) return;
+  const bool consented = services.submission.DiagnosticLogSubmissionEnabled();
   DomainSet domainsToSync;
   // A domain of which many settings change is written once.
   services.preferences.holdWrites();
@@ -152,6 +154,12 @@ void applyScheduledTasking(const Services& services, const std::optional<std::st
   }
   services.preferences.writeHeld();
   domainsToSync.synchronize(services.preferences);
+  if (const bool consents = services.submission.DiagnosticLogSubmissionEnabled();
+      consents != consented) {
+    services.log.log(LogLevel::standard, "Tasking %s changed the user's consent to logs: %s",
+                     description(*newID).c_str(),
+                     consents ? "they are submitted from now on" : "none is submitted any more");
+  }
   services.notifications.postNotification("com.norba.da.tasking_changed");
 }
 

@@ -6,8 +6,10 @@
 
 #include <cstdint>
 #include <span>
+#include <string>
 #include <string_view>
 
+#include "base/Result.h"
 #include "plist/Value.h"
 
 namespace platform {
@@ -43,6 +45,14 @@ class CountersService {
   virtual void PLClientAddValuesForScalarKeys(std::span<const ScalarValue> values) {
     for (const auto& [key, value] : values) PLClientAddValueForScalarKey(key, value);
   }
+
+  // The same, and keeps a text under a name, for what must not be added again: both, or neither and
+  // then false, which the service says in the log. Empty: nothing is kept any more.
+  virtual bool addValuesAndKeep(std::span<const ScalarValue> values, std::string_view name,
+                                std::string_view text) = 0;
+
+  // What was kept under a name; empty: nothing.
+  virtual base::Result<std::string> keptText(std::string_view name) = 0;
 };
 
 }  // namespace platform

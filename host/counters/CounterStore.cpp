@@ -12,6 +12,7 @@
 #include "base/ByteWriter.h"
 #include "base/CivilDate.h"
 #include "base/UTF8.h"
+#include "host/counters/KeptTexts.h"
 #include "host/counters/SQLite.h"
 
 namespace host {
@@ -164,7 +165,11 @@ void CounterStore::record(CounterChange::Kind kind, std::span<const platform::Sc
   for (const auto& [key, value] : values) {
     changes.push_back({.kind = kind, .key = key, .day = today, .amount = value});
   }
-  auto applied = apply(changes);
+  noted(apply(changes));
+}
+
+// Says why values couldn't be recorded, and keeps it.
+bool CounterStore::noted(base::Result<void> applied) {
   const std::scoped_lock lock(mutex_);
   if (!applied && (lastRecord_ || applied.error().text != lastRecord_.error().text)) {
     place_.log.log(platform::LogLevel::error, "Could not record counters: %s",
@@ -172,6 +177,39 @@ void CounterStore::record(CounterChange::Kind kind, std::span<const platform::Sc
   }
   if (recorded_) recorded_ = applied;
   lastRecord_ = std::move(applied);
+  return static_cast<bool>(lastRecord_);
+}
+
+bool CounterStore::addValuesAndKeep(std::span<const platform::ScalarValue> values,
+                                    std::string_view name, std::string_view text) {
+  const std::int32_t today = PLDaysSince1970();
+  const auto addAndKeep = [&](sqlite::Connection& connection) -> base::Result<void> {
+    for (const auto& [key, value] : values) {
+      const CounterChange change{
+          .kind = CounterChange::Kind::add, .key = key, .day = today, .amount = value};
+      if (auto written = write(connection, change); !written) return written;
+    }
+    return keepText(connection, name, text);
+  };
+  std::unique_lock lock(mutex_);
+  auto done =
+      database_.write(CounterDatabase::Missing::create, [&](sqlite::Connection& connection) {
+        return inTransaction(connection, [&] { return addAndKeep(connection); });
+      });
+  lock.unlock();
+  return noted(std::move(done));
+}
+
+base::Result<std::string> CounterStore::keptText(std::string_view name) {
+  base::Result<std::string> text = std::string();
+  const std::scoped_lock lock(mutex_);
+  const auto read =
+      database_.write(CounterDatabase::Missing::skip, [&](sqlite::Connection& connection) {
+        text = host::keptText(connection, name);
+        return text ? base::Result<void>() : text.error();
+      });
+  if (!read) return read.error();
+  return text;
 }
 
 base::Result<void> CounterStore::recorded() {

@@ -57,6 +57,10 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   void PLClientSetValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
   void PLClientAddValuesForScalarKeys(std::span<const platform::ScalarValue> values) override;
 
+  bool addValuesAndKeep(std::span<const platform::ScalarValue> values, std::string_view name,
+                        std::string_view text) override;
+  base::Result<std::string> keptText(std::string_view name) override;
+
   // Whether all of these values could be recorded; the error is the first one's.
   base::Result<void> recorded();
 
@@ -73,6 +77,7 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
 
  private:
   void record(CounterChange::Kind kind, std::span<const platform::ScalarValue> values);
+  bool noted(base::Result<void> outcome);
 
   CounterPlace place_;
   platform::Clock& clock_;

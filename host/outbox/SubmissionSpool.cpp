@@ -98,8 +98,10 @@ base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
 }  // namespace
 
 bool SubmissionSpool::DiagnosticLogSubmissionEnabled() {
-  return preferences_.QNSPreferencesGetBooleanValue("DiagnosticLogSubmissionEnabled",
-                                                    "com.norba.quenset");
+  const auto consent = preferences_.QNSPreferencesGetValue("DiagnosticLogSubmissionEnabled",
+                                                           "com.norba.quenset");
+  const auto* number = consent ? consent->as<plist::Number>() : nullptr;
+  return number != nullptr && !number->isReal() && number->int64Value() == 1;
 }
 
 bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,

@@ -3,7 +3,7 @@
 
 // Log submission into a spool folder: var/spool/morvend/submitted/<log name>.<log type>.<time>,
 // with the options beside it (see SpoolFolder). Consent is the user's preference
-// "DiagnosticLogSubmissionEnabled".
+// "DiagnosticLogSubmissionEnabled": true or 1, and nothing else.
 #pragma once
 
 #include <string>

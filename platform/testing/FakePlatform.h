@@ -11,7 +11,9 @@
 #include <memory>
 #include <optional>
 #include <set>
+#include <span>
 #include <string>
+#include <string_view>
 #include <tuple>
 #include <utility>
 #include <vector>
@@ -85,6 +87,20 @@ class FakeCounters : public CountersService {
     record("add " + std::string(key) + " " + std::to_string(value));
   }
 
+  bool refuses = false;  // to keep, and to say what is kept
+  std::map<std::string, std::string, std::less<>> kept;
+  bool addValuesAndKeep(std::span<const ScalarValue> values, std::string_view name,
+                        std::string_view text) override {
+    if (refuses) return false;
+    PLClientAddValuesForScalarKeys(values);
+    kept[std::string(name)] = text;
+    return true;
+  }
+  base::Result<std::string> keptText(std::string_view name) override {
+    if (refuses) return base::Error{"refused"};
+    return kept[std::string(name)];
+  }
+
  private:
   void record(std::string text) {
     if (areInJournal) journal_.push_back(text);
@@ -154,8 +170,12 @@ class FakeSubmission : public LogSubmission {
   bool allowed = true;
   std::vector<Log> logs;
   std::function<void()> beforeLog = [] {};  // may throw
+  std::function<void()> asked = [] {};      // before the answer whether it is allowed
 
-  bool DiagnosticLogSubmissionEnabled() override { return allowed; }
+  bool DiagnosticLogSubmissionEnabled() override {
+    asked();
+    return allowed;
+  }
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                 const plist::Dictionary* options, const Writer& writer) override;
 

@@ -171,6 +171,46 @@ TEST(DataUsageStep, GoesOnWithoutAReplyAndDealsWithALateOne) {
   EXPECT_EQ(device.journal.size(), 2u);
 }
 
+// A run that was ended between the counters and the baseline has counted already: the next one goes
+// on from there. Where the counters refuse, both stay.
+TEST(DataUsageStep, CountsOnceWhereverARunEnds) {
+  support::TestPlatform device;
+  device.counters.today = 20000;
+  const auto run = [&device](std::vector<Value> counts) {
+    device.counters.records.clear();
+    device.networkUsage.records = Array{bundle(kToday, counts)};
+    collect(device.platform);
+    return device.counters.records;
+  };
+  const auto baseline = [&device] { return device.preferences.mobile(kDomain, kBaseline); };
+  const auto lose = [&device](const std::optional<Value>& before) {
+    device.preferences.values.clear();
+    if (before) device.preferences.setMobile(kDomain, kBaseline, *before);
+  };
+  for (const bool first : {true, false}) {  // without a baseline, and with one
+    const auto before = baseline();
+    const int at = first ? 0 : 10 << 10;
+    EXPECT_EQ(run({at + 2048}), Lines{"add datausage.wifiInKB.b 2"});
+    lose(before);
+    EXPECT_EQ(run({at + 2048}), Lines{});
+    lose(before);
+    EXPECT_EQ(run({at + 5120}), Lines{"add datausage.wifiInKB.b 3"});
+    const auto after = baseline();
+    device.counters.refuses = true;
+    EXPECT_EQ(run({at + 10240}), Lines{});
+    EXPECT_EQ(baseline(), after);
+    device.counters.refuses = false;
+    EXPECT_EQ(run({at + 10240}), Lines{"add datausage.wifiInKB.b 5"});
+  }
+  // An empty reply leads back to the first baseline, from which nothing is counted any more.
+  device.networkUsage.records = Array();
+  collect(device.platform);
+  EXPECT_EQ(run({4096}), Lines{"add datausage.wifiInKB.b 4"});
+  lose(Value(Dictionary()));
+  device.preferences.readable = false;
+  EXPECT_EQ(run({8192}), Lines{}) << "a baseline that can't be read is not none";
+}
+
 // On the host, where the reply is another thread's.
 class DataUsageThreads : public ::testing::Test {
  protected:

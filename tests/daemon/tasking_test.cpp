@@ -122,6 +122,26 @@ TEST_F(TaskingTest, AppliesKeepsReplacesAndReappliesATasking) {
   EXPECT_EQ(run(), Lines{kPosted});
 }
 
+TEST_F(TaskingTest, SaysWhenItChangesTheConsent) {
+  run();
+  const std::string said = "Tasking T1 changed the user's consent to logs: ";
+  for (const bool after : {false, true, true}) {
+    schedule({{"TaskingID", "T1"}, {"TaskingPayload", Array{item("mobile", "a", after)}}});
+    platform.preferences.setMobile(kDomain, "TaskingOS", "other");
+    // What the item means to the service whose consent it is.
+    platform.submission.asked = [this] {
+      const auto consent = platform.preferences.mobile("com.example", "a");
+      platform.submission.allowed = !consent || *consent == Value(true);
+    };
+    const bool before = platform.submission.DiagnosticLogSubmissionEnabled();
+    run();
+    EXPECT_EQ(platform.log.count("default: " + said + "they are submitted from now on"),
+              after && !before);
+    EXPECT_EQ(platform.log.count("default: " + said + "none is submitted any more"),
+              !after && before);
+  }
+}
+
 TEST_F(TaskingTest, NeverTakesAnUnknownBuildForTheSame) {
   platform.device.version.reset();
   schedule({{"TaskingID", "T1"}, {"TaskingPayload", Array{}}});

@@ -149,6 +149,14 @@ TEST_F(SubmissionSpoolTest, ConsentIsTheUsersAndOffByDefault) {
   folder.write("var/preferences/mobile/com.norba.quenset.plist",
                xml({{"DiagnosticLogSubmissionEnabled", true}}));
   EXPECT_TRUE(spool.DiagnosticLogSubmissionEnabled());
+  const std::pair<plist::Value, bool> rows[] = {{1, true},    {1.0, false}, {2, false},
+                                                {-1, false},  {0, false},   {"true", false},
+                                                {1.5, false}, {0.1, false}, {false, false}};
+  for (const auto& [consent, given] : rows) {
+    folder.write("var/preferences/mobile/com.norba.quenset.plist",
+                 xml({{"DiagnosticLogSubmissionEnabled", consent}}));
+    EXPECT_EQ(spool.DiagnosticLogSubmissionEnabled(), given) << description(consent);
+  }
 }
 
 }  // namespace
