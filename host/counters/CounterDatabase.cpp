@@ -230,8 +230,7 @@ Result<CounterDatabase::Identity> CounterDatabase::identity() const {
 Result<void> CounterDatabase::create() {
   // A new database must not meet what is left of another one.
   for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
-  const auto file = opened(
-      ::openat(folder_.get(), kName, O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  const auto file = makeFile(folder_.get(), kName);
   if (!file) return Error{file.error().text};
   return {};
 }

@@ -98,7 +98,7 @@ base::Result<FileDescriptor> DeviceRoot::openFolder(std::string_view path, Missi
       const std::string name = slash == std::string::npos ? upTo : upTo.substr(slash + 1);
       const auto above = open(parent, flags, links);
       if (!above) return above.error();
-      const auto made = checked(::mkdirat(above->get(), name.c_str(), 0700));
+      const auto made = makeFolder(above->get(), name);
       if (!made && !made.error().is(std::errc::file_exists)) return made.error();
       if (const auto synced = checked(::fsync(above->get())); !synced) return synced.error();
       found = open(upTo, flags, links);

@@ -14,6 +14,7 @@
 #include <system_error>
 #include <tuple>
 
+#include "host/files/Ownership.h"
 #include "host/files/SystemError.h"
 
 namespace host {
@@ -43,8 +44,7 @@ base::Result<NewFile> makeBeside(int folder, const std::string& name) {
   for (int number = 1;; ++number) {
     std::string beside = numbered("." + name + ".new", number);
     auto file = ::unlinkat(folder, beside.c_str(), 0) == 0 || errno == ENOENT
-                    ? opened(::openat(folder, beside.c_str(),
-                                      O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600))
+                    ? makeFile(folder, beside)
                     : systemError();
     if (file) return NewFile{std::move(beside), *std::move(file)};
     struct stat status;
@@ -134,6 +134,17 @@ base::Result<void> writeAll(int file, std::string_view bytes) {
   return {};
 }
 
+base::Result<FileDescriptor> makeFile(int folder, const std::string& name) {
+  const AsOwnerOf owner(folder);
+  return opened(
+      ::openat(folder, name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+}
+
+base::Result<void> makeFolder(int folder, const std::string& name) {
+  const AsOwnerOf owner(folder);
+  return checked(::mkdirat(folder, name.c_str(), 0700));
+}
+
 base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
   if (auto free = refuseOtherKinds(folder, name); !free) return free;
   const auto beside = makeBeside(folder, name);
@@ -202,6 +213,7 @@ base::Result<RolledOver> rollOver(int folder, const std::string& path, const std
 
 base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines,
                                const LockWait& wait) {
+  const AsOwnerOf owner(folder);
   const auto file = opened(
       ::openat(folder, name.c_str(),
                O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));

@@ -41,6 +41,11 @@ std::string shownText(std::string_view text);
 // Writes all the bytes, going on after short writes and signals.
 base::Result<void> writeAll(int file, std::string_view bytes);
 
+// Makes a file that isn't there yet, or a folder, in an open folder to whose owner it then belongs:
+// the file is open for writing.
+base::Result<FileDescriptor> makeFile(int folder, const std::string& name);
+base::Result<void> makeFolder(int folder, const std::string& name);
+
 // How many names beside a file are tried, for what is to stand there for a while or be kept: in the
 // way of each may be something that is not ours.
 inline constexpr int kMaxNamesBeside = 8;

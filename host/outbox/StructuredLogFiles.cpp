@@ -77,8 +77,7 @@ base::Result<void> submitPart(int file, off_t start, off_t end, const std::strin
     return renameToFreeName(spool.descriptor(), SpoolFolder::kUnfinishedLog, spool.descriptor(),
                             to);
   };
-  auto submitted = opened(::openat(spool.descriptor(), SpoolFolder::kUnfinishedLog,
-                                   O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600))
+  auto submitted = makeFile(spool.descriptor(), SpoolFolder::kUnfinishedLog)
                        .and_then([&](const FileDescriptor& part) {
                          return copyPart(file, start, end, part.get());
                        })

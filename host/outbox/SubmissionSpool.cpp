@@ -51,8 +51,7 @@ class OpenLog final : public platform::LogHandle {
 // The size of what was written.
 base::Result<std::uint64_t> writeUnfinished(const SpoolFolder& spool, const char* name,
                                             const platform::LogSubmission::Writer& writer) {
-  const auto file = opened(::openat(spool.descriptor(), name,
-                                    O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+  const auto file = makeFile(spool.descriptor(), name);
   if (!file) return file.error();
   OpenLog log(*file);
   writer(log);
@@ -98,8 +97,8 @@ base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
 }  // namespace
 
 bool SubmissionSpool::DiagnosticLogSubmissionEnabled() {
-  const auto consent = preferences_.QNSPreferencesGetValue("DiagnosticLogSubmissionEnabled",
-                                                           "com.norba.quenset");
+  const auto consent =
+      preferences_.QNSPreferencesGetValue("DiagnosticLogSubmissionEnabled", "com.norba.quenset");
   const auto* number = consent ? consent->as<plist::Number>() : nullptr;
   return number != nullptr && !number->isReal() && number->int64Value() == 1;
 }

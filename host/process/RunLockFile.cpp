@@ -6,6 +6,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include "host/files/Ownership.h"
 #include "host/files/SystemError.h"
 
 namespace host {
@@ -19,6 +20,7 @@ base::Result<FileDescriptor> openLockFile(const DeviceRoot& root) {
   const auto folder =
       root.openFolder(kFolder, DeviceRoot::Missing::create, DeviceRoot::Links::followed);
   if (!folder) return folder.error();
+  const AsOwnerOf owner(folder->get());
   auto file =
       opened(::openat(folder->get(), kName,
                       O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));

@@ -81,7 +81,8 @@ platform::Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
 
 // Moves a file of the folder to its rejected ones, under a name that is free.
 base::Result<void> reject(int folder, const std::string& name) {
-  if (::mkdirat(folder, kRejected, 0700) != 0 && errno != EEXIST) return systemError();
+  const auto made = makeFolder(folder, kRejected);
+  if (!made && !made.error().is(std::errc::file_exists)) return made;
   const auto rejected =
       opened(::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!rejected) return rejected.error();

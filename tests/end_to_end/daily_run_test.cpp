@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <filesystem>
@@ -232,6 +233,31 @@ TEST(DailyRun, KnowsAKeyAgainThatIsNotWrittenAsItCame) {
 
 // A link in the place of a file or a folder that is written must lead nothing out of the root, and
 // a FIFO must not stop the run.
+// Root's run on another user's device leaves nothing there that this user can't write to, the
+// database's files included, which a day and a counter make.
+TEST(DailyRun, MakesEverythingTheOwnersOfTheFolders) {
+  if (::geteuid() != 0) GTEST_SKIP() << "only root makes files for others";
+  Device device;
+  device.fill();
+  std::filesystem::remove_all(device.root() / "var/mobile");
+  constexpr uid_t kOwner = 4711;
+  ASSERT_EQ(::lchown(device.root().path().c_str(), kOwner, kOwner), 0);
+  const auto everything = [&device] {
+    return std::filesystem::recursive_directory_iterator(device.root().path());
+  };
+  for (const auto& entry : everything()) {
+    ASSERT_EQ(::lchown(entry.path().c_str(), kOwner, kOwner), 0);
+  }
+  EXPECT_EQ(device.run("pelloran", {"add", "exact", "1"}).status, 0);
+  EXPECT_TRUE(ended(device.run("morvend", {"-d"})));
+  for (const auto& entry : everything()) {
+    struct stat status;
+    ASSERT_EQ(::lstat(entry.path().c_str(), &status), 0);
+    EXPECT_EQ(status.st_uid, kOwner) << entry.path();
+    EXPECT_EQ(status.st_gid, kOwner) << entry.path();
+  }
+}
+
 // A tasking of many settings costs what its size says: the calls are those of a small one.
 TEST(DailyRun, WritesEachDomainOfATaskingOnce) {
   if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
