@@ -5,7 +5,6 @@
 
 #include <fcntl.h>
 
-#include <cstdio>
 #include <limits>
 #include <system_error>
 

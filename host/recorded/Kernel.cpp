@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
+#include <charconv>
 #include <cstdint>
 #include <cstring>
 #include <ctime>
@@ -79,6 +80,39 @@ platform::Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
   return deliver(record.data(), buffer.size() < record.size() ? 8 : record.size(), buffer);
 }
 
+// The name under which an event waits: ".taken-<day>.<name>", with "run" for no day.
+constexpr std::string_view kTaken = ".taken-", kNoDay = "run";
+
+struct TakenName {
+  std::optional<std::int32_t> day;
+  std::string name;
+};
+
+std::optional<TakenName> parseTaken(std::string_view file) {
+  if (!file.starts_with(kTaken)) return std::nullopt;
+  file.remove_prefix(kTaken.size());
+  const std::size_t dot = file.find('.');
+  if (dot == file.npos || dot + 1 == file.size()) return std::nullopt;
+  const std::string_view day = file.substr(0, dot);
+  TakenName taken{std::nullopt, std::string(file.substr(dot + 1))};
+  if (day == kNoDay) return taken;
+  std::int32_t number = 0;
+  const auto [end, error] = std::from_chars(day.data(), day.data() + day.size(), number);
+  if (error != std::errc() || end != day.data() + day.size()) return std::nullopt;
+  taken.day = number;
+  return taken;
+}
+
+// Renames a file of the folder to the first of the names <to>, <to>-2, and so on that is free.
+base::Result<void> renameNumbered(int folder, const std::string& from, int toFolder,
+                                  const std::string& to) {
+  for (int number = 1;; ++number) {
+    const std::string name = number == 1 ? to : to + "-" + std::to_string(number);
+    auto renamed = renameToFreeName(folder, from, toFolder, name);
+    if (renamed || !renamed.error().is(std::errc::file_exists)) return renamed;
+  }
+}
+
 // Moves a file of the folder to its rejected ones, under a name that is free.
 base::Result<void> reject(int folder, const std::string& name) {
   const auto made = makeFolder(folder, kRejected);
@@ -86,11 +120,7 @@ base::Result<void> reject(int folder, const std::string& name) {
   const auto rejected =
       opened(::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
   if (!rejected) return rejected.error();
-  for (int number = 1;; ++number) {
-    const std::string to = number == 1 ? name : name + "-" + std::to_string(number);
-    auto moved = renameToFreeName(folder, name, rejected->get(), to);
-    if (moved || !moved.error().is(std::errc::file_exists)) return moved;
-  }
+  return renameNumbered(folder, name, rejected->get(), name);
 }
 
 }  // namespace
@@ -131,7 +161,7 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
     return std::nullopt;
   }
   for (const std::string& name : *names) {
-    if (name == kRejected) continue;
+    if (name == kRejected || name.starts_with(kTaken)) continue;
     const auto bytes = root_.readFile(kEventsFolder + ("/" + name), kMaxEventSize + 1);
     if (!bytes) {
       say(name, bytes.error().text);
@@ -146,15 +176,38 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
     }
     // It stays for a caller with room for it.
     if (bytes->size() > buffer.size()) return failure(ENOMEM);
-    // Removed first: an event that stays would be delivered again and again.
-    if (::unlinkat(folder->get(), name.c_str(), 0) != 0) {
-      const int error = errno;
-      say(name, systemError(error).text);
-      return failure(error);
+    // Taken first: an event that stays would be delivered again and again.
+    if (const auto taken = take(folder->get(), name); !taken) {
+      say(name, taken.error().text);
+      return failure(static_cast<int>(taken.error().what));
     }
     return deliver(bytes->data(), bytes->size(), buffer);
   }
   return std::nullopt;
+}
+
+base::Result<void> Kernel::take(int folder, const std::string& name) const {
+  if (!taker_) return checked(::unlinkat(folder, name.c_str(), 0));
+  std::string taken(kTaken);
+  taken += taker_->day ? std::to_string(*taker_->day) : std::string(kNoDay);
+  return renameNumbered(folder, name, folder, taken + "." + name);
+}
+
+base::Result<void> Kernel::settleEvents(const Done& done) {
+  taker_.reset();
+  const auto folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
+  if (!folder && isMissing(folder.error())) return {};
+  const auto names = folder ? namesInFolder(folder->get()) : folder.error();
+  if (!names) return names.error().at(root_.hostPath(kEventsFolder));
+  base::Result<void> settled;
+  for (const std::string& name : *names) {
+    const auto taken = parseTaken(name);
+    if (!taken) continue;
+    auto dealt = done(taken->day) ? checked(::unlinkat(folder->get(), name.c_str(), 0))
+                                  : renameNumbered(folder->get(), name, folder->get(), taken->name);
+    if (settled) settled = std::move(dealt).at(root_.hostPath(kEventsFolder, name));
+  }
+  return settled;
 }
 
 std::uint64_t Kernel::pageSize() {

@@ -184,6 +184,46 @@ TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
   EXPECT_EQ(log.count(events + ": too many links"), 1);
 }
 
+// What a killed run took comes again, unless its day is done; no event is lost or comes twice.
+TEST_F(DeviceFiles, EccEventsWaitUntilWhatCameOfThemIsOnDisk) {
+  const auto events = folder / "device/ecc-events";
+  const auto read = [](Kernel& kernel) {
+    std::string buffer(72, '\0');
+    const auto got =
+        kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
+    return buffer.substr(0, got.length);
+  };
+  const auto count = [&events] {
+    return std::distance(std::filesystem::directory_iterator(events), {});
+  };
+  std::filesystem::create_directories(events);
+  std::filesystem::create_directory(events / ".taken-5");  // not one of ours
+  const std::optional<std::int32_t> days[] = {std::nullopt, -7, 20780};
+  for (const auto& day : days) {
+    folder.write("device/ecc-events/1", "one");
+    folder.write("device/ecc-events/2.b", "two");
+    {
+      Kernel killed(root, log);
+      killed.holdEvents(day);
+      EXPECT_EQ(read(killed), "one");
+      EXPECT_EQ(read(killed), "two");
+      EXPECT_EQ(read(killed), "");
+      EXPECT_EQ(count(), 3);
+    }
+    folder.write("device/ecc-events/1", "new");
+    Kernel next(root, log);
+    EXPECT_TRUE(next.settleEvents([&](const auto& of) { return of != day; }));
+    next.holdEvents(day);
+    for (const char* event : {"new", "one", "two", ""}) EXPECT_EQ(read(next), event);
+    EXPECT_TRUE(next.settleEvents([&](const auto& of) { return of == day; }));
+    EXPECT_EQ(count(), 1);
+    folder.write("device/ecc-events/1", "not held");
+    EXPECT_EQ(read(next), "not held");
+    EXPECT_EQ(count(), 1);
+  }
+  EXPECT_TRUE(log.lines().empty());
+}
+
 TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
   DeviceFile file(root, log, "device/properties.plist");
   host::recorded::DeviceProperties none(root, file);

@@ -9,6 +9,7 @@
 #include <filesystem>
 #include <fstream>
 #include <set>
+#include <utility>
 
 #include "HostServices.h"
 #include "host/outbox/SpoolFolder.h"
