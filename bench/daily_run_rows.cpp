@@ -8,6 +8,7 @@
 #include <chrono>
 #include <cstdio>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "NANDInfo/NANDInfo.h"
@@ -44,7 +45,8 @@ constexpr struct {
     {"counters checkpoint", [](const Day& day) { day.platform.counters.PLClientCheckpoint(); }},
     {"counters report",
      [](const Day& day) {
-       report::PLReport(day.platform, day.context).writeLogForYesterday(day.number, nullptr);
+       std::ignore =
+           report::PLReport(day.platform, day.context).writeLogForYesterday(day.number, nullptr);
      }},
     {"storage log and lists",
      [](const Day& day) { NANDInfo::DumpStorageStructuredLog(day.platform, false); }},

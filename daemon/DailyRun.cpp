@@ -4,6 +4,7 @@
 #include "daemon/DailyRun.h"
 
 #include <mutex>
+#include <string>
 
 #include "base/CivilDate.h"
 #include "daemon/DailyTelemetry.h"
@@ -24,15 +25,29 @@ using platform::LogLevel;
 namespace {
 
 constexpr char kGateRecord[] = "LastCrashLogSerializationDateInDaysSince1970";
+constexpr char kLostReport[] = "LostReport";  // the last one, for who asks
 
 struct Day {
   std::int32_t number;
   const ActivatedAppInfo* appInfo;
 };
 
+void sayLost(const Services& services, std::int32_t day, const std::string& why) {
+  services.log.log(LogLevel::error, "the report of day %d is lost: %s", day, why.c_str());
+  const plist::Value lost(plist::Dictionary{{"day", day}, {"why", why}});
+  services.preferences.QNSPreferencesSetValue(kLostReport, &lost, platform::kDaemonName);
+}
+
 void writeReport(const Services& services, DeviceContext& context, const Day& day) {
-  if (!services.submission.DiagnosticLogSubmissionEnabled()) return;
-  report::PLReport(services.report, context).writeLogForYesterday(day.number, day.appInfo);
+  if (services.submission.DiagnosticLogSubmissionEnabled()) {
+    const auto written =
+        report::PLReport(services.report, context).writeLogForYesterday(day.number, day.appInfo);
+    if (!written) sayLost(services, day.number, written.error().text);
+  } else if (const auto consent =
+                 services.preferences.readValue(platform::kConsentKey, platform::kConsentDomain);
+             !consent) {
+    sayLost(services, day.number, "the user's consent can't be read");
+  }
 }
 
 struct Step {

@@ -11,6 +11,10 @@
 
 namespace platform {
 
+// The consent: true or 1, and nothing else, of this preference.
+inline constexpr char kConsentKey[] = "DiagnosticLogSubmissionEnabled";
+inline constexpr char kConsentDomain[] = "com.norba.quenset";
+
 // A log that is open for writing.
 class LogHandle {
  public:
@@ -29,7 +33,7 @@ class LogSubmission {
   // Whether the user allows diagnostic logs to be submitted.
   virtual bool DiagnosticLogSubmissionEnabled() = 0;
 
-  // Opens a log, lets the writer write it whole, and submits it together with its options (null:
+  // Opens a log, lets the writer write it whole, once more for each further try, and submits it together with its options (null:
   // none). A log is submitted whole or not at all; true on success.
   virtual bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                         const plist::Dictionary* options, const Writer& writer) = 0;

@@ -58,7 +58,7 @@ Dictionary buildLog(LogHeader header, Sections sections, const ActivatedAppInfo*
   return log;
 }
 
-void submitLog(const Services& services, const std::string& log) {
+bool submitLog(const Services& services, const std::string& log) {
   Dictionary options;
   const auto stored =
       services.preferences.QNSPreferencesGetValue(kLastOSVersion, platform::kDaemonName);
@@ -74,6 +74,7 @@ void submitLog(const Services& services, const std::string& log) {
   if (!submitted) {
     services.log.log(platform::LogLevel::error, "Failed to write pellorand log");
   }
+  return submitted;
 }
 
 }  // namespace report

@@ -32,7 +32,7 @@ plist::Dictionary buildLog(LogHeader header, Sections sections, const ActivatedA
 
 // Submits a log's text, and tells which version of the system recorded the one before when that was
 // another. The recorded version is updated whether or not the submission then succeeds. A failure
-// is logged.
-void submitLog(const Services& services, const std::string& log);
+// is logged, and then this is false.
+bool submitLog(const Services& services, const std::string& log);
 
 }  // namespace report

@@ -21,13 +21,16 @@ using platform::LogLevel;
 PLReport::PLReport(const Services& services, morvend::DeviceContext& context)
     : services_(services), context_(context), config_(PLConfig::init(services, context)) {}
 
-void PLReport::writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) const {
+base::Result<void> PLReport::writeLogForYesterday(std::int32_t day,
+                                                  const ActivatedAppInfo* appInfo) const {
   services_.log.log(LogLevel::info, "writing pellorand log. yesterday=%d", day);
-  serializeWithDate(day, appInfo, sectionsOfDay(day));
+  return sectionsOfDay(day).and_then(
+      [&](Sections sections) { return serializeWithDate(day, appInfo, std::move(sections)); });
 }
 
-// What the history's rows come to; when that is nothing, a line says why.
-Sections PLReport::sectionsOfDay(std::int32_t day) const {
+// What the history's rows come to; when that is nothing, a line says why. The error is why it is
+// nothing that should be something.
+base::Result<Sections> PLReport::sectionsOfDay(std::int32_t day) const {
   Sections sections = emptySections();
   std::set<std::string, std::less<>> refused;  // as long as nothing is let through
   const auto refuse = [&](std::string_view key) {
@@ -70,13 +73,14 @@ Sections PLReport::sectionsOfDay(std::int32_t day) const {
             ? "no counter was recorded on that day or the day before"
             : base::format("the whitelist names none of the %zu counters", refused.size());
     services_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
+    if (!read) return read.error();
   }
   return sections;
 }
 
-void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,
-                                 Sections sections) const {
-  if (sections.empty()) return;
+base::Result<void> PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,
+                                               Sections sections) const {
+  if (sections.empty()) return {};
   addInstalledAppInfo(sections, services_.applications, services_.eventra);
   addMetadataKeys(sections, services_.locale);
   reportDatabaseSize(sections, context_);
@@ -94,9 +98,10 @@ void PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appIn
   if (!log) {
     services_.log.log(LogLevel::error, "Could not create pellorand plist: %s",
                       log.error().text.c_str());
-    return;
+    return log.error();
   }
-  submitLog(services_, *log);
+  if (!submitLog(services_, *log)) return base::Error{"its log couldn't be submitted"};
+  return {};
 }
 
 }  // namespace report

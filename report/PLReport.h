@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <memory>
 
+#include "base/Result.h"
 #include "device/DeviceContext.h"
 #include "report/DailyLog.h"
 #include "report/PLConfig.h"
@@ -27,20 +28,20 @@ class PLReport {
   // Fills the report from the history rows of the day (and of the day before it: a later day's row
   // replaces an earlier one's) and submits it. `day` is the day that is reported; `appInfo` may be
   // null, which is not the same as empty. Failures are logged, and why there is no report when no
-  // counter is let through.
-  void writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) const;
+  // counter is let through. The error says why a report that there was to be is lost.
+  base::Result<void> writeLogForYesterday(std::int32_t day, const ActivatedAppInfo* appInfo) const;
 
   // Runs the collectors over what the day's counters came to, builds the log and submits it; does
   // nothing at all when no counter is in the sections. Tells how many keys are in it that no
   // whitelist entry names.
-  void serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,
-                         Sections sections) const;
+  base::Result<void> serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,
+                                       Sections sections) const;
 
   // Empty sections, into which this report's whitelist lets values.
   Sections emptySections() const { return {config_.get(), services_.log}; }
 
  private:
-  Sections sectionsOfDay(std::int32_t day) const;
+  base::Result<Sections> sectionsOfDay(std::int32_t day) const;
 
   const Services services_;
   morvend::DeviceContext& context_;

@@ -25,9 +25,10 @@ std::string relative(std::string_view path) {
 
 }  // namespace
 
-DeviceRoot::DeviceRoot(std::string path)
-    : path_(std::move(path)),
-      root_(opened(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC))) {}
+DeviceRoot::DeviceRoot(std::string path, Patience::Pause pause)
+    : path_(std::move(path)), patience_(std::move(pause)), root_(patience_([this] {
+        return opened(::open(path_.c_str(), O_PATH | O_DIRECTORY | O_CLOEXEC));
+      })) {}
 
 base::Result<void> DeviceRoot::isThere(const char* what) const {
   if (!root_) return root_.error().at(std::string(what) + " " + path_);
@@ -52,6 +53,11 @@ std::string DeviceRoot::hostPath(std::string_view folder, std::string_view name)
 
 base::Result<FileDescriptor> DeviceRoot::open(const std::string& path, int flags,
                                               Links links) const {
+  return patience_([&] { return openOnce(path, flags, links); });
+}
+
+base::Result<FileDescriptor> DeviceRoot::openOnce(const std::string& path, int flags,
+                                                  Links links) const {
   if (!root_ || path.find('\0') != std::string::npos) return systemError(ENOENT);
   open_how how{};
   how.flags = static_cast<std::uint64_t>(flags | O_CLOEXEC);
@@ -78,8 +84,9 @@ base::Result<FileDescriptor> DeviceRoot::openForStatus(std::string_view path) co
 }
 
 base::Result<std::string> DeviceRoot::readFile(std::string_view path, std::size_t maximum) const {
-  return openForReading(path).and_then(
-      [maximum](const FileDescriptor& file) { return readRegularFile(file.get(), maximum); });
+  return openForReading(path).and_then([&](const FileDescriptor& file) {
+    return patience_([&] { return readRegularFile(file.get(), maximum); });
+  });
 }
 
 base::Result<FileDescriptor> DeviceRoot::openFolder(std::string_view path, Missing missing,
@@ -88,20 +95,25 @@ base::Result<FileDescriptor> DeviceRoot::openFolder(std::string_view path, Missi
   const int flags = O_RDONLY | O_DIRECTORY;
   auto found = open(folder, flags, links);
   if (found || !isMissing(found.error()) || missing == Missing::fails) return found;
-  // Something is missing: make one part after the other, each below its parent.
+  return patience_([&] { return make(folder, flags, links); });
+}
+
+// Something of the folder's path is missing: makes one part after the other, each below its parent.
+base::Result<FileDescriptor> DeviceRoot::make(const std::string& folder, int flags,
+                                              Links links) const {
   for (std::size_t end = folder.find('/');; end = folder.find('/', end + 1)) {
     const std::string upTo = folder.substr(0, end);
-    found = open(upTo, flags, links);
+    auto found = openOnce(upTo, flags, links);
     if (!found && isMissing(found.error())) {
       const auto slash = upTo.rfind('/');
       const std::string parent = slash == std::string::npos ? "." : upTo.substr(0, slash);
       const std::string name = slash == std::string::npos ? upTo : upTo.substr(slash + 1);
-      const auto above = open(parent, flags, links);
+      const auto above = openOnce(parent, flags, links);
       if (!above) return above.error();
       const auto made = makeFolder(above->get(), name);
       if (!made && !made.error().is(std::errc::file_exists)) return made.error();
       if (const auto synced = checked(::fsync(above->get())); !synced) return synced.error();
-      found = open(upTo, flags, links);
+      found = openOnce(upTo, flags, links);
     }
     if (!found || end == std::string::npos) return found;
   }

@@ -16,15 +16,20 @@
 #include "base/Result.h"
 #include "host/files/FileDescriptor.h"
 #include "host/files/PathWalk.h"
+#include "host/files/Patience.h"
 
 namespace host {
 
 class DeviceRoot {
  public:
-  // `path` is a path of the host; a root that isn't there reads as an empty device.
-  explicit DeviceRoot(std::string path);
+  // `path` is a path of the host; a root that isn't there reads as an empty device. `pause` is how
+  // the time passes before something is tried again.
+  explicit DeviceRoot(std::string path, Patience::Pause pause = LockWait::sleepFor);
 
   const std::string& path() const { return path_; }
+
+  // For what is done to files on the device; all that this class does has it already.
+  Patience& patience() const { return patience_; }
 
   // Whether the root is a folder; the error is of its path, which is `what`.
   base::Result<void> isThere(const char* what = "the device root") const;
@@ -60,8 +65,11 @@ class DeviceRoot {
 
  private:
   base::Result<FileDescriptor> open(const std::string& path, int flags, Links links) const;
+  base::Result<FileDescriptor> openOnce(const std::string& path, int flags, Links links) const;
+  base::Result<FileDescriptor> make(const std::string& folder, int flags, Links links) const;
 
   std::string path_;
+  mutable Patience patience_;
   base::Result<FileDescriptor> root_;
 };
 

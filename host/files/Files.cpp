@@ -78,7 +78,8 @@ base::Result<std::string> readRegularFile(int file, std::size_t maximum) {
   bytes.resize(std::min(maximum, static_cast<std::size_t>(status.st_size)));
   std::size_t filled = 0;
   while (filled < bytes.size()) {
-    const ssize_t got = ::read(file, bytes.data() + filled, bytes.size() - filled);
+    const ssize_t got =
+        ::pread(file, bytes.data() + filled, bytes.size() - filled, static_cast<off_t>(filled));
     if (got < 0 && errno == EINTR) continue;
     if (got < 0) return systemError();
     if (got == 0) break;

@@ -125,7 +125,8 @@ base::Result<void> EventSink::append(const std::string& lines) {
   const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(kFolder)});
   if (!lock) return lock.error().at(path);
   if (auto room = makeRoom(folder->get(), lines.size()); !room) return room;
-  return appendLines(folder->get(), kName, lines, {log_, path}).at(path);
+  const auto append = [&] { return appendLines(folder->get(), kName, lines, {log_, path}); };
+  return root_.patience()(append).at(path);
 }
 
 base::Result<void> EventSink::makeRoom(int folder, std::uint64_t bytes) {

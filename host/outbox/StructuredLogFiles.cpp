@@ -165,7 +165,9 @@ void StructuredLogFiles::logStructuredData(std::int32_t type, const plist::Dicti
   const auto appended =
       root_.openFolder(kFolder, DeviceRoot::Missing::create)
           .and_then([&](const FileDescriptor& folder) {
-            return appendLines(folder.get(), name, line, {log_, root_.hostPath(kFolder, name)});
+            return root_.patience()([&] {
+              return appendLines(folder.get(), name, line, {log_, root_.hostPath(kFolder, name)});
+            });
           });
   if (appended || !said_.insert(appended.error().text).second) return;
   log_.log(platform::LogLevel::error, "Could not write %s: %s; structured logs are dropped",

@@ -98,7 +98,7 @@ base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
 
 bool SubmissionSpool::DiagnosticLogSubmissionEnabled() {
   const auto consent =
-      preferences_.QNSPreferencesGetValue("DiagnosticLogSubmissionEnabled", "com.norba.quenset");
+      preferences_.QNSPreferencesGetValue(platform::kConsentKey, platform::kConsentDomain);
   const auto* number = consent ? consent->as<plist::Number>() : nullptr;
   return number != nullptr && !number->isReal() && number->int64Value() == 1;
 }
@@ -110,7 +110,8 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
                            fileTime(clock_.now().secondsSince1970);
   const bool named = !logType.empty() && !logName.empty() && !logName.starts_with('.') &&
                      isPlainFileName(stem, kMaxStem);
-  auto submitted = named ? submit(stem, options, writer) : base::Error{"not a file name"};
+  auto submitted = named ? root_.patience()([&] { return submit(stem, options, writer); })
+                         : base::Error{"not a file name"};
   submitted = std::move(submitted).at(root_.hostPath(SpoolFolder::kPath, stem));
   if (submitted) return true;
   log_.log(platform::LogLevel::error, "Could not submit %s", submitted.error().text.c_str());

@@ -29,7 +29,7 @@ class SubmissionSpool final : public platform::LogSubmission {
 
   // The spool is locked while the writer writes: it must not submit a log itself. Type and name
   // must be fit for a file's name, and the name not begin with "."; a log larger than the spool
-  // fails. A failure is logged, with its reason.
+  // fails. What may pass is tried again, with the writer. A failure is logged, with its reason.
   bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                 const plist::Dictionary* options, const Writer& writer) override;
 

@@ -97,7 +97,8 @@ void PreferenceFile::load(bool evenIfUnchanged) {
   if (static_cast<std::size_t>(status_.st_size) > plist::kMaxSize) {
     return fail(State::broken, {"larger than 16 MiB"});
   }
-  const auto bytes = readRegularFile(file->get(), plist::kMaxSize);
+  const auto bytes =
+      root_.patience()([&] { return readRegularFile(file->get(), plist::kMaxSize); });
   if (!bytes) return fail(State::unreadable, bytes.error());
   auto value = plist::read(*bytes);
   if (!value) return fail(State::broken, value.error());
@@ -156,10 +157,11 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
   if (after->size() > plist::kMaxSize) return base::Error{"it would be larger than 16 MiB"};
 
   if (state_ == State::broken) {
-    auto kept = keepBeside(folder->get(), name_, name_ + ".corrupt");
+    auto kept =
+        root_.patience()([&] { return keepBeside(folder->get(), name_, name_ + ".corrupt"); });
     if (!kept) return std::move(kept).at("it can't be kept as .corrupt");
   }
-  return replaceFile(folder->get(), name_, *after);
+  return root_.patience()([&] { return replaceFile(folder->get(), name_, *after); });
 }
 
 }  // namespace host

@@ -34,7 +34,7 @@ base::Result<FileDescriptor> openLockFile(const DeviceRoot& root) {
 }  // namespace
 
 base::Result<void> RunLockFile::take() {
-  auto file = openLockFile(root_);
+  auto file = root_.patience()([this] { return openLockFile(root_); });
   if (!file) return file.error();
   auto lock = FileLock::take(file->get(), {log_, root_.hostPath(kFolder, kName), kMaxWait, pause_});
   if (!lock) return lock.error();

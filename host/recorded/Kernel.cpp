@@ -155,7 +155,7 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
     if (!isMissing(folder.error())) say("", folder.error().text);
     return std::nullopt;
   }
-  const auto names = namesInFolder(folder->get());
+  const auto names = root_.patience()([&] { return namesInFolder(folder->get()); });
   if (!names) {
     say("", names.error().text);
     return std::nullopt;

@@ -188,6 +188,7 @@ class StringHandle : public LogHandle {
 bool FakeSubmission::QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                               const plist::Dictionary* options,
                                               const Writer& writer) {
+  if (!accepts) return false;
   beforeLog();
   Log log{std::string(logType), std::string(logName), {}, {}};
   if (options != nullptr) log.options = *options;

@@ -167,7 +167,7 @@ class FakeSubmission : public LogSubmission {
   };
 
   explicit FakeSubmission(Journal& journal) : journal_(journal) {}
-  bool allowed = true;
+  bool allowed = true, accepts = true;
   std::vector<Log> logs;
   std::function<void()> beforeLog = [] {};  // may throw
   std::function<void()> asked = [] {};      // before the answer whether it is allowed

@@ -127,6 +127,33 @@ TEST_F(DailyRunTest, RunsNoDayWhileTheRecordCannotBeRead) {
             1);
 }
 
+TEST_F(DailyRunTest, SaysAndKeepsThatAReportIsLost) {
+  const auto lost = [this] { return platform.preferences.mobile(kDomain, "LostReport"); };
+  const auto expected = [](const char* why) {
+    return Value(Dictionary{{"day", 20000}, {"why", why}});
+  };
+  platform.preferences.setMobile("com.norba.quenset", "DiagnosticLogSubmissionEnabled", false);
+  platform.submission.allowed = false;
+  run({"morvend", "-f"});
+  EXPECT_EQ(lost(), std::nullopt) << "no consent, no loss";
+  platform.preferences.readable = false;
+  run({"morvend", "-f"});
+  EXPECT_EQ(lost(), expected("the user's consent can't be read"));
+  platform.preferences.readable = platform.submission.allowed = true;
+  platform.submission.accepts = false;
+  run({"morvend", "-d"});
+  EXPECT_EQ(lost(), expected("its log couldn't be submitted"));
+  EXPECT_EQ(platform.preferences.mobile(kDomain, kRecord), Value(20000));
+  platform.submission.accepts = true;
+  platform.history.scalars.clear();
+  run({"morvend", "-f"});
+  EXPECT_EQ(lost(), expected("its log couldn't be submitted")) << "no counters, no report to lose";
+  platform.history.outcome = base::Error{"broken"};
+  run({"morvend", "-f"});
+  EXPECT_EQ(lost(), expected("broken"));
+  EXPECT_EQ(platform.log.count("error: the report of day 20000 is lost: "), 3);
+}
+
 TEST_F(DailyRunTest, ActsOnItsFirstArgumentOnly) {
   platform.preferences.setMobile(kDomain, kRecord, 20000);
   const struct {

@@ -28,6 +28,7 @@
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
+#include <time.h>
 #include <unistd.h>
 
 #define EXPORTED __attribute__((visibility("default")))
@@ -147,6 +148,15 @@ OPENING(open, (const char* path, int flags, ...), AT_FDCWD, path)
 OPENING(open64, (const char* path, int flags, ...), AT_FDCWD, path)
 OPENING(openat, (int folder, const char* path, int flags, ...), folder, folder, path)
 OPENING(openat64, (int folder, const char* path, int flags, ...), folder, folder, path)
+
+// Nobody sleeps while calls fail: what is tried again is tried at once.
+EXPORTED int nanosleep(const struct timespec* time, struct timespec* left) {
+  return kind == FAIL ? 0 : ORIGINAL(nanosleep)(time, left);
+}
+EXPORTED int clock_nanosleep(clockid_t clock, int flags, const struct timespec* time,
+                             struct timespec* left) {
+  return kind == FAIL ? 0 : ORIGINAL(clock_nanosleep)(clock, flags, time, left);
+}
 
 // Half of the bytes, but at least one, so that a program that goes on comes to an end.
 static size_t half(size_t size) { return size - size / 2; }

@@ -3,15 +3,21 @@
 
 #include "host/files/Files.h"
 
+#include <cerrno>
+#include <chrono>
 #include <filesystem>
+#include <numeric>
 #include <system_error>
 #include <utility>
+#include <vector>
 
 #include <fcntl.h>
 #include <gtest/gtest.h>
 
 #include "HostServices.h"
 #include "host/files/DeviceFileSystem.h"
+#include "host/files/Patience.h"
+#include "host/files/SystemError.h"
 
 namespace host {
 namespace {
@@ -80,6 +86,32 @@ TEST(Files, NothingButARegularFileIsWritten) {
       EXPECT_TRUE(support::untouched(kind, at, target));
     }
   }
+}
+
+TEST(Patience, TriesAgainWhatMayPassWithinItsBounds) {
+  std::vector<int> pauses;
+  Patience patience([&pauses](std::chrono::milliseconds time) {
+    pauses.push_back(static_cast<int>(time.count()));
+  });
+  // Fails as often; how often it was tried.
+  const auto tries = [&](int failures, int error) {
+    int tried = 0;
+    const auto done = patience([&]() -> base::Result<void> {
+      if (++tried <= failures) return systemError(error);
+      return {};
+    });
+    EXPECT_EQ(static_cast<bool>(done), tried > failures);
+    return tried;
+  };
+  for (const int error : {ENOENT, EACCES, EROFS, ENOTDIR, ELOOP}) EXPECT_EQ(tries(9, error), 1);
+  EXPECT_TRUE(pauses.empty());
+  EXPECT_EQ(tries(0, EIO), 1);
+  EXPECT_EQ(tries(1, EIO), 2);
+  EXPECT_EQ(tries(3, ENOSPC), 4);
+  EXPECT_EQ(tries(9, EMFILE), 4);
+  EXPECT_EQ(pauses, (std::vector<int>{100, 100, 400, 1500, 100, 400, 1500}));
+  for (const int left : {3, 2, 2, 2, 2, 1, 1}) EXPECT_EQ(tries(9, EIO), left);
+  EXPECT_EQ(std::accumulate(pauses.begin(), pauses.end(), 0), 5000);
 }
 
 TEST(Files, WhatStandsInTheWayOfAFileBesideIsPassedBy) {

@@ -64,10 +64,12 @@ class PLReportTest : public ::testing::Test {
                                   Dictionary{{"intervals", Array{Value(10), Value(100)}}}}}}}}});
   }
 
+  base::Result<void> written;
+
   // What the last log holds then.
   Dictionary write(const ActivatedAppInfo* appInfo = nullptr) {
     morvend::DeviceContext context(platform.platform);
-    PLReport(platform.platform, context).writeLogForYesterday(kDay, appInfo);
+    written = PLReport(platform.platform, context).writeLogForYesterday(kDay, appInfo);
     const auto& logs = platform.submission.logs;
     return logs.empty() ? Dictionary() : platform.parse(logs.back().contents);
   }
@@ -158,6 +160,7 @@ TEST_F(PLReportTest, SaysWhyThereIsNoReport) {
     platform.history.outcome = row.outcome;
     platform.log.clear();
     write();
+    EXPECT_EQ(static_cast<bool>(written), static_cast<bool>(row.outcome)) << "is one lost?";
     std::vector<std::string> lines{"info: writing pellorand log. yesterday=20000"};
     if (!row.outcome) lines.push_back("error: broken");
     lines.push_back(std::string("default: no report for day 20000: ") + row.why);
