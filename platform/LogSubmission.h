@@ -33,8 +33,9 @@ class LogSubmission {
   // Whether the user allows diagnostic logs to be submitted.
   virtual bool DiagnosticLogSubmissionEnabled() = 0;
 
-  // Opens a log, lets the writer write it whole, once more for each further try, and submits it together with its options (null:
-  // none). A log is submitted whole or not at all; true on success.
+  // Opens a log, lets the writer write it whole, once more for each further try, and submits it
+  // together with its options (null: none). A log is submitted whole or not at all; true on
+  // success.
   virtual bool QNSWriteLogForSubmission(std::string_view logType, std::string_view logName,
                                         const plist::Dictionary* options, const Writer& writer) = 0;
 };
