@@ -87,7 +87,8 @@ void PreferenceFile::load(bool evenIfUnchanged) {
     return;
   }
   struct stat status;
-  if (::fstat(file->get(), &status) != 0) return fail(State::unreadable, systemError());
+  const auto looked = root_.patience()([&] { return checked(::fstat(file->get(), &status)); });
+  if (!looked) return fail(State::unreadable, looked.error());
   const bool known =
       (state_ == State::whole || state_ == State::broken) && sameFile(status, status_);
   if (known && !evenIfUnchanged) return;
