@@ -49,7 +49,8 @@ class PLHistory {
 
   // The rows whose key begins with the prefix, from the first to the last day, both included,
   // ordered by day and then by key (bytewise). After an error there is no further row: what was
-  // delivered is not all that there is.
+  // delivered is not all that there is. It is std::errc::resource_unavailable_try_again when the
+  // query may go well another time.
   virtual base::Result<void> scalarsForKeyPrefix(std::string_view keyPrefix,
                                                  std::int32_t minDaysSince1970,
                                                  std::int32_t maxDaysSince1970,

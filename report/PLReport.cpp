@@ -3,8 +3,8 @@
 
 #include "report/PLReport.h"
 
-#include <set>
 #include <string>
+#include <system_error>
 #include <utility>
 
 #include "base/CivilDate.h"
@@ -18,6 +18,12 @@ namespace report {
 
 using platform::LogLevel;
 
+namespace {
+
+constexpr int kMaxReadings = 3;
+
+}  // namespace
+
 PLReport::PLReport(const Services& services, morvend::DeviceContext& context)
     : services_(services), context_(context), config_(PLConfig::init(services, context)) {}
 
@@ -28,43 +34,51 @@ base::Result<void> PLReport::writeLogForYesterday(std::int32_t day,
       [&](Sections sections) { return serializeWithDate(day, appInfo, std::move(sections)); });
 }
 
-// What the history's rows come to; when that is nothing, a line says why. The error is why it is
-// nothing that should be something.
-base::Result<Sections> PLReport::sectionsOfDay(std::int32_t day) const {
-  Sections sections = emptySections();
-  std::set<std::string, std::less<>> refused;  // as long as nothing is let through
+PLReport::Collected PLReport::collect(std::int32_t day) const {
+  Collected collected{emptySections()};
+  auto& [sections, refused, read] = collected;
   const auto refuse = [&](std::string_view key) {
-    if (sections.empty()) refused.emplace(key);
+    if (collected.sections.empty()) collected.refused.emplace(key);
   };
-  base::Result<void> read;
-  if (config_ != nullptr) {
-    const auto history = services_.history.initWithDefaultPath();
-    const std::int32_t first = base::dayBefore(day);
-    read = history->scalarsForKeyPrefix(
-        "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
-          if (const auto* options = config_->configOptionsForScalarKey(key)) {
-            sections.addScalar(value, key, *options);
+  const auto history = services_.history.initWithDefaultPath();
+  const std::int32_t first = base::dayBefore(day);
+  read = history->scalarsForKeyPrefix(
+      "", first, day, [&](std::string_view key, std::int32_t, std::int64_t value, bool&) {
+        if (const auto* options = config_->configOptionsForScalarKey(key)) {
+          collected.sections.addScalar(value, key, *options);
+        } else {
+          refuse(key);
+        }
+      });
+  if (read) {
+    read = history->distributionsForKeyPrefix(
+        "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
+          if (const auto* options = config_->configOptionsForDistributionKey(key)) {
+            if (samples.comesAgain()) {
+              collected.sections.keepPlace(key, *options);
+            } else {
+              collected.sections.computeAndAddDistribution(samples, key, *options);
+            }
           } else {
             refuse(key);
           }
         });
-    if (read) {
-      read = history->distributionsForKeyPrefix(
-          "", first, day, [&](std::string_view key, std::int32_t, auto& samples, bool&) {
-            if (const auto* options = config_->configOptionsForDistributionKey(key)) {
-              if (samples.comesAgain()) {
-                sections.keepPlace(key, *options);
-              } else {
-                sections.computeAndAddDistribution(samples, key, *options);
-              }
-            } else {
-              refuse(key);
-            }
-          });
-    }
-    sections.dropKeptPlaces();
-    if (!read) services_.log.log(LogLevel::error, "%s", read.error().text.c_str());
   }
+  sections.dropKeptPlaces();
+  return collected;
+}
+
+// What the history's rows come to, read anew where that may help; when that is nothing, a line says
+// why. The error is why it is nothing that should be something.
+base::Result<Sections> PLReport::sectionsOfDay(std::int32_t day) const {
+  Collected collected{emptySections()};
+  for (int reading = 1; config_ != nullptr && reading <= kMaxReadings; ++reading) {
+    collected = collect(day);
+    const auto& read = collected.read;
+    if (read || !read.error().is(std::errc::resource_unavailable_try_again)) break;
+  }
+  const auto& [sections, refused, read] = collected;
+  if (!read) services_.log.log(LogLevel::error, "%s", read.error().text.c_str());
   if (sections.empty()) {
     const std::string why =
         config_ == nullptr ? "the whitelist couldn't be read"
@@ -75,7 +89,7 @@ base::Result<Sections> PLReport::sectionsOfDay(std::int32_t day) const {
     services_.log.log(LogLevel::standard, "no report for day %d: %s", day, why.c_str());
     if (!read) return read.error();
   }
-  return sections;
+  return std::move(collected.sections);
 }
 
 base::Result<void> PLReport::serializeWithDate(std::int32_t day, const ActivatedAppInfo* appInfo,

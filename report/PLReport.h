@@ -41,6 +41,14 @@ class PLReport {
   Sections emptySections() const { return {config_.get(), services_.log}; }
 
  private:
+  // What the day's rows come to. As long as none is let through, `refused` holds the keys that
+  // aren't.
+  struct Collected {
+    Sections sections;
+    std::set<std::string, std::less<>> refused = {};
+    base::Result<void> read = {};
+  };
+  Collected collect(std::int32_t day) const;
   base::Result<Sections> sectionsOfDay(std::int32_t day) const;
 
   const Services services_;

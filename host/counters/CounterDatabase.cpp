@@ -8,13 +8,18 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <climits>
 #include <string_view>
+#include <tuple>
 #include <vector>
 
 #include "base/Text.h"
+#include "host/counters/KeptTexts.h"
 #include "host/counters/SQLite.h"
+#include "host/counters/WaitingChanges.h"
 #include "host/files/Files.h"
+#include "host/files/Patience.h"
 #include "host/files/SystemError.h"
 
 namespace host {
@@ -47,10 +52,14 @@ constexpr char kSchema[] =
 constexpr char kOwn[] =
     "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL AND type IN ('table', 'index') AND "
     "lower(name) IN ('scalars', 'staged', 'packed', 'packed_by_day') ORDER BY rowid";
+constexpr char kOwnAtTimes[] =
+    "SELECT sql FROM sqlite_schema WHERE type <> 'trigger' AND lower(name) IN ('kept', "
+    "'waiting_recorded')";
 // What somebody added: it is left as it is, but for indexes that have a say in what is written.
 constexpr char kAddedIndexes[] =
     "SELECT name, sql FROM sqlite_schema WHERE type = 'index' AND sql IS NOT NULL AND "
-    "lower(tbl_name) IN ('scalars', 'staged', 'packed') AND name <> 'packed_by_day'";
+    "lower(tbl_name) IN ('scalars', 'staged', 'packed', 'kept', 'waiting_recorded') AND name <> "
+    "'packed_by_day'";
 constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
 
 const Error kNotRegular{"it, or a file beside it, is not a regular file"};
@@ -84,6 +93,15 @@ bool onlyOrders(std::string_view sql) {
   return true;
 }
 
+// The text of a table as SQLite keeps it.
+std::string asKept(std::string_view sql) {
+  constexpr std::string_view kUnlessThere = "IF NOT EXISTS ";
+  return std::string(sql).erase(sql.find(kUnlessThere), kUnlessThere.size());
+}
+
+// What is wrong with what stands in the place of a file.
+Error ofPlace(const Error& why) { return mayPass(why) ? why : kNotRegular; }
+
 // Where an open file or folder lies on the host.
 Result<std::string> pathOfOpen(int file) {
   std::array<char, PATH_MAX> path;
@@ -99,35 +117,98 @@ CounterDatabase::CounterDatabase(const CounterPlace& place, DeviceRoot::Links li
     : place_(place), links_(links), name_(kName) {}
 CounterDatabase::~CounterDatabase() = default;
 
-Result<void> CounterDatabase::read(const Work& work) {
-  Result<void> done;
-  if (!connection_) {
-    const auto folder = openFolder(DeviceRoot::Missing::fails);
-    if (!folder) return folder.error();
-    if (!*folder) return {};
-    const FileLock lock(folder_.get());
-    done = connect(Use::read);
-  }
-  if (done && connection_) done = work(*connection_);
-  if (done) return {};
-  connection_.reset();
-  if (!done.error().is(sqlite::kDamaged) || linked_) return std::move(done).at(path());
-  const FileLock lock(folder_.get());
-  return setAside(done.error()).value_or(done.error().at(path()));
+bool CounterDatabase::refusedForNow(const Error& error) {
+  return mayPass(error) || error.is(std::errc::timed_out);
 }
 
-Result<void> CounterDatabase::write(Missing missing, const Work& work) {
-  const bool creates = missing == Missing::create;
+Result<void> CounterDatabase::patiently(const std::function<Result<void>()>& attempt) {
+  auto done = patient_ ? place_.root.patience()(attempt) : attempt();
+  patient_ = done || (patient_ && !refusedForNow(done.error()));
+  return done;
+}
+
+Result<FileLock> CounterDatabase::lock() {
+  return FileLock::take(folder_.get(),
+                        {place_.log, folderPath_,
+                         patient_ ? kMaxLockWait : std::chrono::milliseconds(0), place_.pause});
+}
+
+Result<void> CounterDatabase::read(const Work& work) {
+  Result<void> done;
+  if (!connection_) done = patiently([this] { return connectToRead(); });
+  if (done && connection_) done = readOnce(work);
+  if (!done && mayPass(done.error())) return Error{done.error().text, sqlite::kPassing};
+  return done;
+}
+
+Result<void> CounterDatabase::readOnce(const Work& work) {
+  const auto done = work(*connection_);
+  if (done) return {};
+  connection_.reset();
+  const auto held = done.error().is(sqlite::kDamaged) ? lock() : done.error();
+  return held ? failedToRead(done.error()) : done.error().at(path());
+}
+
+Result<void> CounterDatabase::connectToRead() {
+  const auto folder = openFolder(DeviceRoot::Missing::fails);
+  if (!folder) return folder.error();
+  if (!*folder) return {};
+  const auto held = lock();
+  if (held && !linked_) {
+    if (auto waiting = WaitingChanges::open(folder_.get(), folderPath_); waiting && *waiting) {
+      // Who may only read shows what was recorded up to now.
+      if (connect(Use::create)) std::ignore = recordWaiting(**waiting);
+      connection_.reset();
+    }
+  }
+  if (!held) {
+    // Its holder may be stopped; it would have to set the database aside just now to do harm.
+    place_.log.log(platform::LogLevel::error, "%s: %s; it is read all the same", path().c_str(),
+                   held.error().text.c_str());
+  }
+  const auto connected = connect(Use::read);
+  if (connected) return {};
+  return held ? failedToRead(connected.error()) : connected.error().at(path());
+}
+
+// With the lock held.
+Error CounterDatabase::failedToRead(const Error& why) {
+  if (!why.is(sqlite::kDamaged) || linked_) return why.at(path());
+  return setAside(why).value_or(why.at(path()));
+}
+
+Result<void> CounterDatabase::write(Missing missing, const Work& work, Kept kept) {
+  return patiently([&] { return writeOnce(missing, work, kept); });
+}
+
+Result<void> CounterDatabase::writeOnce(Missing missing, const Work& work, Kept kept) {
+  bool creates = missing == Missing::create;
   const auto folder =
       openFolder(creates ? DeviceRoot::Missing::create : DeviceRoot::Missing::fails);
   if (!folder) return folder.error();
   if (!*folder) return {};
-  const FileLock lock(folder_.get());
+  const auto held = lock();
+  if (!held) return held.error().at(path());
+  auto found = WaitingChanges::open(folder_.get(), folderPath_);
+  if (!found && mayPass(found.error())) return found.error().at(path());
+  // Something else in the journal's place is a matter of who wants to leave something there.
+  auto waiting = found ? *std::move(found) : std::nullopt;
+  creates = creates || waiting;
   for (bool again = false;; again = true) {
     auto done = connect(creates ? Use::create : Use::write);
     if (done && !connection_) return {};
+    if (done && waiting) {
+      done = recordWaiting(*waiting);
+      if (done) waiting.reset();
+    }
     if (done) done = work(*connection_);
     const bool written = static_cast<bool>(done);
+    if (written && kept == Kept::onDisk) {
+      if (const auto safe = synchronise(); !safe) {
+        return Error{"it is recorded, but a loss of power may take it: " + safe.error().text}.at(
+            path());
+      }
+    }
     if (written && connection_->pagesInLog() > kMaxPagesInLog) {
       done = connection_->checkpoint(Connection::Checkpoint::passive);
     }
@@ -143,6 +224,25 @@ Result<void> CounterDatabase::write(Missing missing, const Work& work) {
   }
 }
 
+Result<void> CounterDatabase::recordWaiting(WaitingChanges& waiting) {
+  return waiting.recordAll(
+      *connection_, [this] { return synchronise(); }, place_.log);
+}
+
+// Brings to disk what is in the write-ahead log.
+Result<void> CounterDatabase::synchronise() {
+  const auto log = opened(::openat(folder_.get(), (name_ + kBeside[0]).c_str(),
+                                   O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+  if (!log) return log.error();
+  return checked(::fsync(log->get())).and_then([this] { return checked(::fsync(folder_.get())); });
+}
+
+Result<void> CounterDatabase::keepWaiting(std::span<const CounterChange> changes) {
+  return openFolder(DeviceRoot::Missing::create).and_then([&](bool) {
+    return host::keepWaiting(folder_.get(), changes).at(path());
+  });
+}
+
 Result<void> CounterDatabase::settle() {
   auto settled = write(Missing::skip, [](Connection& connection) {
     return connection.checkpoint(Connection::Checkpoint::truncate).and_then([&] {
@@ -150,10 +250,10 @@ Result<void> CounterDatabase::settle() {
       return Result<void>();
     });
   });
-  if (connection_) {
-    const FileLock lock(folder_.get());
-    connection_.reset();
-  }
+  if (!connection_) return settled;
+  const auto held = lock();
+  if (!held) return held.error().at(path());
+  connection_.reset();
   return settled;
 }
 
@@ -209,7 +309,7 @@ Result<void> CounterDatabase::follow(const std::string& folder) {
   folder_ = *std::move(itsFolder);
   linked_ = true;
   const auto now = identity();
-  if (!now) return kNotRegular;
+  if (!now) return ofPlace(now.error());
   // The path was the machine's; the file is the one that was found below the root.
   const bool same = now->device == status.st_dev && now->inode == status.st_ino;
   if (!same) return Error{"moved while it was looked for"};
@@ -231,7 +331,7 @@ Result<void> CounterDatabase::create() {
   // A new database must not meet what is left of another one.
   for (const char* suffix : kBeside) ::unlinkat(folder_.get(), (name_ + suffix).c_str(), 0);
   const auto file = makeFile(folder_.get(), kName);
-  if (!file) return Error{file.error().text};
+  if (!file) return file.error();
   return {};
 }
 
@@ -241,7 +341,7 @@ Result<void> CounterDatabase::connect(Use use) {
   auto now = identity();
   if (now && connection_ && *now == opened_) return {};
   connection_.reset();
-  if (!now) return kNotRegular;
+  if (!now) return ofPlace(now.error());
   bool sharedBeside = false;
   for (const char* suffix : kBeside) {
     struct stat status;
@@ -257,7 +357,7 @@ Result<void> CounterDatabase::connect(Use use) {
     if (use != Use::create) return {};
     if (auto created = create(); !created) return created;
     now = identity();
-    if (!now) return kNotRegular;
+    if (!now) return ofPlace(now.error());
   }
   opened_ = *now;
   // SQLite takes a missing path for a temporary database.
@@ -283,7 +383,7 @@ Result<void> CounterDatabase::connect(Use use) {
 }
 
 Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connection::Access access) {
-  auto connection = Connection::open(path, access);
+  auto connection = Connection::open(path, access, place_.pause);
   if (!connection) return connection.error();
   if (use == Use::read) {
     // A scan comes to each page once: a cache of many would be memory that is filled and never
@@ -301,6 +401,7 @@ Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connectio
 // false when it isn't to be made.
 Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
   std::int64_t version = 0, entries = 0;
+  bool foreign = false;
   std::string schema;
   {
     sqlite::Transaction transaction(connection);
@@ -324,6 +425,13 @@ Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
               });
             });
     if (!known) return known.error();
+    sqlite::Statement atTimes(connection, kOwnAtTimes);
+    const auto read = atTimes.forEach([&] {
+      const auto sql = atTimes.column(0).bytes();
+      foreign = foreign || (sql != asKept(kKeptTable) && sql != asKept(kWaitingTable));
+      return true;
+    });
+    if (!read) return read.error();
   }
   if (version > kVersion) {
     return Error{
@@ -338,7 +446,7 @@ Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
     ready = connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE")
                 .and_then([&] { return connection.execute(kSchema); })
                 .and_then([&] { return connection.execute(kCreation); });
-  } else if (version != kVersion || schema != kSchema) {
+  } else if (version != kVersion || schema != kSchema || foreign) {
     return Error{"its tables are not the store's", sqlite::kDamaged};
   } else if (use != Use::read) {
     ready = connection.execute("PRAGMA journal_mode = WAL").and_then([&] {

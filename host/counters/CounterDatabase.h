@@ -14,14 +14,19 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string>
 
 #include "base/Result.h"
+#include "host/counters/CounterChange.h"
 #include "host/counters/SQLite.h"
 #include "host/files/DeviceRoot.h"
+#include "host/files/FileLock.h"
 #include "platform/SystemLog.h"
 
 namespace host {
+
+class WaitingChanges;
 
 // What the connections of one store share.
 struct CounterPlace {
@@ -31,8 +36,13 @@ struct CounterPlace {
   std::function<std::optional<std::string>()> home;
   // Called once for each database that was set aside, with the store's lock held.
   std::function<void()> foundDamaged;
+  // How who waits passes the time.
+  sqlite::Pause pause = LockWait::sleepFor;
 };
 
+// What fails and may pass is tried again, three times in some seconds, and the store's lock is
+// waited for within its limit. Once that was of no use, nothing is waited for until something
+// succeeds.
 class CounterDatabase {
  public:
   // Nothing is opened before it is needed. The place is borrowed. Links to the database are
@@ -41,16 +51,25 @@ class CounterDatabase {
   CounterDatabase(const CounterPlace& place, DeviceRoot::Links links);
   ~CounterDatabase();
 
-  // Runs the work on a connection for reading. With no database there is nothing to be done, and
-  // the work isn't run; but without a home folder that is a failure. Damage is said by the error.
+  // Runs the work on a connection for reading, once at most. With no database there is nothing to
+  // be done, and the work isn't run; but without a home folder that is a failure. Damage is said by
+  // the error, and kPassing what may go well another time. What waits in the journal is recorded
+  // before, where that can be done.
   using Work = std::function<base::Result<void>(sqlite::Connection&)>;
   base::Result<void> read(const Work& work);
 
-  // Runs the work, which writes, with the lock held; once more, on a new database, when the first
-  // turns out to be damaged, which is logged. The work must neither use this object nor open
-  // another connection to the database.
+  // Runs the work, which writes, with the lock held, after what waits in the journal was recorded;
+  // once more, on a new database, when the first turns out to be damaged, which is logged. The work
+  // must neither use this object nor open another connection to the database. What was written
+  // survives the process, and the loss of power too if it is to be on disk.
   enum class Missing { create, skip };
-  base::Result<void> write(Missing missing, const Work& work);
+  enum class Kept { bySystem, onDisk };
+  base::Result<void> write(Missing missing, const Work& work, Kept kept = Kept::bySystem);
+
+  // Whether a write that failed so is one for the journal: the database refuses it for now.
+  static bool refusedForNow(const base::Error& error);
+  // Leaves changes in the journal; they are on disk then.
+  base::Result<void> keepWaiting(std::span<const CounterChange> changes);
 
   // Brings everything into the database file and closes it; nothing stands beside it then, unless
   // another connection is open.
@@ -65,6 +84,14 @@ class CounterDatabase {
   };
   enum class Use { read, write, create };
 
+  base::Result<void> patiently(const std::function<base::Result<void>()>& attempt);
+  base::Result<FileLock> lock();
+  base::Result<void> readOnce(const Work& work);
+  base::Result<void> connectToRead();
+  base::Error failedToRead(const base::Error& why);
+  base::Result<void> writeOnce(Missing missing, const Work& work, Kept kept);
+  base::Result<void> recordWaiting(WaitingChanges& waiting);
+  base::Result<void> synchronise();
   base::Result<bool> openFolder(DeviceRoot::Missing missing);
   base::Result<void> follow(const std::string& folder);
   base::Result<Identity> identity() const;
@@ -84,6 +111,7 @@ class CounterDatabase {
   bool linked_ = false;
   Identity opened_;
   std::unique_ptr<sqlite::Connection> connection_;
+  bool patient_ = true;
 };
 
 }  // namespace host

@@ -11,7 +11,6 @@
 
 #include "base/ByteWriter.h"
 #include "base/CivilDate.h"
-#include "base/UTF8.h"
 #include "host/counters/KeptTexts.h"
 #include "host/counters/SQLite.h"
 
@@ -21,36 +20,6 @@ namespace {
 
 constexpr int kDaysKept = 60;
 constexpr std::size_t kMaxSamplesInRow = 65536;
-
-base::Result<void> write(sqlite::Connection& connection, const CounterChange& change) {
-  std::string room;
-  const std::string_view key = base::writable(change.key, room);
-  switch (change.kind) {
-    case CounterChange::Kind::set:
-      return sqlite::Statement(connection,
-                               "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
-                               "ON CONFLICT(day, key) DO UPDATE SET value = excluded.value",
-                               change.day, key, change.amount)
-          .run();
-    case CounterChange::Kind::add:
-      return sqlite::Statement(
-                 connection,
-                 "INSERT INTO scalars(day, key, value) VALUES(?1, ?2, ?3) "
-                 "ON CONFLICT(day, key) DO UPDATE SET value = CASE "
-                 "WHEN ?3 > 0 AND value > 9223372036854775807 - ?3 THEN 9223372036854775807 "
-                 "WHEN ?3 < 0 AND value < -9223372036854775807 - 1 - ?3 "
-                 "THEN -9223372036854775807 - 1 "
-                 "ELSE value + ?3 END",
-                 change.day, key, change.amount)
-          .run();
-    case CounterChange::Kind::push:
-      return sqlite::Statement(
-                 connection, "INSERT INTO staged(day, key, seconds, value) VALUES(?1, ?2, ?3, ?4)",
-                 change.day, key, change.seconds, change.sample)
-          .run();
-  }
-  return {};
-}
 
 // Moves the staged samples behind those that are packed already.
 base::Result<void> pack(sqlite::Connection& connection) {
@@ -128,8 +97,8 @@ base::Result<void> inTransaction(sqlite::Connection& connection,
 
 CounterStore::CounterStore(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
                            std::function<std::optional<std::string>()> home,
-                           std::function<void()> foundDamaged)
-    : place_{root, log, std::move(home), std::move(foundDamaged)},
+                           std::function<void()> foundDamaged, sqlite::Pause pause)
+    : place_{root, log, std::move(home), std::move(foundDamaged), std::move(pause)},
       clock_(clock),
       database_(place_, DeviceRoot::Links::refused) {}
 
@@ -187,7 +156,7 @@ bool CounterStore::addValuesAndKeep(std::span<const platform::ScalarValue> value
     for (const auto& [key, value] : values) {
       const CounterChange change{
           .kind = CounterChange::Kind::add, .key = key, .day = today, .amount = value};
-      if (auto written = write(connection, change); !written) return written;
+      if (auto written = host::record(connection, change); !written) return written;
     }
     return keepText(connection, name, text);
   };
@@ -241,7 +210,7 @@ base::Result<void> CounterStore::settle() {
   return database_.settle();
 }
 
-base::Result<void> CounterStore::apply(std::span<const CounterChange> changes) {
+base::Result<void> CounterStore::apply(std::span<const CounterChange> changes, Kept kept) {
   for (const CounterChange& change : changes) {
     if (std::isnan(change.sample)) {
       return base::Error{"not a number can't be recorded as a sample"};
@@ -249,16 +218,32 @@ base::Result<void> CounterStore::apply(std::span<const CounterChange> changes) {
   }
   const auto writeAll = [changes](sqlite::Connection& connection) -> base::Result<void> {
     for (const CounterChange& change : changes) {
-      if (auto written = write(connection, change); !written) return written;
+      if (auto written = host::record(connection, change); !written) return written;
     }
     return {};
   };
   const std::scoped_lock lock(mutex_);
-  return database_.write(CounterDatabase::Missing::create, [&](sqlite::Connection& connection) {
-    // One change is a transaction of its own.
-    if (changes.size() == 1) return writeAll(connection);
-    return inTransaction(connection, [&] { return writeAll(connection); });
-  });
+  auto written = database_.write(
+      CounterDatabase::Missing::create,
+      [&](sqlite::Connection& connection) {
+        // One change is a transaction of its own.
+        if (changes.size() == 1) return writeAll(connection);
+        return inTransaction(connection, [&] { return writeAll(connection); });
+      },
+      kept);
+  const bool refused = !written && CounterDatabase::refusedForNow(written.error());
+  if (refused) {
+    if (const auto waits = database_.keepWaiting(changes); !waits) {
+      return base::Error{written.error().text + "; nor can it wait: " + waits.error().text};
+    }
+    if (!refused_) {
+      place_.log.log(platform::LogLevel::standard, "%s; what is to be recorded waits beside it",
+                     written.error().text.c_str());
+    }
+    written = {};
+  }
+  refused_ = refused;
+  return written;
 }
 
 base::Result<void> CounterStore::set(std::string_view key, std::int64_t value, std::int32_t day) {

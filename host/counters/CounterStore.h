@@ -11,34 +11,23 @@
 #include <span>
 #include <string>
 
+#include "host/counters/CounterChange.h"
 #include "host/counters/CounterHistory.h"
 #include "platform/Clock.h"
 #include "platform/CountersService.h"
 
 namespace host {
 
-// One thing to be recorded: a scalar set or added to, or a sample pushed. In the key, what can't be
-// written is recorded as U+FFFD.
-struct CounterChange {
-  enum class Kind { set, add, push };
-
-  Kind kind;
-  std::string_view key;
-  std::int32_t day;
-  std::int64_t amount = 0;   // set, add
-  double sample = 0;         // push; not-a-number is refused
-  std::int32_t seconds = 0;  // push: the second within the day
-};
-
 // For any thread; each history for one. Nothing is opened before it is needed.
 class CounterStore : public platform::CountersService, public platform::HistoryStore {
  public:
   // `home` yields the device path of the folder that holds the counters' data; while it yields none
   // there is no database: reads are empty, writes fail. `foundDamaged` is called once for each
-  // database that is found damaged and set aside; it must not use the store.
+  // database that is found damaged and set aside; it must not use the store. `pause` is how who
+  // waits passes the time.
   CounterStore(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
-               std::function<std::optional<std::string>()> home,
-               std::function<void()> foundDamaged);
+               std::function<std::optional<std::string>()> home, std::function<void()> foundDamaged,
+               sqlite::Pause pause = LockWait::sleepFor);
 
   std::int32_t PLDaysSince1970() override;
   plist::Date PLDateFromDaysSince1970(std::int32_t day) override;
@@ -68,8 +57,10 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   std::unique_ptr<platform::PLHistory> initWithDefaultPath() override { return history(); }
   std::unique_ptr<CounterHistory> history() { return std::make_unique<CounterHistory>(place_); }
 
-  // Records all the changes or none. Sums saturate.
-  base::Result<void> apply(std::span<const CounterChange> changes);
+  // Records all the changes or none. What the database refuses for now waits in the journal, on
+  // disk, and is recorded before the next write that it takes.
+  using Kept = CounterDatabase::Kept;
+  base::Result<void> apply(std::span<const CounterChange> changes, Kept kept = Kept::bySystem);
   base::Result<void> set(std::string_view key, std::int64_t value, std::int32_t day);
   base::Result<void> add(std::string_view key, std::int64_t value, std::int32_t day);
   base::Result<void> push(std::string_view key, double value, std::int32_t day,
@@ -83,6 +74,7 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   platform::Clock& clock_;
   std::mutex mutex_;  // over what follows
   CounterDatabase database_;
+  bool refused_ = false;  // the last change, which waits
   base::Result<void> lastRecord_, recorded_;
 };
 

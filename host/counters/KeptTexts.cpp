@@ -7,11 +7,7 @@ namespace host {
 
 base::Result<void> keepText(sqlite::Connection& connection, std::string_view name,
                             std::string_view text) {
-  if (auto made = connection.execute("CREATE TABLE IF NOT EXISTS kept(name TEXT PRIMARY KEY NOT "
-                                     "NULL, text BLOB NOT NULL) STRICT");
-      !made) {
-    return made;
-  }
+  if (auto made = connection.execute(kKeptTable); !made) return made;
   if (text.empty()) {
     return sqlite::Statement(connection, "DELETE FROM kept WHERE name = ?", name).run();
   }

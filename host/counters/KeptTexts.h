@@ -13,6 +13,10 @@
 
 namespace host {
 
+// Makes their table.
+inline constexpr char kKeptTable[] =
+    "CREATE TABLE IF NOT EXISTS kept(name TEXT PRIMARY KEY NOT NULL, text BLOB NOT NULL) STRICT";
+
 // Keeps a text in the place of the one that is under the name; an empty one removes it.
 base::Result<void> keepText(sqlite::Connection& connection, std::string_view name,
                             std::string_view text);

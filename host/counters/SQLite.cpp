@@ -5,13 +5,16 @@
 
 #include <tuple>
 
+#include "host/files/Patience.h"
 #include "host/files/SystemError.h"
 
 namespace host::sqlite {
 
 namespace {
 
-constexpr int kBusyMilliseconds = 5000;
+// Pauses, and how many: they come to a second.
+constexpr std::chrono::milliseconds kPause(10);
+constexpr int kMaxPauses = 100;
 
 // A path as the URI of a file that nothing changes while it is read.
 std::string immutableUri(const std::string& path) {
@@ -34,14 +37,22 @@ std::string immutableUri(const std::string& path) {
   return uri + "?immutable=1";
 }
 
-std::errc kindOf(int code) {
+std::errc kindOf(int code, int systemNumber) {
   switch (code & 0xff) {
+    case SQLITE_BUSY:
+    case SQLITE_LOCKED:
+    case SQLITE_PROTOCOL:
+    case SQLITE_IOERR:
+    case SQLITE_FULL:
+    case SQLITE_NOMEM:
+      return kPassing;
     case SQLITE_CORRUPT:
     case SQLITE_NOTADB:
       return kDamaged;
     case SQLITE_READONLY:
-    case SQLITE_CANTOPEN:
       return kUnwritable;
+    case SQLITE_CANTOPEN:
+      return mayPass(systemError(systemNumber)) ? kPassing : kUnwritable;
     default:
       return {};
   }
@@ -49,7 +60,8 @@ std::errc kindOf(int code) {
 
 }  // namespace
 
-base::Result<std::unique_ptr<Connection>> Connection::open(const std::string& path, Access access) {
+base::Result<std::unique_ptr<Connection>> Connection::open(const std::string& path, Access access,
+                                                           const Pause& pause) {
   constexpr int common = SQLITE_OPEN_NOFOLLOW | SQLITE_OPEN_NOMUTEX | SQLITE_OPEN_EXRESCODE;
   std::unique_ptr<Connection> made(new Connection);
   const int code =
@@ -62,7 +74,8 @@ base::Result<std::unique_ptr<Connection>> Connection::open(const std::string& pa
                             nullptr);
   if (code != SQLITE_OK) return made->error(code);
   made->openedReadOnly_ = made->readOnly();
-  sqlite3_busy_timeout(made->database_, kBusyMilliseconds);
+  made->pause_ = pause;
+  sqlite3_busy_handler(made->database_, waitForOthers, made.get());
   sqlite3_db_config(made->database_, SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
   sqlite3_db_config(made->database_, SQLITE_DBCONFIG_TRUSTED_SCHEMA, 0, nullptr);
   // Nothing that the file brings along runs.
@@ -90,11 +103,17 @@ Connection::~Connection() {
   sqlite3_close(database_);
 }
 
+int Connection::waitForOthers(void* connection, int timesWaited) {
+  if (timesWaited >= kMaxPauses) return 0;
+  static_cast<Connection*>(connection)->pause_(kPause);
+  return 1;
+}
+
 base::Error Connection::error(int code) const {
-  const std::errc kind = kindOf(code);
+  const std::errc kind = kindOf(code, sqlite3_system_errno(database_));
   // SQLite reports a disk that fails to read as a damaged database.
   if (const int number = kind == kDamaged ? errorOfFiles() : 0; number != 0) {
-    return {systemError(number).text};
+    return {systemError(number).text, kPassing};
   }
   const bool explained = database_ != nullptr && sqlite3_errcode(database_) != SQLITE_OK;
   return {explained ? sqlite3_errmsg(database_) : sqlite3_errstr(code), kind};

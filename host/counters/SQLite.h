@@ -8,10 +8,12 @@
 
 #include <sqlite3.h>
 
+#include <chrono>
 #include <concepts>
 #include <cstddef>
 #include <cstdint>
 #include <deque>
+#include <functional>
 #include <memory>
 #include <span>
 #include <string>
@@ -24,9 +26,13 @@
 namespace host::sqlite {
 
 // What these errors are: the file is not a sound database; it, or what must stand beside it, can't
-// be written. Any other is none.
+// be written; somebody else has locked it, or the system failed, which may pass. Any other is none.
 inline constexpr std::errc kDamaged = std::errc::bad_message;
 inline constexpr std::errc kUnwritable = std::errc::read_only_file_system;
+inline constexpr std::errc kPassing = std::errc::resource_unavailable_try_again;
+
+// How who waits for somebody else's lock passes the time.
+using Pause = std::function<void(std::chrono::milliseconds)>;
 
 // One open database with its prepared statements. Every failure comes back as an error with
 // SQLite's own words, and as kDamaged or kUnwritable where it is that; nothing is logged here.
@@ -40,7 +46,9 @@ class Connection {
   // Opens an existing file; a link anywhere in its path is refused. The connection distrusts the
   // file: none of its triggers, views and references does anything. It checkpoints only when told
   // to. For one thread.
-  static base::Result<std::unique_ptr<Connection>> open(const std::string& path, Access access);
+  // Locks of others are waited for up to a second, in pauses.
+  static base::Result<std::unique_ptr<Connection>> open(const std::string& path, Access access,
+                                                        const Pause& pause);
   ~Connection();
   Connection(const Connection&) = delete;
   Connection& operator=(const Connection&) = delete;
@@ -79,12 +87,14 @@ class Connection {
   }
   base::Error error(int code) const;
   int errorOfFiles() const;
+  static int waitForOthers(void* connection, int timesWaited);
   bool readOnly() const { return sqlite3_db_readonly(database_, "main") == 1; }
 
   sqlite3* database_ = nullptr;
   bool openedReadOnly_ = false;
   std::deque<Prepared> prepared_;
   int pagesInLog_ = 0;
+  Pause pause_;
 };
 
 // An argument that is bound as data.

@@ -73,12 +73,7 @@ base::Result<FileLock> FileLock::take(int file, const LockWait& wait) {
     waited += pause;
     pause = std::min(pause * 2, kMaxPause);
   }
-  return FileLock(file, Held{});
-}
-
-FileLock::FileLock(int file) : file_(file) {
-  while (::flock(file_, LOCK_EX) != 0 && errno == EINTR) {
-  }
+  return FileLock(file);
 }
 
 FileLock::FileLock(FileLock&& other) noexcept : file_(std::exchange(other.file_, -1)) {}

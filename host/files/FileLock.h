@@ -34,14 +34,12 @@ class FileLock {
   // Waits for it; std::errc::timed_out, with the holder, once that took as long as it may.
   static base::Result<FileLock> take(int file, const LockWait& wait);
 
-  explicit FileLock(int file);  // waits for as long as it takes
   FileLock(FileLock&& other) noexcept;
   FileLock& operator=(FileLock&&) = delete;
   ~FileLock();
 
  private:
-  struct Held {};
-  FileLock(int file, Held) : file_(file) {}
+  explicit FileLock(int file) : file_(file) {}
 
   int file_;
 };

@@ -70,7 +70,7 @@ class OpenHistory : public PLHistory {
       if (stop || !covers(row, keyPrefix, minDay, maxDay)) continue;
       rowHandler(row.second, row.first, value, stop);
     }
-    return store_.outcome;
+    return store_.nextOutcome();
   }
 
   base::Result<void> distributionsForKeyPrefix(std::string_view keyPrefix, std::int32_t minDay,
@@ -84,7 +84,7 @@ class OpenHistory : public PLHistory {
       BlockEnumerator enumerator(samples, store_.blockSize, comesAgain);
       rowHandler(row.second, row.first, enumerator, stop);
     }
-    return store_.outcome;
+    return store_.nextOutcome();
   }
 
  private:
@@ -97,6 +97,13 @@ class OpenHistory : public PLHistory {
 };
 
 }  // namespace
+
+base::Result<void> FakeHistory::nextOutcome() {
+  if (firstOutcomes.empty()) return outcome;
+  auto first = std::move(firstOutcomes.front());
+  firstOutcomes.erase(firstOutcomes.begin());
+  return first;
+}
 
 std::unique_ptr<PLHistory> FakeHistory::initWithDefaultPath() {
   return std::make_unique<OpenHistory>(*this);

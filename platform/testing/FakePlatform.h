@@ -116,9 +116,11 @@ class FakeHistory : public HistoryStore {
   using RowKey = std::pair<std::int32_t, std::string>;
   std::map<RowKey, std::int64_t> scalars;
   std::map<RowKey, std::vector<double>> distributions;
-  std::size_t blockSize = 3;   // samples handed over at a time
-  base::Result<void> outcome;  // of a query, after its rows
+  std::size_t blockSize = 3;                      // samples handed over at a time
+  base::Result<void> outcome;                     // of a query, after its rows
+  std::vector<base::Result<void>> firstOutcomes;  // of the next queries, instead of that
 
+  base::Result<void> nextOutcome();
   std::unique_ptr<PLHistory> initWithDefaultPath() override;
 };
 

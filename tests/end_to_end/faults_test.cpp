@@ -3,15 +3,23 @@
 
 // A whole day, with a fault at each of its state-changing calls.
 
+#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <signal.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cstddef>
+#include <cstdint>
 #include <filesystem>
 #include <nlohmann/json.hpp>
 
+#include "base/Text.h"
 #include "end_to_end/Device.h"
+#include "host/counters/CounterStore.h"
+#include "host/files/FileLock.h"
+#include "host/process/SystemClock.h"
+#include "platform/testing/RecordingLog.h"
 
 namespace end_to_end {
 namespace {
@@ -121,6 +129,47 @@ TEST(Faults, CompletesTheDayAfterAFaultAtAnyCallOfARun) {
       EXPECT_EQ(next.status, 0) << what;
       checkDevice(filled, clean, device, faulty, what);
       if (HasFailure()) FAIL() << faulty.standardError << "then\n" << next.standardError;
+    }
+  }
+}
+
+// Whoever writes next records what waits beside the counters database, once, wherever it fails or
+// is killed.
+TEST(Faults, RecordsOnceWhatWaitsWhicheverCallOfTheNextWriterFails) {
+  if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
+  Device waiting;
+  const std::int32_t today = waiting.today();
+  {
+    const host::DeviceRoot root(waiting.root().path());
+    host::SystemClock clock;
+    platform::fakes::RecordingLog log;
+    host::CounterStore store{
+        root, clock, log, [] { return "/var/mobile"; }, [] {}, [](std::chrono::milliseconds) {}};
+    EXPECT_TRUE(store.set("k", 1, today));
+    const auto folder = (waiting.root() / support::kCountersDatabase).parent_path();
+    const host::FileDescriptor held(::open(folder.c_str(), O_RDONLY | O_CLOEXEC));
+    const auto lock = host::FileLock::take(held.get(), {log, folder});
+    for (const std::int64_t amount : {10, 100}) EXPECT_TRUE(store.add("k", amount, today));
+  }
+  const auto row = [today](int sum) {
+    return Lines{std::to_string(today) + base::format(" k %d", sum)};
+  };
+  Device device;
+  device.become(waiting);
+  const std::size_t calls = device.countCalls("pelloran", {"add", "k", "1000"});
+  ASSERT_GT(calls, 10u);
+  for (const char* kind : faults::kKinds) {
+    for (std::size_t at = 1; at <= calls; ++at) {
+      device.become(waiting);
+      const auto faulty = device.run("pelloran", {"add", "k", "1000"}, {.at = at, .kind = kind});
+      const std::string what = base::format("%s at call %zu: ", kind, at) + faulty.standardError;
+      const Lines rows = device.recorded();
+      EXPECT_TRUE(rows == row(1111) || (faulty.status != 0 && rows == row(111))) << what;
+      EXPECT_TRUE(faulty.status == 0 || faulty.signal == SIGKILL) << what;
+      EXPECT_EQ(device.recorded(), rows) << what;
+      EXPECT_FALSE(std::filesystem::exists(device.root() /
+                                           (std::string(support::kCountersDatabase) + ".waiting")))
+          << what;
     }
   }
 }

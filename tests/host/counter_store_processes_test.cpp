@@ -38,6 +38,7 @@ TEST(CounterStoreProcesses, NoWriteIsLostBetweenWritersAndACheckpointer) {
   for (int writer = 0; writer < writers; ++writer) {
     children.push_back(inChild([&] {
       StoreFixture there(folder.path());
+      there.sleeps = true;
       for (int i = 0; i < rounds; ++i) {
         if (!there.store.add("sum", 1, 1)) return false;
         if (!there.store.push("series", i, 1, writer)) return false;
@@ -47,6 +48,7 @@ TEST(CounterStoreProcesses, NoWriteIsLostBetweenWritersAndACheckpointer) {
   }
   children.push_back(inChild([&] {
     StoreFixture there(folder.path());
+    there.sleeps = true;
     for (int i = 0; i < 30; ++i) {
       there.store.PLClientCheckpoint();
       there.rows();
@@ -77,6 +79,7 @@ TEST(CounterStoreProcesses, OneOfSeveralSetsADamagedDatabaseAside) {
     for (int i = 0; i < 3; ++i) {
       children.push_back(inChild([&] {
         StoreFixture there(folder.path());
+        there.sleeps = true;
         there.rows();
         const auto sound = there.store.add("sum", 1, 1);
         if (there.damaged > 0) folder.write("found/" + std::to_string(::getpid()), "");

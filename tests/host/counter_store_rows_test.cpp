@@ -308,6 +308,7 @@ TEST_F(CounterStoreRows, ANewerDatabaseIsRefusedAndLeftAlone) {
 
 TEST_F(CounterStoreRows, TablesThatAreNotTheStoresAreSetAside) {
   for (const char* change : {"DROP TABLE staged", "ALTER TABLE staged ADD COLUMN x TEXT",
+                             "CREATE TABLE kept(name)", "CREATE VIEW waiting_recorded AS SELECT 1",
                              "PRAGMA user_version = -1", "PRAGMA user_version = 0"}) {
     EXPECT_TRUE(here.store.set("k", 1, 1));
     sql(change);

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 
+#include <chrono>
 #include <filesystem>
 #include <optional>
 #include <string>
@@ -68,16 +69,22 @@ inline std::string sql(const std::filesystem::path& file, const char* text) {
 }
 
 struct StoreFixture {
-  explicit StoreFixture(const std::filesystem::path& path) : root(path.string()) {}
+  explicit StoreFixture(const std::filesystem::path& path) : root(path.string(), pause) {}
 
   std::vector<std::string> rows() { return support::rows(*store.initWithDefaultPath(), log); }
 
+  std::chrono::milliseconds waited{0};
+  bool sleeps = false;  // while it waits for other processes
+  host::sqlite::Pause pause = [this](std::chrono::milliseconds time) {
+    waited += time;
+    if (sleeps) host::LockWait::sleepFor(time);
+  };
   host::DeviceRoot root;
   SetClock clock;
   platform::fakes::RecordingLog log;
   std::optional<std::string> home = "/var/mobile";
   int damaged = 0;
-  host::CounterStore store{root, clock, log, [this] { return home; }, [this] { ++damaged; }};
+  host::CounterStore store{root, clock, log, [this] { return home; }, [this] { ++damaged; }, pause};
 };
 
 }  // namespace support

@@ -9,6 +9,7 @@
 #include <initializer_list>
 #include <map>
 #include <new>
+#include <system_error>
 #include <vector>
 
 #include "platform/InstalledApplications.h"
@@ -227,6 +228,33 @@ TEST_F(PLReportTest, GoesOnWithoutAHistogramWhenMemoryIsShort) {
             1);
   EXPECT_EQ(log.dictionary("PLDistributions")->size(), 1u);
   EXPECT_TRUE(log.dictionary("PLDistributionsHistogram")->empty());
+}
+
+// What was read before the failure counts once; a failure that stays is said once.
+TEST_F(PLReportTest, ReadsTheDayAnewWhenTheHistoryFailsAndMayNotFailAgain) {
+  const base::Error passing{"busy", std::errc::resource_unavailable_try_again};
+  const base::Result<void> done;
+  const struct {
+    std::vector<base::Result<void>> outcomes;
+    std::size_t left;  // of them
+  } rows[] = {{{passing}, 0},
+              {{done, passing}, 0},
+              {{done, passing, passing}, 0},
+              {{passing, passing, passing, done}, 1},
+              {{base::Error{"broken"}, done}, 1}};
+  platform.history.scalars = {{{kDay, "exact"}, 3}};
+  platform.history.distributions = {{{kDay, "counted"}, {10, 11, 1000}}};
+  const Dictionary expected = write();
+  for (const auto& row : rows) {
+    platform.log.clear();
+    platform.history.firstOutcomes = row.outcomes;
+    const Dictionary log = write();
+    EXPECT_EQ(platform.history.firstOutcomes.size(), row.left);
+    EXPECT_EQ(platform.log.count("error: "), row.left);
+    for (const char* section : {"PLScalars", "PLDistributions", "PLDistributionsHistogram"}) {
+      EXPECT_TRUE(row.left > 0 || *log.find(section) == *expected.find(section)) << section;
+    }
+  }
 }
 
 // A later row without samples takes the histogram of an earlier day's row away.

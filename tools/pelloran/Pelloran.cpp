@@ -171,7 +171,7 @@ class Command {
     if (number >= kLinesBetweenProgress) {
       progress.show("writing " + std::to_string(changes.size()) + " changes");
     }
-    const auto applied = environment_.store.apply(changes);
+    const auto applied = environment_.store.apply(changes, host::CounterStore::Kept::onDisk);
     progress.clear();
     return outcome(applied);
   }
