@@ -6,13 +6,10 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
-#include <algorithm>
 #include <array>
 #include <chrono>
 #include <climits>
-#include <string_view>
 #include <tuple>
-#include <vector>
 
 #include "base/Text.h"
 #include "host/counters/KeptTexts.h"
@@ -37,67 +34,9 @@ constexpr char kLogAside[] = "PLDataStore.sqlitedb.corrupt-wal";
 
 constexpr int kMaxPagesInLog = 1000;
 
-// Scalars and days are found by (day, key). Samples are appended to `staged`, and a checkpoint
-// packs them into data of 12 bytes each. The texts are compared with those of a database that is
-// opened: they stand as SQLite keeps them.
-constexpr std::int64_t kVersion = 1;
-constexpr char kSchema[] =
-    "CREATE TABLE scalars(day INTEGER NOT NULL, key TEXT NOT NULL, value INTEGER NOT NULL, "
-    "PRIMARY KEY(day, key)) WITHOUT ROWID, STRICT;"
-    "CREATE TABLE staged(day INTEGER NOT NULL, key TEXT NOT NULL, seconds INTEGER NOT NULL, "
-    "value REAL NOT NULL) STRICT;"
-    "CREATE TABLE packed(day INTEGER NOT NULL, key TEXT NOT NULL, samples BLOB NOT NULL) STRICT;"
-    "CREATE INDEX packed_by_day ON packed(day, key);";
-// What the schema says of those; the names of a column may come in any case.
-constexpr char kOwn[] =
-    "SELECT sql FROM sqlite_schema WHERE sql IS NOT NULL AND type IN ('table', 'index') AND "
-    "lower(name) IN ('scalars', 'staged', 'packed', 'packed_by_day') ORDER BY rowid";
-constexpr char kOwnAtTimes[] =
-    "SELECT sql FROM sqlite_schema WHERE type <> 'trigger' AND lower(name) IN ('kept', "
-    "'waiting_recorded')";
-// What somebody added: it is left as it is, but for indexes that have a say in what is written.
-constexpr char kAddedIndexes[] =
-    "SELECT name, sql FROM sqlite_schema WHERE type = 'index' AND sql IS NOT NULL AND "
-    "lower(tbl_name) IN ('scalars', 'staged', 'packed', 'kept', 'waiting_recorded') AND name <> "
-    "'packed_by_day'";
-constexpr char kCreation[] = "PRAGMA user_version = 1; COMMIT";
-
 const Error kNotRegular{"it, or a file beside it, is not a regular file"};
 const Error kShared{"it, or a file beside it, is a file with several names"};
 constexpr char kNoPath[] = "its path can't be read from /proc";
-
-// Whether an index, as SQLite keeps its text, does no more than order rows by columns: a unique or
-// partial one, and one of an expression, could refuse what is written, or make it costly.
-bool onlyOrders(std::string_view sql) {
-  constexpr std::string_view kLetters =
-      "abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ0123456789_\"`[]";
-  const std::size_t list = sql.find('(');
-  if (!sql.starts_with("CREATE INDEX ") || list == sql.npos || !sql.ends_with(')')) return false;
-  std::string_view columns = sql.substr(list + 1, sql.size() - list - 2);
-  for (bool more = true; more;) {
-    const std::size_t end = columns.find(',');
-    std::string_view column = columns.substr(0, end);
-    const auto skipBlanks = [&column] {
-      column.remove_prefix(std::min(column.find_first_not_of(" \t\n"), column.size()));
-    };
-    skipBlanks();
-    const std::size_t name = std::min(column.find_first_not_of(kLetters), column.size());
-    if (name == 0) return false;
-    column.remove_prefix(name);
-    skipBlanks();
-    while (column.ends_with(' ')) column.remove_suffix(1);
-    if (!column.empty() && column != "ASC" && column != "DESC") return false;
-    more = end != columns.npos;
-    if (more) columns.remove_prefix(end + 1);
-  }
-  return true;
-}
-
-// The text of a table as SQLite keeps it.
-std::string asKept(std::string_view sql) {
-  constexpr std::string_view kUnlessThere = "IF NOT EXISTS ";
-  return std::string(sql).erase(sql.find(kUnlessThere), kUnlessThere.size());
-}
 
 // What is wrong with what stands in the place of a file.
 Error ofPlace(const Error& why) { return mayPass(why) ? why : kNotRegular; }
@@ -391,92 +330,20 @@ Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connectio
     const auto set = (*connection)->execute("PRAGMA cache_size = -128");
     if (!set) return set;
   }
-  const auto sound = verify(**connection, use);
+  const auto sound = verifySchema(**connection, use);
   if (!sound) return sound.error();
-  if (*sound) connection_ = *std::move(connection);
+  if (!*sound) return {};
+  if (use != Use::read) {
+    const auto dropped = dropMeddlingIndexes(**connection);
+    if (!dropped) return dropped.error();
+    for (const std::string& index : *dropped) {
+      place_.log.log(platform::LogLevel::error,
+                     "%s: the index %s, which has a say in what is written, is dropped",
+                     this->path().c_str(), shownText(index).c_str());
+    }
+  }
+  connection_ = *std::move(connection);
   return {};
-}
-
-// Makes sure that what was opened is a database of this store, and makes it one if it is empty;
-// false when it isn't to be made.
-Result<bool> CounterDatabase::verify(Connection& connection, Use use) {
-  std::int64_t version = 0, entries = 0;
-  bool foreign = false;
-  std::string schema;
-  {
-    sqlite::Transaction transaction(connection);
-    const auto begun = transaction.begin(sqlite::Transaction::Kind::read);
-    if (!begun) return begun.error();
-    const auto number = [&connection](const char* sql, std::int64_t& value) {
-      sqlite::Statement statement(connection, sql);
-      return statement.forEach([&] {
-        value = statement.column(0).integer();
-        return false;
-      });
-    };
-    sqlite::Statement own(connection, kOwn);
-    const auto known =
-        number("PRAGMA user_version", version)
-            .and_then([&] { return number("SELECT count(*) FROM sqlite_schema", entries); })
-            .and_then([&] {
-              return own.forEach([&] {
-                schema.append(own.column(0).bytes()).append(";");
-                return true;
-              });
-            });
-    if (!known) return known.error();
-    sqlite::Statement atTimes(connection, kOwnAtTimes);
-    const auto read = atTimes.forEach([&] {
-      const auto sql = atTimes.column(0).bytes();
-      foreign = foreign || (sql != asKept(kKeptTable) && sql != asKept(kWaitingTable));
-      return true;
-    });
-    if (!read) return read.error();
-  }
-  if (version > kVersion) {
-    return Error{
-        base::format("made by a newer version of the store (%d)", static_cast<int>(version))};
-  }
-  if (use != Use::read && connection.headerForbidsWriting()) {
-    return Error{"its header forbids writing", sqlite::kDamaged};
-  }
-  Result<void> ready;
-  if (version == 0 && entries == 0) {
-    if (use != Use::create) return false;
-    ready = connection.execute("PRAGMA journal_mode = WAL; BEGIN IMMEDIATE")
-                .and_then([&] { return connection.execute(kSchema); })
-                .and_then([&] { return connection.execute(kCreation); });
-  } else if (version != kVersion || schema != kSchema || foreign) {
-    return Error{"its tables are not the store's", sqlite::kDamaged};
-  } else if (use != Use::read) {
-    ready = connection.execute("PRAGMA journal_mode = WAL").and_then([&] {
-      return dropMeddling(connection);
-    });
-  }
-  if (!ready) return ready.error();
-  return true;
-}
-
-// Drops the indexes that have a say in what is written. Triggers have none: the connection runs
-// none.
-Result<void> CounterDatabase::dropMeddling(Connection& connection) {
-  std::vector<std::string> names;
-  sqlite::Statement added(connection, kAddedIndexes);
-  auto dropped = added.forEach([&] {
-    if (!onlyOrders(added.column(1).bytes())) names.emplace_back(added.column(0).bytes());
-    return true;
-  });
-  for (const std::string& name : names) {
-    if (!dropped) break;
-    std::string quoted;
-    for (const char c : name) quoted.append(c == '"' ? 2 : 1, c);
-    dropped = connection.execute(("DROP INDEX \"" + quoted + "\"").c_str());
-    if (!dropped) break;
-    place_.log.log(platform::LogLevel::error,
-                   "%s: the index %s, which has a say in what is written, is dropped",
-                   path().c_str(), shownText(name).c_str());
-  }
-  return dropped;
 }
 
 // With the lock held. What is to be said of it; none when another process was first.

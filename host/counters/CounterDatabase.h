@@ -19,6 +19,7 @@
 
 #include "base/Result.h"
 #include "host/counters/CounterChange.h"
+#include "host/counters/CounterSchema.h"
 #include "host/counters/SQLite.h"
 #include "host/files/DeviceRoot.h"
 #include "host/files/FileLock.h"
@@ -82,7 +83,7 @@ class CounterDatabase {
     nlink_t names = 0;
     bool operator==(const Identity&) const = default;
   };
-  enum class Use { read, write, create };
+  using Use = DatabaseUse;
 
   base::Result<void> patiently(const std::function<base::Result<void>()>& attempt);
   base::Result<FileLock> lock();
@@ -98,8 +99,6 @@ class CounterDatabase {
   base::Result<void> create();
   base::Result<void> connect(Use use);
   base::Result<void> openAs(Use use, const std::string& path, sqlite::Connection::Access access);
-  base::Result<bool> verify(sqlite::Connection& connection, Use use);
-  base::Result<void> dropMeddling(sqlite::Connection& connection);
   std::optional<base::Error> setAside(const base::Error& why);
   std::string path() const;
 

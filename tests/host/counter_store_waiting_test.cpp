@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -222,6 +223,27 @@ TEST_F(CounterStoreWaiting, NothingIsWrittenThroughWhatStandsInTheJournalsPlace)
     std::filesystem::remove(folder / "target");
   }
   EXPECT_EQ(here.rows(), Lines{"1 k 4"});
+}
+
+// What root leaves on another user's device, that user's programs can go on with.
+TEST(CounterStoreOwner, WhatRootWritesBelongsToTheOwnerOfTheDevice) {
+  constexpr uid_t kOwner = 65534;
+  const support::TemporaryFolder folder;
+  if (::geteuid() != 0) GTEST_SKIP() << "not root";
+  ASSERT_EQ(::chown(folder.path().c_str(), kOwner, kOwner), 0);
+  StoreFixture here(folder.path());
+  EXPECT_TRUE(here.store.set("k", 1, 1));
+  const Holder locked(folder / support::kDatabase, kWrites);
+  EXPECT_TRUE(here.store.add("k", 1, 1));
+  int files = 0;
+  for (const auto& entry : std::filesystem::recursive_directory_iterator(folder.path())) {
+    struct stat status;
+    ASSERT_EQ(::lstat(entry.path().c_str(), &status), 0);
+    EXPECT_EQ(status.st_uid, kOwner) << entry.path();
+    EXPECT_EQ(status.st_gid, kOwner) << entry.path();
+    files += entry.is_regular_file() ? 1 : 0;
+  }
+  EXPECT_EQ(files, 4) << "the database, two files beside it, and what waits";
 }
 
 }  // namespace
