@@ -40,8 +40,11 @@ base::Result<std::unique_ptr<SpoolFolder>> SpoolFolder::open(const DeviceRoot& r
 }
 
 base::Result<void> SpoolFolder::lookAround() {
-  remove(kUnfinishedLog);
-  remove(kUnfinishedOptions);
+  for (const char* name : {kUnfinishedLog, kUnfinishedOptions}) {
+    // What can't be removed from there is moved out of the way; else who writes there says why.
+    if (::unlinkat(folder_.get(), name, 0) == 0 || errno == ENOENT) continue;
+    std::ignore = keepBeside(folder_.get(), name, std::string(name) + ".in-the-way");
+  }
   auto names = namesInFolder(folder_.get());
   if (!names) return names.error();
   const std::string_view suffix = kOptionsSuffix;

@@ -134,6 +134,19 @@ TEST_F(SubmissionSpoolTest, NoLinkIsFollowedToTheFolder) {
   EXPECT_EQ(log.count("error: "), 1);
 }
 
+TEST_F(SubmissionSpoolTest, WhatStandsWhereALogIsWrittenIsMovedOutOfTheWay) {
+  const plist::Dictionary options{{"previous_os_version", "1.0"}};
+  for (const char* name : {SpoolFolder::kUnfinishedLog, SpoolFolder::kUnfinishedOptions}) {
+    for (int times = 0; times < 2; ++times) {
+      folder.write(std::string(SpoolFolder::kPath + 1) + "/" + name + "/kept", "theirs");
+      EXPECT_TRUE(submit("bytes", &options));
+    }
+    const std::string aside = std::string(name) + ".in-the-way";
+    EXPECT_EQ(read(aside + "/kept") + read(aside + "-2/kept"), "theirstheirs");
+  }
+  EXPECT_TRUE(log.lines().empty());
+}
+
 TEST_F(SubmissionSpoolTest, NamesThatAreNoFileNamesAreRefused) {
   for (const std::string& bad :
        {std::string(), std::string("../x"), std::string("a\0b", 3), std::string(250, 'x')}) {
