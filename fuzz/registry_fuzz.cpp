@@ -48,7 +48,7 @@ class CountingLog : public SystemLog {
   bool handlesWereLost = false;
 
  private:
-  void write(LogLevel, std::string_view message) override {
+  void write(LogLevel, std::string_view, std::string_view message) override {
     ++lines;
     handlesWereLost |= message.ends_with(" driver handles were not released");
   }

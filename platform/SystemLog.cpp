@@ -11,7 +11,7 @@ void SystemLog::log(LogLevel level, const char* format, ...) {
   if (!shows(level)) return;
   std::va_list arguments;
   va_start(arguments, format);
-  write(level, base::vformat(format, arguments));
+  write(level, format, base::vformat(format, arguments));
   va_end(arguments);
 }
 

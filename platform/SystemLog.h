@@ -27,7 +27,8 @@ class SystemLog {
   explicit SystemLog(LogLevel lowest) : lowest_(lowest) {}
 
  private:
-  virtual void write(LogLevel level, std::string_view message) = 0;
+  // The format is what messages of one kind have in common.
+  virtual void write(LogLevel level, std::string_view format, std::string_view message) = 0;
 
   LogLevel lowest_;
 };

@@ -41,7 +41,28 @@ platform::LogLevel StandardErrorLog::levelNamed(const char* name) {
   return platform::LogLevel::standard;
 }
 
-void StandardErrorLog::write(platform::LogLevel level, std::string_view message) {
+StandardErrorLog::~StandardErrorLog() { endRow(); }
+
+void StandardErrorLog::write(platform::LogLevel level, std::string_view format,
+                             std::string_view message) {
+  const std::scoped_lock lock(mutex_);
+  // Who asks for the lower levels is to see all of them.
+  if (level < platform::LogLevel::standard) {
+    endRow();
+    return writeLines(level, message);
+  }
+  // "%s" says nothing of its messages.
+  const FloodGate::Next next = gate_.next(format == "%s" ? message : format, message);
+  if (next.before) writeLines(lastLevel_, *next.before);
+  lastLevel_ = level;
+  if (next.said) writeLines(level, message);
+}
+
+void StandardErrorLog::endRow() {
+  if (const auto rest = gate_.end()) writeLines(lastLevel_, *rest);
+}
+
+void StandardErrorLog::writeLines(platform::LogLevel level, std::string_view message) {
   if (message.ends_with('\n')) message.remove_suffix(1);
   const std::string_view prefix = terminal_ ? std::string_view() : prefixOf(level);
   std::string text;

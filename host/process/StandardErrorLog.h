@@ -6,6 +6,9 @@
 
 #include <unistd.h>
 
+#include <mutex>
+
+#include "host/process/FloodGate.h"
 #include "platform/SystemLog.h"
 
 namespace host {
@@ -13,19 +16,31 @@ namespace host {
 // Each message is written with one call, so that the lines of two processes don't mix. Where it
 // goes to a terminal it stands alone, elsewhere every line of it follows the "<N>" priority prefix
 // of the journal. What can't be written is lost. The process is expected to ignore SIGPIPE.
+//
+// Of the messages of the default level and errors that one place of the program says in a row, ten
+// are written; a line then says how many there were beyond, at the latest when the log goes. Any
+// thread may write.
 class StandardErrorLog : public platform::SystemLog {
  public:
   explicit StandardErrorLog(platform::LogLevel lowest, int file = STDERR_FILENO);
+  ~StandardErrorLog() override;
 
   // The level that a text names: "debug", "info", "default" or "error". Any other text, or none
   // (null), is the default level.
   static platform::LogLevel levelNamed(const char* name);
 
+  // As SystemLog::log does; for a log that hands its messages on.
+  void write(platform::LogLevel level, std::string_view format, std::string_view message) override;
+
  private:
-  void write(platform::LogLevel level, std::string_view message) override;
+  void writeLines(platform::LogLevel level, std::string_view message);
+  void endRow();
 
   int file_;
   bool terminal_;
+  std::mutex mutex_;
+  FloodGate gate_{10};
+  platform::LogLevel lastLevel_ = platform::LogLevel::standard;
 };
 
 }  // namespace host

@@ -43,7 +43,7 @@ void RecordingLog::clear() {
   lines_.clear();
 }
 
-void RecordingLog::write(LogLevel level, std::string_view message) {
+void RecordingLog::write(LogLevel level, std::string_view, std::string_view message) {
   const std::scoped_lock lock(mutex_);
   lines_.push_back(levelName(level) + std::string(message));
 }

@@ -25,7 +25,7 @@ class RecordingLog : public SystemLog {
   void clear();
 
  private:
-  void write(LogLevel level, std::string_view message) override;
+  void write(LogLevel level, std::string_view format, std::string_view message) override;
 
   mutable std::mutex mutex_;
   std::vector<std::string> lines_;

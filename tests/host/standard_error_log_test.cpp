@@ -46,6 +46,38 @@ TEST(StandardErrorLog, EveryLineOfAMessageHasItsPriority) {
   }
 }
 
+// What a hostile whitelist or sender says once for each of its entries.
+TEST(StandardErrorLog, AFloodIsCounted) {
+  int ends[2];
+  ASSERT_EQ(::pipe2(ends, O_NONBLOCK), 0);
+  const FileDescriptor out(ends[0]), in(ends[1]);
+  const auto flood = [](StandardErrorLog& log, int messages) {
+    for (int i = 0; i < messages; ++i) log.log(LogLevel::error, "skipping %d", i);
+  };
+  std::string ten;
+  for (int i = 0; i < 10; ++i) ten += "<3>skipping " + std::to_string(i) + "\n";
+  const std::string counted = ten + "<3>1990 more messages like \"skipping 9\"\n";
+  {
+    StandardErrorLog log(LogLevel::debug, in.get());
+    flood(log, 10);
+    log.log(LogLevel::standard, "other");
+    EXPECT_EQ(readSome(out.get()), ten + "<5>other\n");
+    flood(log, 2000);
+    log.log(LogLevel::debug, "other");
+    EXPECT_EQ(readSome(out.get()), counted + "<7>other\n");
+    std::string all;
+    for (int i = 0; i < 20; ++i) {
+      log.log(LogLevel::debug, "debug");
+      log.log(LogLevel::standard, "%s", std::to_string(i).c_str());
+      all += "<7>debug\n<5>" + std::to_string(i) + "\n";
+    }
+    EXPECT_EQ(readSome(out.get()), all);
+    flood(log, 2000);
+    EXPECT_EQ(readSome(out.get()), ten);
+  }
+  EXPECT_EQ(readSome(out.get()), counted.substr(ten.size()));
+}
+
 TEST(StandardErrorLog, ATerminalGetsTheMessageAlone) {
   const FileDescriptor terminal(::posix_openpt(O_RDWR | O_NOCTTY));
   ASSERT_TRUE(terminal && ::grantpt(terminal.get()) == 0 && ::unlockpt(terminal.get()) == 0);

@@ -57,9 +57,8 @@ std::vector<std::string> CommandLog::take() {
   return std::exchange(kept_, {});
 }
 
-void CommandLog::write(LogLevel level, std::string_view message) {
-  if (systemLog_)
-    return systemLog_->log(level, "%.*s", static_cast<int>(message.size()), message.data());
+void CommandLog::write(LogLevel level, std::string_view format, std::string_view message) {
+  if (systemLog_) return systemLog_->write(level, format, message);
   if (message.ends_with('\n')) message.remove_suffix(1);
   const std::lock_guard lock(mutex_);
   if (keeps_) {

@@ -37,7 +37,7 @@ class CommandLog final : public platform::SystemLog {
   std::vector<std::string> take();
 
  private:
-  void write(platform::LogLevel level, std::string_view message) override;
+  void write(platform::LogLevel level, std::string_view format, std::string_view message) override;
   void say(const std::string& line);
 
   const std::string command_;

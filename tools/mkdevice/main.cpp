@@ -7,7 +7,6 @@
 
 #include <CLI/CLI.hpp>
 #include <charconv>
-#include <filesystem>
 #include <iostream>
 #include <span>
 #include <string>
