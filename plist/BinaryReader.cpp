@@ -12,6 +12,7 @@
 
 #include "base/Text.h"
 #include "base/UTF8.h"
+#include "plist/Allowance.h"
 
 namespace plist {
 
@@ -23,13 +24,12 @@ constexpr double kSecondsFrom1970To2001 = 978307200;
 
 // What a file may expand to: shared objects are read once for each reference.
 constexpr std::uint64_t kFreeObjects = 4096;  // plus one for each byte of the file
-constexpr std::uint64_t kMaxObjects = std::uint64_t{4} << 20;
 constexpr std::uint64_t kMaxContent = std::uint64_t{64} << 20;  // bytes of text and data
 
 class Reader {
  public:
   explicit Reader(std::string_view bytes)
-      : bytes_(bytes), objectsLeft_(std::min(kFreeObjects + bytes.size(), kMaxObjects)) {}
+      : bytes_(bytes), objectsLeft_(kFreeObjects + bytes.size()) {}
 
   base::Result<Value> read() {
     std::optional<Value> value;
@@ -253,7 +253,10 @@ class Reader {
     const std::optional<Range> range =
         elements(object, isArray ? referenceSize_ : 2 * referenceSize_);
     if (!range) return std::nullopt;
-    if (range->size > objectsLeft_) return fail(object.offset, "too many objects");
+    const bool room =
+        range->size <= objectsLeft_ &&
+        (isArray ? allowance_.takeElements(range->size) : allowance_.takeEntries(range->size));
+    if (!room) return fail(object.offset, "too many objects");
     objectsLeft_ -= range->size;
     return isArray ? array(*range, depth) : dictionary(*range, depth);
   }
@@ -292,7 +295,7 @@ class Reader {
   }
 
   bool takeContent(const Object& object, std::uint64_t size) {
-    if (size > contentLeft_) {
+    if (size > contentLeft_ || !allowance_.takeContent(size)) {
       fail(object.offset, "too much text and data");
       return false;
     }
@@ -303,6 +306,7 @@ class Reader {
   std::string_view bytes_;
   std::uint64_t offsetSize_ = 0, referenceSize_ = 0, count_ = 0, top_ = 0, table_ = 0;
   std::uint64_t objectsLeft_;
+  Allowance allowance_;
   std::uint64_t contentLeft_ = kMaxContent;
   std::array<std::uint64_t, kMaxDepth> path_{};  // offsets of the open containers
   std::uint64_t errorOffset_ = 0;

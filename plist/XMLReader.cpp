@@ -14,6 +14,7 @@
 
 #include "base/Text.h"
 #include "base/Timestamp.h"
+#include "plist/Allowance.h"
 #include "plist/Base64.h"
 
 namespace plist {
@@ -110,6 +111,7 @@ std::optional<double> realFrom(std::string_view text) {
 }
 
 constexpr std::size_t kUsualArraySize = 8;
+constexpr std::size_t kUnusedElements = (kUsualArraySize - 1) * sizeof(Value);
 
 // Builds the value while expat reads: containers grow in place, the scalar that is open gathers its
 // text in a buffer that is used again and again.
@@ -189,6 +191,7 @@ class Reader {
     } else if (isKey == hasKey_) {
       return fail(isKey ? "a key without a value" : "a value without a key");
     }
+    if (!isKey && !takeValue()) return fail("too many values");
     if (element == Element::array) {
       open(Array());
     } else if (element == Element::dict) {
@@ -197,6 +200,16 @@ class Reader {
       scalar_ = element;
       text_.clear();
     }
+  }
+
+  // The room for a value, and for the key before it. Arrays begin with room for a few.
+  bool takeValue() {
+    if (containers_.empty()) return true;
+    if (containers_.back().dictionary != nullptr) {
+      return allowance_.takeEntries(1) && allowance_.takeContent(key_.size());
+    }
+    const std::size_t size = containers_.back().array->size();
+    return allowance_.takeElements(1) && (size > 0 || allowance_.takeContent(kUnusedElements));
   }
 
   template <typename Empty>
@@ -222,6 +235,7 @@ class Reader {
   }
 
   void endScalar() {
+    if (!allowance_.takeContent(text_.size())) return fail("too much text and data");
     switch (scalar_) {
       case Element::key:
         key_.swap(text_);
@@ -294,6 +308,7 @@ class Reader {
   std::string text_;                 // its text
   std::string key_;                  // the key that waits for its value
   bool hasKey_ = false;
+  Allowance allowance_;
   std::string error_;
 };
 

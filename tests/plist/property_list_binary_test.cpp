@@ -162,6 +162,15 @@ TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
     const std::vector<std::size_t> many(100, list.add(large));
     EXPECT_EQ(errorOf(list, list.container(kind, many)), "too much text and data");
   }
+  // Each place counts, and in memory too: a small file is not to fill the machine.
+  for (const std::size_t beyond : {0, 1}) {
+    BinaryPropertyList list;
+    const std::vector<std::size_t> some(1000, list.add(true));
+    std::vector<std::size_t> all(1998, list.container(0xA, some));
+    all.push_back(list.container(0xA, std::vector<std::size_t>(1 + beyond, some[0])));
+    list.object(std::string(kMaxValues, ' '));
+    EXPECT_EQ(bool(readBinary(list.finish(list.container(0xA, all)))), beyond == 0);
+  }
 }
 
 // Lying trailers, counts, offsets and references: each byte in turn gets other values.

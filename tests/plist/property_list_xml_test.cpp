@@ -151,6 +151,20 @@ TEST(PropertyListXML, DepthIsLimitedBothWays) {
   EXPECT_FALSE(writeXML(nested(kMaxDepth + 1)));
 }
 
+TEST(PropertyListXML, ValuesAreBoundedByTheMemoryThatTheyTake) {
+  const auto list = [](std::size_t count, std::string_view value) {
+    std::string xml = "<plist><array>";
+    for (std::size_t i = 0; i < count; ++i) xml += value;
+    return read(xml + "</array></plist>");
+  };
+  EXPECT_TRUE(list(kMaxValues, "<true/>"));
+  for (const auto& [count, value] : {std::pair<std::size_t, const char*>{kMaxValues + 1, "<true/>"},
+                                     {600'000, "<array><true/></array>"}}) {
+    const auto refused = list(count, value);
+    EXPECT_TRUE(!refused && refused.error().text.ends_with("too many values")) << value;
+  }
+}
+
 TEST(PropertyListXML, ACutDocumentIsNeverAValue) {
   const std::string whole = *writeXML(Dictionary{{"a", Array{1, "\xE2\x82\xAC", Data{1}}}});
   for (std::size_t length = 0; length + 1 < whole.size(); ++length) {
