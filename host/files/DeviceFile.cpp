@@ -17,7 +17,12 @@ const plist::Value* DeviceFile::value() {
 
 std::optional<plist::Value> DeviceFile::load() const {
   // One byte more, for the codec to see that the file is too long.
-  auto content = root_.readFile(path_, plist::kMaxSize + 1).and_then(plist::read);
+  auto content = root_.readFile(path_, plist::kMaxSize + 1)
+                     .and_then(plist::read)
+                     .and_then([this](plist::Value value) -> base::Result<plist::Value> {
+                       if (root_.takeMemory(plist::memoryOf(value))) return value;
+                       return base::Error{"the device's files hold too much together"};
+                     });
   if (!content) {
     const base::Error& why = content.error();
     if (!isMissing(why) && !why.is(std::errc::not_a_directory)) {

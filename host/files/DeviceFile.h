@@ -16,7 +16,8 @@
 namespace host {
 
 // The file is read by the first call and never again; calls may come from any thread. A file that
-// can't be read or parsed is said once, with an error line, and counts as missing.
+// can't be read or parsed, or that has no room beside the others in what a root's may fill
+// together, is said once, with an error line, and counts as missing.
 class DeviceFile {
  public:
   // `path` as in "device/kernel.plist".

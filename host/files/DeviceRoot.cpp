@@ -89,6 +89,14 @@ base::Result<std::string> DeviceRoot::readFile(std::string_view path, std::size_
   });
 }
 
+bool DeviceRoot::takeMemory(std::size_t bytes) const {
+  std::size_t left = memoryLeft_;
+  while (bytes <= left) {
+    if (memoryLeft_.compare_exchange_weak(left, left - bytes)) return true;
+  }
+  return false;
+}
+
 base::Result<FileDescriptor> DeviceRoot::openFolder(std::string_view path, Missing missing,
                                                     Links links) const {
   const std::string folder = relative(path);

@@ -10,6 +10,8 @@
 // path, for the service that knows what they mean to its user.
 #pragma once
 
+#include <atomic>
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -55,6 +57,11 @@ class DeviceRoot {
   // The bytes of a regular file, at most `maximum` of them.
   base::Result<std::string> readFile(std::string_view path, std::size_t maximum) const;
 
+  // What all files below device/ may fill together while they are held in memory. Takes of it;
+  // false: there isn't as much left.
+  static constexpr std::size_t kMaxHeld = std::size_t{32} << 20;
+  bool takeMemory(std::size_t bytes) const;
+
   // Opens a folder in which the host keeps files. `create` makes what is missing, with mode 0700,
   // but not the root itself. No link is followed (ELOOP), unless `followed` allows those that stay
   // within the root, as a system's own links from one of its folders to another do.
@@ -71,6 +78,7 @@ class DeviceRoot {
   std::string path_;
   mutable Patience patience_;
   base::Result<FileDescriptor> root_;
+  mutable std::atomic<std::size_t> memoryLeft_ = kMaxHeld;
 };
 
 }  // namespace host
