@@ -136,11 +136,7 @@ TEST(StandardStreams, ErrorsAreLinesAndOutputIsAsItIs) {
   streams.writeError("no end");
   streams.writeError("two\nlines\n");
   streams.writeOutput("no end");
-  for (int i = 0; i < 9; ++i) streams.writeError("mode: 0x" + std::to_string(i));
-  streams.writeError("other");
-  EXPECT_EQ(::testing::internal::GetCapturedStderr(),
-            "no end\ntwo\nlines\nmode: 0x0\nmode: 0x1\nmode: 0x2\n"
-            "6 more messages like \"mode: 0x2\"\nother\n");
+  EXPECT_EQ(::testing::internal::GetCapturedStderr(), "no end\ntwo\nlines\n");
   EXPECT_EQ(::testing::internal::GetCapturedStdout(), "no end");
 }
 
