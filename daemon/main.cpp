@@ -8,6 +8,7 @@
 #include "host/Host.h"
 #include "host/process/EndSignals.h"
 #include "host/process/StandardErrorLog.h"
+#include "host/process/Surroundings.h"
 #include "platform/SystemLog.h"
 
 namespace {
@@ -28,6 +29,7 @@ base::Result<void> run(const host::HostOptions& options, int argc, char** argv) 
 }  // namespace
 
 int main(int argc, char** argv) {
+  host::settleIn();
   host::deferEndSignals();  // a day's work that has begun is finished
   auto options = host::HostOptions::fromEnvironment();
   host::StandardErrorLog log(options.lowestLevel);

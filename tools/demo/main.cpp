@@ -7,6 +7,7 @@
 #include <iostream>
 #include <vector>
 
+#include "host/process/Surroundings.h"
 #include "tools/demo/Delivery.h"
 #include "tools/demo/ShowKept.h"
 #include "tools/demo/ShowLeft.h"
@@ -56,6 +57,7 @@ int runLeft(const std::string& root, bool all) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  host::settleIn();
   std::string root;
   std::vector<std::string> logs;
   demo::ShowOptions options;

@@ -15,6 +15,7 @@
 
 #include "base/CivilDate.h"
 #include "host/process/LibraryLoader.h"
+#include "host/process/Surroundings.h"
 #include "host/process/SystemClock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/Terminal.h"
@@ -30,6 +31,7 @@ std::vector<std::string> textsOf(std::span<const char* const> names) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  host::settleIn();
   constexpr int kDone = 0, kFailed = 1, kUsage = 2;
   mkdevice::MakingOptions options;
   options.module = host::installedModule();

@@ -7,6 +7,7 @@
 
 #include <iostream>
 
+#include "host/process/Surroundings.h"
 #include "tools/common/StandardOutput.h"
 #include "tools/common/Terminal.h"
 #include "tools/nandinfo/NandinfoCommand.h"
@@ -30,6 +31,7 @@ int run(std::ostream& out, int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  host::settleIn();
   tools::StandardOutput out;
   return out.end(run(out, argc, argv));
 }

@@ -9,6 +9,7 @@
 #include <thread>
 
 #include "host/Host.h"
+#include "host/process/Surroundings.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/StandardOutput.h"
 #include "tools/pelloran/Pelloran.h"
@@ -34,6 +35,7 @@ int run(std::ostream& out, int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  host::settleIn();
   tools::StandardOutput out;
   return out.end(run(out, argc, argv));
 }
