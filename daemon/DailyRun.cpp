@@ -13,6 +13,7 @@
 #include "platform/FaultwatchSupport.h"
 #include "platform/LogSubmission.h"
 #include "platform/Names.h"
+#include "platform/Outbox.h"
 #include "platform/PreferenceStore.h"
 #include "platform/RunLock.h"
 #include "platform/ServitaLogs.h"
@@ -78,34 +79,48 @@ void runSequence(const Services& services, DeviceContext& context, const Day& da
   }
 }
 
+// The last day that was run; 0 when none is recorded.
+base::Result<std::int64_t> recordedDay(const Services& services) {
+  const auto record = services.preferences.readValue(kGateRecord, platform::kDaemonName);
+  if (!record) return record.error();
+  const auto* last = *record ? (*record)->as<plist::Number>() : nullptr;
+  return last != nullptr ? last->int64Value() : 0;
+}
+
 }  // namespace
 
 void RunDailyTasksIfDue(const Services& services, DeviceContext& context,
                         const ActivatedAppInfo* appInfo) {
   const std::scoped_lock lock(services.runLock);
   const std::int32_t yesterday = base::dayBefore(services.counters.PLDaysSince1970());
-  const auto record = services.preferences.readValue(kGateRecord, platform::kDaemonName);
-  if (!record) {
+  const auto last = recordedDay(services);
+  if (!last) {
     services.log.log(LogLevel::error,
                      "The record of the last day can't be read, so no day is run: %s",
-                     record.error().text.c_str());
+                     last.error().text.c_str());
     return;
   }
-  const auto* last = *record ? (*record)->as<plist::Number>() : nullptr;
-  if ((last != nullptr ? last->int64Value() : 0) >= yesterday) {
+  services.outbox.settle(*last);
+  if (*last >= yesterday) {
     services.log.log(LogLevel::standard, "Day unchanged since last run");
     return;
   }
+  services.outbox.hold(yesterday);
   runSequence(services, context, {yesterday, appInfo});
   const plist::Value done(yesterday);
   services.preferences.QNSPreferencesSetValue(kGateRecord, &done, platform::kDaemonName);
   services.preferences.QNSPreferencesSynchronize(platform::kDaemonName);
+  services.outbox.publish();
 }
 
 void RunDailyTasks(const Services& services, DeviceContext& context, std::int32_t day,
                    const ActivatedAppInfo* appInfo) {
   const std::scoped_lock lock(services.runLock);
+  // What an earlier run left stays where nobody knows whether its day is recorded.
+  if (const auto last = recordedDay(services)) services.outbox.settle(*last);
+  services.outbox.hold({});
   runSequence(services, context, {day, appInfo});
+  services.outbox.publish();
 }
 
 }  // namespace morvend

@@ -20,6 +20,7 @@ class LogSubmission;
 class NamedServices;
 class NetworkUsage;
 class NotificationCenter;
+class Outbox;
 class PreferenceStore;
 class PrivilegedPreferences;
 class ReportingChannels;
@@ -50,6 +51,7 @@ struct Services {
   platform::ReportingChannels& reportingChannels;
   platform::NetworkUsage& networkUsage;
   platform::RunLock& runLock;
+  platform::Outbox& outbox;
   report::Services report;
   NANDInfo::Services storage;
 
@@ -74,6 +76,7 @@ struct Services {
         reportingChannels(source.reportingChannels),
         networkUsage(source.networkUsage),
         runLock(source.runLock),
+        outbox(source.outbox),
         report(source),
         storage(source) {}
 };

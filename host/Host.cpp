@@ -8,6 +8,7 @@
 #include <string_view>
 
 #include "host/PlayedServices.h"
+#include "host/RunOutbox.h"
 #include "host/bus/Bus.h"
 #include "host/files/DeviceFileSystem.h"
 #include "host/outbox/EventSink.h"
@@ -75,20 +76,22 @@ struct Host::Assembly {
   morvend::DeviceContext context{deviceProperties, files, libraries, log};
   CounterStore counters{root, clock, log, [this] { return context.homeOfCounters(); },
                         [this] { countDamagedDatabase(); }};
-  SubmissionSpool submission{root, preferences, clock, log};
+  PendingRun run;
+  SubmissionSpool submission{root, preferences, clock, log, run};
   const std::unique_ptr<StructuredLogFiles> structuredLogs =
-      played ? std::make_unique<PlayedStructuredLogs>(root, clock, log, played->incident)
-             : std::make_unique<StructuredLogFiles>(root, clock, log);
+      played ? std::make_unique<PlayedStructuredLogs>(root, clock, log, run, played->incident)
+             : std::make_unique<StructuredLogFiles>(root, clock, log, run);
   ServitaLogFiles servitaLogs{root, log};
   Bus bus{log};
   PlayedNotifications playedNotifications;
   platform::NotificationCenter& notifications =
       played ? static_cast<platform::NotificationCenter&>(playedNotifications) : bus;
-  EventSink eventSink{root, clock, log};
+  EventSink eventSink{root, clock, log, run};
   recorded::SystemVersion systemVersion{root, log};
   const std::unique_ptr<recorded::Kernel> kernel =
       played ? std::make_unique<PlayedKernel>(root, log, *played)
              : std::make_unique<recorded::Kernel>(root, log);
+  RunOutbox outbox{root, run, submission, *structuredLogs, eventSink, *kernel, preferences, log};
   recorded::KernelSnapshots snapshots{root};
   recorded::DeviceRegistry registry{root, log};
   recorded::PurgeableSpace purgeableSpace{root, log};
@@ -126,7 +129,8 @@ struct Host::Assembly {
                             .applications = applications,
                             .locale = locale,
                             .libraries = libraries,
-                            .runLock = runLock};
+                            .runLock = runLock,
+                            .outbox = outbox};
 };
 
 Host::Host(const HostOptions& options) : assembly_(std::make_unique<Assembly>(options)) {

@@ -38,8 +38,8 @@ class PlayedKernel final : public recorded::Kernel {
 class PlayedStructuredLogs final : public StructuredLogFiles {
  public:
   PlayedStructuredLogs(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
-                       std::string incident)
-      : StructuredLogFiles(root, clock, log), incident_(std::move(incident)) {}
+                       const PendingRun& run, std::string incident)
+      : StructuredLogFiles(root, clock, log, run), incident_(std::move(incident)) {}
   std::string newIncidentIdentifier() override { return incident_; }
 
  private:

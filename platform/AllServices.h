@@ -27,6 +27,7 @@ class LogSubmission;
 class NamedServices;
 class NetworkUsage;
 class NotificationCenter;
+class Outbox;
 class PreferenceStore;
 class PrivilegedPreferences;
 class PurgeableSpace;
@@ -67,6 +68,7 @@ struct AllServices {
   LocaleService& locale;
   LibraryLoader& libraries;
   RunLock& runLock;
+  Outbox& outbox;
 };
 
 }  // namespace platform

@@ -212,10 +212,9 @@ base::Result<RolledOver> rollOver(int folder, const std::string& path, const std
   return rolled;
 }
 
-base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines,
-                               const LockWait& wait) {
+base::Result<FileDescriptor> openLines(int folder, const std::string& name) {
   const AsOwnerOf owner(folder);
-  const auto file = opened(
+  auto file = opened(
       ::openat(folder, name.c_str(),
                O_RDWR | O_CREAT | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600));
   if (!file) {
@@ -223,17 +222,32 @@ base::Result<void> appendLines(int folder, const std::string& name, std::string_
                        file.error().is(std::errc::is_a_directory);
     return other ? notRegular() : file.error();
   }
-  const auto lock = FileLock::take(file->get(), wait);
-  if (!lock) return lock.error();
   struct stat status;
   if (::fstat(file->get(), &status) != 0) return systemError();
   if (!S_ISREG(status.st_mode)) return notRegular();
   if (status.st_nlink > 1) return severalNames();
-  const off_t whole = sizeOfWholeLines(file->get(), status.st_size);
-  if (whole != status.st_size && ::ftruncate(file->get(), whole) != 0) return systemError();
+  return file;
+}
+
+base::Result<std::uint64_t> cutUnfinishedLine(int file) {
+  struct stat status;
+  if (::fstat(file, &status) != 0) return systemError();
+  const off_t whole = sizeOfWholeLines(file, status.st_size);
+  if (whole != status.st_size && ::ftruncate(file, whole) != 0) return systemError();
+  return static_cast<std::uint64_t>(whole);
+}
+
+base::Result<void> appendLines(int folder, const std::string& name, std::string_view lines,
+                               const LockWait& wait) {
+  const auto file = openLines(folder, name);
+  if (!file) return file.error();
+  const auto lock = FileLock::take(file->get(), wait);
+  if (!lock) return lock.error();
+  const auto whole = cutUnfinishedLine(file->get());
+  if (!whole) return whole.error();
   auto appended = writeAll(file->get(), lines);
   // Where this fails too, the next call removes the unfinished line.
-  if (!appended) std::ignore = ::ftruncate(file->get(), whole);
+  if (!appended) std::ignore = ::ftruncate(file->get(), static_cast<off_t>(*whole));
   return appended;
 }
 

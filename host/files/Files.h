@@ -10,6 +10,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -78,6 +79,13 @@ struct RolledOver {
 // path for the error. A kill leaves at most a free number.
 base::Result<RolledOver> rollOver(int folder, const std::string& path, const std::string& name,
                                   int oldest);
+
+// Opens a file that holds lines for reading and appending; makes it when it is missing.
+base::Result<FileDescriptor> openLines(int folder, const std::string& name);
+
+// Removes a line that an earlier failure left unfinished at the end of an open file; the size
+// without it.
+base::Result<std::uint64_t> cutUnfinishedLine(int file);
 
 // Appends lines, whose line feeds the text already holds, to a file that holds lines; makes the
 // file when it is missing. A line is in the file whole or not at all: what a failed write left is

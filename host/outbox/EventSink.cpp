@@ -6,6 +6,7 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 
+#include <cerrno>
 #include <system_error>
 
 #include "host/files/Files.h"
@@ -124,17 +125,42 @@ base::Result<void> EventSink::append(const std::string& lines) {
   // Another process may roll the file over, too.
   const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(kFolder)});
   if (!lock) return lock.error().at(path);
-  if (auto room = makeRoom(folder->get(), lines.size()); !room) return room;
-  const auto append = [&] { return appendLines(folder->get(), kName, lines, {log_, path}); };
+  const std::string name = run_.nameFor(kName);
+  if (auto room = makeRoom(folder->get(), name, lines.size()); !room) return room;
+  const auto append = [&] { return appendLines(folder->get(), name, lines, {log_, path}); };
   return root_.patience()(append).at(path);
 }
 
-base::Result<void> EventSink::makeRoom(int folder, std::uint64_t bytes) {
+base::Result<void> EventSink::synchronise() {
+  drain();
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  return synchronisePending(folder->get()).at(root_.hostPath(kFolder));
+}
+
+base::Result<void> EventSink::settle(const Leaves& leaves) {
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  const LockWait wait{log_, root_.hostPath(kFolder)};
+  const auto lock = FileLock::take(folder->get(), wait);
+  if (!lock) return lock.error().at(wait.path);
+  return settleLines(
+             folder->get(), leaves,
+             [&](const std::string& name, std::uint64_t bytes) {
+               return makeRoom(folder->get(), name, bytes);
+             },
+             wait)
+      .at(root_.hostPath(kFolder));
+}
+
+base::Result<void> EventSink::makeRoom(int folder, const std::string& file, std::uint64_t bytes) {
   // What is not a file of ours, or can't be looked at, is the append's to refuse.
   struct stat status;
-  if (::fstatat(folder, kName, &status, AT_SYMLINK_NOFOLLOW) != 0) return {};
+  if (::fstatat(folder, file.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return {};
   const auto size = static_cast<std::uint64_t>(status.st_size);
   if (!S_ISREG(status.st_mode) || size == 0 || size + bytes <= kMaxFile) return {};
+  // What waits can't roll over; of what leaves, only this file does.
+  if (file != kName) return systemError(EFBIG).at(root_.hostPath(kFolder, kName));
   const auto rolled = rollOver(folder, root_.hostPath(kFolder), kName, kKept);
   if (!rolled) return rolled.error();
   if (!rolled->dropped.empty()) {

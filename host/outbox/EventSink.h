@@ -4,7 +4,7 @@
 // The analytics event sink: events as JSON Lines in var/spool/morvend/events.jsonl. A file that
 // would grow beyond kMaxFile becomes events.jsonl.1 first, that .2, and so on; of more than
 // kKept the oldest is removed, with a line in the log. A number that is taken by anything but a
-// file is passed over, with a line too.
+// file is passed over, with a line too. While a run is on, its events wait; no more than kMaxFile.
 //
 // device/analytics.plist says which events are used ("UsedEvents", an array of names; missing: all)
 // and whether the device has the lazy-send operation ("Available"; default true). It is read when
@@ -23,6 +23,8 @@
 
 #include "base/Result.h"
 #include "host/files/DeviceFile.h"
+#include "host/outbox/LineFiles.h"
+#include "host/files/Pending.h"
 #include "platform/Clock.h"
 #include "platform/Eventra.h"
 #include "platform/SystemLog.h"
@@ -38,9 +40,15 @@ class EventSink final : public platform::Eventra {
   static constexpr std::uint64_t kMaxFile = std::uint64_t{16} << 20;
   static constexpr int kKept = 4;
 
-  // All are borrowed; the clock is asked on the sender's thread, the log used on both.
-  EventSink(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log)
-      : root_(root), clock_(clock), log_(log), file_(root, log, "device/analytics.plist") {}
+  // All are borrowed; the clock is asked on the sender's thread, the log used on both. The run
+  // begins and ends while nothing is queued.
+  EventSink(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
+            const PendingRun& run)
+      : root_(root),
+        clock_(clock),
+        log_(log),
+        run_(run),
+        file_(root, log, "device/analytics.plist") {}
 
   // Drains.
   ~EventSink() override;
@@ -55,6 +63,12 @@ class EventSink final : public platform::Eventra {
   // be written are dropped; the first failure is logged. For one thread at a time, and not for
   // producers.
   void drain();
+
+  // Drains, and brings to disk what waits for the end of the run.
+  base::Result<void> synchronise();
+
+  // Lets what waits leave, or drops it. Nothing is queued.
+  base::Result<void> settle(const Leaves& leaves);
 
  private:
   struct Event {
@@ -75,11 +89,12 @@ class EventSink final : public platform::Eventra {
   void serve();
   void write(const std::vector<Event>& events);
   base::Result<void> append(const std::string& lines);
-  base::Result<void> makeRoom(int folder, std::uint64_t bytes);
+  base::Result<void> makeRoom(int folder, const std::string& file, std::uint64_t bytes);
 
   const DeviceRoot& root_;
   platform::Clock& clock_;
   platform::SystemLog& log_;
+  const PendingRun& run_;
 
   DeviceFile file_;  // the configuration's
   std::once_flag configured_;

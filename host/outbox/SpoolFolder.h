@@ -10,6 +10,7 @@
 
 #include <sys/stat.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -19,6 +20,8 @@
 
 #include "host/files/DeviceRoot.h"
 #include "host/files/Files.h"
+#include "host/outbox/LineFiles.h"
+#include "host/files/Pending.h"
 #include "platform/SystemLog.h"
 
 namespace host {
@@ -28,9 +31,12 @@ class SpoolFolder {
   static constexpr char kPath[] = "/var/spool/morvend/submitted";
   static constexpr char kOptionsSuffix[] = ".options.plist";
 
-  // What the folder may hold. Options count for the bytes.
-  static constexpr std::size_t kMaxLogs = 1000;
+  // What the folder may hold, with what waits. Options count for the bytes. A quarter is kept from
+  // structured logs: they can't push out all others.
+  static constexpr std::size_t kMaxLogs = 1000, kMaxStructuredLogs = 750;
   static constexpr std::uint64_t kMaxBytes = std::uint64_t{64} << 20;
+  static constexpr std::uint64_t kMaxStructuredBytes = std::uint64_t{48} << 20;
+  static constexpr char kStructured[] = "structured-";  // what their names begin with
 
   // Files that aren't logs yet are kept under these names.
   static constexpr char kUnfinishedLog[] = ".log.new";
@@ -53,6 +59,14 @@ class SpoolFolder {
   // Removes what stands under a name, if anything does.
   void remove(const std::string& name);
 
+  // Removes the oldest structured log or, where there is none, the oldest log, for the sake of one
+  // that the disk has no room for, with a line in the log. False when there is none.
+  bool removeOldest();
+
+  // Gives the logs that wait their names where `leaves` says so of their run's day, and removes the
+  // others. A log comes with its options, or not at all. The first failure.
+  base::Result<void> settle(const Leaves& leaves);
+
  private:
   struct Log {
     std::string name;
@@ -64,7 +78,10 @@ class SpoolFolder {
               FileLock lock)
       : root_(root), log_(log), folder_(std::move(folder)), lock_(std::move(lock)) {}
   base::Result<void> lookAround();
-  void makeRoom(std::uint64_t bytes);
+  void makeRoom(const std::string& stem, std::uint64_t bytes);
+  bool remove(std::vector<Log>::iterator log, const char* why);
+  base::Result<void> publish(const std::string& waiting, const PendingName& pending);
+  static bool isStructured(const Log& log);
   bool isFree(const std::string& name) const;
 
   const DeviceRoot& root_;

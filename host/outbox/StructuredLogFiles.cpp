@@ -8,7 +8,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <array>
 #include <limits>
 #include <vector>
 
@@ -32,21 +31,6 @@ constexpr off_t kMaxPart = off_t{16} << 20;
 // What one dump may move: the spool keeps room for the day's other logs.
 constexpr off_t kMaxMoved = static_cast<off_t>(SpoolFolder::kMaxBytes) - kMaxPart;
 
-// The end of the last line that ends within [from, to), or `to` where none does.
-off_t lastLineEnd(int file, off_t from, off_t to) {
-  std::array<char, 65536> block;
-  for (off_t end = to; end > from;) {
-    const off_t start = std::max<off_t>(end - off_t{block.size()}, from);
-    const auto wanted = static_cast<std::size_t>(end - start);
-    const ssize_t got = ::pread(file, block.data(), wanted, start);
-    if (got <= 0) break;
-    const std::string_view read(block.data(), static_cast<std::size_t>(got));
-    if (const auto at = read.rfind('\n'); at != read.npos) return start + off_t(at) + 1;
-    end = start;
-  }
-  return to;
-}
-
 // Where the parts of a file begin, from an offset on.
 std::vector<off_t> partsOf(int file, off_t from, off_t size) {
   std::vector<off_t> starts{from};
@@ -54,20 +38,6 @@ std::vector<off_t> partsOf(int file, off_t from, off_t size) {
     starts.push_back(lastLineEnd(file, starts.back(), starts.back() + kMaxPart));
   }
   return starts;
-}
-
-base::Result<void> copyPart(int from, off_t start, off_t end, int to) {
-  std::array<char, 65536> block;
-  while (start < end) {
-    const auto wanted = static_cast<std::size_t>(std::min<off_t>(end - start, block.size()));
-    const ssize_t got = ::pread(from, block.data(), wanted, start);
-    if (got < 0) return systemError();
-    if (got == 0) return systemError(EIO);
-    auto written = writeAll(to, {block.data(), static_cast<std::size_t>(got)});
-    if (!written) return written;
-    start += got;
-  }
-  return checked(::fsync(to));
 }
 
 // Copies a part of a file into the spool.
@@ -79,7 +49,9 @@ base::Result<void> submitPart(int file, off_t start, off_t end, const std::strin
   };
   auto submitted = makeFile(spool.descriptor(), SpoolFolder::kUnfinishedLog)
                        .and_then([&](const FileDescriptor& part) {
-                         return copyPart(file, start, end, part.get());
+                         return copyBytes(file, start, end, part.get()).and_then([&] {
+                           return checked(::fsync(part.get()));
+                         });
                        })
                        .and_then([&] {
                          return spool.place(stem, std::string(kSuffix),
@@ -125,6 +97,13 @@ off_t sizeOfAll(int folder, const std::vector<std::string>& names) {
   return all;
 }
 
+// The size of a file; 0 where there is none that lines could be appended to.
+std::uint64_t sizeOf(int folder, const std::string& name) {
+  struct stat status;
+  const bool known = ::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0;
+  return known && S_ISREG(status.st_mode) ? static_cast<std::uint64_t>(status.st_size) : 0;
+}
+
 // Moves a file but for its first `dropped` bytes, of which it takes what it drops. `path` is the
 // file's for the log.
 base::Result<void> moveToSpool(int folder, const std::string& name, const std::string& path,
@@ -162,16 +141,50 @@ void StructuredLogFiles::logStructuredData(std::int32_t type, const plist::Dicti
   plist::appendJSON(line, plist::Dictionary{{"type", type}, {"time", now}, {"data", data}});
   line += '\n';
   const std::string name = fileDay(now.secondsSince1970).append(kSuffix);
-  const auto appended =
-      root_.openFolder(kFolder, DeviceRoot::Missing::create)
-          .and_then([&](const FileDescriptor& folder) {
-            return root_.patience()([&] {
-              return appendLines(folder.get(), name, line, {log_, root_.hostPath(kFolder, name)});
-            });
-          });
+  const auto appended = append(name, line);
   if (appended || !said_.insert(appended.error().text).second) return;
   log_.log(platform::LogLevel::error, "Could not write %s: %s; structured logs are dropped",
            root_.hostPath(kFolder, name).c_str(), appended.error().text.c_str());
+}
+
+base::Result<void> StructuredLogFiles::append(const std::string& name, std::string_view line) {
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
+  if (!folder) return folder.error();
+  const std::string now = run_.nameFor(name);
+  const std::uint64_t waiting = run_.isOn() ? sizeOf(folder->get(), now) : 0;
+  if (sizeOf(folder->get(), name) + waiting + line.size() > kMaxDay) {
+    ++dropped_;
+    return {};
+  }
+  return root_.patience()([&] {
+    return appendLines(folder->get(), now, line, {log_, root_.hostPath(kFolder, name)});
+  });
+}
+
+void StructuredLogFiles::sayDropped() {
+  if (dropped_ == 0) return;
+  log_.log(platform::LogLevel::error,
+           "Dropped %zu structured logs: those of a day take at most %llu bytes", dropped_,
+           static_cast<unsigned long long>(kMaxDay));
+  dropped_ = 0;
+}
+
+StructuredLogFiles::~StructuredLogFiles() { sayDropped(); }
+
+base::Result<void> StructuredLogFiles::synchronise() {
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  return synchronisePending(folder->get()).at(root_.hostPath(kFolder));
+}
+
+base::Result<void> StructuredLogFiles::settle(const Leaves& leaves) {
+  sayDropped();
+  const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  return settleLines(folder->get(), leaves,
+                     [](const std::string&, std::uint64_t) { return base::Result<void>(); },
+                     {log_, root_.hostPath(kFolder)})
+      .at(root_.hostPath(kFolder));
 }
 
 void StructuredLogFiles::dumpAllOldStructuredDataLogs() {

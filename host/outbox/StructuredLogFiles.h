@@ -5,10 +5,15 @@
 // var/spool/morvend/structured/<day>.jsonl.
 #pragma once
 
+#include <cstdint>
 #include <set>
 #include <string>
+#include <string_view>
 
+#include "base/Result.h"
 #include "host/files/DeviceRoot.h"
+#include "host/outbox/LineFiles.h"
+#include "host/files/Pending.h"
 #include "host/outbox/RandomUUID.h"
 #include "platform/Clock.h"
 #include "platform/FaultwatchSupport.h"
@@ -18,11 +23,19 @@ namespace host {
 
 class StructuredLogFiles : public platform::FaultwatchSupport {
  public:
-  // All are borrowed.
-  StructuredLogFiles(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log)
-      : root_(root), clock_(clock), log_(log) {}
+  // What the logs of one day may take. What is beyond is dropped, and counted in one line.
+  static constexpr std::uint64_t kMaxDay = std::uint64_t{8} << 20;
 
-  // A log that can't be written is dropped, with an error line for the first of each reason.
+  // All are borrowed.
+  StructuredLogFiles(const DeviceRoot& root, platform::Clock& clock, platform::SystemLog& log,
+                     const PendingRun& run)
+      : root_(root), clock_(clock), log_(log), run_(run) {}
+
+  // Says how many logs were dropped.
+  ~StructuredLogFiles() override;
+
+  // Waits while a run is on. A log that can't be written is dropped, with an error line for the
+  // first of each reason.
   void logStructuredData(std::int32_t type, const plist::Dictionary& data) override;
 
   // Moves the files of earlier days to the spool of submitted logs, as structured-<day>.jsonl; one
@@ -32,10 +45,21 @@ class StructuredLogFiles : public platform::FaultwatchSupport {
 
   std::string newIncidentIdentifier() override { return randomUUID(); }
 
+  // Brings to disk what waits, so that it can leave after whatever happens.
+  base::Result<void> synchronise();
+
+  // Lets what waits leave, or drops it.
+  base::Result<void> settle(const Leaves& leaves);
+
  private:
+  base::Result<void> append(const std::string& name, std::string_view line);
+  void sayDropped();
+
   const DeviceRoot& root_;
   platform::Clock& clock_;
   platform::SystemLog& log_;
+  const PendingRun& run_;
+  std::size_t dropped_ = 0;     // beyond the bytes of a day, since the last line that said so
   std::set<std::string> said_;  // why logs couldn't be written
 };
 

@@ -5,7 +5,9 @@
 
 #include <fcntl.h>
 
+#include <algorithm>
 #include <optional>
+#include <system_error>
 #include <tuple>
 
 #include "host/files/FileTime.h"
@@ -21,7 +23,7 @@ namespace {
 // Room for "-2", "-3", …; the spool's own bounds keep the number far below.
 constexpr std::size_t kMaxStem = kMaxFileName -
                                  std::string_view(SpoolFolder::kOptionsSuffix).size() -
-                                 std::string_view("-1000000000").size();
+                                 std::string_view("-1000000000").size() - kMaxPendingPrefix;
 
 // A file being written.
 class OpenLog final : public platform::LogHandle {
@@ -58,8 +60,10 @@ base::Result<std::uint64_t> writeUnfinished(const SpoolFolder& spool, const char
   return log.finish();
 }
 
-// Gives the unfinished files their names, the log last; takes them back when that fails.
-base::Result<void> publish(int folder, const std::string& name, bool withOptions) {
+// Gives the unfinished files their names, the log last; takes them back when that fails. Names of
+// logs that wait are brought to disk together, later.
+base::Result<void> nameUnfinished(int folder, const std::string& name, bool withOptions,
+                                  bool waits) {
   const std::string optionsName = name + SpoolFolder::kOptionsSuffix;
   if (withOptions) {
     auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedOptions, folder, optionsName);
@@ -67,7 +71,7 @@ base::Result<void> publish(int folder, const std::string& name, bool withOptions
   }
   auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedLog, folder, name);
   if (named) {
-    named = checked(::fsync(folder));
+    if (!waits) named = checked(::fsync(folder));
     if (named) return named;
     std::ignore = renameToFreeName(folder, name, folder, SpoolFolder::kUnfinishedLog);
   }
@@ -78,9 +82,10 @@ base::Result<void> publish(int folder, const std::string& name, bool withOptions
 }
 
 // Leaves the unfinished files behind when it fails.
-base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
-                                   const std::optional<std::string>& options,
-                                   const platform::LogSubmission::Writer& writer) {
+base::Result<void> writeAndName(SpoolFolder& spool, const std::string& stem,
+                                const std::optional<std::string>& options,
+                                const platform::LogSubmission::Writer& writer,
+                                const PendingRun& run) {
   auto size = writeUnfinished(spool, SpoolFolder::kUnfinishedLog, writer);
   if (!size) return size.error();
   if (options) {
@@ -90,7 +95,7 @@ base::Result<void> writeAndPublish(SpoolFolder& spool, const std::string& stem,
     *size += *more;
   }
   return spool.place(stem, "", *size, [&](const std::string& name) {
-    return publish(spool.descriptor(), name, options.has_value());
+    return nameUnfinished(spool.descriptor(), run.nameFor(name), options.has_value(), run.isOn());
   });
 }
 
@@ -110,8 +115,11 @@ bool SubmissionSpool::QNSWriteLogForSubmission(std::string_view logType, std::st
                            fileTime(clock_.now().secondsSince1970);
   const bool named = !logType.empty() && !logName.empty() && !logName.starts_with('.') &&
                      isPlainFileName(stem, kMaxStem);
-  auto submitted = named ? root_.patience()([&] { return submit(stem, options, writer); })
-                         : base::Error{"not a file name"};
+  const auto attempt = [&] { return submit(stem, options, writer); };
+  auto submitted = named ? root_.patience()(attempt) : base::Error{"not a file name"};
+  while (!submitted && submitted.error().is(std::errc::no_space_on_device) && removeOldest()) {
+    submitted = attempt();
+  }
   submitted = std::move(submitted).at(root_.hostPath(SpoolFolder::kPath, stem));
   if (submitted) return true;
   log_.log(platform::LogLevel::error, "Could not submit %s", submitted.error().text.c_str());
@@ -129,12 +137,35 @@ base::Result<void> SubmissionSpool::submit(const std::string& stem,
   }
   const auto spool = SpoolFolder::open(root_, log_);
   if (!spool) return spool.error();
-  auto published = writeAndPublish(**spool, stem, optionsText, writer);
-  if (!published) {
+  auto submitted = writeAndName(**spool, stem, optionsText, writer, run_);
+  if (!submitted) {
     (*spool)->remove(SpoolFolder::kUnfinishedLog);
     (*spool)->remove(SpoolFolder::kUnfinishedOptions);
   }
-  return published;
+  return submitted;
+}
+
+bool SubmissionSpool::removeOldest() {
+  const auto spool = SpoolFolder::open(root_, log_);
+  return spool && (*spool)->removeOldest();
+}
+
+base::Result<void> SubmissionSpool::synchronise() {
+  const auto folder = root_.openFolder(SpoolFolder::kPath, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  return checked(::fsync(folder->get())).at(root_.hostPath(SpoolFolder::kPath));
+}
+
+base::Result<void> SubmissionSpool::settle(const Leaves& leaves) {
+  // The spool is looked through only where something waits.
+  const auto folder = root_.openFolder(SpoolFolder::kPath, DeviceRoot::Missing::fails);
+  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  const auto names = namesInFolder(folder->get());
+  const auto waits = [](const std::string& name) { return parsePendingName(name).has_value(); };
+  if (names && std::ranges::none_of(*names, waits)) return {};
+  const auto spool = SpoolFolder::open(root_, log_);
+  auto settled = spool ? (*spool)->settle(leaves) : spool.error();
+  return std::move(settled).at(root_.hostPath(SpoolFolder::kPath));
 }
 
 }  // namespace host

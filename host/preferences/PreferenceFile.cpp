@@ -60,7 +60,7 @@ void PreferenceFile::change(std::string_view key, const plist::Value* value) {
 }
 
 void PreferenceFile::flush() {
-  if (!set_.empty() || !removed_.empty()) write(nullptr);
+  if (!held_ && (!set_.empty() || !removed_.empty())) write(nullptr);
 }
 
 base::Result<void> PreferenceFile::written() const {

@@ -40,8 +40,16 @@ class PreferenceFile {
   // Sets a key, or removes it (null); to be written by the next flush.
   void change(std::string_view key, const plist::Value* value);
 
-  // Brings the changes to the file. What couldn't be written stays a change.
+  // Brings the changes to the file, unless they are held back. What couldn't be written stays a
+  // change.
   void flush();
+
+  // From `hold` on changes are held back, so that `release` brings them to the file together.
+  void hold() { held_ = true; }
+  void release() {
+    held_ = false;
+    flush();
+  }
 
   // Whether the last change or addition is in the file; the error is of the file's path.
   base::Result<void> written() const;
@@ -73,6 +81,7 @@ class PreferenceFile {
 
   plist::Dictionary set_;
   std::set<std::string, std::less<>> removed_;
+  bool held_ = false;
 
   std::optional<base::Error> readError_;
   base::Result<void> written_;

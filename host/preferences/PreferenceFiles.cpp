@@ -93,6 +93,19 @@ void PreferenceFiles::writeHeld() {
   }
 }
 
+void PreferenceFiles::hold(std::string_view domain) {
+  const std::scoped_lock lock(mutex_);
+  if (PreferenceFile* known = file(kSystemUser, domain)) known->hold();
+}
+
+base::Result<void> PreferenceFiles::release(std::string_view domain) {
+  const std::scoped_lock lock(mutex_);
+  PreferenceFile* known = file(kSystemUser, domain);
+  if (known == nullptr) return base::Error{"no such domain"};
+  known->release();
+  return known->written();
+}
+
 void PreferenceFiles::addToInteger(std::string_view key, std::string_view domain,
                                    std::int64_t delta) {
   const std::scoped_lock lock(mutex_);

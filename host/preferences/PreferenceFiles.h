@@ -32,6 +32,11 @@ class PreferenceFiles final : public platform::PreferenceStore,
   // file that couldn't be written, of its path.
   base::Result<void> flushAll();
 
+  // From `hold` on a domain of user "mobile" is not synchronised, so that `release` writes all that
+  // has changed meanwhile at once; whether it could be written, the error of the file's path.
+  void hold(std::string_view domain);
+  base::Result<void> release(std::string_view domain);
+
   // Adds to an integer of user "mobile", at once and atomically: see PreferenceFile::add.
   void addToInteger(std::string_view key, std::string_view domain, std::int64_t delta);
 

@@ -11,7 +11,6 @@
 #include <algorithm>
 #include <array>
 #include <cerrno>
-#include <charconv>
 #include <cstdint>
 #include <cstring>
 #include <ctime>
@@ -80,29 +79,6 @@ platform::Kernel::ReadResult swapUsage(std::span<std::byte> buffer) {
   return deliver(record.data(), buffer.size() < record.size() ? 8 : record.size(), buffer);
 }
 
-// The name under which an event waits: ".taken-<day>.<name>", with "run" for no day.
-constexpr std::string_view kTaken = ".taken-", kNoDay = "run";
-
-struct TakenName {
-  std::optional<std::int32_t> day;
-  std::string name;
-};
-
-std::optional<TakenName> parseTaken(std::string_view file) {
-  if (!file.starts_with(kTaken)) return std::nullopt;
-  file.remove_prefix(kTaken.size());
-  const std::size_t dot = file.find('.');
-  if (dot == file.npos || dot + 1 == file.size()) return std::nullopt;
-  const std::string_view day = file.substr(0, dot);
-  TakenName taken{std::nullopt, std::string(file.substr(dot + 1))};
-  if (day == kNoDay) return taken;
-  std::int32_t number = 0;
-  const auto [end, error] = std::from_chars(day.data(), day.data() + day.size(), number);
-  if (error != std::errc() || end != day.data() + day.size()) return std::nullopt;
-  taken.day = number;
-  return taken;
-}
-
 // Renames a file of the folder to the first of the names <to>, <to>-2, and so on that is free.
 base::Result<void> renameNumbered(int folder, const std::string& from, int toFolder,
                                   const std::string& to) {
@@ -161,7 +137,7 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
     return std::nullopt;
   }
   for (const std::string& name : *names) {
-    if (name == kRejected || name.starts_with(kTaken)) continue;
+    if (name == kRejected || parsePendingName(name)) continue;
     const auto bytes = root_.readFile(kEventsFolder + ("/" + name), kMaxEventSize + 1);
     if (!bytes) {
       say(name, bytes.error().text);
@@ -187,21 +163,19 @@ std::optional<platform::Kernel::ReadResult> Kernel::nextEvent(std::span<std::byt
 }
 
 base::Result<void> Kernel::take(int folder, const std::string& name) const {
-  if (!taker_) return checked(::unlinkat(folder, name.c_str(), 0));
-  std::string taken(kTaken);
-  taken += taker_->day ? std::to_string(*taker_->day) : std::string(kNoDay);
-  return renameNumbered(folder, name, folder, taken + "." + name);
+  return run_.isOn() ? renameNumbered(folder, name, folder, run_.nameFor(name))
+                     : checked(::unlinkat(folder, name.c_str(), 0));
 }
 
-base::Result<void> Kernel::settleEvents(const Done& done) {
-  taker_.reset();
+base::Result<void> Kernel::settle(const Done& done) {
+  run_.end();
   const auto folder = root_.openFolder(kEventsFolder, DeviceRoot::Missing::fails);
   if (!folder && isMissing(folder.error())) return {};
   const auto names = folder ? namesInFolder(folder->get()) : folder.error();
   if (!names) return names.error().at(root_.hostPath(kEventsFolder));
   base::Result<void> settled;
   for (const std::string& name : *names) {
-    const auto taken = parseTaken(name);
+    const auto taken = parsePendingName(name);
     if (!taken) continue;
     auto dealt = done(taken->day) ? checked(::unlinkat(folder->get(), name.c_str(), 0))
                                   : renameNumbered(folder->get(), name, folder->get(), taken->name);

@@ -13,6 +13,7 @@
 
 #include "base/Result.h"
 #include "host/files/DeviceFile.h"
+#include "host/files/Pending.h"
 #include "platform/Kernel.h"
 
 namespace host::recorded {
@@ -34,13 +35,13 @@ class Kernel : public platform::Kernel {
   // From now on a file that is delivered waits in the folder under a name that no event has, until
   // it is settled: it must not be gone before what was made of it is on disk. `day` is the one that
   // the run is for, if it is for one.
-  void holdEvents(std::optional<std::int32_t> day) { taker_ = Taker{day}; }
+  void holdEvents(std::optional<std::int32_t> day) { run_.begin(day); }
 
   // Deals with the files that wait, those of an earlier process included: where `done` says so of
   // the day that their run was for they are removed, else they are events again. Events are held no
   // longer. The error is of the folder's path.
   using Done = std::function<bool(const std::optional<std::int32_t>& day)>;
-  base::Result<void> settleEvents(const Done& done);
+  base::Result<void> settle(const Done& done);
 
   std::uint64_t pageSize() override;
   std::uint64_t absoluteTime() override;
@@ -48,9 +49,6 @@ class Kernel : public platform::Kernel {
   Process process() override;
 
  private:
-  struct Taker {
-    std::optional<std::int32_t> day;
-  };
   base::Result<void> take(int folder, const std::string& name) const;
   std::optional<ReadResult> nextEvent(std::span<std::byte> buffer);
   const plist::Value* deviceValue(std::string_view name);
@@ -58,7 +56,7 @@ class Kernel : public platform::Kernel {
   const DeviceRoot& root_;
   platform::SystemLog& log_;
   DeviceFile values_;
-  std::optional<Taker> taker_;        // while events are held
+  PendingRun run_;                    // for which events wait
   std::set<std::string> saidEvents_;  // the files of events that were complained of
 };
 

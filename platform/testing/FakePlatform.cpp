@@ -363,6 +363,7 @@ FakePlatform::FakePlatform(LogLevel lowest)
                .applications = device,
                .locale = device,
                .libraries = device,
-               .runLock = runLock} {}
+               .runLock = runLock,
+               .outbox = outbox} {}
 
 }  // namespace platform::fakes

@@ -35,6 +35,7 @@
 #include "platform/LocaleService.h"
 #include "platform/LogSubmission.h"
 #include "platform/NetworkUsage.h"
+#include "platform/Outbox.h"
 #include "platform/PLHistory.h"
 #include "platform/PreferenceStore.h"
 #include "platform/PurgeableSpace.h"
@@ -361,6 +362,19 @@ class FakeStreams : public StandardStreams {
   void writeOutput(std::string_view text) override { output += text; }
 };
 
+// Says what is asked of it by `calls`: "settle <day>", "hold <day>", "hold", "publish".
+class FakeOutbox : public Outbox {
+ public:
+  std::vector<std::string> calls;
+  void settle(std::int64_t recordedDay) override {
+    calls.push_back("settle " + std::to_string(recordedDay));
+  }
+  void hold(std::optional<std::int32_t> day) override {
+    calls.push_back(day ? "hold " + std::to_string(*day) : "hold");
+  }
+  void publish() override { calls.push_back("publish"); }
+};
+
 class FakeRunLock : public RunLock {
  public:
   int held = 0, taken = 0;
@@ -393,6 +407,7 @@ class FakePlatform {
   FakeReportingChannels reportingChannels;
   FakeNetworkUsage networkUsage;
   FakeRunLock runLock;
+  FakeOutbox outbox;
   AllServices platform;
 };
 

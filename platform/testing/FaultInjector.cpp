@@ -314,7 +314,8 @@ struct FaultInjector::Decorated {
                  .applications = inner.applications,
                  .locale = inner.locale,
                  .libraries = device,
-                 .runLock = inner.runLock} {}
+                 .runLock = inner.runLock,
+                 .outbox = inner.outbox} {}
 
   Plan plan;
   Files files;

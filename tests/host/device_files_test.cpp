@@ -212,10 +212,10 @@ TEST_F(DeviceFiles, EccEventsWaitUntilWhatCameOfThemIsOnDisk) {
     }
     folder.write("device/ecc-events/1", "new");
     Kernel next(root, log);
-    EXPECT_TRUE(next.settleEvents([&](const auto& of) { return of != day; }));
+    EXPECT_TRUE(next.settle([&](const auto& of) { return of != day; }));
     next.holdEvents(day);
     for (const char* event : {"new", "one", "two", ""}) EXPECT_EQ(read(next), event);
-    EXPECT_TRUE(next.settleEvents([&](const auto& of) { return of == day; }));
+    EXPECT_TRUE(next.settle([&](const auto& of) { return of == day; }));
     EXPECT_EQ(count(), 1);
     folder.write("device/ecc-events/1", "not held");
     EXPECT_EQ(read(next), "not held");

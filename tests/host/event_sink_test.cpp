@@ -18,7 +18,8 @@ namespace {
 constexpr char kEvents[] = "var/spool/morvend/events.jsonl";
 
 struct EventSinkTest : testing::Test, support::HostServices {
-  EventSink sink{root, clock, log};
+  PendingRun run;
+  EventSink sink{root, clock, log, run};
 
   static plist::Dictionary nothing() { return {}; }
   void send(const char* event = "event") {
@@ -78,7 +79,7 @@ TEST_F(EventSinkTest, OnlyUsedEventsAreProduced) {
   send("used");
   EXPECT_EQ(lines(), 1);
   folder.write("device/analytics.plist", xml({{"Available", false}}));
-  EventSink absent(root, clock, log);
+  EventSink absent(root, clock, log, run);
   EXPECT_FALSE(absent.offersLazySend());
   EXPECT_TRUE(absent.EventraIsEventUsed("used"));
   EXPECT_FALSE(absent.EventraSendEventLazy("used", never));
@@ -143,7 +144,7 @@ TEST_F(EventSinkTest, EventsThatCannotBeWrittenAreDroppedWithOneLine) {
     if (row.folders.size() != 1) folder.write(name, row.secondName ? "one\n" : full);
     for (const char* end : row.folders) std::filesystem::create_directories(folder / (name + end));
     if (row.secondName) std::filesystem::create_hard_link(folder / name, folder / "other");
-    EventSink failing(root, clock, log);
+    EventSink failing(root, clock, log, run);
     for (int n = 0; n < 3; ++n) {
       EXPECT_TRUE(failing.EventraSendEventLazy("event", nothing));
       failing.drain();

@@ -18,7 +18,8 @@ constexpr char kStructured[] = "var/spool/morvend/structured/";
 constexpr char kSubmitted[] = "var/spool/morvend/submitted/";
 
 struct StructuredLogFilesTest : testing::Test, support::HostServices {
-  StructuredLogFiles logs{root, clock, log};
+  PendingRun run;
+  StructuredLogFiles logs{root, clock, log, run};
 
   std::string structured(const std::string& name) const { return folder.read(kStructured + name); }
   std::string submitted(const std::string& name) const { return folder.read(kSubmitted + name); }

@@ -23,7 +23,8 @@ constexpr char kLog[] = "log-pellorand.193.20261122T040000Z";
 
 struct SubmissionSpoolTest : testing::Test, support::HostServices {
   PreferenceFiles preferences{root, log};
-  SubmissionSpool spool{root, preferences, clock, log};
+  PendingRun run;
+  SubmissionSpool spool{root, preferences, clock, log, run};
 
   bool submit(const std::string& bytes = "bytes", const plist::Dictionary* options = nullptr,
               const std::string& type = "193", const std::string& name = "log-pellorand") {
