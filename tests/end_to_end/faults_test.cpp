@@ -44,7 +44,6 @@ void checkDevice(const Device& before, const Device& clean, const Device& device
   const auto said = [&faulty](const char* text) {
     return faulty.standardError.find(text) != std::string::npos;
   };
-  const bool killed = faulty.signal != 0;
   EXPECT_EQ(device.history(), before.history()) << what;
   EXPECT_EQ(device.record(kGateRecord), Value(device.today() - 1)) << what;
   EXPECT_EQ(device.record("TaskingID"), Value("T1")) << what;
