@@ -327,7 +327,7 @@ Result<void> CounterDatabase::openAs(Use use, const std::string& path, Connectio
   if (use == Use::read) {
     // A scan comes to each page once: a cache of many would be memory that is filled and never
     // read.
-    const auto set = (*connection)->execute("PRAGMA cache_size = -128");
+    auto set = (*connection)->execute("PRAGMA cache_size = -128");
     if (!set) return set;
   }
   const auto sound = verifySchema(**connection, use);

@@ -38,7 +38,7 @@ base::Result<void> pack(sqlite::Connection& connection) {
   bool any = false;
   sqlite::Statement staged(connection,
                            "SELECT day, key, seconds, value FROM staged ORDER BY day, key, rowid");
-  const auto read = staged.forEach([&] {
+  auto read = staged.forEach([&] {
     any = true;
     const sqlite::Column itsDay = staged.column(0), itsKey = staged.column(1);
     const sqlite::Column second = staged.column(2), value = staged.column(3);

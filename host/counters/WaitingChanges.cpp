@@ -126,8 +126,8 @@ Result<std::string> nameForBatch(int journal, std::size_t size) {
   }
   std::uint64_t chance = 0;
   if (::getrandom(&chance, sizeof chance, 0) != sizeof chance) return systemError();
-  return base::format("%016llx-%016llx", static_cast<unsigned long long>(last + 1),
-                      static_cast<unsigned long long>(chance));
+  const unsigned long long next = last + 1;
+  return base::format("%016llx-%016llx", next, static_cast<unsigned long long>(chance));
 }
 
 Result<void> keep(int folder, std::string_view batch) {

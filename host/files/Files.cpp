@@ -152,7 +152,7 @@ base::Result<void> replaceFile(int folder, const std::string& name, std::string_
   if (!beside) return beside.error();
   const int file = beside->file.get();
   const char* from = beside->name.c_str();
-  const auto replaced =
+  auto replaced =
       writeAll(file, bytes).and_then([&] { return checked(::fsync(file)); }).and_then([&] {
         return checked(::renameat(folder, from, folder, name.c_str()));
       });

@@ -155,7 +155,7 @@ base::Result<void> SpoolFolder::place(const std::string& stem, const std::string
     if (number > 1) name.append("-").append(std::to_string(number));
     name += extension;
     if (!isFree(name)) continue;
-    const auto placed = put(name);
+    auto placed = put(name);
     if (!placed && placed.error().is(std::errc::file_exists)) continue;
     if (!placed) return placed;
     names_.insert(name);

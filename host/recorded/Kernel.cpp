@@ -91,7 +91,7 @@ base::Result<void> renameNumbered(int folder, const std::string& from, int toFol
 
 // Moves a file of the folder to its rejected ones, under a name that is free.
 base::Result<void> reject(int folder, const std::string& name) {
-  const auto made = makeFolder(folder, kRejected);
+  auto made = makeFolder(folder, kRejected);
   if (!made && !made.error().is(std::errc::file_exists)) return made;
   const auto rejected =
       opened(::openat(folder, kRejected, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));

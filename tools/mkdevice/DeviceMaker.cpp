@@ -123,7 +123,7 @@ Result<void> playDay(const MakingOptions& options, Sample sample, const SampleCo
              .played = dailyRun(sample),
              .log = options.log});
   morvend::RunDailyTasksIfDue(host.services(), host.context(), nullptr);
-  const auto recorded = host.counters().apply(counters.ofDay(sample.today)).and_then([&] {
+  auto recorded = host.counters().apply(counters.ofDay(sample.today)).and_then([&] {
     return host.counters().settle();
   });
   if (!recorded) return recorded;
