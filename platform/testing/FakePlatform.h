@@ -35,16 +35,15 @@
 #include "platform/LocaleService.h"
 #include "platform/LogSubmission.h"
 #include "platform/NetworkUsage.h"
-#include "platform/Outbox.h"
 #include "platform/PLHistory.h"
 #include "platform/PreferenceStore.h"
 #include "platform/PurgeableSpace.h"
 #include "platform/ReportingChannels.h"
-#include "platform/RunLock.h"
 #include "platform/ServitaLogs.h"
 #include "platform/StandardStreams.h"
 #include "platform/SystemLog.h"
 #include "platform/testing/FakeDeviceRegistry.h"
+#include "platform/testing/FakeRun.h"
 #include "platform/testing/RecordingLog.h"
 
 namespace platform::fakes {
@@ -360,26 +359,6 @@ class FakeStreams : public StandardStreams {
   std::string output;
   void writeError(std::string_view text) override { errors.emplace_back(text); }
   void writeOutput(std::string_view text) override { output += text; }
-};
-
-// Says what is asked of it by `calls`: "settle <day>", "hold <day>", "hold", "publish".
-class FakeOutbox : public Outbox {
- public:
-  std::vector<std::string> calls;
-  void settle(std::int64_t recordedDay) override {
-    calls.push_back("settle " + std::to_string(recordedDay));
-  }
-  void hold(std::optional<std::int32_t> day) override {
-    calls.push_back(day ? "hold " + std::to_string(*day) : "hold");
-  }
-  void publish() override { calls.push_back("publish"); }
-};
-
-class FakeRunLock : public RunLock {
- public:
-  int held = 0, taken = 0;
-  void lock() override { ++held, ++taken; }
-  void unlock() override { --held; }
 };
 
 // All of them, assembled.

@@ -82,6 +82,8 @@ TEST_F(DailyRunTest, RunsTheSequenceInItsOrderThenWritesTheRecord) {
   Lines without = kSequence;
   without.erase(without.begin() + 1);
   EXPECT_EQ(platform.journal, without);
+  EXPECT_EQ(platform.outbox.calls,
+            (Lines{"settle 0", "hold 20000", "publish", "settle 20000", "hold", "publish"}));
 }
 
 TEST_F(DailyRunTest, OpensTheGateOnceADayWhateverTheClockDoes) {

@@ -32,6 +32,33 @@ struct EventSinkTest : testing::Test, support::HostServices {
   }
 };
 
+// A process may be killed anywhere between the record of the day and the last of its lines.
+TEST_F(EventSinkTest, WhatWaitsIsAppendedOnceWhereverTheLastTimeEnded) {
+  const auto leavesDay5 = [](const auto& day) { return day == 5; };
+  const struct {
+    const char* pending;  // "2\n33\n" waits under this name, the file held "1\n" before
+    const char* stands;
+    const char* becomes;
+  } rows[] = {{".pending-5.events.jsonl", "1\n", "1\n2\n33\n"},
+              {".pending-5.events.jsonl", "1\nto", "1\n2\n33\n"},
+              {".pending-6.events.jsonl", "1\n", "1\n"},
+              {".pending-run.events.jsonl", "1\n", "1\n"},
+              {".publishing-2.events.jsonl", "1\n", "1\n2\n33\n"},
+              {".publishing-2.events.jsonl", "1\n2\n3", "1\n2\n33\n"},
+              {".publishing-2.events.jsonl", "1\n2\n33\n", "1\n2\n33\n"},
+              {".publishing-2.events.jsonl", "1\n2\n33\n4\n", "1\n2\n33\n4\n"},
+              {".publishing-2.events.jsonl", "1\n2\n4\n", "1\n2\n4\n33\n"},
+              {".publishing-2.events.jsonl", "1\n22\n", "1\n22\n2\n33\n"}};
+  for (const auto& [pending, stands, becomes] : rows) {
+    const std::string waiting = std::string("var/spool/morvend/") + pending;
+    folder.write(waiting, "2\n33\n");
+    folder.write(kEvents, stands);
+    EXPECT_TRUE(sink.settle(leavesDay5));
+    EXPECT_EQ(folder.read(kEvents), becomes) << pending << stands;
+    EXPECT_FALSE(std::filesystem::exists(folder / waiting.c_str())) << pending;
+  }
+}
+
 TEST_F(EventSinkTest, LinesStandInTheOrderAndWithTheTimesOfSending) {
   std::promise<void> go;
   sink.EventraSendEventLazy("first", [wait = go.get_future().share()] {
