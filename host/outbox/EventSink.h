@@ -23,8 +23,8 @@
 
 #include "base/Result.h"
 #include "host/files/DeviceFile.h"
-#include "host/outbox/LineFiles.h"
 #include "host/files/Pending.h"
+#include "host/outbox/LineFiles.h"
 #include "platform/Clock.h"
 #include "platform/Eventra.h"
 #include "platform/SystemLog.h"

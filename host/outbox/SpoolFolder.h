@@ -20,8 +20,8 @@
 
 #include "host/files/DeviceRoot.h"
 #include "host/files/Files.h"
-#include "host/outbox/LineFiles.h"
 #include "host/files/Pending.h"
+#include "host/outbox/LineFiles.h"
 #include "platform/SystemLog.h"
 
 namespace host {

@@ -12,8 +12,8 @@
 
 #include "base/Result.h"
 #include "host/files/DeviceRoot.h"
-#include "host/outbox/LineFiles.h"
 #include "host/files/Pending.h"
+#include "host/outbox/LineFiles.h"
 #include "host/outbox/RandomUUID.h"
 #include "platform/Clock.h"
 #include "platform/FaultwatchSupport.h"

@@ -10,8 +10,8 @@
 
 #include "base/Result.h"
 #include "host/files/DeviceRoot.h"
-#include "host/outbox/LineFiles.h"
 #include "host/files/Pending.h"
+#include "host/outbox/LineFiles.h"
 #include "platform/Clock.h"
 #include "platform/LogSubmission.h"
 #include "platform/PreferenceStore.h"
