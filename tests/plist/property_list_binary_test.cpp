@@ -163,7 +163,7 @@ TEST(PropertyListBinary, SharedObjectsDontMultiplyWithoutBound) {
     EXPECT_EQ(errorOf(list, list.container(kind, many)), "too much text and data");
   }
   // Each place counts, and in memory too: a small file is not to fill the machine.
-  for (const std::size_t beyond : {0, 1}) {
+  for (const std::size_t beyond : {std::size_t{0}, std::size_t{1}}) {
     BinaryPropertyList list;
     const std::vector<std::size_t> some(1000, list.add(true));
     std::vector<std::size_t> all(1998, list.container(0xA, some));
