@@ -183,7 +183,10 @@ TEST_F(CounterStoreWaiting, WhatIsNoBatchIsSetAside) {
   const std::string name = "00000000000000ff-0123456789abcdef";
   std::vector<std::string> foreign{"", "garbage", batch + "more"};
   for (std::size_t size = 0; size < batch.size(); ++size) foreign.push_back(batch.substr(0, size));
-  for (const std::size_t at : {8, 16, 33}) foreign.push_back(batch), foreign.back()[at] = '\x7f';
+  for (const std::size_t at : {8u, 16u, 33u}) {
+    foreign.push_back(batch);
+    foreign.back()[at] = '\x7f';
+  }
   foreign.push_back(std::string(batch).replace(25, 8, 8, '\xff'));  // not a number
   for (const std::string& bytes : foreign) {
     folder.write(kJournal + "/" + name, bytes);
