@@ -11,7 +11,7 @@
 
 #include "NANDInfo/EAN.h"
 #include "base/Text.h"
-#include "host/recorded/SimulatedDriver.h"
+#include "host/device/DescribedDriver.h"
 #include "platform/DeviceRegistry.h"
 
 namespace nandinfo {
@@ -136,7 +136,7 @@ base::Result<void> ControllerCapture::captureBuffer(const DriverService& service
   if (fetched.failure == Failure::size) {
     leaveOut(kind, argument, statusText(fetched.status));
     // What nothing is known of fails like that.
-    if (fetched.status != host::recorded::kNotSupported) {
+    if (fetched.status != host::kNotSupported) {
       answers_.set(key, Dictionary{{"FailSize", std::uint64_t{fetched.status}}});
     }
     return {};

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "host/recorded/SimulatedDriver.h"
+#include "host/device/DescribedDriver.h"
 
 #include <sys/stat.h>
 
@@ -14,7 +14,7 @@
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"
 
-namespace host::recorded {
+namespace host {
 
 using CallResult = platform::DriverConnections::CallResult;
 
@@ -120,19 +120,19 @@ std::optional<std::size_t> DriverFiles::read(const std::string& name, std::span<
   return std::nullopt;
 }
 
-bool SimulatedDriver::isSet(const char* key) const {
+bool DescribedDriver::isSet(const char* key) const {
   const plist::Number* value = answers_.number(key);
   return value != nullptr && value->boolValue();
 }
 
-CallResult SimulatedDriver::callStructMethod(std::uint32_t method, std::span<const std::byte> input,
+CallResult DescribedDriver::callStructMethod(std::uint32_t method, std::span<const std::byte> input,
                                              std::span<std::byte> output) const {
   if (method == kRecommendsDeletionMethod) return recommendsDeletion(output);
   if (std::ranges::count(kTunnelMethods, method) > 0) return tunnel(input, output);
   return failure(kNotSupported);
 }
 
-CallResult SimulatedDriver::recommendsDeletion(std::span<std::byte> output) const {
+CallResult DescribedDriver::recommendsDeletion(std::span<std::byte> output) const {
   if (const plist::Number* number = answers_.number("RecommendsDeletion")) {
     return deliverWord(static_cast<std::uint32_t>(number->uint64Value()), output);
   }
@@ -140,14 +140,14 @@ CallResult SimulatedDriver::recommendsDeletion(std::span<std::byte> output) cons
   return data != nullptr ? deliver(data->data(), data->size(), output) : failure(kNotSupported);
 }
 
-const plist::Value* SimulatedDriver::bufferFor(std::uint32_t opType, std::uint32_t argument) const {
+const plist::Value* DescribedDriver::bufferFor(std::uint32_t opType, std::uint32_t argument) const {
   const plist::Dictionary* buffers = answers_.dictionary("Buffers");
   if (buffers == nullptr) return nullptr;
   const plist::Value* value = buffers->find(base::format("%u:%u", opType, argument));
   return value == nullptr && argument == 0 ? buffers->find(base::format("%u", opType)) : value;
 }
 
-CallResult SimulatedDriver::tunnel(std::span<const std::byte> block,
+CallResult DescribedDriver::tunnel(std::span<const std::byte> block,
                                    std::span<std::byte> output) const {
   if (block.size() < kTunnelBlockSize) return failure(kNotSupported);
   base::ByteReader reader(block);
@@ -160,7 +160,7 @@ CallResult SimulatedDriver::tunnel(std::span<const std::byte> block,
   return asksForSize ? announce(answer, files_, output) : deliverData(answer, files_, output);
 }
 
-platform::DriverStatus SimulatedDriver::callScalarMethod(std::uint32_t method,
+platform::DriverStatus DescribedDriver::callScalarMethod(std::uint32_t method,
                                                          std::span<const std::uint64_t> input,
                                                          std::span<std::uint64_t> output) const {
   const plist::Dictionary* scalars = answers_.dictionary("Scalars");
@@ -175,4 +175,4 @@ platform::DriverStatus SimulatedDriver::callScalarMethod(std::uint32_t method,
   return 0;
 }
 
-}  // namespace host::recorded
+}  // namespace host

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-// A driver as its dictionary in the registry file describes it.
+// A driver as its dictionary in a registry tree describes it.
 #pragma once
 
 #include <cstdint>
@@ -12,7 +12,7 @@
 #include "platform/DeviceRegistry.h"
 #include "platform/SystemLog.h"
 
-namespace host::recorded {
+namespace host {
 
 // What a driver answers to whatever its dictionary doesn't name.
 inline constexpr platform::DriverStatus kNotSupported = 0x2D;
@@ -42,9 +42,9 @@ class DriverFiles {
 };
 
 // Answers the calls of one connection; holds nothing but references.
-class SimulatedDriver {
+class DescribedDriver {
  public:
-  SimulatedDriver(const plist::Dictionary& answers, DriverFiles& files)
+  DescribedDriver(const plist::Dictionary& answers, DriverFiles& files)
       : answers_(answers), files_(files) {}
 
   bool refusesOpen() const { return isSet("RefuseOpen"); }
@@ -68,4 +68,4 @@ class SimulatedDriver {
   DriverFiles& files_;
 };
 
-}  // namespace host::recorded
+}  // namespace host

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "host/recorded/DeviceRegistry.h"
+#include "host/device/RegistryTree.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -10,7 +10,7 @@
 #include <string_view>
 #include <utility>
 
-namespace host::recorded {
+namespace host {
 
 namespace {
 
@@ -36,21 +36,21 @@ const plist::Value* property(const plist::Dictionary& content, std::string_view 
 
 }  // namespace
 
-DeviceRegistry::~DeviceRegistry() {
+RegistryTree::~RegistryTree() {
   if (handles_.empty()) return;
   log_.log(platform::LogLevel::error, "%zu driver handles were not released", handles_.size());
 }
 
-const std::vector<DeviceRegistry::Entry>& DeviceRegistry::entries() {
+const std::vector<RegistryTree::Entry>& RegistryTree::entries() {
   if (!isRead_) {
     isRead_ = true;
-    if (const plist::Dictionary* root = file_.dictionary()) add(*root, 0);
+    if (const plist::Dictionary* root = tree()) add(*root, 0);
   }
   return entries_;
 }
 
 // No deeper than the property list, whose depth is limited.
-void DeviceRegistry::add(const plist::Dictionary& content, std::size_t parent) {
+void RegistryTree::add(const plist::Dictionary& content, std::size_t parent) {
   const std::size_t place = entries_.size();
   entries_.push_back({content, parent, 0});
   if (const plist::Array* children = content.array("Children")) {
@@ -61,19 +61,19 @@ void DeviceRegistry::add(const plist::Dictionary& content, std::size_t parent) {
   entries_[place].end = entries_.size();
 }
 
-std::uint32_t DeviceRegistry::handOut(Kind kind, std::size_t place) {
+std::uint32_t RegistryTree::handOut(Kind kind, std::size_t place) {
   do {
     ++lastHandle_;
   } while (lastHandle_ == 0 || !handles_.try_emplace(lastHandle_, Handle{kind, place}).second);
   return lastHandle_;
 }
 
-DeviceRegistry::Handle* DeviceRegistry::held(std::uint32_t handle, Kind kind) {
+RegistryTree::Handle* RegistryTree::held(std::uint32_t handle, Kind kind) {
   const auto found = handles_.find(handle);
   return found != handles_.end() && found->second.kind == kind ? &found->second : nullptr;
 }
 
-platform::RegistryObject DeviceRegistry::DrvGetMatchingService(std::string_view className) {
+platform::RegistryObject RegistryTree::DrvGetMatchingService(std::string_view className) {
   for (std::size_t place = 1; place < entries().size(); ++place) {
     const plist::Dictionary& content = entries_[place].content;
     if (isRegistered(content) && conforms(content, className)) return handOut(Kind::entry, place);
@@ -81,28 +81,28 @@ platform::RegistryObject DeviceRegistry::DrvGetMatchingService(std::string_view 
   return 0;
 }
 
-platform::RegistryObject DeviceRegistry::rootEntry() {
+platform::RegistryObject RegistryTree::rootEntry() {
   return entries().empty() ? 0 : handOut(Kind::entry, 0);
 }
 
-platform::RegistryObject DeviceRegistry::createIterator() {
+platform::RegistryObject RegistryTree::createIterator() {
   return entries().empty() ? 0 : handOut(Kind::iterator, 1);
 }
 
-platform::RegistryObject DeviceRegistry::next(platform::RegistryObject iterator) {
+platform::RegistryObject RegistryTree::next(platform::RegistryObject iterator) {
   Handle* handle = held(iterator, Kind::iterator);
   if (handle == nullptr || handle->place >= entries_.size()) return 0;
   return handOut(Kind::entry, handle->place++);
 }
 
-bool DeviceRegistry::conformsTo(platform::RegistryObject entry, std::string_view className) {
+bool RegistryTree::conformsTo(platform::RegistryObject entry, std::string_view className) {
   const Handle* handle = held(entry, Kind::entry);
   return handle != nullptr && conforms(entries_[handle->place].content, className);
 }
 
-std::optional<plist::Value> DeviceRegistry::searchProperty(platform::RegistryObject entry,
-                                                           std::string_view key,
-                                                           Direction direction) {
+std::optional<plist::Value> RegistryTree::searchProperty(platform::RegistryObject entry,
+                                                         std::string_view key,
+                                                         Direction direction) {
   const Handle* handle = held(entry, Kind::entry);
   if (handle == nullptr) return std::nullopt;
   const Entry& start = entries_[handle->place];
@@ -114,22 +114,22 @@ std::optional<plist::Value> DeviceRegistry::searchProperty(platform::RegistryObj
   }
 }
 
-void DeviceRegistry::release(platform::RegistryObject object) {
+void RegistryTree::release(platform::RegistryObject object) {
   if (held(object, Kind::connection) == nullptr) handles_.erase(object);
 }
 
-std::optional<SimulatedDriver> DeviceRegistry::driverAt(std::size_t place) {
+std::optional<DescribedDriver> RegistryTree::driverAt(std::size_t place) {
   const plist::Dictionary* answers = entries_[place].content.dictionary("Driver");
-  return answers != nullptr ? std::optional<SimulatedDriver>(std::in_place, *answers, files_)
+  return answers != nullptr ? std::optional<DescribedDriver>(std::in_place, *answers, files_)
                             : std::nullopt;
 }
 
-std::optional<SimulatedDriver> DeviceRegistry::driverOf(platform::DriverConnection connection) {
+std::optional<DescribedDriver> RegistryTree::driverOf(platform::DriverConnection connection) {
   const Handle* handle = held(connection, Kind::connection);
   return handle != nullptr ? driverAt(handle->place) : std::nullopt;
 }
 
-platform::DriverConnections::OpenResult DeviceRegistry::DrvServiceOpen(
+platform::DriverConnections::OpenResult RegistryTree::DrvServiceOpen(
     platform::RegistryObject service, std::uint32_t) {
   const Handle* handle = held(service, Kind::entry);
   if (handle == nullptr) return {kDriverFailed, 0};
@@ -139,14 +139,14 @@ platform::DriverConnections::OpenResult DeviceRegistry::DrvServiceOpen(
   return {0, handOut(Kind::connection, place)};
 }
 
-platform::DriverStatus DeviceRegistry::DrvServiceClose(platform::DriverConnection connection) {
+platform::DriverStatus RegistryTree::DrvServiceClose(platform::DriverConnection connection) {
   const auto driver = driverOf(connection);
   if (!driver) return kDriverFailed;
   handles_.erase(connection);
   return driver->failsClose() ? kDriverFailed : 0;
 }
 
-platform::DriverConnections::CallResult DeviceRegistry::DrvCallStructMethod(
+platform::DriverConnections::CallResult RegistryTree::DrvCallStructMethod(
     platform::DriverConnection connection, std::uint32_t method, std::span<const std::byte> input,
     std::span<std::byte> output) {
   const auto driver = driverOf(connection);
@@ -154,12 +154,12 @@ platform::DriverConnections::CallResult DeviceRegistry::DrvCallStructMethod(
   return driver->callStructMethod(method, input, output);
 }
 
-platform::DriverStatus DeviceRegistry::DrvCallMethod(platform::DriverConnection connection,
-                                                     std::uint32_t method,
-                                                     std::span<const std::uint64_t> input,
-                                                     std::span<std::uint64_t> output) {
+platform::DriverStatus RegistryTree::DrvCallMethod(platform::DriverConnection connection,
+                                                   std::uint32_t method,
+                                                   std::span<const std::uint64_t> input,
+                                                   std::span<std::uint64_t> output) {
   const auto driver = driverOf(connection);
   return driver ? driver->callScalarMethod(method, input, output) : kDriverFailed;
 }
 
-}  // namespace host::recorded
+}  // namespace host
