@@ -10,7 +10,8 @@
 #include "host/PlayedServices.h"
 #include "host/RunOutbox.h"
 #include "host/bus/Bus.h"
-#include "host/files/DeviceFileSystem.h"
+#include "host/device/DeviceServices.h"
+#include "host/machine/Device.h"
 #include "host/outbox/EventSink.h"
 #include "host/outbox/ServitaLogFiles.h"
 #include "host/outbox/StructuredLogFiles.h"
@@ -20,16 +21,8 @@
 #include "host/process/RunLockFile.h"
 #include "host/process/StandardErrorLog.h"
 #include "host/process/StandardStreams.h"
-#include "host/recorded/Applications.h"
-#include "host/recorded/DeviceProperties.h"
-#include "host/recorded/DeviceRegistry.h"
-#include "host/recorded/Kernel.h"
-#include "host/recorded/KernelSnapshots.h"
-#include "host/recorded/Locale.h"
-#include "host/recorded/NetworkUsage.h"
-#include "host/recorded/PurgeableSpace.h"
-#include "host/recorded/ReportingChannels.h"
-#include "host/recorded/SystemVersion.h"
+#include "host/recorded/Device.h"
+#include "host/recorded/EccEventFiles.h"
 #include "platform/Names.h"
 
 namespace host {
@@ -49,6 +42,7 @@ HostOptions HostOptions::fromEnvironment() {
 struct Host::Assembly {
   explicit Assembly(const HostOptions& options)
       : root(options.root),
+        machineFiles(options.machineFiles),
         ownLog(options.lowestLevel),
         log(options.log != nullptr ? *options.log : ownLog),
         played(options.played),
@@ -60,7 +54,7 @@ struct Host::Assembly {
     preferences.addToInteger("DatabaseCorruptionCount", platform::kPellorandDomain, 1);
   }
 
-  DeviceRoot root;
+  DeviceRoot root, machineFiles;
   StandardErrorLog ownLog;
   platform::SystemLog& log;
   const std::optional<PlayedRun> played;
@@ -68,12 +62,12 @@ struct Host::Assembly {
   const std::unique_ptr<SystemClock> ownClock =
       played ? std::make_unique<PlayedClock>(played->now) : std::make_unique<SystemClock>();
   platform::Clock& clock = *ownClock;
-  DeviceFile propertiesFile{root, log, "device/properties.plist"};
-  DeviceFileSystem files{root, propertiesFile};
   PreferenceFiles preferences{root, log};
-  recorded::DeviceProperties deviceProperties{root, propertiesFile};
+  recorded::EccEventFiles eccEvents{root, log};
+  DeviceServices device = root.isRecorded() ? recorded::device(root, log, eccEvents)
+                                            : machine::device(root, machineFiles, preferences, log);
   LibraryLoader libraries;
-  morvend::DeviceContext context{deviceProperties, files, libraries, log};
+  morvend::DeviceContext context{*device.properties, *device.files, libraries, log};
   CounterStore counters{root, clock, log, [this] { return context.homeOfCounters(); },
                         [this] { countDamagedDatabase(); }};
   PendingRun run;
@@ -87,24 +81,18 @@ struct Host::Assembly {
   platform::NotificationCenter& notifications =
       played ? static_cast<platform::NotificationCenter&>(playedNotifications) : bus;
   EventSink eventSink{root, clock, log, run};
-  recorded::SystemVersion systemVersion{root, log};
-  const std::unique_ptr<recorded::Kernel> kernel =
-      played ? std::make_unique<PlayedKernel>(root, log, *played)
-             : std::make_unique<recorded::Kernel>(root, log);
-  RunOutbox outbox{root, run, submission, *structuredLogs, eventSink, *kernel, preferences, log};
-  recorded::KernelSnapshots snapshots{root};
-  recorded::DeviceRegistry registry{root, log};
-  recorded::PurgeableSpace purgeableSpace{root, log};
-  recorded::ReportingChannels reportingChannels{root, log};
-  recorded::Applications applications{root, log};
-  recorded::Locale locale{root, log};
+  const std::unique_ptr<platform::Kernel> kernel =
+      played ? std::make_unique<PlayedKernel>(std::move(device.kernel), *played)
+             : std::move(device.kernel);
+  RunOutbox outbox{root, run, submission, *structuredLogs, eventSink, eccEvents, preferences, log};
   RunLockFile runLock{root, log};
-  recorded::NetworkUsage networkUsage{root, log};  // last: its replies use the others
+  const std::unique_ptr<platform::NetworkUsage> networkUsage =
+      std::move(device.networkUsage);  // last: its replies use the others
 
   platform::AllServices all{.log = log,
                             .streams = streams,
                             .clock = clock,
-                            .files = files,
+                            .files = *device.files,
                             .counters = counters,
                             .history = counters,
                             .preferences = preferences,
@@ -117,17 +105,17 @@ struct Host::Assembly {
                             .namedServices = bus,
                             .notifications = notifications,
                             .eventra = eventSink,
-                            .deviceProperties = deviceProperties,
-                            .systemVersion = systemVersion,
+                            .deviceProperties = *device.properties,
+                            .systemVersion = *device.systemVersion,
                             .kernel = *kernel,
-                            .snapshots = snapshots,
-                            .registry = registry,
-                            .drivers = registry,
-                            .purgeableSpace = purgeableSpace,
-                            .reportingChannels = reportingChannels,
-                            .networkUsage = networkUsage,
-                            .applications = applications,
-                            .locale = locale,
+                            .snapshots = *device.snapshots,
+                            .registry = *device.registry,
+                            .drivers = *device.drivers,
+                            .purgeableSpace = *device.purgeableSpace,
+                            .reportingChannels = *device.reportingChannels,
+                            .networkUsage = *networkUsage,
+                            .applications = *device.applications,
+                            .locale = *device.locale,
                             .libraries = libraries,
                             .runLock = runLock,
                             .outbox = outbox};

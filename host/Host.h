@@ -22,6 +22,7 @@ struct HostOptions {
   std::string root = "/";  // the device root, a path of the host
   platform::LogLevel lowestLevel = platform::LogLevel::standard;
   bool runModules = false;               // of this root, whatever they are: it is trusted
+  std::string machineFiles = "/";        // the folder of this machine's /proc, /sys, /etc and /usr
   std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
   platform::SystemLog* log = nullptr;    // borrowed; instead of the one on standard error
 

@@ -4,14 +4,20 @@
 // The services that differ in a run at another time.
 #pragma once
 
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <span>
 #include <string>
+#include <string_view>
 #include <utility>
 
 #include "host/PlayedRun.h"
 #include "host/outbox/StructuredLogFiles.h"
 #include "host/process/SystemClock.h"
-#include "host/recorded/Kernel.h"
 #include "platform/EventLoop.h"
+#include "platform/Kernel.h"
 
 namespace host {
 
@@ -24,15 +30,21 @@ class PlayedClock final : public SystemClock {
   plist::Date now_;
 };
 
-class PlayedKernel final : public recorded::Kernel {
+class PlayedKernel final : public platform::Kernel {
  public:
-  PlayedKernel(const DeviceRoot& root, platform::SystemLog& log, PlayedRun run)
-      : recorded::Kernel(root, log), run_(std::move(run)) {}
+  PlayedKernel(std::unique_ptr<platform::Kernel> device, PlayedRun run)
+      : device_(std::move(device)), run_(std::move(run)) {}
+  ReadResult sysctlbyname(std::string_view name, std::span<std::byte> buffer) override {
+    return device_->sysctlbyname(name, buffer);
+  }
+  std::uint64_t pageSize() override { return device_->pageSize(); }
   std::uint64_t absoluteTime() override { return run_.sinceBoot; }
+  std::optional<Timebase> timebase() override { return device_->timebase(); }
   Process process() override { return run_.process; }
 
  private:
-  PlayedRun run_;
+  const std::unique_ptr<platform::Kernel> device_;
+  const PlayedRun run_;
 };
 
 class PlayedStructuredLogs final : public StructuredLogFiles {

@@ -20,7 +20,7 @@ void RunOutbox::settleAll(const Leaves& leaves) {
   settle(submission_);
   settle(structuredLogs_);
   settle(events_);
-  settle(kernel_);  // last: what came of its events is to leave before they go
+  settle(eccEvents_);  // last: what came of its events is to leave before they go
 }
 
 void RunOutbox::settle(std::int64_t recordedDay) {
@@ -31,7 +31,7 @@ void RunOutbox::settle(std::int64_t recordedDay) {
 void RunOutbox::hold(std::optional<std::int32_t> day) {
   events_.drain();  // what was sent before is not this run's
   run_.begin(day);
-  kernel_.holdEvents(day);
+  eccEvents_.hold(day);
   preferences_.hold(platform::kDaemonName);
 }
 

@@ -20,7 +20,7 @@
 #include "host/outbox/StructuredLogFiles.h"
 #include "host/outbox/SubmissionSpool.h"
 #include "host/preferences/PreferenceFiles.h"
-#include "host/recorded/Kernel.h"
+#include "host/recorded/EccEventFiles.h"
 #include "platform/Outbox.h"
 #include "platform/SystemLog.h"
 
@@ -30,14 +30,15 @@ class RunOutbox final : public platform::Outbox {
  public:
   // All are borrowed; the run is the one that the others were made with.
   RunOutbox(const DeviceRoot& root, PendingRun& run, SubmissionSpool& submission,
-            StructuredLogFiles& structuredLogs, EventSink& events, recorded::Kernel& kernel,
-            PreferenceFiles& preferences, platform::SystemLog& log)
+            StructuredLogFiles& structuredLogs, EventSink& events,
+            recorded::EccEventFiles& eccEvents, PreferenceFiles& preferences,
+            platform::SystemLog& log)
       : root_(root),
         run_(run),
         submission_(submission),
         structuredLogs_(structuredLogs),
         events_(events),
-        kernel_(kernel),
+        eccEvents_(eccEvents),
         preferences_(preferences),
         log_(log) {}
 
@@ -54,7 +55,7 @@ class RunOutbox final : public platform::Outbox {
   SubmissionSpool& submission_;
   StructuredLogFiles& structuredLogs_;
   EventSink& events_;
-  recorded::Kernel& kernel_;
+  recorded::EccEventFiles& eccEvents_;
   PreferenceFiles& preferences_;
   platform::SystemLog& log_;
 };

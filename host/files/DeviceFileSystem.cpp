@@ -13,16 +13,6 @@
 
 namespace host {
 
-namespace {
-
-std::optional<std::uint64_t> amount(const plist::Dictionary& figures, const char* key) {
-  const plist::Number* number = figures.number(key);
-  if (number == nullptr || number->int64Value() < 0) return std::nullopt;
-  return number->uint64Value();
-}
-
-}  // namespace
-
 std::optional<platform::FileSystem::Statistics> fileSystemHolding(const DeviceRoot& root,
                                                                   std::string_view path) {
   const auto file = root.openForStatus(path);
@@ -39,14 +29,7 @@ std::optional<std::uint64_t> DeviceFileSystem::fileStatus(std::string_view path)
 }
 
 std::optional<platform::FileSystem::Statistics> DeviceFileSystem::statfs(std::string_view path) {
-  if (!root_.isRecorded()) return fileSystemHolding(root_, path);
-  const plist::Dictionary* properties = properties_.dictionary();
-  const plist::Dictionary* recorded = properties ? properties->dictionary("FileSystem") : nullptr;
-  if (recorded == nullptr) return std::nullopt;
-  const auto blockSize = amount(*recorded, "BlockSize"), blocks = amount(*recorded, "Blocks"),
-             available = amount(*recorded, "BlocksAvailable");
-  if (!blockSize || !blocks || !available) return std::nullopt;
-  return Statistics{*blockSize, *blocks, *available};
+  return fileSystemHolding(root_, path);
 }
 
 std::optional<std::string> DeviceFileSystem::readFile(std::string_view path, std::size_t maximum) {

@@ -4,27 +4,21 @@
 // The device's files as the core sees them: below the device root, links followed within it.
 #pragma once
 
-#include "host/files/DeviceFile.h"
+#include "host/files/DeviceRoot.h"
 #include "platform/FileSystem.h"
 
 namespace host {
 
-class DeviceFileSystem final : public platform::FileSystem {
+class DeviceFileSystem : public platform::FileSystem {
  public:
-  // Both are borrowed; `properties` is device/properties.plist.
-  DeviceFileSystem(const DeviceRoot& root, DeviceFile& properties)
-      : root_(root), properties_(properties) {}
+  explicit DeviceFileSystem(const DeviceRoot& root) : root_(root) {}
 
   std::optional<std::uint64_t> fileStatus(std::string_view path) override;
-
-  // Of any path on a recorded device: what its properties hold under "FileSystem". A figure that is
-  // no number, or negative, fails the query.
   std::optional<Statistics> statfs(std::string_view path) override;
   std::optional<std::string> readFile(std::string_view path, std::size_t maximum) override;
 
  private:
   const DeviceRoot& root_;
-  DeviceFile& properties_;
 };
 
 // The figures of this machine's file system that holds a path of the device.

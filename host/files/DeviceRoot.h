@@ -36,8 +36,8 @@ class DeviceRoot {
   // Whether the root is a folder; the error is of its path, which is `what`.
   base::Result<void> isThere(const char* what = "the device root") const;
 
-  // Whether this is a recorded device: a root with a folder device/, which alone answers for all
-  // that is not a file of the device. Any other root is this machine. Looked up at each call.
+  // Whether this is a recorded device: a root with a folder device/. Any other root is this
+  // machine. Looked up at each call.
   bool isRecorded() const;
 
   // A device path as a path of the host, for who is to find the file.

@@ -3,40 +3,26 @@
 
 #include "host/recorded/DeviceProperties.h"
 
-#include <sys/utsname.h>
-#include <systemd/sd-id128.h>
-
-#include <array>
 #include <cstdint>
 #include <optional>
+#include <string>
+#include <string_view>
 
-#include "host/files/DeviceFileSystem.h"
-#include "host/files/Files.h"
+#include "host/device/CommonAnswers.h"
 
 namespace host::recorded {
 
 namespace {
 
-constexpr std::uint64_t kNoSuchContainer = 2;
-
-// The same on every boot of this machine, and no other program's.
-std::optional<std::string> identifierOfOurs() {
-  constexpr sd_id128_t kApplication =
-      SD_ID128_ARRAY(60, 4e, 83, 89, 41, 9e, 13, a3, 42, 9b, c1, ab, fd, 4f, b5, 62);
-  sd_id128_t id;
-  if (::sd_id128_get_machine_app_specific(kApplication, &id) < 0) return std::nullopt;
-  std::array<char, SD_ID128_STRING_MAX> text;
-  return ::sd_id128_to_string(id, text.data());
-}
-
-std::optional<std::string> machineName() {
-  utsname host;
-  return ::uname(&host) == 0 ? std::optional<std::string>(host.machine) : std::nullopt;
-}
-
 std::optional<std::int64_t> bytes(const plist::Dictionary& usage, const char* key) {
   const plist::Number* size = usage.number(key);
   return size != nullptr ? std::optional(size->int64Value()) : std::nullopt;
+}
+
+std::optional<std::uint64_t> amount(const plist::Dictionary& figures, const char* key) {
+  const plist::Number* number = figures.number(key);
+  if (number == nullptr || number->int64Value() < 0) return std::nullopt;
+  return number->uint64Value();
 }
 
 }  // namespace
@@ -52,10 +38,6 @@ bool DeviceProperties::booleanProperty(std::string_view name) {
 }
 
 std::optional<std::string> DeviceProperties::textProperty(std::string_view name) {
-  if (!root_.isRecorded()) {
-    if (name == "SystemIdentifier") return identifierOfOurs();
-    return name == "HardwareModel" ? machineName() : std::nullopt;
-  }
   const plist::Dictionary* properties = properties_.dictionary();
   const std::string* text = properties != nullptr ? properties->text(name) : nullptr;
   return text != nullptr ? std::optional(*text) : std::nullopt;
@@ -68,15 +50,6 @@ std::optional<std::uint32_t> DeviceProperties::multiUserIndicator() {
 }
 
 std::optional<platform::DeviceProperties::DiskUsage> DeviceProperties::diskUsage() {
-  if (!root_.isRecorded()) {
-    const auto holding = fileSystemHolding(root_, "/");
-    if (!holding) return std::nullopt;
-    const auto inBytes = [&](std::uint64_t blocks) {
-      return static_cast<std::int64_t>(blocks * holding->blockSize);
-    };
-    const std::int64_t available = inBytes(holding->blocksAvailable);
-    return DiskUsage{inBytes(holding->blocks), available, available};
-  }
   const plist::Dictionary* properties = properties_.dictionary();
   const plist::Dictionary* usage =
       properties != nullptr ? properties->dictionary("DiskUsage") : nullptr;
@@ -85,15 +58,20 @@ std::optional<platform::DeviceProperties::DiskUsage> DeviceProperties::diskUsage
                    bytes(*usage, "AmountDataAvailable")};
 }
 
+std::optional<platform::FileSystem::Statistics> DeviceProperties::fileSystem() {
+  const plist::Dictionary* properties = properties_.dictionary();
+  const plist::Dictionary* recorded =
+      properties != nullptr ? properties->dictionary("FileSystem") : nullptr;
+  if (recorded == nullptr) return std::nullopt;
+  const auto blockSize = amount(*recorded, "BlockSize"), blocks = amount(*recorded, "Blocks"),
+             available = amount(*recorded, "BlocksAvailable");
+  if (!blockSize || !blocks || !available) return std::nullopt;
+  return platform::FileSystem::Statistics{*blockSize, *blocks, *available};
+}
+
 DeviceProperties::GroupContainer DeviceProperties::systemGroupContainerPath(
     std::string_view identifier) {
-  if (isPlainFileName(identifier, kMaxFileName)) {
-    std::string path = "/var/containers/systemgroup/" + std::string(identifier);
-    if (root_.openFolder(path, DeviceRoot::Missing::fails, DeviceRoot::Links::followed)) {
-      return {.path = std::move(path)};
-    }
-  }
-  return {.error = kNoSuchContainer};
+  return groupContainer(root_, identifier);
 }
 
 }  // namespace host::recorded

@@ -4,8 +4,8 @@
 #include "host/recorded/NetworkUsage.h"
 
 #include <algorithm>
+#include <chrono>
 #include <cstdint>
-#include <system_error>
 
 #include "base/Convert.h"
 
@@ -24,48 +24,9 @@ std::chrono::milliseconds replyDelay(const plist::Dictionary* answer) {
 
 }  // namespace
 
-NetworkUsage::~NetworkUsage() {
-  {
-    const std::scoped_lock lock(mutex_);
-    ending_ = true;
-    changed_.notify_one();
-  }
-  if (thread_.joinable()) thread_.join();
-}
-
-void NetworkUsage::queryAllProcesses(Reply reply) {
-  {
-    const std::scoped_lock lock(mutex_);
-    queries_.push_back({Clock::now(), std::move(reply)});
-    changed_.notify_one();
-  }
-  if (thread_.joinable()) return;
-  try {
-    thread_ = std::thread([this] { serve(); });
-  } catch (const std::system_error&) {
-    // The next query tries again.
-  }
-}
-
-void NetworkUsage::serve() {
+UsageReplies::Answer NetworkUsage::answer() {
   const plist::Dictionary* answer = file_.dictionary();
-  const plist::Array* records = answer != nullptr ? answer->array("Records") : nullptr;
-  const auto delay = replyDelay(answer);
-  std::unique_lock lock(mutex_);
-  while (!ending_) {
-    if (queries_.empty()) {
-      changed_.wait(lock);
-    } else if (const auto due = queries_.front().asked + delay; Clock::now() < due) {
-      changed_.wait_until(lock, due);
-    } else {
-      Query query = std::move(queries_.front());
-      queries_.pop_front();
-      lock.unlock();
-      query.reply(records);
-      query.reply = nullptr;
-      lock.lock();
-    }
-  }
+  return {answer != nullptr ? answer->array("Records") : nullptr, replyDelay(answer)};
 }
 
 }  // namespace host::recorded

@@ -1,11 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-// The services of a recorded device, which answer from files below device/, and of this machine.
+// The services of a recorded device, which answer from files below device/.
 
 #include <gtest/gtest.h>
 #include <sys/stat.h>
-#include <systemd/sd-id128.h>
 
 #include <algorithm>
 #include <array>
@@ -20,18 +19,20 @@
 #include <thread>
 #include <utility>
 
+#include "host/Host.h"
 #include "host/files/DeviceFile.h"
-#include "host/files/DeviceFileSystem.h"
 #include "host/outbox/RandomUUID.h"
 #include "host/process/LibraryLoader.h"
 #include "host/process/SystemClock.h"
 #include "host/recorded/Applications.h"
 #include "host/recorded/DeviceProperties.h"
+#include "host/recorded/EccEventFiles.h"
 #include "host/recorded/Kernel.h"
 #include "host/recorded/Locale.h"
 #include "host/recorded/NetworkUsage.h"
 #include "host/recorded/ReportingChannels.h"
 #include "host/recorded/SystemVersion.h"
+#include "platform/AllServices.h"
 #include "platform/FaultwatchSupport.h"
 #include "platform/InstalledApplications.h"
 #include "platform/PreferenceStore.h"
@@ -90,7 +91,8 @@ TEST_F(DeviceFiles, KernelValuesComeInTheirForms) {
                                {"no number", plist::Dictionary{{"Error", "x"}}},
                                {"success?", plist::Dictionary{{"Error", std::int64_t{0}}}},
                                {"hw.pagesize", std::int64_t{16384}}});
-  Kernel kernel(root, log);
+  EccEventFiles events(root, log);
+  Kernel kernel(root, log, events);
   const struct {
     const char* name;
     std::size_t room;
@@ -123,22 +125,6 @@ TEST_F(DeviceFiles, KernelValuesComeInTheirForms) {
   EXPECT_EQ(kernel.pageSize(), 16384u);
 }
 
-TEST_F(DeviceFiles, ThisMachineAnswersForTheKernelWhereItCan) {
-  Kernel kernel(root, log);
-  std::string text(64, '#');
-  EXPECT_EQ(
-      kernel.sysctlbyname("kern.bootsessionuuid", std::as_writable_bytes(std::span(text))).length,
-      37u);
-  EXPECT_EQ(text.find_first_not_of("0123456789ABCDEF-"), 36u);
-  for (const auto& [room, length] : {std::pair{32u, 32u}, {40u, 32u}, {31u, 8u}, {8u, 8u}}) {
-    std::vector<std::byte> record(room);
-    EXPECT_EQ(kernel.sysctlbyname("vm.swapusage", record).length, length) << room;
-  }
-  EXPECT_EQ(kernel.pageSize(), static_cast<std::uint64_t>(::sysconf(_SC_PAGESIZE)));
-  const auto before = kernel.absoluteTime();
-  EXPECT_GE(kernel.absoluteTime(), before);
-}
-
 TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
   writePlist("device/kernel.plist",
              plist::Dictionary{
@@ -152,7 +138,8 @@ TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
   std::filesystem::create_symlink("../../linked", folder / "device/ecc-events/1-within");
   std::filesystem::create_symlink(folder.path() / "linked", folder / "device/ecc-events/1-out");
   std::filesystem::create_directories(folder / "device/ecc-events/1-folder");
-  Kernel kernel(root, log);
+  EccEventFiles files(root, log);
+  Kernel kernel(root, log, files);
   std::string buffer(72, '\0');
   const auto read = [&] {
     return kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
@@ -187,11 +174,10 @@ TEST_F(DeviceFiles, EccEventsComeOnceInTheOrderOfTheirNames) {
 // What a killed run took comes again, unless its day is done; no event is lost or comes twice.
 TEST_F(DeviceFiles, EccEventsWaitUntilWhatCameOfThemIsOnDisk) {
   const auto events = folder / "device/ecc-events";
-  const auto read = [](Kernel& kernel) {
+  const auto read = [](EccEventFiles& files) {
     std::string buffer(72, '\0');
-    const auto got =
-        kernel.sysctlbyname("kern.next_ecc_event", std::as_writable_bytes(std::span(buffer)));
-    return buffer.substr(0, got.length);
+    const auto got = files.next(std::as_writable_bytes(std::span(buffer)));
+    return buffer.substr(0, got ? got->length : 0);
   };
   const auto count = [&events] {
     return std::distance(std::filesystem::directory_iterator(events), {});
@@ -202,17 +188,17 @@ TEST_F(DeviceFiles, EccEventsWaitUntilWhatCameOfThemIsOnDisk) {
     folder.write("device/ecc-events/1", "one");
     folder.write("device/ecc-events/2.b", "two");
     {
-      Kernel killed(root, log);
-      killed.holdEvents(day);
+      EccEventFiles killed(root, log);
+      killed.hold(day);
       EXPECT_EQ(read(killed), "one");
       EXPECT_EQ(read(killed), "two");
       EXPECT_EQ(read(killed), "");
       EXPECT_EQ(count(), 2);
     }
     folder.write("device/ecc-events/1", "new");
-    Kernel next(root, log);
+    EccEventFiles next(root, log);
     EXPECT_TRUE(next.settle([&](const auto& of) { return of != day; }));
-    next.holdEvents(day);
+    next.hold(day);
     for (const char* event : {"new", "one", "two", ""}) EXPECT_EQ(read(next), event);
     EXPECT_TRUE(next.settle([&](const auto& of) { return of == day; }));
     EXPECT_EQ(count(), 0);
@@ -224,14 +210,12 @@ TEST_F(DeviceFiles, EccEventsWaitUntilWhatCameOfThemIsOnDisk) {
 }
 
 TEST_F(DeviceFiles, DevicePropertiesAndContainers) {
-  DeviceFile file(root, log, "device/properties.plist");
-  host::recorded::DeviceProperties none(root, file);
+  host::recorded::DeviceProperties none(root, log);
   EXPECT_FALSE(none.booleanProperty("InternalBuild"));
   EXPECT_EQ(none.multiUserIndicator(), std::nullopt);
   writePlist("device/properties.plist",
              plist::Dictionary{{"InternalBuild", true}, {"MultiUser", std::int64_t{1}}});
-  DeviceFile written(root, log, "device/properties.plist");
-  host::recorded::DeviceProperties properties(root, written);
+  host::recorded::DeviceProperties properties(root, log);
   EXPECT_TRUE(properties.booleanProperty("InternalBuild"));
   EXPECT_EQ(properties.multiUserIndicator(), 1u);
 
@@ -251,28 +235,25 @@ TEST_F(DeviceFiles, ARecordedDeviceAnswersAlone) {
   ::setenv("LANGUAGE", "fr", 1);
   ::setenv("LANG", "de_AT.UTF-8", 1);
   const auto known = [this] {
-    DeviceFile file(root, log, "device/properties.plist");
-    host::recorded::DeviceProperties properties(root, file);
-    host::recorded::SystemVersion version(root, log);
-    host::recorded::Locale locale(root, log);
-    Kernel kernel(root, log);
+    const Host host({.root = folder.path(), .log = &log});
+    const platform::AllServices& device = host.services();
     std::array<std::byte, 64> buffer;
     std::string names;
     const auto note = [&names](const char* name, bool isKnown) {
       if (isKnown) names += std::string(name) + " ";
     };
     for (const char* name : {"SystemIdentifier", "HardwareModel", "InverseDeviceID"}) {
-      note(name, properties.textProperty(name).has_value());
+      note(name, device.deviceProperties.textProperty(name).has_value());
     }
-    note("usage", properties.diskUsage().has_value());
-    note("statfs", DeviceFileSystem(root, file).statfs("/").has_value());
-    note("version", version.systemVersionDictionary().has_value());
-    note("version text", !version.operatingSystemVersion().empty());
-    note("languages", !locale.preferredLanguages().empty());
-    note("localizations", !locale.systemLocalizations().empty());
-    note("country", locale.countryCode().has_value());
+    note("usage", device.deviceProperties.diskUsage().has_value());
+    note("statfs", device.files.statfs("/").has_value());
+    note("version", device.systemVersion.systemVersionDictionary().has_value());
+    note("version text", !device.systemVersion.operatingSystemVersion().empty());
+    note("languages", !device.locale.preferredLanguages().empty());
+    note("localizations", !device.locale.systemLocalizations().empty());
+    note("country", device.locale.countryCode().has_value());
     for (const char* name : {"kern.bootsessionuuid", "vm.swapusage"}) {
-      note(name, kernel.sysctlbyname(name, buffer).error == 0);
+      note(name, device.kernel.sysctlbyname(name, buffer).error == 0);
     }
     return names;
   };
@@ -298,19 +279,6 @@ TEST_F(DeviceFiles, ARecordedDeviceAnswersAlone) {
              plist::Dictionary{
                  {"SystemIdentifier", "a"}, {"HardwareModel", "b"}, {"InverseDeviceID", "c"}});
   EXPECT_EQ(known(), "SystemIdentifier HardwareModel InverseDeviceID ");
-}
-
-TEST_F(DeviceFiles, NobodyLearnsTheMachinesOwnIdentifier) {
-  DeviceFile file(root, log, "device/properties.plist");
-  const auto identifier =
-      host::recorded::DeviceProperties(root, file).textProperty("SystemIdentifier");
-  sd_id128_t machine;
-  ASSERT_EQ(identifier.has_value(), ::sd_id128_get_machine(&machine) == 0);
-  if (!identifier) GTEST_SKIP() << "this machine has no identifier";
-  EXPECT_TRUE(std::regex_match(*identifier, std::regex("[0-9a-f]{32}"))) << *identifier;
-  EXPECT_FALSE(::sd_id128_string_equal(identifier->c_str(), machine));
-  EXPECT_EQ(host::recorded::DeviceProperties(root, file).textProperty("SystemIdentifier"),
-            identifier);
 }
 
 TEST_F(DeviceFiles, TheZoneIsTheHosts) {
@@ -339,49 +307,10 @@ TEST_F(DeviceFiles, IncidentIdentifiersAreRandomUUIDs) {
   EXPECT_EQ(seen.size(), 100u);
 }
 
-TEST_F(DeviceFiles, TheSystemVersionIsTheDevicesOrThisMachines) {
-  const struct {
-    const char *release, *text;
-  } rows[] = {
-      {"NAME=x\nVERSION_ID=\"12\"\nBUILD_ID='b\\'1'\n", "12 (b'1)"},
-      {"VERSION_ID=12", "12 (12)"},
-      {"BUILD_ID=rolling\nXVERSION_ID=1\nVERSION_IDX=2\n", "rolling"},
-      {"", ""},
-  };
-  const std::string release = (folder / "os-release").string();
-  for (const auto& row : rows) {
-    folder.write("os-release", row.release);
-    EXPECT_EQ(host::recorded::SystemVersion(root, log, release).operatingSystemVersion(), row.text);
-  }
-  EXPECT_EQ(host::recorded::SystemVersion(root, log, release).systemVersionDictionary(),
-            std::nullopt);
+TEST_F(DeviceFiles, VersionAndLocaleAreTheirFiles) {
   writePlist("device/system-version.plist",
              plist::Dictionary{{"ProductVersion", "7.1"}, {"ProductBuildVersion", "7B2"}});
   EXPECT_EQ(host::recorded::SystemVersion(root, log).operatingSystemVersion(), "7.1 (7B2)");
-}
-
-TEST_F(DeviceFiles, LanguagesComeFromTheEnvironmentUnlessTheDeviceSaysThem) {
-  const struct {
-    const char *language, *lang;
-    Texts preferred;
-    std::optional<std::string> country;
-  } rows[] = {
-      {"", "de_AT.UTF-8@euro", {"de-AT"}, "AT"},
-      {"fr_CA:fr:en", "de_AT", {"fr-CA", "fr", "en"}, "AT"},
-      {"", "C.UTF-8", {}, std::nullopt},
-      {"::", "POSIX", {}, std::nullopt},
-      {"", "eo", {"eo"}, std::nullopt},
-      {"", "", {}, std::nullopt},
-  };
-  for (const auto& row : rows) {
-    ::setenv("LANGUAGE", row.language, 1);
-    ::setenv("LANG", row.lang, 1);
-    host::recorded::Locale locale(root, log);
-    EXPECT_EQ(locale.preferredLanguages(), row.preferred) << row.lang;
-    EXPECT_EQ(locale.countryCode(), row.country) << row.lang;
-    EXPECT_EQ(locale.systemLocalizations(), Texts{"en"});
-  }
-  ::setenv("LANG", "de_AT", 1);
   writePlist("device/locale.plist",
              plist::Dictionary{{"PreferredLanguages", plist::Array{"ja", std::int64_t{1}}}});
   host::recorded::Locale locale(root, log);

@@ -8,12 +8,12 @@
 #include <map>
 #include <sstream>
 
-#include "host/machine/MachineFigures.h"
+#include "host/figures/MachineFigures.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
 
-using host::machine::MachineFigures;
+using host::figures::MachineFigures;
 
 TEST(MachineFigures, SoundLinesOfFilesAreReadAndOthersSkipped) {
   const support::TemporaryFolder root;
@@ -27,7 +27,7 @@ TEST(MachineFigures, SoundLinesOfFilesAreReadAndOthersSkipped) {
     root.write(std::string("sys/class/thermal/thermal_zone") + zone + "/temp", text);
   }
   MachineFigures figures;
-  host::machine::addFiguresOfFiles(root.path(), figures);
+  host::figures::addFiguresOfFiles(root.path(), figures);
   EXPECT_EQ(figures.counts, (decltype(figures.counts){{"host.vmstat.pgfault", 12},
                                                       {"host.vmstat.pswpout", INT64_MAX},
                                                       {"host.vmstat.pgmajfault", 7},
@@ -69,7 +69,7 @@ std::map<std::string, double> figuresOfKernel() {
 // go up and down by less than the twentieth part of all.
 TEST(MachineFigures, OfDisksAndMemoryAreTheKernels) {
   const auto before = figuresOfKernel();
-  MachineFigures figures = host::machine::readMachineFigures();
+  MachineFigures figures = host::figures::readMachineFigures();
   const auto after = figuresOfKernel();
   figures.measurements.insert(figures.measurements.end(), figures.counts.begin(),
                               figures.counts.end());

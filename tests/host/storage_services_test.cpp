@@ -12,8 +12,10 @@
 #include <array>
 #include <filesystem>
 #include "host/files/DeviceFileSystem.h"
+#include "host/machine/DeviceProperties.h"
 #include "host/process/StandardStreams.h"
 #include "host/recorded/DeviceProperties.h"
+#include "host/recorded/FileSystem.h"
 #include "host/recorded/KernelSnapshots.h"
 #include "host/recorded/PurgeableSpace.h"
 #include "platform/KernelSnapshots.h"
@@ -82,9 +84,9 @@ TEST_F(StorageServices, DiskFiguresOfARecordedDeviceAreThoseOfItsProperties) {
   };
   for (const auto& row : rows) {
     folder.write("device/properties.plist", xml(row.properties));
-    DeviceFile file(root, log, "device/properties.plist");
-    const auto usage = host::recorded::DeviceProperties(root, file).diskUsage();
-    const auto statistics = DeviceFileSystem(root, file).statfs("/private/var");
+    host::recorded::DeviceProperties properties(root, log);
+    const auto usage = properties.diskUsage();
+    const auto statistics = recorded::FileSystem(root, properties).statfs("/private/var");
     ASSERT_EQ(usage.has_value(), row.usage.has_value()) << xml(row.properties);
     ASSERT_EQ(statistics.has_value(), row.fileSystem.has_value()) << xml(row.properties);
     if (usage) {
@@ -107,8 +109,7 @@ TEST_F(StorageServices, OnThisMachineTheFileSystemIsThatOfAPathBelowTheRoot) {
   std::filesystem::create_directories(folder / "private/var");
   std::filesystem::create_symlink("/private", folder / "inside");
   std::filesystem::create_symlink("../../../../proc", folder / "outside");
-  DeviceFile properties(root, log, "device/properties.plist");
-  DeviceFileSystem files(root, properties);
+  DeviceFileSystem files(root);
   struct statvfs host;
   ASSERT_EQ(::statvfs(folder.path().c_str(), &host), 0);
   const std::uint64_t total = host.f_blocks * host.f_frsize;
@@ -121,12 +122,12 @@ TEST_F(StorageServices, OnThisMachineTheFileSystemIsThatOfAPathBelowTheRoot) {
   for (const char* path : {"/private/missing", "/proc", "/outside"}) {
     EXPECT_FALSE(files.statfs(path)) << path;
   }
-  const auto usage = host::recorded::DeviceProperties(root, properties).diskUsage();
+  const auto usage = machine::DeviceProperties(root, root).diskUsage();
   ASSERT_TRUE(usage);
   EXPECT_EQ(usage->totalDiskCapacity, static_cast<std::int64_t>(total));
   EXPECT_EQ(usage->totalDataAvailable, usage->amountDataAvailable);
   EXPECT_LE(usage->totalDataAvailable, usage->totalDiskCapacity);
-  EXPECT_FALSE(DeviceFileSystem(DeviceRoot("/nonexistent"), properties).statfs("/"));
+  EXPECT_FALSE(DeviceFileSystem(DeviceRoot("/nonexistent")).statfs("/"));
 }
 
 TEST(StandardStreams, ErrorsAreLinesAndOutputIsAsItIs) {

@@ -35,7 +35,7 @@ class PelloranCommand : public testing::Test {
   }
 
   support::TemporaryFolder folder;
-  host::machine::MachineFigures figures;
+  host::figures::MachineFigures figures;
   support::StoreFixture here{folder.path()};
   std::string out, err;
   bool terminal = false;

@@ -176,7 +176,7 @@ class Command {
     return outcome(applied);
   }
 
-  base::Result<void> record(const host::machine::MachineFigures& figures) {
+  base::Result<void> record(const host::figures::MachineFigures& figures) {
     const Moment now = momentOf(environment_.clock.now());
     std::vector<CounterChange> changes;
     for (const auto& [key, count] : figures.counts) {

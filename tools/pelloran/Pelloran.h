@@ -10,7 +10,7 @@
 #include <ostream>
 
 #include "host/counters/CounterStore.h"
-#include "host/machine/MachineFigures.h"
+#include "host/figures/MachineFigures.h"
 #include "platform/Clock.h"
 
 namespace pelloran {
@@ -22,7 +22,7 @@ struct Environment {
   std::ostream& out;
   std::ostream& err;
   bool errIsTerminal;  // then long work shows its progress there
-  std::function<host::machine::MachineFigures()> figures;  // of this machine
+  std::function<host::figures::MachineFigures()> figures;  // of this machine
   std::function<void(std::chrono::steady_clock::time_point)> waitUntil;
   base::Result<void> root = {};  // whether the device root is there
 };

@@ -26,7 +26,7 @@ int run(std::ostream& out, int argc, char** argv) {
        .out = out,
        .err = std::cerr,
        .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
-       .figures = host::machine::readMachineFigures,
+       .figures = host::figures::readMachineFigures,
        .waitUntil = [](auto moment) { std::this_thread::sleep_until(moment); },
        .root = host.root().isThere()},
       argc, argv);

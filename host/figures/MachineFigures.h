@@ -14,7 +14,7 @@
 #include <utility>
 #include <vector>
 
-namespace host::machine {
+namespace host::figures {
 
 struct MachineFigures {
   std::vector<std::pair<std::string, std::int64_t>> counts;  // what grew since the machine started
@@ -35,4 +35,4 @@ MachineFigures readMachineFigures();
 // skipped, and a number that 64 bits don't hold saturates.
 void addFiguresOfFiles(const std::string& root, MachineFigures& figures);
 
-}  // namespace host::machine
+}  // namespace host::figures

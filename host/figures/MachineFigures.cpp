@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "host/machine/MachineFigures.h"
+#include "host/figures/MachineFigures.h"
 
 #include <libproc2/diskstats.h>
 #include <libproc2/meminfo.h>
@@ -20,7 +20,7 @@
 #include <string_view>
 #include <system_error>
 
-namespace host::machine {
+namespace host::figures {
 
 namespace {
 
@@ -255,4 +255,4 @@ MachineFigures readMachineFigures() {
   return figures;
 }
 
-}  // namespace host::machine
+}  // namespace host::figures
