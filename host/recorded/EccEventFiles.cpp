@@ -8,7 +8,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstdint>
 #include <optional>
 #include <system_error>
 

@@ -114,6 +114,7 @@ TEST(DailyRun, SubmitsTheDayOnceAndLeavesTheRecordsBehind) {
 
 TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
   Device empty, missing;
+  std::filesystem::create_directory(empty.root() / "device");
   std::filesystem::remove(missing.root().path());
   for (const Device* device : {&empty, &missing}) {
     for (const char* option : {"-d", "-f", "-t", "-x"}) {
@@ -124,7 +125,7 @@ TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
   }
   EXPECT_FALSE(std::filesystem::exists(missing.root().path()));
   EXPECT_EQ(empty.record(kGateRecord), Value(empty.today() - 1));
-  EXPECT_EQ(empty.recorded().size(), 2u) << "disk usage";
+  EXPECT_TRUE(empty.recorded().empty());
   EXPECT_TRUE(empty.history().empty());
 }
 

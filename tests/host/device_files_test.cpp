@@ -17,7 +17,6 @@
 #include <set>
 #include <span>
 #include <thread>
-#include <utility>
 
 #include "host/Host.h"
 #include "host/files/DeviceFile.h"

@@ -36,8 +36,7 @@ TEST(DeviceRoot, NoPathLeadsOutside) {
   std::filesystem::create_symlink("..", outer / "root/up");
   const DeviceRoot root((outer / "root").string());
   platform::fakes::RecordingLog log;
-  DeviceFile properties(root, log, "device/properties.plist");
-  DeviceFileSystem files(root, properties);
+  DeviceFileSystem files(root);
   for (const char* path :
        {"/absolute", "/relative", "../secret", "/x/../../secret", "/up/secret"}) {
     EXPECT_FALSE(files.readFile(path, 100)) << path;

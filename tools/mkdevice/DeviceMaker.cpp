@@ -38,20 +38,23 @@ constexpr char kModulePath[] =
     "System/Library/PrivateFrameworks/FaultwatchSupport.framework/FaultwatchSupport";
 constexpr std::size_t kMaxModuleSize = std::size_t{64} << 20;
 
-Result<void> makeEmptyFolder(const fs::path& folder) {
+// With the folder that makes it a recorded device.
+Result<void> makeEmptyRoot(const fs::path& folder) {
   std::error_code error;
   if (folder.has_parent_path()) fs::create_directories(folder.parent_path(), error);
   if (error) return Error{error.message()}.at(folder.parent_path().string());
   const auto made = host::checked(::mkdir(folder.c_str(), 0700));
-  if (made) return {};
-  if (!made.error().is(std::errc::file_exists)) return made.error().at(folder.string());
-  if (!fs::is_directory(folder, error)) {
-    return Error{"it exists and is not a folder"}.at(folder.string());
+  if (!made) {
+    if (!made.error().is(std::errc::file_exists)) return made.error().at(folder.string());
+    if (!fs::is_directory(folder, error)) {
+      return Error{"it exists and is not a folder"}.at(folder.string());
+    }
+    const bool empty = fs::is_empty(folder, error);
+    if (error) return Error{error.message()}.at(folder.string());
+    if (!empty) return Error{"the folder is not empty"}.at(folder.string());
   }
-  const bool empty = fs::is_empty(folder, error);
-  if (error) return Error{error.message()}.at(folder.string());
-  if (!empty) return Error{"the folder is not empty"}.at(folder.string());
-  return {};
+  const fs::path device = folder / "device";
+  return host::checked(::mkdir(device.c_str(), 0700)).at(device.string());
 }
 
 // `path` is a path of the device.
@@ -134,7 +137,7 @@ Result<void> playDay(const MakingOptions& options, Sample sample, const SampleCo
 }  // namespace
 
 Result<void> makeDevice(const MakingOptions& options, const Listener& listener) {
-  if (auto folder = makeEmptyFolder(options.folder); !folder) return folder;
+  if (auto folder = makeEmptyRoot(options.folder); !folder) return folder;
   const SampleCounters counters(options.sample);
   Sample sample = options.sample;
   sample.today -= options.days;
