@@ -125,7 +125,7 @@ TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
   }
   EXPECT_FALSE(std::filesystem::exists(missing.root().path()));
   EXPECT_EQ(empty.record(kGateRecord), Value(empty.today() - 1));
-  EXPECT_TRUE(empty.recorded().empty());
+  EXPECT_EQ(empty.recorded().size(), 2u) << "disk usage";
   EXPECT_TRUE(empty.history().empty());
 }
 
