@@ -19,6 +19,14 @@ class Allowance {
   bool takeElements(std::size_t count) { return takeValues(count, sizeof(Value)); }
   bool takeEntries(std::size_t count) { return takeValues(count, sizeof(Dictionary::Entry)); }
 
+  // Elements or entries for which a container that isn't empty makes room beyond those it has.
+  bool takeUnusedElements(std::size_t count) {
+    return takeBytes(count * sizeof(Value) + kOverhead);
+  }
+  bool takeUnusedEntries(std::size_t count) {
+    return takeBytes(count * sizeof(Dictionary::Entry) + kOverhead);
+  }
+
   // The bytes of a text, a key or data; short ones have their place in the value.
   bool takeContent(std::size_t size) {
     return size < sizeof(std::string) / 2 || takeBytes(size + kOverhead);

@@ -253,9 +253,8 @@ class Reader {
     const std::optional<Range> range =
         elements(object, isArray ? referenceSize_ : 2 * referenceSize_);
     if (!range) return std::nullopt;
-    const bool room =
-        range->size <= objectsLeft_ &&
-        (isArray ? allowance_.takeElements(range->size) : allowance_.takeEntries(range->size));
+    const bool room = range->size <= objectsLeft_ &&
+                      (isArray ? allowance_.takeElements(range->size) : takeEntries(range->size));
     if (!room) return fail(object.offset, "too many objects");
     objectsLeft_ -= range->size;
     return isArray ? array(*range, depth) : dictionary(*range, depth);
@@ -292,6 +291,12 @@ class Reader {
 
   std::uint64_t reference(const Range& references, std::uint64_t i) const {
     return number(references.begin + i * referenceSize_, referenceSize_);
+  }
+
+  bool takeEntries(std::uint64_t size) {
+    constexpr std::uint64_t kUsual = Dictionary::kUsualSize;
+    const std::uint64_t unused = size == 0 || size >= kUsual ? 0 : kUsual - size;
+    return allowance_.takeEntries(size) && allowance_.takeUnusedEntries(unused);
   }
 
   bool takeContent(const Object& object, std::uint64_t size) {

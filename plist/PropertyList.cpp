@@ -24,6 +24,8 @@ std::size_t memoryOf(const Value& value) {
     for (const Dictionary::Entry& entry : *dictionary) {
       all += memoryOf(entry.value) + sizeof(std::string) + entry.key.size();
     }
+    const bool hasUnused = !dictionary->empty() && dictionary->size() < Dictionary::kUsualSize;
+    if (hasUnused) all += (Dictionary::kUsualSize - dictionary->size()) * sizeof(Dictionary::Entry);
   }
   return all;
 }

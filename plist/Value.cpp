@@ -136,7 +136,7 @@ Value& Dictionary::setKey(Key&& key, Value&& value) {
   }
   if (index_) index_->expected = found + 1;
   if (found < entries_.size()) return entries_[found].value = std::move(value);
-  if (entries_.empty()) entries_.reserve(kUnindexed / 2);
+  if (entries_.empty()) entries_.reserve(kUsualSize);
   entries_.emplace_back(std::forward<Key>(key), std::move(value));
   if (!index_) {
     if (entries_.size() > kUnindexed) buildIndex();

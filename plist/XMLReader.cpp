@@ -111,7 +111,7 @@ std::optional<double> realFrom(std::string_view text) {
 }
 
 constexpr std::size_t kUsualArraySize = 8;
-constexpr std::size_t kUnusedElements = (kUsualArraySize - 1) * sizeof(Value);
+constexpr std::size_t kPiece = std::size_t{64} << 10;
 
 // Builds the value while expat reads: containers grow in place, the scalar that is open gathers its
 // text in a buffer that is used again and again.
@@ -140,8 +140,14 @@ class Reader {
 
   base::Result<Value> read(std::string_view bytes) {
     if (parser_ == nullptr) return base::Error{"XML property list: out of memory"};
-    const XML_Status status =
-        XML_Parse(parser_.get(), bytes.data(), static_cast<int>(bytes.size()), XML_TRUE);
+    // In pieces: expat copies what it is given.
+    XML_Status status = XML_STATUS_OK;
+    do {
+      const std::string_view piece = bytes.substr(0, kPiece);
+      bytes.remove_prefix(piece.size());
+      status = XML_Parse(parser_.get(), piece.data(), static_cast<int>(piece.size()),
+                         bytes.empty() ? XML_TRUE : XML_FALSE);
+    } while (status == XML_STATUS_OK && !bytes.empty());
     if (status != XML_STATUS_OK && error_.empty()) {
       fail(XML_ErrorString(XML_GetErrorCode(parser_.get())));
     }
@@ -202,14 +208,15 @@ class Reader {
     }
   }
 
-  // The room for a value, and for the key before it. Arrays begin with room for a few.
+  // The room for a value, and for the key before it. Containers begin with room for a few.
   bool takeValue() {
     if (containers_.empty()) return true;
-    if (containers_.back().dictionary != nullptr) {
-      return allowance_.takeEntries(1) && allowance_.takeContent(key_.size());
+    if (const Dictionary* dictionary = containers_.back().dictionary) {
+      return allowance_.takeEntries(1) && allowance_.takeContent(key_.size()) &&
+             (!dictionary->empty() || allowance_.takeUnusedEntries(Dictionary::kUsualSize - 1));
     }
-    const std::size_t size = containers_.back().array->size();
-    return allowance_.takeElements(1) && (size > 0 || allowance_.takeContent(kUnusedElements));
+    return allowance_.takeElements(1) && (!containers_.back().array->empty() ||
+                                          allowance_.takeUnusedElements(kUsualArraySize - 1));
   }
 
   template <typename Empty>

@@ -7,6 +7,7 @@
 
 #include <limits>
 #include <system_error>
+#include <utility>
 
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"
@@ -15,6 +16,9 @@
 namespace host {
 
 namespace {
+
+// What is kept of a file between reads.
+constexpr std::size_t kMaxStored = std::size_t{8} << 20;
 
 bool sameFile(const struct stat& a, const struct stat& b) {
   return a.st_dev == b.st_dev && a.st_ino == b.st_ino && a.st_size == b.st_size &&
@@ -45,8 +49,10 @@ base::Result<std::optional<plist::Value>> PreferenceFile::value(std::string_view
   if (state_ == State::unreadable && !readError_->is(std::errc::not_a_directory)) {
     return readError_->at(path());
   }
-  const plist::Value* value = stored_.find(key);
-  return value != nullptr ? std::optional(*value) : std::nullopt;
+  const plist::Value* stored = stored_.find(key);
+  std::optional<plist::Value> value = stored != nullptr ? std::optional(*stored) : std::nullopt;
+  if (isLarge_) takeStored();
+  return value;
 }
 
 void PreferenceFile::change(std::string_view key, const plist::Value* value) {
@@ -106,7 +112,14 @@ void PreferenceFile::load(bool evenIfUnchanged) {
   auto* dictionary = value->as<plist::Dictionary>();
   if (dictionary == nullptr) return fail(State::broken, {"the top level is not a dictionary"});
   state_ = State::whole;
+  isLarge_ = plist::memoryOf(*value) > kMaxStored;
   stored_ = std::move(*dictionary);
+}
+
+// What was read, to be read anew when it is asked for.
+plist::Dictionary PreferenceFile::takeStored() {
+  if (state_ == State::whole) state_ = State::absent;
+  return std::exchange(stored_, {});
 }
 
 void PreferenceFile::fail(State state, const base::Error& why) {
@@ -146,18 +159,25 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
   load(true);
   if (state_ == State::unreadable) return *readError_;
 
-  plist::Dictionary merged = stored_;
+  // Compared as they are written: values of two types may be equal. What was read is changed where
+  // it is, and read anew if it is asked for again.
+  const State was = state_;
+  plist::Value all = takeStored();
+  const auto before = plist::writeXML(all);
+  auto& merged = *all.as<plist::Dictionary>();
   for (const std::string& key : removed_) merged.remove(key);
   for (const plist::Dictionary::Entry& entry : set_) merged.set(entry.key, entry.value);
   if (edit != nullptr) edit(merged);
-  // Compared as they are written: values of two types may be equal.
-  const auto before = plist::writeXML(stored_);
-  const auto after = plist::writeXML(std::move(merged));
+  const auto after = plist::writeXML(all);
   if (!after) return after.error();
-  if (before && *before == *after) return {};
+  if (before && *before == *after) {
+    stored_ = std::move(merged);
+    state_ = was;
+    return {};
+  }
   if (after->size() > plist::kMaxSize) return base::Error{"it would be larger than 16 MiB"};
 
-  if (state_ == State::broken) {
+  if (was == State::broken) {
     auto kept =
         root_.patience()([&] { return keepBeside(folder->get(), name_, name_ + ".corrupt"); });
     if (!kept) return std::move(kept).at("it can't be kept as .corrupt");

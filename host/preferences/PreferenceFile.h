@@ -64,6 +64,7 @@ class PreferenceFile {
   using Edit = std::function<void(plist::Dictionary& values)>;
 
   void load(bool evenIfUnchanged);
+  plist::Dictionary takeStored();
   void fail(State state, const base::Error& why);
   void write(const Edit& edit);
   base::Result<void> merge(const Edit& edit);
@@ -78,6 +79,7 @@ class PreferenceFile {
   State state_ = State::absent;
   struct stat status_ {};
   plist::Dictionary stored_;
+  bool isLarge_ = false;
 
   plist::Dictionary set_;
   std::set<std::string, std::less<>> removed_;
