@@ -13,6 +13,10 @@
 
 namespace plist {
 
+// A dictionary, and an array of which nobody said the size, make room for a few at their first.
+inline constexpr std::size_t kUsualDictionarySize = 4;
+inline constexpr std::size_t kUsualArraySize = 8;
+
 class Allowance {
  public:
   // Values for which a container has room, in each place in which they appear.

@@ -294,7 +294,7 @@ class Reader {
   }
 
   bool takeEntries(std::uint64_t size) {
-    constexpr std::uint64_t kUsual = Dictionary::kUsualSize;
+    constexpr std::uint64_t kUsual = kUsualDictionarySize;
     const std::uint64_t unused = size == 0 || size >= kUsual ? 0 : kUsual - size;
     return allowance_.takeEntries(size) && allowance_.takeUnusedEntries(unused);
   }

@@ -4,6 +4,7 @@
 #include "plist/PropertyList.h"
 
 #include "base/Text.h"
+#include "plist/Allowance.h"
 #include "plist/BinaryReader.h"
 #include "plist/XMLReader.h"
 
@@ -24,8 +25,8 @@ std::size_t memoryOf(const Value& value) {
     for (const Dictionary::Entry& entry : *dictionary) {
       all += memoryOf(entry.value) + sizeof(std::string) + entry.key.size();
     }
-    const bool hasUnused = !dictionary->empty() && dictionary->size() < Dictionary::kUsualSize;
-    if (hasUnused) all += (Dictionary::kUsualSize - dictionary->size()) * sizeof(Dictionary::Entry);
+    const bool hasUnused = !dictionary->empty() && dictionary->size() < kUsualDictionarySize;
+    if (hasUnused) all += (kUsualDictionarySize - dictionary->size()) * sizeof(Dictionary::Entry);
   }
   return all;
 }

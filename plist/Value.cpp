@@ -11,6 +11,7 @@
 #include "base/Convert.h"
 #include "base/KeyIndex.h"
 #include "base/Text.h"
+#include "plist/Allowance.h"
 
 namespace plist {
 
@@ -136,7 +137,7 @@ Value& Dictionary::setKey(Key&& key, Value&& value) {
   }
   if (index_) index_->expected = found + 1;
   if (found < entries_.size()) return entries_[found].value = std::move(value);
-  if (entries_.empty()) entries_.reserve(kUsualSize);
+  if (entries_.empty()) entries_.reserve(kUsualDictionarySize);
   entries_.emplace_back(std::forward<Key>(key), std::move(value));
   if (!index_) {
     if (entries_.size() > kUnindexed) buildIndex();

@@ -133,9 +133,6 @@ class Dictionary {
   const Entry* begin() const;
   const Entry* end() const;
 
-  // The first entry makes room for a few.
-  static constexpr std::size_t kUsualSize = 4;
-
   // Equal when they hold equal values under the same keys, in any order.
   bool operator==(const Dictionary& other) const;
 

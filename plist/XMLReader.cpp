@@ -110,7 +110,6 @@ std::optional<double> realFrom(std::string_view text) {
   return value;
 }
 
-constexpr std::size_t kUsualArraySize = 8;
 constexpr std::size_t kPiece = std::size_t{64} << 10;
 
 // Builds the value while expat reads: containers grow in place, the scalar that is open gathers its
@@ -213,7 +212,7 @@ class Reader {
     if (containers_.empty()) return true;
     if (const Dictionary* dictionary = containers_.back().dictionary) {
       return allowance_.takeEntries(1) && allowance_.takeContent(key_.size()) &&
-             (!dictionary->empty() || allowance_.takeUnusedEntries(Dictionary::kUsualSize - 1));
+             (!dictionary->empty() || allowance_.takeUnusedEntries(kUsualDictionarySize - 1));
     }
     return allowance_.takeElements(1) && (!containers_.back().array->empty() ||
                                           allowance_.takeUnusedElements(kUsualArraySize - 1));
