@@ -3,6 +3,7 @@
 
 #include "host/device/UsageReplies.h"
 
+#include <optional>
 #include <system_error>
 #include <utility>
 
@@ -39,11 +40,12 @@ void UsageReplies::serve() {
     Query query = std::move(queries_.front());
     queries_.pop_front();
     lock.unlock();
-    const Answer answer = answer_();
+    const std::optional<Answer> answer = answer_();
     lock.lock();
-    if (changed_.wait_until(lock, query.asked + answer.delay, [this] { return ending_; })) return;
+    if (!answer) continue;
+    if (changed_.wait_until(lock, query.asked + answer->delay, [this] { return ending_; })) return;
     lock.unlock();
-    query.reply(answer.records);
+    query.reply(answer->records);
     query.reply = nullptr;
     lock.lock();
   }

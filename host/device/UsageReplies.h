@@ -9,6 +9,7 @@
 #include <deque>
 #include <functional>
 #include <mutex>
+#include <optional>
 #include <thread>
 
 #include "platform/NetworkUsage.h"
@@ -25,8 +26,9 @@ class UsageReplies {
     std::chrono::milliseconds delay = {};
   };
 
-  // `answer` is called on the thread, once for each query.
-  explicit UsageReplies(std::function<Answer()> answer) : answer_(std::move(answer)) {}
+  // `answer` is called on the thread, once for each query; one without an answer is not replied.
+  explicit UsageReplies(std::function<std::optional<Answer>()> answer)
+      : answer_(std::move(answer)) {}
 
   // Waits for an answer or a reply that has begun, and drops the others: what they use must outlive
   // this.
@@ -45,7 +47,7 @@ class UsageReplies {
 
   void serve();
 
-  const std::function<Answer()> answer_;
+  const std::function<std::optional<Answer>()> answer_;
 
   std::mutex mutex_;  // over all that follows but the thread
   std::condition_variable changed_;

@@ -89,7 +89,7 @@ base::Result<std::string> readRegularFile(int file, std::size_t maximum) {
   return bytes;
 }
 
-base::Result<std::vector<std::string>> namesInFolder(int folder) {
+base::Result<std::vector<std::string>> namesInFolder(int folder, std::size_t maximum) {
   // A description of its own, because the place in the listing belongs to the description.
   const int again = ::openat(folder, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
   if (again < 0) return systemError();
@@ -104,6 +104,7 @@ base::Result<std::vector<std::string>> namesInFolder(int folder) {
   while (const dirent* entry = ::readdir(listing.get())) {
     const std::string_view name = entry->d_name;
     if (name != "." && name != "..") names.emplace_back(name);
+    if (names.size() > maximum) return systemError(EOVERFLOW);
     errno = 0;
   }
   if (errno != 0) return systemError();

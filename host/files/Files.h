@@ -11,6 +11,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <limits>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -25,8 +26,10 @@ namespace host {
 // is an error.
 base::Result<std::string> readRegularFile(int file, std::size_t maximum);
 
-// The names in an open folder, "." and ".." left out, in bytewise order.
-base::Result<std::vector<std::string>> namesInFolder(int folder);
+// The names in an open folder, "." and ".." left out, in bytewise order. More than `maximum` are an
+// error.
+base::Result<std::vector<std::string>> namesInFolder(
+    int folder, std::size_t maximum = std::numeric_limits<std::size_t>::max());
 
 // The longest name that a file can have, in bytes.
 inline constexpr std::size_t kMaxFileName = 255;

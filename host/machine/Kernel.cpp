@@ -11,7 +11,6 @@
 #include <limits>
 #include <optional>
 #include <span>
-#include <string>
 #include <string_view>
 #include <vector>
 
@@ -24,17 +23,6 @@ namespace {
 
 constexpr std::size_t kBootIdLength = 36;
 constexpr std::size_t kSwapUsageSize = 32;
-
-// The number after a name, in a file of lines "<name> <number>".
-std::optional<std::uint64_t> countNamed(const std::optional<std::string>& text,
-                                        std::string_view name) {
-  if (!text) return std::nullopt;
-  for (std::string_view lines = *text; !lines.empty();) {
-    std::string_view line = takeUntil(lines, '\n');
-    if (takeWord(line) == name) return countIn(takeWord(line));
-  }
-  return std::nullopt;
-}
 
 std::uint64_t product(std::uint64_t left, std::uint64_t right) {
   std::uint64_t result = 0;

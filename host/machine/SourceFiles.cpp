@@ -16,7 +16,6 @@
 #include <string>
 #include <string_view>
 #include <system_error>
-#include <utility>
 #include <vector>
 
 #include "host/files/Files.h"
@@ -106,9 +105,17 @@ std::vector<std::string> sourceNames(const DeviceRoot& files, std::string_view p
   const auto folder =
       files.openFolder(path, DeviceRoot::Missing::fails, DeviceRoot::Links::followed);
   if (!folder) return {};
-  auto names = namesInFolder(folder->get());
-  if (!names || names->size() > kMaxNames) return {};
-  return *std::move(names);
+  return namesInFolder(folder->get(), kMaxNames).orNone().value_or(std::vector<std::string>());
+}
+
+std::optional<std::uint64_t> countNamed(const std::optional<std::string>& text,
+                                        std::string_view name) {
+  if (!text) return std::nullopt;
+  for (std::string_view lines = *text; !lines.empty();) {
+    std::string_view line = takeUntil(lines, '\n');
+    if (takeWord(line) == name) return countIn(takeWord(line));
+  }
+  return std::nullopt;
 }
 
 std::string assignedValue(std::string_view lines, std::string_view name) {

@@ -46,6 +46,10 @@ std::string_view takeWord(std::string_view& line);
 // saturates.
 std::optional<std::uint64_t> countIn(std::string_view word);
 
+// The number after a name, in a text of lines "<name> <number>"; the first of that name.
+std::optional<std::uint64_t> countNamed(const std::optional<std::string>& text,
+                                        std::string_view name);
+
 // The value of a shell-like assignment, NAME=value, one on a line: in quotes or bare, with
 // backslash escapes. The last one of a name holds; empty when there is none.
 std::string assignedValue(std::string_view lines, std::string_view name);

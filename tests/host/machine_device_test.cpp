@@ -6,9 +6,11 @@
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/utsname.h>
+#include <systemd/sd-bus.h>
 #include <systemd/sd-id128.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <cstdint>
 #include <cstdlib>
@@ -18,13 +20,22 @@
 #include <span>
 #include <string>
 #include <string_view>
+#include <system_error>
+#include <thread>
+#include <utility>
 #include <vector>
 
+#include "base/ByteReader.h"
 #include "host/files/DeviceRoot.h"
+#include "host/machine/Applications.h"
 #include "host/machine/DeviceProperties.h"
 #include "host/machine/Kernel.h"
 #include "host/machine/Locale.h"
+#include "host/machine/NetworkUsage.h"
+#include "host/machine/ReportingChannels.h"
 #include "host/machine/SourceFiles.h"
+#include "host/machine/UnitTraffic.h"
+#include "support/PrivateBus.h"
 #include "support/TemporaryFolder.h"
 
 namespace {
@@ -175,6 +186,263 @@ TEST_F(MachineDevice, LanguagesAreTheEnvironmentsElseTheSystems) {
       EXPECT_EQ(locale.systemLocalizations(), Texts{"en"});
     }
   }
+}
+
+TEST_F(MachineDevice, ErrorCountersAreSummedOverTheDevicesOfADriver) {
+  const std::pair<const char*, std::string> sound[] = {
+      {"sys/devices/system/edac/mc/mc0/ce_count", "3\n"},
+      {"sys/devices/system/edac/mc/mc0/ue_count", "0\n"},
+      {"sys/devices/system/edac/mc/power/x", "1"},
+      {"sys/bus/pci/devices/0000:01/aer_dev_correctable", "RxErr 9\nTOTAL_ERR_COR 5\n"},
+      {"sys/bus/pci/devices/0000:01/aer_dev_fatal", "TOTAL_ERR_FATAL 1\n"},
+      {"sys/bus/pci/devices/0000:01/uevent", "DRIVER=nvme\nPCI_ID=1\n"},
+      {"sys/bus/pci/devices/0000:02/aer_dev_correctable", "TOTAL_ERR_COR 7"},
+      {"sys/bus/pci/devices/0000:02/uevent", "DRIVER=nvme"},
+      {"sys/bus/pci/devices/0000:03/aer_dev_correctable", "TOTAL_ERR_COR 7"},
+      {"sys/bus/pci/devices/0000:03/uevent", "PCI_ID=2"},
+      {"sys/block/sda/device/ioerr_cnt", "0x1f\n"},
+      {"sys/block/loop0/size", "1"},
+      {"sys/class/net/a/device/uevent", "DRIVER=e 1\n"},
+      {"sys/class/net/a/statistics/rx_errors", "18446744073709551615"},
+      {"sys/class/net/a/statistics/tx_errors", "many"},
+      {"sys/class/net/b/device/uevent", "DRIVER=e 1"},
+      {"sys/class/net/b/statistics/rx_errors", "2"},
+      {"sys/class/net/lo/statistics/rx_errors", "4"},
+  };
+  machine::ReportingChannels facility(files);
+  EXPECT_TRUE(facility.copyChannels(~0U).empty());
+  for (const auto& [path, text] : sound) folder.write(path, text);
+  for (const unsigned none : {0U, 0x200U}) EXPECT_TRUE(facility.copyChannels(none).empty());
+  const auto channels = facility.copyChannels(0x100);
+  EXPECT_EQ(facility.copyChannels(1).size(), channels.size());
+  Texts names, samples;
+  for (const auto& channel : channels) {
+    EXPECT_EQ(channel.format, platform::kSimpleChannelFormat);
+    names.push_back(channel.name);
+  }
+  const auto subscription = facility.subscribe(channels);
+  std::filesystem::remove(folder / "sys/bus/pci/devices/0000:01/aer_dev_fatal");
+  const auto taken = subscription->createSamples();
+  for (const auto& [channel, value] : *taken) {
+    samples.push_back(channel.name + " " + std::to_string(value));
+  }
+  EXPECT_EQ(names, (Texts{"aer.nvme.correctable", "aer.nvme.fatal", "block.sda.io_errors",
+                          "edac.mc0.corrected", "edac.mc0.uncorrected", "net.e_1.rx_errors"}));
+  EXPECT_EQ(samples,
+            (Texts{"aer.nvme.correctable 12", "block.sda.io_errors 31", "edac.mc0.corrected 3",
+                   "edac.mc0.uncorrected 0", "net.e_1.rx_errors 9223372036854775807"}));
+}
+
+TEST_F(MachineDevice, ApplicationsAreTheDesktopEntriesThatAreShown) {
+  const std::string shown = "#x\n[Desktop Entry]\nType = Application \n[Desktop Action a]\n";
+  const std::string hidden = "[Desktop Entry]\nType=Application\nHidden=true\n";
+  const struct {
+    std::string path, text;
+    const char* counts;  // the types of all so far
+  } rows[] = {
+      {"usr/share/applications/a.desktop", shown, "s"},
+      {"usr/share/applications/deep/er/b.desktop", shown + "NoDisplay=true", "ss"},
+      {"usr/share/applications/c.desktop", "[Desktop Entry]\nType=Link\n", "ss"},
+      {"usr/share/applications/d.desktop", "Type=Application\n[Desktop Entry]\n", "ss"},
+      {"usr/share/applications/e.desktop", "[Desktop Entry]\nType=Application\nNoDisplay=true",
+       "ss"},
+      {"usr/share/applications/f.desktop", shown + std::string(256 << 10, '#'), "ss"},
+      {"usr/share/applications/g.txt", shown, "ss"},
+      {"usr/share/applications/1/2/3/4/5/h.desktop", shown, "ss"},
+      {"home/u/.local/share/applications/a.desktop", shown, "ss"},
+      {"home/u/.local/share/applications/i.desktop", shown, "ssu"},
+      {"var/lib/flatpak/exports/share/applications/j.desktop", shown, "ssuu"},
+      {"usr/local/share/applications/a.desktop", hidden, "suu"},
+  };
+  for (const auto& row : rows) {
+    folder.write(row.path, row.text);
+    std::string counts;
+    machine::Applications(files).enumerateBundles([&](auto type) {
+      counts += type == platform::InstalledApplications::BundleType::user ? 'u' : 's';
+    });
+    EXPECT_EQ(counts, row.counts) << row.path;
+  }
+  std::filesystem::create_symlink(".", folder / "usr/share/applications/loop");
+  int found = 0;
+  machine::Applications(files).enumerateBundles([&](auto) { ++found; });
+  EXPECT_LT(found, 40) << "a loop of folders ends";
+}
+
+// The kernel's own form: what was swapped out, where the storage library looks for it.
+TEST_F(MachineDevice, TheSnapshotHoldsWhatWasSwappedOut) {
+  machine::Kernel kernel(files);
+  machine::KernelSnapshots snapshots(files, kernel);
+  constexpr auto kFlags = platform::KernelSnapshots::kChunkedData;
+  EXPECT_EQ(snapshots.capture(kFlags), std::nullopt);
+  const std::uint64_t page = kernel.pageSize();
+  for (const auto& [text, bytes] :
+       {std::pair<const char*, std::uint64_t>{"pswpin 1\npswpout 5\n", 5 * page},
+        {"pswpout 99999999999999999999", UINT64_MAX}}) {
+    folder.write("proc/vmstat", text);
+    EXPECT_EQ(snapshots.capture(0), std::nullopt);
+    const auto snapshot = snapshots.capture(kFlags);
+    ASSERT_TRUE(snapshot);
+    // Container, its kind, thread name, four counters, end, end of the buffer.
+    ASSERT_EQ(snapshot->size(), 5 * 16 + 4 + sizeof "VM_swapout" + 32);
+    base::ByteReader reader{
+        std::span<const std::byte>(*snapshot).subspan(2 * 16 + 4 + sizeof "VM_swapout" + 16 + 24)};
+    EXPECT_EQ(reader.read<std::uint64_t>(), bytes);
+  }
+}
+
+TEST_F(MachineDevice, TheDefaultRouteIsTheOneOfTheLowestMetric) {
+  const std::string heading = "Iface\tDestination\tGateway\tFlags\tRefCnt\tUse\tMetric\tMask\n";
+  const auto route = [](const char* interface, const char* destination, const char* flags,
+                        const char* metric, const char* mask = "00000000") {
+    return std::string(interface) + "\t" + destination + "\t0\t" + flags + "\t0\t0\t" + metric +
+           "\t" + mask + "\t0\n";
+  };
+  const std::string zeros(32, '0');
+  folder.write("sys/class/net/wwan0/uevent", "INTERFACE=wwan0\nDEVTYPE=wwan\n");
+  folder.write("sys/class/net/eth0/uevent", "INTERFACE=eth0\n");
+  const struct {
+    std::string four, six;
+    bool isMobile;
+  } rows[] = {
+      {"", "", false},
+      {heading + route("wwan0", "00000000", "0003", "700"), "", true},
+      {route("wwan0", "00000000", "0003", "700") + route("eth0", "00000000", "0003", "100"), "",
+       false},
+      {route("wwan0", "00000000", "0003", "700") + route("eth0", "00000000", "0002", "100"), "",
+       true},
+      {route("wwan0", "0000A8C0", "0003", "1", "00FFFFFF"), "", false},
+      {route("../wwan0", "00000000", "0003", "1") + "\n\n00000000 x", "", false},
+      {"", zeros + " 00 " + zeros + " 00 " + zeros + " 00000400 1 0 00000003    wwan0\n", true},
+      {"", zeros + " 00 " + zeros + " 00 " + zeros + " ffffffff 1 0 00200200       lo\n", false},
+  };
+  for (const auto& row : rows) {
+    folder.write("proc/net/route", row.four);
+    folder.write("proc/net/ipv6_route", row.six);
+    EXPECT_EQ(machine::defaultRouteIsMobile(files), row.isMobile) << row.four << row.six;
+  }
+}
+
+// However the route changes and a unit is started anew, a count only grows while its date stands,
+// and both kinds together are what the unit has had.
+TEST_F(MachineDevice, TrafficIsCountedOnceUnderTheKindOfItsDay) {
+  using Counts = std::vector<std::int64_t>;
+  const struct {
+    double since;
+    std::uint64_t received, sent;
+    bool isMobile;
+    Counts counts;
+  } days[] = {
+      {1000.25, 100, 10, false, {100, 10, 0, 0}},
+      {1000.25, 150, 10, true, {100, 10, 50, 0}},
+      {1000.25, 150, 30, false, {100, 30, 50, 0}},
+      {1000.5, 170, 30, true, {100, 30, 70, 0}},
+      {2000, 20, 2, true, {0, 0, 20, 2}},
+      {2000, 5, 2, false, {5, 0, 0, 2}},
+      {2000, UINT64_MAX - 1, 2, false, {INT64_MAX, 0, 0, 2}},
+  };
+  plist::Dictionary remembered{{"u", "no array"}};
+  for (const auto& day : days) {
+    const auto usage =
+        machine::usageByRoute(remembered, {{"u", day.since, day.received, day.sent}}, day.isMobile);
+    ASSERT_EQ(usage.records.size(), 1u);
+    const auto& record = *usage.records[0].as<plist::Dictionary>();
+    Counts counts;
+    for (const char* name : {"wifiInBytes", "wifiOutBytes", "wwanInBytes", "wwanOutBytes"}) {
+      counts.push_back(record.number(name)->int64Value());
+    }
+    EXPECT_EQ(counts, day.counts) << day.since << " " << day.received;
+    EXPECT_EQ(*record.text("procName"), "u");
+    EXPECT_EQ(record.date(platform::kUsageSinceKey)->secondsSince1970, day.since);
+    remembered = usage.remembered;
+  }
+  EXPECT_TRUE(machine::usageByRoute(remembered, {}, false).remembered.empty());
+}
+
+// What is called systemd on a bus of the test's own: on a thread, as it answers.
+class UnitsOnABus : public testing::Test {
+ protected:
+  UnitsOnABus() { ::setenv("DBUS_SYSTEM_BUS_ADDRESS", bus.address().c_str(), 1); }
+  ~UnitsOnABus() override {
+    stops = true;
+    if (thread.joinable()) thread.join();
+    ::unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+  }
+
+  void serve() {
+    client.emplace(bus.address());
+    ASSERT_GE(sd_bus_request_name(client->bus(), "org.freedesktop.systemd1", 0), 0);
+    ASSERT_GE(sd_bus_add_filter(client->bus(), nullptr, answer, this), 0);
+    thread = std::thread([this] {
+      while (!stops) {
+        if (sd_bus_process(client->bus(), nullptr) == 0) sd_bus_wait(client->bus(), 10'000);
+      }
+    });
+  }
+
+  static int answer(sd_bus_message* call, void* test, sd_bus_error*) {
+    auto& self = *static_cast<UnitsOnABus*>(test);
+    if (sd_bus_message_is_method_call(call, nullptr, "ListUnitsByPatterns") > 0) {
+      sd_bus_message* list = nullptr;
+      sd_bus_message_new_method_return(call, &list);
+      sd_bus_message_open_container(list, 'a', "(ssssssouso)");
+      for (const char* unit : {"accounted.service", "restarts.service", "gone.service",
+                               "other.scope", "whole.slice"}) {
+        const std::string path = "/" + std::string(unit).substr(0, std::string(unit).find('.'));
+        sd_bus_message_append(list, "(ssssssouso)", unit, "", "loaded", "active", "running", "",
+                              path.c_str(), 0, "", "/");
+      }
+      sd_bus_message_close_container(list);
+      sd_bus_send(nullptr, list, nullptr);
+      sd_bus_message_unref(list);
+      return 1;
+    }
+    const char *interface = nullptr, *name = nullptr;
+    if (sd_bus_message_is_method_call(call, nullptr, "Get") <= 0 ||
+        sd_bus_message_read(call, "ss", &interface, &name) < 0) {
+      return 0;
+    }
+    const std::string path = sd_bus_message_get_path(call);
+    if (path == "/gone") return sd_bus_reply_method_errorf(call, SD_BUS_ERROR_UNKNOWN_OBJECT, "-");
+    std::uint64_t value = std::string_view(name) == "IPIngressBytes" ? 100 : 7;
+    if (path == "/other") value = UINT64_MAX;
+    if (std::string_view(name) == "ActiveEnterTimestamp") {
+      value = 1'500'000 + (path == "/restarts" ? ++self.starts / 2 * 1'000'000 : 0);
+    }
+    sd_bus_reply_method_return(call, "v", "t", value);
+    return 1;
+  }
+
+  support::PrivateBus bus;
+  std::optional<support::BusClient> client;
+  std::uint64_t starts = 0;
+  std::atomic<bool> stops = false;
+  std::thread thread;
+};
+
+TEST_F(UnitsOnABus, ThoseThatAreAccountedAreReadWithinOneRunOfTheirs) {
+  using namespace std::chrono_literals;
+  auto none = machine::unitTraffic(5s);
+  ASSERT_TRUE(none) << none.error().text;
+  EXPECT_TRUE(none->empty()) << "nobody is called systemd";
+  serve();
+  const auto traffic = machine::unitTraffic(5s);
+  ASSERT_TRUE(traffic) << traffic.error().text;
+  Texts found;
+  for (const auto& unit : *traffic) {
+    found.push_back(unit.name + " " + std::to_string(unit.since) + " " +
+                    std::to_string(unit.received) + " " + std::to_string(unit.sent));
+  }
+  EXPECT_EQ(found, (Texts{"accounted.service 1.500000 100 7"})) << "one never stands still";
+}
+
+TEST_F(UnitsOnABus, ABusThatIsSilentOrGoneIsNotWaitedFor) {
+  using namespace std::chrono_literals;
+  bus.freeze();
+  EXPECT_TRUE(machine::unitTraffic(20ms).error().is(std::errc::timed_out));
+  bus.kill();
+  const auto none = machine::unitTraffic(5s);
+  ASSERT_TRUE(none) << none.error().text;
+  EXPECT_TRUE(none->empty());
 }
 
 }  // namespace
