@@ -93,7 +93,8 @@ Result<void> forEachChange(std::string_view batch,
     const auto value = reader.read<std::uint64_t>();
     const auto length = reader.read<std::uint32_t>();
     const auto key = length ? reader.take(*length) : std::nullopt;
-    if (!key || *kind > static_cast<std::uint8_t>(CounterChange::Kind::push)) return foreign;
+    if (!value || !key || *kind > static_cast<std::uint8_t>(CounterChange::Kind::push))
+      return foreign;
     CounterChange change{
         .kind = static_cast<CounterChange::Kind>(*kind),
         .key = {reinterpret_cast<const char*>(key->data()), key->size()},
