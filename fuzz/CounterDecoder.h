@@ -6,7 +6,6 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <cstdlib>
 #include <memory_resource>
 #include <span>
 #include <string>
@@ -14,15 +13,14 @@
 #include <utility>
 #include <vector>
 
+#include "Input.h"
 #include "NANDInfo/GenericParserContext.h"
 
 namespace fuzz {
 
 using Fields = std::vector<std::pair<std::string, std::uint64_t>>;
 
-inline void require(bool condition) {
-  if (!condition) std::abort();
-}
+inline void require(bool condition) { require(condition, "decoders keep their promise"); }
 
 inline Fields fieldsOf(const NANDInfo::GenericParserCxt& context) {
   Fields fields;

@@ -4,23 +4,17 @@
 // What must hold for every property list that could be read.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 #include <string>
 
+#include "Input.h"
 #include "plist/JSON.h"
 #include "plist/PropertyList.h"
 #include "plist/Value.h"
 #include "plist/XMLReader.h"
 
 namespace fuzz {
-
-inline void require(bool holds, const char* what) {
-  if (holds) return;
-  std::fprintf(stderr, "%s\n", what);
-  std::abort();
-}
 
 // Reads with one of the readers; a value must write, and read back as one that is the same in both
 // of the forms that are written.

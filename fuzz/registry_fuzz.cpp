@@ -2,14 +2,11 @@
 // Copyright the morvend authors
 
 // Bytes as the registry file, and then every question to every entry and driver.
-#include <unistd.h>
-
-#include <filesystem>
-#include <fstream>
 #include <span>
-#include <string>
+#include <vector>
 
-#include "PropertyListRoundTrip.h"
+#include "Input.h"
+#include "MemoryFolder.h"
 #include "base/ByteWriter.h"
 #include "host/recorded/DeviceRegistry.h"
 #include "plist/PropertyList.h"
@@ -21,23 +18,14 @@ using namespace platform;
 using fuzz::require;
 using host::recorded::DeviceRegistry;
 
-constexpr std::size_t kMaxEntries = 200, kMaxOutput = 4096;
+constexpr std::size_t kMaxEntries = 200, kMaxOutput = 256;
 
 // A root in memory, with one file for drivers to answer from and one outside device/.
-struct Folder {
-  Folder() {
-    const bool inMemory = std::filesystem::is_directory("/dev/shm");
-    path = std::string(inMemory ? "/dev/shm" : "/tmp") + "/registry-fuzz-XXXXXX";
-    require(::mkdtemp(path.data()) != nullptr, "there is a folder");
-    write("buffer", "below device/");
-    std::ofstream(path + "/outside") << "OUTSIDE";
+struct Folder : fuzz::MemoryFolder {
+  Folder() : MemoryFolder("device") {
+    fuzz::writeFile(path / "device/buffer", "below device/");
+    fuzz::writeFile(path / "outside", "OUTSIDE");
   }
-  ~Folder() { std::filesystem::remove_all(path); }
-  void write(const std::string& name, std::string_view bytes) const {
-    std::filesystem::create_directories(path + "/device");
-    std::ofstream(path + "/device/" + name, std::ios::binary) << bytes;
-  }
-  std::string path;
 };
 
 // The number of lines, and whether one is about handles.
@@ -66,9 +54,9 @@ void callStruct(host::recorded::DeviceRegistry& registry, DriverConnection conne
   const auto result = registry.DrvCallStructMethod(connection, method, block, output);
   require(result.outputSize <= capacity, "no more is delivered than there is room");
   require(result.status == 0 || result.outputSize == 0, "a failed call delivers nothing");
-  for (std::size_t i = result.outputSize; i < capacity; ++i) {
-    require(output[i] == kUntouched, "what isn't delivered isn't written");
-  }
+  require(std::all_of(output.begin() + static_cast<std::ptrdiff_t>(result.outputSize), output.end(),
+                      [](std::byte byte) { return byte == kUntouched; }),
+          "what isn't delivered isn't written");
   const std::string_view text(reinterpret_cast<const char*>(output.data()), result.outputSize);
   require(text != "OUTSIDE", "no file outside device/ is read");
 }
@@ -123,8 +111,9 @@ void askEverything(host::recorded::DeviceRegistry& registry) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
   static const Folder folder;
-  static const host::DeviceRoot root(folder.path);
-  folder.write("registry.plist", {reinterpret_cast<const char*>(bytes), size});
+  static const host::DeviceRoot root(folder.path.string());
+  fuzz::writeFile(folder.path / "device/registry.plist",
+                  {reinterpret_cast<const char*>(bytes), size});
   CountingLog log;
   {
     host::recorded::DeviceRegistry registry(root, log);
