@@ -33,7 +33,7 @@ int main(int argc, char** argv) {
   host::deferEndSignals();  // a day's work that has begun is finished
   auto options = host::HostOptions::fromEnvironment();
   host::StandardErrorLog log(options.lowestLevel);
-  options.log = &log;
+  options.standardError = &log;
   // The last line, after all that the host says at its end: the exit status doesn't tell.
   if (const auto kept = run(options, argc, argv); !kept) {
     log.log(LogLevel::error, "the day is not done: %s", kept.error().text.c_str());

@@ -44,7 +44,8 @@ struct Host::Assembly {
       : root(options.root),
         machineFiles(options.machineFiles),
         ownLog(options.lowestLevel),
-        log(options.log != nullptr ? *options.log : ownLog),
+        standardError(options.standardError != nullptr ? *options.standardError : ownLog),
+        log(options.log != nullptr ? *options.log : standardError),
         played(options.played),
         libraries(root, preferences, log,
                   options.runModules ? LibraryLoader::Trusted::root
@@ -56,9 +57,10 @@ struct Host::Assembly {
 
   DeviceRoot root, machineFiles;
   StandardErrorLog ownLog;
+  StandardErrorLog& standardError;
   platform::SystemLog& log;
   const std::optional<PlayedRun> played;
-  StandardStreams streams;
+  StandardStreams streams{standardError};
   const std::unique_ptr<SystemClock> ownClock =
       played ? std::make_unique<PlayedClock>(played->now) : std::make_unique<SystemClock>();
   platform::Clock& clock = *ownClock;

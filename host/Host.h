@@ -18,13 +18,18 @@
 
 namespace host {
 
+class StandardErrorLog;
+
 struct HostOptions {
   std::string root = "/";  // the device root, a path of the host
   platform::LogLevel lowestLevel = platform::LogLevel::standard;
   bool runModules = false;               // of this root, whatever they are: it is trusted
   std::string machineFiles = "/";        // the folder of this machine's /proc, /sys, /etc and /usr
   std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
-  platform::SystemLog* log = nullptr;    // borrowed; instead of the one on standard error
+  // Both borrowed: instead of the host's own on standard error, and of that for all but its texts
+  // without a level.
+  StandardErrorLog* standardError = nullptr;
+  platform::SystemLog* log = nullptr;
 
   // As the environment says: MORVEND_ROOT, MORVEND_LOG and MORVEND_RUN_MODULES.
   static HostOptions fromEnvironment();

@@ -14,25 +14,22 @@ namespace host {
 
 class FloodGate {
  public:
-  // So many in a row are said.
-  explicit FloodGate(std::size_t maxSaid) : maxSaid_(maxSaid) {}
-
-  // Whether a message of this kind is said; `before` is then to be said first, of those of the last
-  // kind that weren't.
+  // Whether a message of this kind is said, of which `maxSaid` in a row are; `before` is then to be
+  // said first, of those of the last kind that weren't.
   struct Next {
     bool said;
     std::optional<std::string> before = {};
   };
-  Next next(std::string_view kind, std::string_view message);
+  Next next(std::string_view kind, std::string_view message, std::size_t maxSaid);
 
-  // Ends the row: what is left to say of it.
+  // Ends the row: what is left to say of it, which is how many there were beyond, or the message if
+  // that was one.
   std::optional<std::string> end();
 
  private:
-  const std::size_t maxSaid_;
   std::string kind_;
-  std::string lastSaid_;
-  std::size_t inARow_ = 0;
+  std::string lastSaid_, notSaid_;
+  std::size_t inARow_ = 0, maxSaid_ = 0;
 };
 
 }  // namespace host

@@ -12,6 +12,9 @@ namespace host {
 
 namespace {
 
+// In a row.
+constexpr std::size_t kMaxMessages = 10, kMaxDirectTexts = 3;
+
 constexpr struct {
   platform::LogLevel level;
   std::string_view name, prefix;
@@ -46,25 +49,35 @@ StandardErrorLog::~StandardErrorLog() { endRow(); }
 void StandardErrorLog::write(platform::LogLevel level, std::string_view format,
                              std::string_view message) {
   const std::scoped_lock lock(mutex_);
+  const std::string_view prefix = terminal_ ? std::string_view() : prefixOf(level);
   // Who asks for the lower levels is to see all of them.
   if (level < platform::LogLevel::standard) {
     endRow();
-    return writeLines(level, message);
+    return writeLines(prefix, message);
   }
   // "%s" says nothing of its messages.
-  const FloodGate::Next next = gate_.next(format == "%s" ? message : format, message);
-  if (next.before) writeLines(lastLevel_, *next.before);
-  lastLevel_ = level;
-  if (next.said) writeLines(level, message);
+  writeNext(format == "%s" ? message : format, prefix, message, kMaxMessages);
+}
+
+void StandardErrorLog::writeDirect(std::string_view text) {
+  const std::scoped_lock lock(mutex_);
+  writeNext(text.substr(0, text.find_first_of("0123456789")), {}, text, kMaxDirectTexts);
+}
+
+void StandardErrorLog::writeNext(std::string_view kind, std::string_view prefix,
+                                 std::string_view message, std::size_t maxSaid) {
+  const FloodGate::Next next = gate_.next(kind, message, maxSaid);
+  if (next.before) writeLines(lastPrefix_, *next.before);
+  lastPrefix_ = prefix;
+  if (next.said) writeLines(prefix, message);
 }
 
 void StandardErrorLog::endRow() {
-  if (const auto rest = gate_.end()) writeLines(lastLevel_, *rest);
+  if (const auto rest = gate_.end()) writeLines(lastPrefix_, *rest);
 }
 
-void StandardErrorLog::writeLines(platform::LogLevel level, std::string_view message) {
+void StandardErrorLog::writeLines(std::string_view prefix, std::string_view message) {
   if (message.ends_with('\n')) message.remove_suffix(1);
-  const std::string_view prefix = terminal_ ? std::string_view() : prefixOf(level);
   std::string text;
   text.reserve(message.size() + prefix.size() + 1);
   while (true) {

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 
 #include <unistd.h>
+#include <algorithm>
 #include <filesystem>
 #include <functional>
 #include <iterator>
@@ -23,6 +24,8 @@
 #include "host/Host.h"
 #include "platform/testing/FaultInjector.h"
 #include "plist/PropertyList.h"
+#include "support/ControllerLists.h"
+#include "support/ControllerRoot.h"
 #include "support/FreshErrors.h"
 
 namespace end_to_end {
@@ -165,6 +168,26 @@ TEST_F(HostileDevice, EndsTheDayWhateverAFileHolds) {
       runWith(path, std::string(bytes.begin(), bytes.end()), "random");
     }
   }
+}
+
+// A list of defects of a kind that nobody knows.
+TEST_F(HostileDevice, SaysLittleOfALongList) {
+  const auto defects = [](std::size_t count, std::uint32_t mode) {
+    return Value(support::data(support::defectsList(
+        2, std::vector<std::vector<std::uint32_t>>(count, {1, 0, 3, 4, 5, 6, 7, mode}))));
+  };
+  Value list = *filled.readPropertyList("device/registry.plist");
+  std::vector<Value*> values;
+  collectValues(list, values);
+  const auto known =
+      std::ranges::find_if(values, [&](const Value* value) { return *value == defects(1, 0); });
+  ASSERT_NE(known, values.end());
+  **known = defects(3000, 0xBAD);
+  filled.writePropertyList("device/registry.plist", list);
+  const std::string said = runDay(filled);
+  EXPECT_LT(said.size(), 64u << 10);
+  EXPECT_NE(said.find("\n2997 more messages like \"Encountered unexpected defectMode: 0xbad\"\n"),
+            said.npos);
 }
 
 // A service that fails once, at any call. A day whose record can't be read is the next run's.

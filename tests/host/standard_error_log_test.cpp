@@ -59,9 +59,9 @@ TEST(StandardErrorLog, AFloodIsCounted) {
   const std::string counted = ten + "<3>1990 more messages like \"skipping 9\"\n";
   {
     StandardErrorLog log(LogLevel::debug, in.get());
-    flood(log, 10);
+    flood(log, 11);
     log.log(LogLevel::standard, "other");
-    EXPECT_EQ(readSome(out.get()), ten + "<5>other\n");
+    EXPECT_EQ(readSome(out.get()), ten + "<3>skipping 10\n<5>other\n");
     flood(log, 2000);
     log.log(LogLevel::debug, "other");
     EXPECT_EQ(readSome(out.get()), counted + "<7>other\n");

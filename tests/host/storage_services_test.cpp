@@ -13,6 +13,7 @@
 #include <filesystem>
 #include "host/files/DeviceFileSystem.h"
 #include "host/machine/DeviceProperties.h"
+#include "host/process/StandardErrorLog.h"
 #include "host/process/StandardStreams.h"
 #include "host/recorded/DeviceProperties.h"
 #include "host/recorded/FileSystem.h"
@@ -131,14 +132,21 @@ TEST_F(StorageServices, OnThisMachineTheFileSystemIsThatOfAPathBelowTheRoot) {
 }
 
 TEST(StandardStreams, ErrorsAreLinesAndOutputIsAsItIs) {
-  StandardStreams streams;
+  StandardErrorLog log(platform::LogLevel::standard);
+  StandardStreams streams(log);
   ::testing::internal::CaptureStderr();
   ::testing::internal::CaptureStdout();
   streams.writeError("no end");
   streams.writeError("two\nlines\n");
   streams.writeOutput("no end");
-  EXPECT_EQ(::testing::internal::GetCapturedStderr(), "no end\ntwo\nlines\n");
-  EXPECT_EQ(::testing::internal::GetCapturedStdout(), "no end");
+  // What a hostile controller's list brings forth.
+  for (int i = 0; i < 1000; ++i) streams.writeError("mode " + std::to_string(i) + "\n");
+  log.log(platform::LogLevel::standard, "other");
+  for (int i = 0; i < 4; ++i) streams.writeOutput("\n");
+  EXPECT_EQ(::testing::internal::GetCapturedStderr(),
+            "no end\ntwo\nlines\nmode 0\nmode 1\nmode 2\n997 more messages like \"mode 2\"\n"
+            "<5>other\n");
+  EXPECT_EQ(::testing::internal::GetCapturedStdout(), "no end\n\n\n\n");
 }
 
 }  // namespace

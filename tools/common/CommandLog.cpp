@@ -43,6 +43,7 @@ CommandLog::~CommandLog() {
 host::HostOptions CommandLog::hostOptions() {
   auto options = host::HostOptions::fromEnvironment();
   options.log = this;
+  if (systemLog_) options.standardError = &*systemLog_;
   return options;
 }
 
