@@ -21,13 +21,25 @@ namespace host {
 
 namespace {
 
-// Succeeds for a regular file and for no file at all.
-base::Result<void> refuseOtherKinds(int folder, const std::string& name) {
+base::Result<void> refuseLink(const struct stat& status) {
+  if (S_ISLNK(status.st_mode)) return notRegular();
+  if (S_ISREG(status.st_mode) && status.st_nlink > 1) return severalNames();
+  return {};
+}
+
+// Succeeds for a file that may be written to.
+base::Result<void> refuseOtherKinds(const struct stat& status) {
+  if (!S_ISREG(status.st_mode)) return notRegular();
+  return refuseLink(status);
+}
+
+// Of what has a name now; succeeds where nothing has it.
+base::Result<void> refuseNamed(int folder, const std::string& name,
+                               base::Result<void> (*refuse)(const struct stat& status)) {
   struct stat status;
   const auto found = checked(::fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW));
   if (!found) return isMissing(found.error()) ? base::Result<void>() : found;
-  if (!S_ISREG(status.st_mode)) return notRegular();
-  return {};
+  return refuse(status);
 }
 
 std::string numbered(const std::string& name, int number) {
@@ -136,6 +148,10 @@ base::Result<void> writeAll(int file, std::string_view bytes) {
   return {};
 }
 
+base::Result<void> refuseLinks(int folder, const std::string& name) {
+  return refuseNamed(folder, name, refuseLink);
+}
+
 base::Result<FileDescriptor> makeFile(int folder, const std::string& name) {
   const AsOwnerOf owner(folder);
   return opened(
@@ -148,7 +164,7 @@ base::Result<void> makeFolder(int folder, const std::string& name) {
 }
 
 base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
-  if (auto free = refuseOtherKinds(folder, name); !free) return free;
+  if (auto free = refuseNamed(folder, name, refuseOtherKinds); !free) return free;
   const auto beside = makeBeside(folder, name);
   if (!beside) return beside.error();
   const int file = beside->file.get();
@@ -225,8 +241,7 @@ base::Result<FileDescriptor> openLines(int folder, const std::string& name) {
   }
   struct stat status;
   if (::fstat(file->get(), &status) != 0) return systemError();
-  if (!S_ISREG(status.st_mode)) return notRegular();
-  if (status.st_nlink > 1) return severalNames();
+  if (const auto free = refuseOtherKinds(status); !free) return free.error();
   return file;
 }
 

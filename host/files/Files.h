@@ -4,9 +4,9 @@
 // What the host does with single files: read one whole, replace one whole, append a line; and with
 // their names.
 //
-// A name that is taken by anything but a regular file is refused (notRegular); links are never
-// followed. A file that has other names is replaced or renamed under this one, but not written to
-// (severalNames). Files are made with mode 0600.
+// A name that is taken by anything but a regular file is refused (notRegular), a link too, and so
+// is a file that has other names (severalNames): it is renamed under this one, but neither written
+// to nor replaced. Files are made with mode 0600.
 #pragma once
 
 #include <cstddef>
@@ -44,6 +44,10 @@ std::string shownText(std::string_view text);
 
 // Writes all the bytes, going on after short writes and signals.
 base::Result<void> writeAll(int file, std::string_view bytes);
+
+// Refuses a name that is a link, or of a file that has other names; nothing else. For who is to
+// write to it.
+base::Result<void> refuseLinks(int folder, const std::string& name);
 
 // Makes a file that isn't there yet, or a folder, in an open folder to whose owner it then belongs:
 // the file is open for writing.

@@ -7,9 +7,9 @@
 // Reads see what other processes have written, and this process's changes before they are. Writing
 // merges under a lock on the user's folder: the file is read again and only the changed keys are
 // replaced. A file that can't be understood reads as empty and is kept as <domain>.plist.corrupt
-// before it is replaced. Links within the root are followed to what is read and refused where the
-// file would be replaced. Failures are logged here: a state of the file, or a reason why it can't
-// be written, once for as long as it lasts. Not thread-safe.
+// before it is replaced. Links within the root are followed to what is read; where the file would
+// be replaced they are refused, and so is one with several names. Failures are logged here: a state
+// of the file, or a reason why it can't be written, once for as long as it lasts. Not thread-safe.
 #pragma once
 
 #include <sys/stat.h>

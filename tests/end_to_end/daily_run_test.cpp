@@ -134,14 +134,16 @@ TEST(DailyRun, EndsWithStatusZeroWithNothingAtAll) {
 TEST(DailyRun, EndsWithWhatCouldNotBeKept) {
   const std::string preference = std::string("var/preferences/mobile/") + kDomain + ".plist";
   const struct {
-    const char *option, *fileInTheWay;
-    std::string unkept;
+    const char* option;
+    std::string fileInTheWay, unkept;
+    const char* why = "Not a directory";
   } rows[] = {{"-d", "elsewhere", ""},
               {"-x", "var", ""},
               {"-d", "var", preference + ": "},
               {"-f", "var/preferences/mobile", "var/preferences/mobile/com.example.plist: "},
               {"-d", "var/spool", "var/spool/morvend/submitted/log-pellorand.193."},
-              {"-t", "var/mobile/Library/Pelloran", "var/mobile/Library/Pelloran: "}};
+              {"-t", "var/mobile/Library/Pelloran", "var/mobile/Library/Pelloran: "},
+              {"-d", preference, preference + ": ", "a file with several names"}};
   Device filled;
   filled.fill();
   for (const auto& row : rows) {
@@ -149,6 +151,9 @@ TEST(DailyRun, EndsWithWhatCouldNotBeKept) {
     device.become(filled);
     std::filesystem::remove_all(device.root() / row.fileInTheWay);
     device.root().write(row.fileInTheWay, "");
+    if (row.fileInTheWay == preference) {
+      std::filesystem::create_hard_link(device.root() / preference, device.root() / "other name");
+    }
     const auto outcome = device.run("morvend", {row.option});
     EXPECT_EQ(outcome.status, 0);
     const std::string last = lastLine(outcome);
@@ -157,8 +162,12 @@ TEST(DailyRun, EndsWithWhatCouldNotBeKept) {
     } else {
       const std::string place = (device.root() / row.unkept).string();
       EXPECT_TRUE(last.starts_with("<3>the day is not done: " + place) &&
-                  last.ends_with(": Not a directory"))
+                  last.ends_with(std::string(": ") + row.why))
           << outcome.standardError;
+    }
+    if (row.unkept.starts_with(preference)) {
+      EXPECT_TRUE(device.dailyLogs().empty());
+      EXPECT_NE(outcome.standardError.find("Dropped what the run for day"), std::string::npos);
     }
   }
 }
@@ -297,7 +306,8 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
   Device filled;
   filled.fill();
   for (const std::string& path : written) {
-    for (const std::string kind : {"link to a file", "link to a folder", "FIFO", "folder"}) {
+    for (const std::string kind :
+         {"link to a file", "link to a folder", "FIFO", "folder", "second name"}) {
       Device device;
       device.become(filled);
       const support::TemporaryFolder outside;
@@ -310,6 +320,8 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
         std::filesystem::create_symlink(outside / "file", place);
       } else if (kind == "link to a folder") {
         std::filesystem::create_symlink(outside / "folder", place);
+      } else if (kind == "second name") {
+        std::filesystem::create_hard_link(outside / "file", place);
       } else if (kind == "FIFO") {
         ASSERT_EQ(::mkfifo(place.c_str(), 0600), 0);
       } else {
@@ -319,6 +331,8 @@ TEST(DailyRun, TouchesNothingOutsideItsRoot) {
       EXPECT_EQ(outcome.status, 0) << path << " " << kind;
       EXPECT_TRUE(ended(outcome)) << path << " " << kind;
       EXPECT_EQ(outside.read("file"), "untouched") << path << " " << kind;
+      EXPECT_EQ(std::filesystem::hard_link_count(outside / "file"), kind == "second name" ? 2u : 1u)
+          << path;
       EXPECT_EQ(outside.read("folder/file"), "untouched") << path << " " << kind;
       const auto entries = [](const std::filesystem::path& folder) {
         return std::distance(std::filesystem::directory_iterator(folder), {});

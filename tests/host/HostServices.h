@@ -33,13 +33,15 @@ struct HostServices {
   std::string xml(const plist::Dictionary& dictionary) { return *plist::writeXML(dictionary); }
 };
 
-// What may stand in the place of a file. A link leads to "target", dangling or not.
-enum class Kind { link, danglingLink, fifo, folder };
+// What may stand in the place of a file. A link leads to "target", dangling or not; a file may have
+// that as its second name.
+enum class Kind { link, danglingLink, fifo, folder, secondName };
 inline constexpr Kind kOtherKinds[] = {Kind::link, Kind::danglingLink, Kind::fifo, Kind::folder};
 
 inline void put(Kind kind, const std::filesystem::path& at, const std::filesystem::path& target) {
   std::filesystem::create_directories(at.parent_path());
-  if (kind == Kind::link) std::ofstream(target) << "precious";
+  if (kind == Kind::link || kind == Kind::secondName) std::ofstream(target) << "precious";
+  if (kind == Kind::secondName) std::filesystem::create_hard_link(target, at);
   if (kind == Kind::link || kind == Kind::danglingLink) std::filesystem::create_symlink(target, at);
   if (kind == Kind::fifo) ::mkfifo(at.c_str(), 0600);
   if (kind == Kind::folder) std::filesystem::create_directory(at);
@@ -50,12 +52,13 @@ inline bool untouched(Kind kind, const std::filesystem::path& at,
                       const std::filesystem::path& target) {
   using std::filesystem::file_type;
   const file_type types[] = {file_type::symlink, file_type::symlink, file_type::fifo,
-                             file_type::directory};
+                             file_type::directory, file_type::regular};
+  const bool precious = kind == Kind::link || kind == Kind::secondName;
   std::ifstream file(target);
   const std::string text(std::istreambuf_iterator<char>(file), {});
   return std::filesystem::symlink_status(at).type() == types[static_cast<int>(kind)] &&
-         std::filesystem::exists(target) == (kind == Kind::link) &&
-         text == (kind == Kind::link ? "precious" : "");
+         std::filesystem::exists(target) == precious && text == (precious ? "precious" : "") &&
+         (kind != Kind::secondName || std::filesystem::equivalent(at, target));
 }
 
 }  // namespace support

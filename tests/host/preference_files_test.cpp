@@ -6,6 +6,7 @@
 #include <filesystem>
 
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -82,13 +83,19 @@ TEST_F(PreferenceFilesTest, ChangesOfOthersAreSeenAndKept) {
 TEST_F(PreferenceFilesTest, WhatIsStoredAlreadyIsNotWrittenAgainUnlessItsTypeDiffers) {
   folder.write(kFile, xml({{"key", 1}}));
   PreferenceFiles files(root, log);
-  std::filesystem::create_hard_link(folder / kFile, folder / "before");
+  const auto identity = [this] {
+    struct stat status {};
+    EXPECT_EQ(::stat((folder / kFile).c_str(), &status), 0);
+    return status.st_ino;
+  };
+  const auto before = identity();
   set(files, "key", 1);
   files.QNSPreferencesSetValue("absent", nullptr, kDomain);
   files.QNSPreferencesSynchronize(kDomain);
-  EXPECT_TRUE(std::filesystem::equivalent(folder / kFile, folder / "before"));
+  EXPECT_EQ(identity(), before);
   set(files, "key", true);
   files.QNSPreferencesSynchronize(kDomain);
+  EXPECT_NE(identity(), before);
   EXPECT_EQ(stored()->number("key")->type(), plist::Number::Type::boolean);
   files.deletePreference("key", "nobody", kDomain);
   EXPECT_FALSE(std::filesystem::exists(folder / "var/preferences/nobody"));
@@ -152,13 +159,19 @@ TEST_F(PreferenceFilesTest, WhatIsNoPreferenceFileIsPutAside) {
 }
 
 TEST_F(PreferenceFilesTest, LinksAreFollowedToWhatIsReadAndRefusedWhereItIsWritten) {
-  for (const std::string link : {kFile, "var/preferences/mobile", "var/preferences", "var"}) {
+  const std::string otherName = "other name";
+  for (const std::string& link : {std::string(kFile), std::string("var/preferences/mobile"),
+                                  std::string("var/preferences"), std::string("var"), otherName}) {
     log.clear();
     folder.write(kFile, xml({{"key", 1}}));
-    std::filesystem::rename(folder / link, folder / "elsewhere");
-    const auto parent = (folder / link).parent_path();
-    std::filesystem::create_symlink(std::filesystem::relative(folder / "elsewhere", parent),
-                                    folder / link);
+    if (link == otherName) {
+      std::filesystem::create_hard_link(folder / kFile, folder / link);
+    } else {
+      std::filesystem::rename(folder / link, folder / "elsewhere");
+      const auto parent = (folder / link).parent_path();
+      std::filesystem::create_symlink(std::filesystem::relative(folder / "elsewhere", parent),
+                                      folder / link);
+    }
     PreferenceFiles files(root, log);
     EXPECT_EQ(files.QNSPreferencesGetIntegerValue("key", kDomain), 1) << link;
     set(files, "new", 1);
