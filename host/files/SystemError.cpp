@@ -29,4 +29,9 @@ base::Result<FileDescriptor> opened(int descriptor) {
 
 bool isMissing(const base::Error& error) { return error.is(std::errc::no_such_file_or_directory); }
 
+base::Result<void> unlessMissing(const base::Error& error, std::string_view place) {
+  if (isMissing(error)) return {};
+  return error.at(place);
+}
+
 }  // namespace host

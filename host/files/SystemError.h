@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cerrno>
+#include <string_view>
 
 #include "base/Result.h"
 #include "host/files/FileDescriptor.h"
@@ -25,5 +26,8 @@ base::Result<FileDescriptor> opened(int descriptor);
 
 // Whether there is no such file.
 bool isMissing(const base::Error& error);
+
+// Nothing where there is no such file; else the error, at its place.
+base::Result<void> unlessMissing(const base::Error& error, std::string_view place);
 
 }  // namespace host

@@ -134,13 +134,13 @@ base::Result<void> EventSink::append(const std::string& lines) {
 base::Result<void> EventSink::synchronise() {
   drain();
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(kFolder));
   return synchronisePending(folder->get()).at(root_.hostPath(kFolder));
 }
 
 base::Result<void> EventSink::settle(const Leaves& leaves) {
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(kFolder));
   const LockWait wait{log_, root_.hostPath(kFolder)};
   const auto lock = FileLock::take(folder->get(), wait);
   if (!lock) return lock.error().at(wait.path);

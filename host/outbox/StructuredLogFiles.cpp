@@ -173,14 +173,14 @@ StructuredLogFiles::~StructuredLogFiles() { sayDropped(); }
 
 base::Result<void> StructuredLogFiles::synchronise() {
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(kFolder));
   return synchronisePending(folder->get()).at(root_.hostPath(kFolder));
 }
 
 base::Result<void> StructuredLogFiles::settle(const Leaves& leaves) {
   sayDropped();
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(kFolder));
   return settleLines(folder->get(), leaves,
                      [](const std::string&, std::uint64_t) { return base::Result<void>(); },
                      {log_, root_.hostPath(kFolder)})

@@ -152,14 +152,14 @@ bool SubmissionSpool::removeOldest() {
 
 base::Result<void> SubmissionSpool::synchronise() {
   const auto folder = root_.openFolder(SpoolFolder::kPath, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(SpoolFolder::kPath));
   return checked(::fsync(folder->get())).at(root_.hostPath(SpoolFolder::kPath));
 }
 
 base::Result<void> SubmissionSpool::settle(const Leaves& leaves) {
   // The spool is looked through only where something waits.
   const auto folder = root_.openFolder(SpoolFolder::kPath, DeviceRoot::Missing::fails);
-  if (!folder) return isMissing(folder.error()) ? base::Result<void>() : folder.error();
+  if (!folder) return unlessMissing(folder.error(), root_.hostPath(SpoolFolder::kPath));
   const auto names = namesInFolder(folder->get());
   const auto waits = [](const std::string& name) { return parsePendingName(name).has_value(); };
   if (names && std::ranges::none_of(*names, waits)) return {};

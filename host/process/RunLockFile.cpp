@@ -13,10 +13,13 @@ namespace host {
 
 namespace {
 
-constexpr char kFolder[] = "/var/run";
+constexpr char kAbove[] = "/var", kFolder[] = "/var/run";
 constexpr char kName[] = "morvend.lock";
 
 base::Result<FileDescriptor> openLockFile(const DeviceRoot& root) {
+  // Of the two only run/ may be the system's own link.
+  const auto above = root.openFolder(kAbove, DeviceRoot::Missing::create);
+  if (!above) return above.error();
   const auto folder =
       root.openFolder(kFolder, DeviceRoot::Missing::create, DeviceRoot::Links::followed);
   if (!folder) return folder.error();

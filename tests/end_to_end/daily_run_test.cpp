@@ -172,6 +172,83 @@ TEST(DailyRun, EndsWithWhatCouldNotBeKept) {
   }
 }
 
+// Links that stay within the root: what they lead to is read, and left as it is.
+TEST(DailyRun, WritesThroughNoLinkOfItsRoot) {
+  const struct {
+    std::string place, said;
+    std::size_t logs;
+  } rows[] = {
+      {"var", "var/run/morvend.lock", 0},
+      {"var/preferences", std::string("var/preferences/mobile/") + kDomain + ".plist", 0},
+      {"var/spool", "var/spool/morvend/submitted", 0},
+      {"var/spool/morvend/structured", "var/spool/morvend/structured", 1},
+      {"var/log", "var/log/servita", 1},
+      {"var/mobile", "var/mobile/Library/Pelloran", 1},
+      {"device", "device/ecc-events", 1},
+  };
+  Device filled;
+  filled.fill();
+  for (const auto& row : rows) {
+    Device device;
+    device.become(filled);
+    const auto place = device.root() / row.place, elsewhere = device.root() / "elsewhere";
+    std::filesystem::rename(place, elsewhere);
+    std::filesystem::create_symlink(std::filesystem::relative(elsewhere, place.parent_path()),
+                                    place);
+    const auto state = [&] {
+      Lines files;
+      for (const auto& entry : std::filesystem::recursive_directory_iterator(elsewhere)) {
+        const std::string path = entry.path().lexically_relative(device.root().path());
+        // The database library's own, of reading.
+        if (path.ends_with("-wal") || path.ends_with("-shm")) continue;
+        files.push_back(path + (entry.is_regular_file() ? ": " + device.root().read(path) : ""));
+      }
+      std::ranges::sort(files);
+      return files;
+    };
+    const Lines before = state();
+    const auto outcome = device.run("morvend", {"-d"});
+    EXPECT_EQ(outcome.status, 0);
+    EXPECT_TRUE(state() == before) << row.place;
+    EXPECT_EQ(device.dailyLogs().size(), row.logs) << row.place << outcome.standardError;
+    for (const std::string& line : linesOf(outcome.standardError)) {
+      if (line.find("too many links") == line.npos) continue;
+      EXPECT_NE(line.find(place.string()), line.npos) << line;
+    }
+    EXPECT_TRUE(holds(linesOf(outcome.standardError), (device.root() / row.said).string()))
+        << row.place << outcome.standardError;
+  }
+}
+
+// What the shell leaves a program: streams that are closed, a limit of file size.
+TEST(DailyRun, TakesNoFileForAStreamAndNoLimitForItsEnd) {
+  Device filled;
+  filled.fill();
+  const auto runAs = [](const Device& device, const std::string& how) {
+    return faults::run({"/bin/sh", "-c", how, PROGRAMS "/morvend"}, device.environment(""));
+  };
+  for (const std::string closed : {"<&-", ">&-", "2>&-", "<&- 2>&-", "<&- >&- 2>&-"}) {
+    Device device;
+    device.become(filled);
+    EXPECT_EQ(runAs(device, "exec \"$0\" -d " + closed).status, 0) << closed;
+    EXPECT_EQ(device.dailyLogs().size(), 1u) << closed;
+    for (const auto& entry : std::filesystem::recursive_directory_iterator(device.root().path())) {
+      const std::string path = entry.path().lexically_relative(device.root().path());
+      if (!entry.is_regular_file()) continue;
+      EXPECT_EQ(device.root().read(path).find("morvend started"), std::string::npos)
+          << closed << ": " << path;
+    }
+  }
+  Device device;
+  device.become(filled);
+  const auto outcome = runAs(device, "ulimit -f 0; exec \"$0\" -d");
+  EXPECT_EQ(outcome.status, 0) << "signal " << outcome.signal;
+  EXPECT_TRUE(lastLine(outcome).starts_with("<3>the day is not done: ") &&
+              lastLine(outcome).ends_with("File too large"))
+      << outcome.standardError;
+  EXPECT_EQ(device.history(), filled.history());
+}
+
 // A timer's run beside another one: the second waits, and then finds the gate closed.
 TEST(DailyRun, MakesOneLogWhenSeveralRunAtOnce) {
   Device device;

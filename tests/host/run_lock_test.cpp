@@ -85,13 +85,21 @@ TEST(RunLockFile, WithoutTheFileTheRunGoesOn) {
   }
 }
 
-TEST(RunLockFile, TheFolderMayBeTheSystemsOwnLink) {
+TEST(RunLockFile, OnlyItsFolderMayBeTheSystemsOwnLink) {
   support::HostServices host;
   std::filesystem::create_directories(host.folder / "run");
   std::filesystem::create_directories(host.folder / "var");
   std::filesystem::create_symlink("/run", host.folder / "var/run");
   RunLockFile(host.root, host.log).lock();
   EXPECT_TRUE(std::filesystem::exists(host.folder / "run/morvend.lock"));
+  EXPECT_TRUE(host.log.lines().empty());
+  // What else is a link is none of the system's.
+  std::filesystem::rename(host.folder / "var", host.folder / "elsewhere");
+  std::filesystem::create_symlink("elsewhere", host.folder / "var");
+  std::filesystem::remove(host.folder / "run/morvend.lock");
+  RunLockFile(host.root, host.log).lock();
+  EXPECT_FALSE(std::filesystem::exists(host.folder / "run/morvend.lock"));
+  EXPECT_EQ(host.log.count("error: Could not lock " + host.root.hostPath(kLock) + ": "), 1);
 }
 
 }  // namespace
