@@ -11,6 +11,13 @@ namespace host {
 
 using platform::LogLevel;
 
+namespace {
+
+// What a run changes in them is of its day: the record, and the count that its report has taken.
+constexpr const char* kHeldDomains[] = {platform::kDaemonName, platform::kPellorandDomain};
+
+}  // namespace
+
 void RunOutbox::settleAll(const Leaves& leaves) {
   const auto settle = [&](auto& part) {
     const auto settled = root_.patience()([&] { return part.settle(leaves); });
@@ -32,7 +39,7 @@ void RunOutbox::hold(std::optional<std::int32_t> day) {
   events_.drain();  // what was sent before is not this run's
   run_.begin(day);
   eccEvents_.hold(day);
-  preferences_.hold(platform::kDaemonName);
+  for (const char* domain : kHeldDomains) preferences_.hold(domain);
 }
 
 base::Result<void> RunOutbox::synchronise() {
@@ -57,11 +64,15 @@ void RunOutbox::publish() {
                "Dropped what the run for day %d left: the day can't be recorded, and will be run "
                "again",
                *day);
+      for (const char* domain : kHeldDomains) preferences_.drop(domain);
+    } else {
+      std::ignore = preferences_.release(platform::kPellorandDomain);
     }
   }
   run_.end();
   settleAll([&](const std::optional<std::int32_t>& of) { return leaves && of == day; });
-  if (!day) std::ignore = preferences_.release(platform::kDaemonName);
+  if (day) return;
+  for (const char* domain : kHeldDomains) std::ignore = preferences_.release(domain);
 }
 
 }  // namespace host

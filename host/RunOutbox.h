@@ -2,12 +2,13 @@
 // Copyright the morvend authors
 
 // Keeps back what a run leaves: logs in the spool, structured logs, events, the files of the memory
-// errors that it has read, and the process's own preferences.
+// errors that it has read, the process's own preferences, and that the report has taken the count
+// of damaged databases.
 //
 // Everything is on disk, under names that nobody looks for, before the preferences are written with
 // the record of the day in them; that one renaming decides. A run that ends before it has left
 // nothing, one that ends after it has left everything: what still waits gets its name by the next
-// run, once.
+// run, once; only a count that was taken may be told again if the run ends just then.
 #pragma once
 
 #include <cstdint>

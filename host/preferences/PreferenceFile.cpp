@@ -74,10 +74,12 @@ base::Result<void> PreferenceFile::written() const {
 }
 
 void PreferenceFile::add(std::string_view key, std::int64_t delta) {
-  write([key, delta](plist::Dictionary& values) {
+  const auto addition = [key, delta](plist::Dictionary& values) {
     const plist::Number* number = values.number(key);
     values.set(key, saturatingSum(number != nullptr ? number->int64Value() : 0, delta));
-  });
+  };
+  write(addition);
+  if (held_ && set_.find(key) != nullptr) addition(set_);
 }
 
 // Reading
@@ -134,11 +136,15 @@ void PreferenceFile::fail(State state, const base::Error& why) {
 
 // Writing
 
+void PreferenceFile::forgetChanges() {
+  set_ = {};
+  removed_.clear();
+}
+
 void PreferenceFile::write(const Edit& edit) {
   auto merged = merge(edit);
   if (merged) {
-    set_ = {};
-    removed_.clear();
+    if (!held_) forgetChanges();
   } else if (written_ || merged.error().text != written_.error().text) {
     log_.log(platform::LogLevel::error, "Could not write %s: %s", path().c_str(),
              merged.error().text.c_str());
@@ -165,8 +171,10 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
   plist::Value all = takeStored();
   const auto before = plist::writeXML(all);
   auto& merged = *all.as<plist::Dictionary>();
-  for (const std::string& key : removed_) merged.remove(key);
-  for (const plist::Dictionary::Entry& entry : set_) merged.set(entry.key, entry.value);
+  if (!held_) {
+    for (const std::string& key : removed_) merged.remove(key);
+    for (const plist::Dictionary::Entry& entry : set_) merged.set(entry.key, entry.value);
+  }
   if (edit != nullptr) edit(merged);
   const auto after = plist::writeXML(all);
   if (!after) return after.error();

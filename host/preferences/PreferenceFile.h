@@ -44,11 +44,16 @@ class PreferenceFile {
   // change.
   void flush();
 
-  // From `hold` on changes are held back, so that `release` brings them to the file together.
+  // From `hold` on changes are held back, so that `release` brings them to the file together, or
+  // `drop` forgets them.
   void hold() { held_ = true; }
   void release() {
     held_ = false;
     flush();
+  }
+  void drop() {
+    held_ = false;
+    forgetChanges();
   }
 
   // Whether the last change or addition is in the file; the error is of the file's path.
@@ -56,7 +61,8 @@ class PreferenceFile {
 
   // Flushes, and adds to an integer in the same write: no process's addition is lost. A value that
   // is missing or not a number counts as 0; the sum saturates. An addition that can't be written is
-  // lost.
+  // lost. What is held back stays so: the addition is in the file, and in the change, if there is
+  // one.
   void add(std::string_view key, std::int64_t delta);
 
  private:
@@ -66,6 +72,7 @@ class PreferenceFile {
   void load(bool evenIfUnchanged);
   plist::Dictionary takeStored();
   void fail(State state, const base::Error& why);
+  void forgetChanges();
   void write(const Edit& edit);
   base::Result<void> merge(const Edit& edit);
   std::string path() const { return root_.hostPath(folder_, name_); }

@@ -106,6 +106,11 @@ base::Result<void> PreferenceFiles::release(std::string_view domain) {
   return known->written();
 }
 
+void PreferenceFiles::drop(std::string_view domain) {
+  const std::scoped_lock lock(mutex_);
+  if (PreferenceFile* known = file(kSystemUser, domain)) known->drop();
+}
+
 void PreferenceFiles::addToInteger(std::string_view key, std::string_view domain,
                                    std::int64_t delta) {
   const std::scoped_lock lock(mutex_);

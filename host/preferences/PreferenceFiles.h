@@ -33,9 +33,11 @@ class PreferenceFiles final : public platform::PreferenceStore,
   base::Result<void> flushAll();
 
   // From `hold` on a domain of user "mobile" is not synchronised, so that `release` writes all that
-  // has changed meanwhile at once; whether it could be written, the error of the file's path.
+  // has changed meanwhile at once, or `drop` forgets it. Whether it could be written, the error of
+  // the file's path.
   void hold(std::string_view domain);
   base::Result<void> release(std::string_view domain);
+  void drop(std::string_view domain);
 
   // Adds to an integer of user "mobile", at once and atomically: see PreferenceFile::add.
   void addToInteger(std::string_view key, std::string_view domain, std::int64_t delta);

@@ -79,6 +79,8 @@ void Device::fill() {
                 Dictionary{{"samples", Dictionary{{"intervals", Array{Value(5), Value(10)}}}}}}}}});
   writePropertyList("var/preferences/mobile/com.norba.quenset.plist",
                     Dictionary{{"DiagnosticLogSubmissionEnabled", true}});
+  writePropertyList("var/preferences/mobile/com.norba.pellorand.plist",
+                    Dictionary{{"DatabaseCorruptionCount", 2}});
   writePropertyList(
       "var/preferences/__quenset__/com.norba.Varnhollow.plist",
       Dictionary{
@@ -205,7 +207,7 @@ Dictionary Device::expectedSections() const {
       {"PLScalars", Dictionary{{"exact", value},
                                {"family.a", rounded},
                                {"family.b", rounded},
-                               {"com.norba.quenset.prnd.database.corruptions", std::int64_t{0}}}},
+                               {"com.norba.quenset.prnd.database.corruptions", std::int64_t{2}}}},
       {"PLDistributions", Dictionary{{"samples", Array{Value(0.0), Value(19.5), Value(9.75),
                                                        Value(1332.5), Value(40)}}}},
       {"PLDistributionsHistogram",

@@ -231,6 +231,31 @@ TEST_F(PreferenceFilesTest, HeldWritesAreOneForEachDomain) {
   EXPECT_EQ(stored("var/preferences/root/com.example.plist")->size(), 1u) << "at once again";
 }
 
+// A value that a run has taken and set back: whenever the process ends, what was added meanwhile is
+// in the file, and the value is told once.
+TEST_F(PreferenceFilesTest, AnAdditionDoesntLetGoWhatIsHeldBack) {
+  for (const bool leaves : {true, false}) {
+    folder.write(kFile, xml({{"count", 3}}));
+    PreferenceFiles files(root, log);
+    const auto count = [&] { return stored()->number("count")->int64Value(); };
+    files.hold(kDomain);
+    set(files, "count", 0);
+    files.QNSPreferencesSynchronize(kDomain);
+    EXPECT_EQ(count(), 3);
+    files.addToInteger("count", kDomain, 1);
+    EXPECT_EQ(count(), 4);
+    EXPECT_EQ(files.QNSPreferencesGetIntegerValue("count", kDomain), 1);
+    if (leaves) {
+      EXPECT_TRUE(files.release(kDomain));
+    } else {
+      files.drop(kDomain);
+    }
+    EXPECT_TRUE(files.flushAll());
+    EXPECT_EQ(count(), leaves ? 1 : 4);
+    EXPECT_EQ(files.QNSPreferencesGetIntegerValue("count", kDomain), count());
+  }
+}
+
 TEST_F(PreferenceFilesTest, AValueThatWouldMakeTheFileUnreadableIsRefused) {
   folder.write(kFile, xml({{"key", 1}}));
   plist::Value deep("leaf");
