@@ -11,6 +11,7 @@
 #include <array>
 #include <cstdio>
 #include <memory>
+#include <optional>
 #include <system_error>
 #include <tuple>
 
@@ -163,21 +164,36 @@ base::Result<void> makeFolder(int folder, const std::string& name) {
   return checked(::mkdirat(folder, name.c_str(), 0700));
 }
 
-base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
+namespace {
+
+base::Result<void> replace(int folder, const std::string& name, std::string_view bytes,
+                           std::optional<mode_t> mode) {
   if (auto free = refuseNamed(folder, name, refuseOtherKinds); !free) return free;
   const auto beside = makeBeside(folder, name);
   if (!beside) return beside.error();
   const int file = beside->file.get();
   const char* from = beside->name.c_str();
   auto replaced =
-      writeAll(file, bytes).and_then([&] { return checked(::fsync(file)); }).and_then([&] {
-        return checked(::renameat(folder, from, folder, name.c_str()));
-      });
+      writeAll(file, bytes)
+          .and_then([&] { return checked(mode ? ::fchmod(file, *mode) : 0); })
+          .and_then([&] { return checked(::fsync(file)); })
+          .and_then([&] { return checked(::renameat(folder, from, folder, name.c_str())); });
   if (!replaced) {
     ::unlinkat(folder, from, 0);
     return replaced;
   }
   return checked(::fsync(folder));
+}
+
+}  // namespace
+
+base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes) {
+  return replace(folder, name, bytes, std::nullopt);
+}
+
+base::Result<void> replaceReadableFile(int folder, const std::string& name,
+                                       std::string_view bytes) {
+  return replace(folder, name, bytes, 0644);
 }
 
 base::Result<void> keepBeside(int folder, const std::string& name, const std::string& kept) {

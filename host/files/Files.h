@@ -64,6 +64,9 @@ inline constexpr int kMaxNamesBeside = 8;
 // beside.
 base::Result<void> replaceFile(int folder, const std::string& name, std::string_view bytes);
 
+// The same for a file that others may read, too.
+base::Result<void> replaceReadableFile(int folder, const std::string& name, std::string_view bytes);
+
 // Renames a file to `kept`, over a file that has that name; where something else has it, to
 // <kept>-2, and so on.
 base::Result<void> keepBeside(int folder, const std::string& name, const std::string& kept);

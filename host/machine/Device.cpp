@@ -21,7 +21,7 @@ DeviceServices device(const DeviceRoot& root, const DeviceRoot& files,
                       platform::PreferenceStore& preferences, platform::SystemLog& log) {
   auto kernel = std::make_unique<Kernel>(files);
   auto snapshots = std::make_unique<KernelSnapshots>(files, *kernel);
-  const auto registry = std::make_shared<DriveRegistry>(files, log);
+  const auto registry = std::make_shared<DriveRegistry>(root, files, log);
   return {.properties = std::make_unique<DeviceProperties>(root, files),
           .files = std::make_unique<DeviceFileSystem>(root),
           .systemVersion = std::make_unique<SystemVersion>(files),
