@@ -29,6 +29,11 @@ using DriverStatus = std::uint32_t;
 // The property under which an entry carries its own matching description.
 inline constexpr char kRegistryPropertyMatchKey[] = "PropertyMatch";
 
+// The property under which this machine's registry describes a drive: a dictionary of "name",
+// "kind", "model", "serial", "firmware", "capacity" in bytes, "holdsRoot", and "figures" (a
+// dictionary of numbers) or, without figures, "unknown", the reason. What isn't known is left out.
+inline constexpr char kRegistryDriveKey[] = "Drive";
+
 class DeviceRegistry {
  public:
   enum class Direction { children, parents };  // of a search, the entry itself always included

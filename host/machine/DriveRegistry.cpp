@@ -11,6 +11,7 @@
 #include "base/UTF8.h"
 #include "host/machine/DriveFigures.h"
 #include "host/machine/Drives.h"
+#include "platform/DeviceRegistry.h"
 
 namespace host::machine {
 
@@ -39,7 +40,7 @@ plist::Dictionary descriptionOf(const Drive& drive) {
 plist::Dictionary entryOf(const Drive& drive) {
   plist::Dictionary entry{
       {"Class", drive.isFlash ? "ZMCStorage" : "Disk"},
-      {"Properties", plist::Dictionary{{kDriveProperty, descriptionOf(drive)}}}};
+      {"Properties", plist::Dictionary{{platform::kRegistryDriveKey, descriptionOf(drive)}}}};
   if (!drive.isFlash) return entry;
   plist::Dictionary answers;
   if (auto statistics = statisticsOf(drive.figures); !statistics.empty()) {

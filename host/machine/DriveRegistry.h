@@ -11,13 +11,8 @@
 
 namespace host::machine {
 
-// An entry's description of its drive: a dictionary of "name", "kind", "model", "serial",
-// "firmware", "capacity" in bytes, "holdsRoot", "figures" (a dictionary) or, without figures,
-// "unknown", the reason; what isn't known is left out.
-inline constexpr char kDriveProperty[] = "Drive";
-
 // The drives, the one that holds `root` first, each an entry of class "ZMCStorage" with its
-// description. Its driver answers the statistics command with the records that the drive's figures
+// description as property platform::kRegistryDriveKey. Its driver answers the statistics command with the records that the drive's figures
 // fill, and no other. A drive without figures can be opened, answers nothing, and is said once. A
 // disk that holds the root and is no such drive is an entry of class "Disk" without a driver. The
 // machine's files are read at the first question.

@@ -10,6 +10,8 @@
 #include "tools/nandinfo/Counters.h"
 #include "tools/nandinfo/Decode.h"
 #include "tools/nandinfo/DecodeCapture.h"
+#include "tools/nandinfo/Drives.h"
+#include "tools/nandinfo/Health.h"
 
 namespace nandinfo {
 
@@ -99,6 +101,10 @@ constexpr Command kCommands[] = {
     {nullptr, "freezer", "What the kernel's swap-out thread has written", kNothing, Needs::nothing,
      "there is no kernel snapshot, or no swap-out thread in it",
      call<NANDInfo::CopyVMFreezerNANDInfo>},
+    {nullptr, "drives", "This machine's flash drives, and what is known of each", kRecord,
+     Needs::nothing, "there is none whose health can be told", drives},
+    {nullptr, "health", "The verdict on the storage: good, watch, replace or unknown", kAcknowledge,
+     Needs::nothing, nullptr, healthVerdict},
     {"health", "servita", "The health for the warranty service", kNothing, Needs::answer, nullptr,
      call<NANDInfo::CopyServitaNANDInfo>},
     {"health", "lab", "The health for internal lab tools", kNothing, Needs::answer, nullptr,

@@ -4,6 +4,7 @@
 // What the command line can ask for: one row a command.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <optional>
@@ -22,16 +23,23 @@ namespace nandinfo {
 // What the command line says; each command looks at its own part.
 struct Arguments {
   bool round = false, all = false, statKeys = false, noDelta = false, history = false,
-       monthly = false, redact = false;
+       monthly = false, redact = false, record = false, acknowledge = false;
   std::uint32_t hours = 0, mode = 2, from = 0, channels = 0;  // channels: 0 if it isn't said
   std::string code, layout, file, folder;
   std::vector<std::string> names;
 };
 
+// What became of the record of each drive of this machine, by its name.
+using RecordedDrives = std::vector<std::pair<std::string, base::Result<void>>>;
+
 struct Invocation {
   const NANDInfo::Services& services;
   const Arguments& arguments;
   std::function<void(const std::string&)> progress;
+  std::size_t width = 80;  // of the terminal, in columns
+  // What only some commands use: reads this machine's NVMe drives, and brings preferences to disk.
+  std::function<base::Result<RecordedDrives>()> recordDrives = {};
+  std::function<base::Result<void>()> kept = {};
 };
 
 // What a command came to: a value to print, or none; and why the work failed, where the command
@@ -44,6 +52,8 @@ struct [[nodiscard]] CommandResult {
 
   std::optional<plist::Value> value;
   std::optional<base::Error> error;
+  std::string text = {};  // what a terminal shows instead of the value's table; empty: nothing else
+  int status = 0;         // the exit status, unless the work failed
 };
 
 // The parts of the command line that a command takes.
@@ -60,6 +70,8 @@ enum Takes : std::uint16_t {
   kCapture = 256,
   kChannels = 512,
   kNames = 1024,
+  kRecord = 2048,
+  kAcknowledge = 4096,
 };
 
 // What a command needs before its result means something: not even a device; nothing of a storage
@@ -76,7 +88,8 @@ struct Command {
   CommandResult (*run)(const Invocation& invocation);
 };
 
-// Commands of one group stand together.
+// Commands of one group stand together. A command may have the name of the group that follows it:
+// it is what the group's word alone means.
 std::span<const Command> commands();
 
 // Whether a text is the code of an image: four printable characters.

@@ -32,7 +32,7 @@ using plist::Array;
 using plist::Dictionary;
 using plist::Value;
 
-constexpr int kDone = 0, kFailed = 1, kUsage = 2;
+constexpr int kFailed = 1, kUsage = 2;
 
 constexpr char kFooter[] =
     "Results are JSON; on a terminal, tables.\n"
@@ -47,7 +47,8 @@ constexpr char kFooter[] =
     "  nandinfo decode ftl copy/statistics-0.bin\n"
     "  nandinfo decode counters 1y copy/telemetry-0.bin\n"
     "  nandinfo decode capture copy\n"
-    "Exit status: 0 done; 1 the work failed; 2 wrong usage.";
+    "Exit status: 0 done; 1 the work failed; 2 wrong usage.\n"
+    "'health' alone: 0 good; 10 watch; 11 replace; 3 unknown.";
 
 constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
 
@@ -77,12 +78,14 @@ std::optional<std::string> failure(const CommandResult& result) {
 
 bool isEmpty(const Value& value) {
   const auto* dictionary = value.as<Dictionary>();
-  return dictionary != nullptr && dictionary->empty();
+  const auto* array = value.as<Array>();
+  return (dictionary != nullptr && dictionary->empty()) || (array != nullptr && array->empty());
 }
 
 std::string shown(const CommandServices& services, const Command& command, Form form,
                   const CommandResult& result) {
   if (services.outIsTerminal && !form.json && !form.compact) {
+    if (!result.text.empty()) return result.text;
     if (!result.value) return {};
     const Value& value = *result.value;
     const auto* records = value.as<Array>();
@@ -133,15 +136,16 @@ class Run {
     }
     if (const auto why = failure(result)) return failed(*why);
     for (const std::string& complaint : complaints_) say(complaint);
-    return kDone;
+    return result.status;
   }
 
  private:
   CommandResult resultOf(const Arguments& arguments) {
     if (services_.log != nullptr) services_.log->keep();
     tools::Progress progress(services_.err, services_.errIsTerminal);
-    return command_.run(
-        {watch_.services(), arguments, [&](const std::string& text) { progress.show(text); }});
+    return command_.run({watch_.services(), arguments,
+                         [&](const std::string& text) { progress.show(text); }, services_.width,
+                         services_.recordDrives, services_.kept});
   }
 
   void say(const std::string& what) {
@@ -262,6 +266,14 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("NAME", arguments.names,
                    "a counter, an array or one of its elements, a key of the counters service");
   }
+  if (takes(kRecord)) {
+    app.add_flag("--record", arguments.record,
+                 "read the NVMe drives' health logs, for those who can't (as root)");
+  }
+  if (takes(kAcknowledge)) {
+    app.add_flag("--acknowledge", arguments.acknowledge,
+                 "the errors until now are known; from now on only further ones count");
+  }
   if (takes(kWindow)) addWindow(app, arguments);
   if (takes(kSteps)) addSteps(app, arguments);
 }
@@ -340,17 +352,25 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
   if (const std::string unknown = unknownCommand(argc, argv); !help && !unknown.empty()) {
     return wrong(unknown, "");
   }
-  CLI::App* group = nullptr;
+  CLI::App *group = nullptr, *alone = nullptr;  // `alone` was made last of those without a group
   for (const Command& command : commands()) {
     if (!help && !named(command.group != nullptr ? command.group : command.name)) continue;
     if (command.group != nullptr && (group == nullptr || group->get_name() != command.group)) {
-      group = app.add_subcommand(command.group, groupDescription(command.group));
-      group->require_subcommand(1)->footer(kGlobalOptions);
+      if (alone != nullptr && alone->get_name() == command.group) {
+        group = alone->require_subcommand(0, 1);
+      } else {
+        group = app.add_subcommand(command.group, groupDescription(command.group));
+        group->require_subcommand(1)->footer(kGlobalOptions);
+      }
     }
     CLI::App& parent = command.group != nullptr ? *group : app;
     CLI::App* own = parent.add_subcommand(command.name, command.description);
     own->footer(kGlobalOptions);
-    own->callback([&chosen, &command] { chosen = &command; });
+    if (command.group == nullptr) alone = own;
+    // A command of a group is called before what its word alone means.
+    own->callback([&chosen, &command] {
+      if (chosen == nullptr) chosen = &command;
+    });
     addOptions(*own, command, arguments);
   }
   try {

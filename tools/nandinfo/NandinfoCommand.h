@@ -5,10 +5,12 @@
 #pragma once
 
 #include <cstddef>
+#include <functional>
 #include <ostream>
 
 #include "NANDInfo/Services.h"
 #include "tools/common/CommandLog.h"
+#include "tools/nandinfo/Commands.h"
 
 namespace nandinfo {
 
@@ -21,10 +23,13 @@ struct CommandServices {
   std::size_t width = 80;            // of the terminal, in columns
   base::Result<void> root = {};      // whether the device root is there
   tools::CommandLog* log = nullptr;  // the services', for the reasons of a failure
+  // As Invocation has them.
+  std::function<base::Result<RecordedDrives>()> recordDrives = {};
+  std::function<base::Result<void>()> kept = {};
 };
 
 // Runs the command line; returns the exit status: 0 done; 1 the work failed, with one line on
-// `err`; 2 wrong usage.
+// `err`; 2 wrong usage; what a verdict comes to.
 int runNandinfo(const CommandServices& services, int argc, const char* const* argv);
 
 }  // namespace nandinfo
