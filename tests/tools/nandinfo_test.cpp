@@ -60,7 +60,7 @@ class Nandinfo : public testing::Test {
 
 TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
   auto commands = argumentsOf(
-      {{"", {"", "helth", "--unknown\x1b[2J info", "health", "health all", "decode ftl"}},
+      {{"", {"", "helth", "--unknown\x1b[2J info", "health all", "decode ftl"}},
        {"info ", {"disk", "--round"}},
        {"ftl ", {"--round --all", "--stat-keys"}},
        {"ean ", {"image-size dBI", "image-size dBIC5", "update-count d\nIC"}},

@@ -11,8 +11,15 @@
 #include "tools/common/StandardOutput.h"
 #include "tools/common/Terminal.h"
 #include "tools/nandinfo/NandinfoCommand.h"
+#include "tools/recorder/RecordDrives.h"
 
 namespace {
+
+// The drives of this machine, for which no recorded device stands.
+base::Result<nandinfo::RecordedDrives> record(const host::DeviceRoot& root) {
+  if (root.isRecorded()) return base::Error{root.path() + " is a recorded device"};
+  return recorder::recordDrives(host::DeviceRoot(host::HostOptions().machineFiles));
+}
 
 int run(std::ostream& out, int argc, char** argv) {
   tools::CommandLog log("nandinfo");
@@ -24,7 +31,9 @@ int run(std::ostream& out, int argc, char** argv) {
                                            .errIsTerminal = ::isatty(STDERR_FILENO) == 1,
                                            .width = tools::terminalWidth(),
                                            .root = host.root().isThere(),
-                                           .log = &log};
+                                           .log = &log,
+                                           .recordDrives = [&host] { return record(host.root()); },
+                                           .kept = [&host] { return host.kept(); }};
   return nandinfo::runNandinfo(services, argc, argv);
 }
 
