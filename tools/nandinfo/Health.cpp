@@ -78,7 +78,8 @@ Patient controllerOf(const NANDInfo::Services& services) {
   const auto counters = NANDInfo::CopyNANDFTLInfo(services, false, true);
   const auto* isQRT1 = counters ? counters->number(NANDInfo::kNANDInfoIsQRT1Controller) : nullptr;
   if (isQRT1 == nullptr) {
-    controller.unknown = NANDInfo::GetAPIErrorMessage();
+    controller.unknown =
+        "no flash drive or storage controller answers (" + NANDInfo::GetAPIErrorMessage() + ")";
     return controller;
   }
   std::vector<Counterpart> counterparts = {

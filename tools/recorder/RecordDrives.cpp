@@ -45,8 +45,8 @@ base::Result<host::FileDescriptor> openRecords(const DeviceRoot& machine) {
 base::Result<void> answered(int result, const char* what) {
   if (result == 0) return {};
   if (result < 0) return host::systemError().at(what);
-  return base::Error{base::format("%s: the drive answers with status 0x%x", what,
-                                  static_cast<unsigned>(result))};
+  return base::Error{
+      base::format("%s: the drive answers with status 0x%x", what, static_cast<unsigned>(result))};
 }
 
 base::Result<void> record(const DeviceRoot& machine, int folder, const std::string& drive) {
@@ -59,9 +59,8 @@ base::Result<void> record(const DeviceRoot& machine, int folder, const std::stri
   auto* log = reinterpret_cast<nvme_smart_log*>(record.healthLog.data());
   auto* identity = reinterpret_cast<nvme_id_ctrl*>(record.identify.data());
   return answered(nvme_get_log_smart(device->get(), NVME_NSID_ALL, false, log), "its health log")
-      .and_then([&] {
-        return answered(nvme_identify_ctrl(device->get(), identity), "its identity");
-      })
+      .and_then(
+          [&] { return answered(nvme_identify_ctrl(device->get(), identity), "its identity"); })
       .and_then([&] { return host::machine::writeDriveRecord(folder, drive, record); });
 }
 
