@@ -9,7 +9,6 @@
 #include <algorithm>
 #include <cstdint>
 #include <span>
-#include <system_error>
 #include <utility>
 
 #include "base/Text.h"

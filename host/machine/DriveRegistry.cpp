@@ -3,10 +3,8 @@
 
 #include "host/machine/DriveRegistry.h"
 
-#include <cstdint>
 #include <string>
 #include <utility>
-#include <vector>
 
 #include "base/UTF8.h"
 #include "host/machine/DriveFigures.h"

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <vector>
 
 #include "HostServices.h"
 #include "host/files/DeviceFileSystem.h"

@@ -144,3 +144,22 @@ say "  less $yesterday"
 say "  $bin/morvend-demo left $device --all"
 say "  MORVEND_ROOT=$device $bin/pelloran show --day yesterday"
 say "  MORVEND_ROOT=$device $bin/nandinfo ftl --all"
+
+# In an empty root, which is no recorded device: the drives are those of whoever runs this.
+chapter "This machine's own storage: nandinfo health"
+mkdir -p "$demo/machine"
+verdict=0
+MORVEND_ROOT=$demo/machine "$bin/nandinfo" health >"$demo/health.json" 2>"$demo/nandinfo.log" ||
+  verdict=$?
+case $verdict in
+0 | 3 | 10 | 11) ;;
+*) fail "nandinfo health failed: $(tail -n 1 "$demo/nandinfo.log")" ;;
+esac
+sed -nE 's/^  "verdict": "(.*)",/The verdict: \1/p
+  /^      "name"/ { s/.*: "(.*)",/  \1: /; h; }
+  /^      "verdict"/ { s/.*: "(.*)",/\1/; H; x; s/\n//p; }
+  /^      "reasons": \["/ { s/.*\["(.*)"\],/    \1/; s/", "/\n    /g; p; }' "$demo/health.json"
+if grep -q "health log" "$demo/health.json"; then
+  say "An NVMe drive tells its health to root alone, who keeps it for the others:"
+  say "  sudo $bin/nandinfo drives --record"
+fi

@@ -3,7 +3,6 @@
 
 #include "tools/nandinfo/Drives.h"
 
-#include <algorithm>
 #include <string>
 #include <utility>
 

@@ -4,7 +4,6 @@
 #include "tools/nandinfo/Health.h"
 
 #include <algorithm>
-#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -78,8 +77,8 @@ Patient controllerOf(const NANDInfo::Services& services) {
   const auto counters = NANDInfo::CopyNANDFTLInfo(services, false, true);
   const auto* isQRT1 = counters ? counters->number(NANDInfo::kNANDInfoIsQRT1Controller) : nullptr;
   if (isQRT1 == nullptr) {
-    controller.unknown =
-        "no flash drive or storage controller answers (" + NANDInfo::GetAPIErrorMessage() + ")";
+    controller.unknown = std::string("no flash drive or storage controller answers (") +
+                         NANDInfo::GetAPIErrorMessage() + ")";
     return controller;
   }
   std::vector<Counterpart> counterparts = {

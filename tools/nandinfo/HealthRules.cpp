@@ -4,8 +4,9 @@
 #include "tools/nandinfo/HealthRules.h"
 
 #include <algorithm>
-#include <iterator>
+#include <cstddef>
 #include <optional>
+#include <string_view>
 
 #include "base/Text.h"
 
@@ -17,7 +18,7 @@ namespace {
 // has grown by since it was acknowledged, at least.
 enum class Is : std::uint8_t { bits, atLeast, atMost, count };
 
-constexpr std::uint64_t kNone = ~std::uint64_t{0};
+constexpr std::uint64_t kNone = ~std::uint64_t{0};  // no threshold, which nothing reaches
 constexpr std::uint8_t kNVMe = 1, kLifeTime = 2, kController = 4;
 
 struct Rule {
@@ -65,7 +66,7 @@ bool reaches(Is is, std::uint64_t value, std::uint64_t threshold) {
       return value <= threshold;
     case Is::atLeast:
     case Is::count:
-      return value >= threshold;
+      return threshold != kNone && value >= threshold;
   }
   return false;
 }

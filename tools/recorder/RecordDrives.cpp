@@ -9,7 +9,6 @@
 #include <optional>
 #include <string>
 #include <string_view>
-#include <utility>
 
 #include "base/Text.h"
 #include "host/files/FileDescriptor.h"
