@@ -15,6 +15,8 @@ namespace {
 
 constexpr std::uint64_t kMost = std::numeric_limits<std::uint64_t>::max();
 
+constexpr char kAvailableSpare[] = "availableSpare", kSpareThreshold[] = "availableSpareThreshold";
+
 struct Field {
   const char* name;
   std::size_t offset, width;  // in the page, in bytes
@@ -24,8 +26,8 @@ struct Field {
 constexpr Field kHealthFields[] = {
     {"criticalWarning", 0, 1},
     {"temperature", 1, 2, true},
-    {"availableSpare", 3, 1},
-    {"availableSpareThreshold", 4, 1},
+    {kAvailableSpare, 3, 1},
+    {kSpareThreshold, 4, 1},
     {"percentageUsed", 5, 1},
     {"enduranceGroupWarning", 6, 1},
     {"dataUnitsRead", 32, 16},
@@ -78,7 +80,7 @@ constexpr Record kRecords[] = {
     {36, "criticalWarning"},                      // smartCritWarnings
     {414, "mediaErrors"},                         // ueccReads
     {431, "percentageUsed"},                      // percentUsed
-    {532, "availableSpare"},                      // spareAvailablePercent
+    {532, kAvailableSpare},                       // spareAvailablePercent
 };
 static_assert(std::ranges::adjacent_find(kRecords, std::ranges::greater_equal{}, &Record::key) ==
               std::end(kRecords));
@@ -97,6 +99,12 @@ std::string textOf(std::span<const std::byte> page, const Field& field) {
   std::string_view text(reinterpret_cast<const char*>(bytes.data()), bytes.size());
   text.remove_prefix(std::min(text.find_first_not_of(kBlanks), text.size()));
   return std::string(text.substr(0, text.find_last_not_of(kBlanks) + 1));
+}
+
+// A drive with neither a spare nor a threshold for it doesn't count it.
+bool tellsSpare(const DriveFigures& figures) {
+  return figureNamed(figures, kAvailableSpare).value_or(0) != 0 ||
+         figureNamed(figures, kSpareThreshold).value_or(0) != 0;
 }
 
 constexpr std::uint64_t kLastLifeTime = 11, kLastEndOfLife = 3;
@@ -146,7 +154,7 @@ std::vector<std::uint8_t> statisticsOf(const DriveFigures& figures) {
   std::vector<std::uint8_t> buffer;
   for (const auto& [key, name, factor] : kRecords) {
     const auto figure = figureNamed(figures, name);
-    if (!figure) continue;
+    if (!figure || (std::string_view(name) == kAvailableSpare && !tellsSpare(figures))) continue;
     base::appendLittleEndian(buffer, key);
     base::appendLittleEndian(buffer, std::uint32_t{1});
     base::appendLittleEndian(buffer, *figure > kMost / factor ? kMost : *figure * factor);

@@ -83,6 +83,8 @@ TEST_F(Drives, AHealthLogBecomesRecordsThatSaturate) {
     support::put(page, 48, units, 16);
     EXPECT_EQ(recordsOf(figuresOf(HealthLog(page)))[4], sectors) << units;
   }
+  support::put(page, 3, 0, 2);
+  EXPECT_EQ(recordsOf(figuresOf(HealthLog(page))).count(532), 0u) << "no spare is counted";
   EXPECT_EQ(figureNamed(figuresOf(HealthLog(healthy.healthLog)), "temperatureSensor1"),
             std::nullopt);
 }

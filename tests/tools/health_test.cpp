@@ -68,6 +68,7 @@ TEST_F(DriveHealth, EveryThresholdDecides) {
               {5, 255, 11}, {3, 21, 0},   {3, 20, 10},  {3, 11, 10}, {3, 10, 11},  {3, 0, 11},
               {160, 1, 10}, {175, 1, 10}, {196, 1, 10}, {192, 1, 0}, {144, 200, 0}};
   for (const auto& [offset, value, status] : rows) byte(offset, value, status);
+  EXPECT_EQ(verdict([](auto& page) { put(page, 3, 0, 2); }), 3) << "it doesn't count its spare";
 }
 
 TEST_F(DriveHealth, OnlyWhatGrewSinceItWasAcknowledgedCounts) {

@@ -60,6 +60,14 @@ Patient patientOf(const Dictionary& drive) {
   patient.identity = serial.empty() ? patient.name : patient.model + " " + serial;
   patient.source = textIn(drive, "kind") == "NVMe" ? Source::NVMe : Source::lifeTime;
   patient.figures = numbersIn(drive.dictionary("figures"));
+  // A drive with neither a spare nor a threshold for it doesn't count it.
+  const auto isZero = [&patient](const char* figure) {
+    const auto found = patient.figures.find(figure);
+    return found != patient.figures.end() && found->second == 0;
+  };
+  if (isZero("availableSpare") && isZero("availableSpareThreshold")) {
+    patient.figures.erase("availableSpare");
+  }
   patient.unknown = textIn(drive, "unknown");
   return patient;
 }
