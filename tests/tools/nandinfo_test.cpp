@@ -59,15 +59,15 @@ class Nandinfo : public testing::Test {
 };
 
 TEST_F(Nandinfo, WrongUsageIsSaidInOneLine) {
-  auto commands = argumentsOf(
-      {{"", {"", "helth", "--unknown\x1b[2J info", "health all", "decode ftl"}},
-       {"info ", {"disk", "--round"}},
-       {"ftl ", {"--round --all", "--stat-keys"}},
-       {"ean ", {"image-size dBI", "image-size dBIC5", "update-count d\nIC"}},
-       {"decode counters ", {"2y file", "1y"}},
-       {"magazine", {"", " --hours 4 --history", " --history --no-delta"}},
-       {"magazine --hours ", {"-1", "0x10", "4294967296", "4 --mode 3"}},
-       {"extract --from ", {"7", "\x1b"}}});
+  auto commands =
+      argumentsOf({{"", {"", "helth", "--unknown\x1b[2J info", "health all", "decode ftl"}},
+                   {"info ", {"disk", "--round"}},
+                   {"ftl ", {"--round --all", "--stat-keys"}},
+                   {"ean ", {"image-size dBI", "image-size dBIC5", "update-count d\nIC"}},
+                   {"decode counters ", {"2y file", "1y"}},
+                   {"magazine", {"", " --hours 4 --history", " --history --no-delta"}},
+                   {"magazine --hours ", {"-1", "0x10", "4294967296", "4 --mode 3"}},
+                   {"extract --from ", {"7", "\x1b"}}});
   commands.emplace_back();
   for (const auto& command : commands) {
     EXPECT_EQ(run(command), 2) << testing::PrintToString(command);
