@@ -5,8 +5,11 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
+#include <algorithm>
 #include <array>
+#include <cerrno>
 #include <chrono>
 #include <climits>
 #include <tuple>
@@ -159,8 +162,20 @@ Result<void> CounterDatabase::writeOnce(Missing missing, const Work& work, Kept 
     if (const auto said = damaged ? setAside(done.error()) : std::nullopt) {
       place_.log.log(platform::LogLevel::error, "%s", said->text.c_str());
     }
+    if (done.error().is(sqlite::kUnwritable) && mayBeWritten()) {
+      return Error{done.error().text, sqlite::kPassing}.at(path());
+    }
     if (!damaged || again) return std::move(done).at(path());
   }
+}
+
+// SQLite opens for reading what it fails to open for writing, whatever the reason was.
+bool CounterDatabase::mayBeWritten() const {
+  const auto allowed = [this](const std::string& name) {
+    return ::faccessat(folder_.get(), name.c_str(), W_OK, AT_EACCESS) == 0 || errno == ENOENT;
+  };
+  return allowed(".") && allowed(name_) &&
+         std::ranges::all_of(kBeside, [&](const char* suffix) { return allowed(name_ + suffix); });
 }
 
 Result<void> CounterDatabase::recordWaiting(WaitingChanges& waiting) {

@@ -92,6 +92,7 @@ class CounterDatabase {
   base::Error failedToRead(const base::Error& why);
   base::Result<void> writeOnce(Missing missing, const Work& work, Kept kept);
   base::Result<void> recordWaiting(WaitingChanges& waiting);
+  bool mayBeWritten() const;
   base::Result<void> synchronise();
   base::Result<bool> openFolder(DeviceRoot::Missing missing);
   base::Result<void> follow(const std::string& folder);

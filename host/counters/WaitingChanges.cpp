@@ -205,8 +205,9 @@ Result<bool> WaitingChanges::recordBatch(Connection& connection, const std::stri
                                     O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
   struct stat status;
   if (!file && !file.error().is(std::errc::too_many_symbolic_link_levels)) return file.error();
-  if (!file || ::fstat(file->get(), &status) != 0 || !S_ISREG(status.st_mode) ||
-      status.st_nlink > 1 || static_cast<std::uint64_t>(status.st_size) > kMaxWaitingBytes) {
+  if (file && ::fstat(file->get(), &status) != 0) return systemError();
+  if (!file || !S_ISREG(status.st_mode) || status.st_nlink > 1 ||
+      static_cast<std::uint64_t>(status.st_size) > kMaxWaitingBytes) {
     return false;
   }
   const auto batch = readRegularFile(file->get(), kMaxWaitingBytes);

@@ -7,6 +7,7 @@
 #include <sys/stat.h>
 
 #include <cerrno>
+#include <optional>
 #include <system_error>
 
 #include "host/files/Files.h"
@@ -122,10 +123,13 @@ base::Result<void> EventSink::append(const std::string& lines) {
   const std::string path = root_.hostPath(kFolder, kName);
   const auto folder = root_.openFolder(kFolder, DeviceRoot::Missing::create);
   if (!folder) return folder.error().at(path);
-  // Another process may roll the file over, too.
-  const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(kFolder)});
-  if (!lock) return lock.error().at(path);
   const std::string name = run_.nameFor(kName);
+  std::optional<FileLock> rollingOver;  // which another process may do, too, but to what waits
+  if (!run_.isOn()) {
+    auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(kFolder)});
+    if (!lock) return lock.error().at(path);
+    rollingOver.emplace(*std::move(lock));
+  }
   if (auto room = makeRoom(folder->get(), name, lines.size()); !room) return room;
   const auto append = [&] { return appendLines(folder->get(), name, lines, {log_, path}); };
   return root_.patience()(append).at(path);

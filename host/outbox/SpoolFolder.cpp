@@ -28,19 +28,27 @@ std::uint64_t counted(const struct stat& status) {
 }  // namespace
 
 base::Result<std::unique_ptr<SpoolFolder>> SpoolFolder::open(const DeviceRoot& root,
-                                                             platform::SystemLog& log) {
+                                                             platform::SystemLog& log,
+                                                             Unlocked unlocked) {
   auto folder = root.openFolder(kPath, DeviceRoot::Missing::create);
   if (!folder) return folder.error();
   auto lock = FileLock::take(folder->get(), {log, root.hostPath(kPath)});
-  if (!lock) return lock.error();
+  if (!lock && (unlocked == Unlocked::refused || !lock.error().is(std::errc::timed_out))) {
+    return lock.error();
+  }
+  if (!lock) {
+    log.log(platform::LogLevel::error, "%s: %s; logs that wait are written there all the same",
+            root.hostPath(kPath).c_str(), lock.error().text.c_str());
+  }
   std::unique_ptr<SpoolFolder> spool(
-      new SpoolFolder(root, log, *std::move(folder), *std::move(lock)));
+      new SpoolFolder(root, log, *std::move(folder), std::move(lock).orNone()));
   if (const auto known = spool->lookAround(); !known) return known.error();
   return spool;
 }
 
 base::Result<void> SpoolFolder::lookAround() {
-  for (const char* name : {kUnfinishedLog, kUnfinishedOptions}) {
+  for (const char* name : {kUnfinishedLog, kUnfinishedOptions, kUnlockedLog, kUnlockedOptions}) {
+    if (!lock_) break;
     // What can't be removed from there is moved out of the way; else who writes there says why.
     if (::unlinkat(folder_.get(), name, 0) == 0 || errno == ENOENT) continue;
     std::ignore = keepBeside(folder_.get(), name, std::string(name) + ".in-the-way");
@@ -70,7 +78,7 @@ base::Result<void> SpoolFolder::lookAround() {
   for (const auto& [name, bytes] : options) {
     if (const auto log = logs.find(name); log != logs.end()) {
       log->second.bytes += bytes;
-    } else if (!names_.contains(name)) {
+    } else if (lock_ && !names_.contains(name)) {
       remove(name + kOptionsSuffix);
     }
   }
@@ -118,6 +126,7 @@ bool SpoolFolder::remove(std::vector<Log>::iterator log, const char* why) {
 
 void SpoolFolder::makeRoom(const std::string& stem, std::uint64_t bytes) {
   constexpr char kWhy[] = "the spool is full";
+  if (!lock_) return;
   if (stem.starts_with(kStructured)) {
     auto structured = std::ranges::count_if(logs_, isStructured);
     std::uint64_t taken = bytes;
@@ -138,7 +147,7 @@ void SpoolFolder::makeRoom(const std::string& stem, std::uint64_t bytes) {
 }
 
 bool SpoolFolder::removeOldest() {
-  while (!logs_.empty()) {
+  while (lock_ && !logs_.empty()) {
     const auto structured = std::ranges::find_if(logs_.rbegin(), logs_.rend(), isStructured);
     const auto oldest = structured != logs_.rend() ? structured.base() - 1 : logs_.end() - 1;
     if (remove(oldest, "the disk is full")) return true;
@@ -166,11 +175,11 @@ base::Result<void> SpoolFolder::place(const std::string& stem, const std::string
 }
 
 // Gives a log that waits its name, its options first: a kill leaves it to be done again.
-base::Result<void> SpoolFolder::publish(const std::string& waiting, const PendingName& pending) {
+base::Result<void> SpoolFolder::publish(const std::vector<std::string>& names,
+                                        const std::string& waiting, const PendingName& pending) {
   const std::string options = waiting + kOptionsSuffix;
-  const auto isThere = [this](const std::string& name) {
-    struct stat status;
-    return ::fstatat(folder_.get(), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0;
+  const auto isThere = [&names](const std::string& name) {
+    return std::ranges::binary_search(names, name);
   };
   std::string name = pending.name;
   // A name that somebody else has taken meanwhile is passed over, for both.
@@ -198,7 +207,7 @@ base::Result<void> SpoolFolder::settle(const Leaves& leaves) {
     if (!leaves(pending->day)) {
       done = checked(::unlinkat(folder_.get(), name.c_str(), 0));
     } else if (!name.ends_with(kOptionsSuffix)) {
-      done = publish(name, *pending);
+      done = publish(*names, name, *pending);
     }
     if (outcome) outcome = std::move(done);
   }

@@ -2,7 +2,8 @@
 // Copyright the morvend authors
 
 // The folder of submitted logs, var/spool/morvend/submitted, as one process has it to itself:
-// opened under its lock, cleared of what a killed run left, with its contents known.
+// opened under its lock, cleared of what a killed run left, with its contents known. Logs that wait
+// can be put there without the lock, too.
 //
 // A log is a regular file; its options, if any, lie beside it under its name and kOptionsSuffix,
 // and come and go with it.
@@ -14,6 +15,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <set>
 #include <string>
 #include <vector>
@@ -38,15 +40,23 @@ class SpoolFolder {
   static constexpr std::uint64_t kMaxStructuredBytes = std::uint64_t{48} << 20;
   static constexpr char kStructured[] = "structured-";  // what their names begin with
 
-  // Files that aren't logs yet are kept under these names.
+  // Files that aren't logs yet are kept under these names; without the lock, under others.
   static constexpr char kUnfinishedLog[] = ".log.new";
   static constexpr char kUnfinishedOptions[] = ".options.new";
+  static constexpr char kUnlockedLog[] = ".log.new-unlocked";
+  static constexpr char kUnlockedOptions[] = ".options.new-unlocked";
 
-  // Opens the folder, made when it is missing, waiting for its lock. Both are borrowed.
+  // Opens the folder, made when it is missing, waiting for its lock. `unlocked` allows what is then
+  // opened without, with an error line, when somebody holds it for too long: nothing is removed
+  // from there, and what is put there has to wait. Root and log are borrowed.
+  enum class Unlocked { refused, allowed };
   static base::Result<std::unique_ptr<SpoolFolder>> open(const DeviceRoot& root,
-                                                         platform::SystemLog& log);
+                                                         platform::SystemLog& log,
+                                                         Unlocked unlocked = Unlocked::refused);
 
   int descriptor() const { return folder_.get(); }
+  const char* unfinishedLog() const { return lock_ ? kUnfinishedLog : kUnlockedLog; }
+  const char* unfinishedOptions() const { return lock_ ? kUnfinishedOptions : kUnlockedOptions; }
 
   // Gives a new log of this size a name: `stem`, with "-2", "-3", … where the log's or its options'
   // name is taken, and `extension`. The oldest logs make room first, each with a line in the log.
@@ -75,19 +85,20 @@ class SpoolFolder {
   };
 
   SpoolFolder(const DeviceRoot& root, platform::SystemLog& log, FileDescriptor folder,
-              FileLock lock)
+              std::optional<FileLock> lock)
       : root_(root), log_(log), folder_(std::move(folder)), lock_(std::move(lock)) {}
   base::Result<void> lookAround();
   void makeRoom(const std::string& stem, std::uint64_t bytes);
   bool remove(std::vector<Log>::iterator log, const char* why);
-  base::Result<void> publish(const std::string& waiting, const PendingName& pending);
+  base::Result<void> publish(const std::vector<std::string>& names, const std::string& waiting,
+                             const PendingName& pending);
   static bool isStructured(const Log& log);
   bool isFree(const std::string& name) const;
 
   const DeviceRoot& root_;
   platform::SystemLog& log_;
   const FileDescriptor folder_;
-  const FileLock lock_;
+  const std::optional<FileLock> lock_;
   std::set<std::string> names_;
   std::vector<Log> logs_;  // newest first
   std::uint64_t bytes_ = 0;

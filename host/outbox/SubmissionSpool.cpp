@@ -62,21 +62,22 @@ base::Result<std::uint64_t> writeUnfinished(const SpoolFolder& spool, const char
 
 // Gives the unfinished files their names, the log last; takes them back when that fails. Names of
 // logs that wait are brought to disk together, later.
-base::Result<void> nameUnfinished(int folder, const std::string& name, bool withOptions,
-                                  bool waits) {
+base::Result<void> nameUnfinished(const SpoolFolder& spool, const std::string& name,
+                                  bool withOptions, bool waits) {
+  const int folder = spool.descriptor();
   const std::string optionsName = name + SpoolFolder::kOptionsSuffix;
   if (withOptions) {
-    auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedOptions, folder, optionsName);
+    auto named = renameToFreeName(folder, spool.unfinishedOptions(), folder, optionsName);
     if (!named) return named;
   }
-  auto named = renameToFreeName(folder, SpoolFolder::kUnfinishedLog, folder, name);
+  auto named = renameToFreeName(folder, spool.unfinishedLog(), folder, name);
   if (named) {
     if (!waits) named = checked(::fsync(folder));
     if (named) return named;
-    std::ignore = renameToFreeName(folder, name, folder, SpoolFolder::kUnfinishedLog);
+    std::ignore = renameToFreeName(folder, name, folder, spool.unfinishedLog());
   }
   if (withOptions) {
-    std::ignore = renameToFreeName(folder, optionsName, folder, SpoolFolder::kUnfinishedOptions);
+    std::ignore = renameToFreeName(folder, optionsName, folder, spool.unfinishedOptions());
   }
   return named;
 }
@@ -86,16 +87,16 @@ base::Result<void> writeAndName(SpoolFolder& spool, const std::string& stem,
                                 const std::optional<std::string>& options,
                                 const platform::LogSubmission::Writer& writer,
                                 const PendingRun& run) {
-  auto size = writeUnfinished(spool, SpoolFolder::kUnfinishedLog, writer);
+  auto size = writeUnfinished(spool, spool.unfinishedLog(), writer);
   if (!size) return size.error();
   if (options) {
-    const auto more = writeUnfinished(spool, SpoolFolder::kUnfinishedOptions,
+    const auto more = writeUnfinished(spool, spool.unfinishedOptions(),
                                       [&](platform::LogHandle& file) { file.write(*options); });
     if (!more) return more.error();
     *size += *more;
   }
   return spool.place(stem, "", *size, [&](const std::string& name) {
-    return nameUnfinished(spool.descriptor(), run.nameFor(name), options.has_value(), run.isOn());
+    return nameUnfinished(spool, run.nameFor(name), options.has_value(), run.isOn());
   });
 }
 
@@ -135,12 +136,15 @@ base::Result<void> SubmissionSpool::submit(const std::string& stem,
     if (!text) return text.error();
     optionsText = *std::move(text);
   }
-  const auto spool = SpoolFolder::open(root_, log_);
+  // What waits is let go under the lock, by this run or by the next.
+  using Unlocked = SpoolFolder::Unlocked;
+  const auto spool =
+      SpoolFolder::open(root_, log_, run_.isOn() ? Unlocked::allowed : Unlocked::refused);
   if (!spool) return spool.error();
   auto submitted = writeAndName(**spool, stem, optionsText, writer, run_);
   if (!submitted) {
-    (*spool)->remove(SpoolFolder::kUnfinishedLog);
-    (*spool)->remove(SpoolFolder::kUnfinishedOptions);
+    (*spool)->remove((*spool)->unfinishedLog());
+    (*spool)->remove((*spool)->unfinishedOptions());
   }
   return submitted;
 }

@@ -92,8 +92,10 @@ std::optional<platform::Kernel::ReadResult> EccEventFiles::next(std::span<std::b
 }
 
 base::Result<void> EccEventFiles::take(int folder, const std::string& name) const {
-  return run_.isOn() ? renameNumbered(folder, name, folder, run_.nameFor(name))
-                     : checked(::unlinkat(folder, name.c_str(), 0));
+  return root_.patience()([&] {
+    return run_.isOn() ? renameNumbered(folder, name, folder, run_.nameFor(name))
+                       : checked(::unlinkat(folder, name.c_str(), 0));
+  });
 }
 
 base::Result<void> EccEventFiles::settle(const Done& done) {
