@@ -4,6 +4,7 @@
 #include "tools/nandinfo/Commands.h"
 
 #include <algorithm>
+#include <mutex>
 
 #include "NANDInfo/NANDInfo.h"
 #include "tools/nandinfo/Capture.h"
@@ -74,6 +75,10 @@ CommandResult extract(const Invocation& invocation) {
 }
 
 CommandResult dump(const Invocation& invocation) {
+  // Whether the weekly log is due is asked and recorded by one process at a time.
+  const auto alone = invocation.runLock != nullptr
+                         ? std::unique_lock<platform::RunLock>(*invocation.runLock)
+                         : std::unique_lock<platform::RunLock>();
   const bool handled = NANDInfo::DumpStorageStructuredLog(invocation.services, false);
   if (!handled) return {Value(false), base::Error{"not every list was dumped"}};
   return Value(true);

@@ -16,6 +16,7 @@
 
 #include "NANDInfo/Services.h"
 #include "base/Result.h"
+#include "platform/RunLock.h"
 #include "plist/Value.h"
 
 namespace nandinfo {
@@ -40,6 +41,7 @@ struct Invocation {
   // What only some commands use: reads this machine's NVMe drives, and brings preferences to disk.
   std::function<base::Result<RecordedDrives>()> recordDrives = {};
   std::function<base::Result<void>()> kept = {};
+  platform::RunLock* runLock = nullptr;  // held by what leaves logs that are due now and then
 };
 
 // What a command came to: a value to print, or none; and why the work failed, where the command

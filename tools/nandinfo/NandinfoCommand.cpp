@@ -145,7 +145,7 @@ class Run {
     tools::Progress progress(services_.err, services_.errIsTerminal);
     return command_.run({watch_.services(), arguments,
                          [&](const std::string& text) { progress.show(text); }, services_.width,
-                         services_.recordDrives, services_.kept});
+                         services_.recordDrives, services_.kept, services_.runLock});
   }
 
   void say(const std::string& what) {

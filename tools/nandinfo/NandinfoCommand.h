@@ -9,6 +9,7 @@
 #include <ostream>
 
 #include "NANDInfo/Services.h"
+#include "platform/RunLock.h"
 #include "tools/common/CommandLog.h"
 #include "tools/nandinfo/Commands.h"
 
@@ -26,6 +27,7 @@ struct CommandServices {
   // As Invocation has them.
   std::function<base::Result<RecordedDrives>()> recordDrives = {};
   std::function<base::Result<void>()> kept = {};
+  platform::RunLock* runLock = nullptr;
 };
 
 // Runs the command line; returns the exit status: 0 done; 1 the work failed, with one line on

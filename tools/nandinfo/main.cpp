@@ -33,7 +33,8 @@ int run(std::ostream& out, int argc, char** argv) {
                                            .root = host.root().isThere(),
                                            .log = &log,
                                            .recordDrives = [&host] { return record(host.root()); },
-                                           .kept = [&host] { return host.kept(); }};
+                                           .kept = [&host] { return host.kept(); },
+                                           .runLock = &host.services().runLock};
   return nandinfo::runNandinfo(services, argc, argv);
 }
 
