@@ -4,6 +4,7 @@
 #include "end_to_end/Device.h"
 
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 
 #include <algorithm>
 #include <filesystem>
@@ -132,9 +133,10 @@ faults::Outcome Device::run(const std::string& program, faults::Strings argument
   return faults::run(arguments, environment(bus), fault);
 }
 
-std::size_t Device::countCalls(const std::string& program, faults::Strings arguments) const {
+std::size_t Device::countCalls(const std::string& program, faults::Strings arguments,
+                               const std::string& kind) const {
   arguments.insert(arguments.begin(), PROGRAMS "/" + program);
-  return faults::count(arguments, environment(""));
+  return faults::count(arguments, environment(""), kind);
 }
 
 void Device::become(const Device& other) {
@@ -213,6 +215,20 @@ Dictionary Device::expectedSections() const {
       {"PLDistributionsHistogram",
        Dictionary{{"samples", Dictionary{{"(-inf, 5]", 11}, {"(5, 10]", 10}, {"(10, inf)", 19}}}}},
       {"PLStartDate", plist::Date{(today_ - 1) * 86400.0}}};
+}
+
+bool Device::databaseIsSound() const {
+  sqlite3* database = nullptr;
+  sqlite3_open_v2((*root_ / support::kCountersDatabase).c_str(), &database, SQLITE_OPEN_READWRITE,
+                  nullptr);
+  const auto isOk = [](void* sound, int, char** values, char**) {
+    *static_cast<bool*>(sound) = std::string_view(values[0]) == "ok";
+    return 0;
+  };
+  bool sound = false;
+  sqlite3_exec(database, "PRAGMA integrity_check", isOk, &sound, nullptr);
+  sqlite3_close(database);
+  return sound;
 }
 
 Lines Device::rows(std::int32_t first, std::int32_t last) const {

@@ -44,8 +44,9 @@ class Device {
   faults::Outcome run(const std::string& program, faults::Strings arguments,
                       const faults::Fault& fault = {}, const std::string& bus = "") const;
 
-  // The same, only counting the calls at which a fault can be made.
-  std::size_t countCalls(const std::string& program, faults::Strings arguments) const;
+  // The same, only counting the calls at which a fault of a kind can be made.
+  std::size_t countCalls(const std::string& program, faults::Strings arguments,
+                         const std::string& kind) const;
 
   // What tells a program of this root and that bus.
   faults::Strings environment(const std::string& bus) const;
@@ -77,6 +78,9 @@ class Device {
 
   // Every row of the history before today as one text a row.
   Lines history() const { return rows(INT32_MIN, today_ - 1); }
+
+  // Whether the counters database is all right for SQLite itself.
+  bool databaseIsSound() const;
 
   // Today's rows: what the runs have recorded.
   Lines recorded() const { return rows(today_, INT32_MAX); }

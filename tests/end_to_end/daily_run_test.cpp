@@ -365,7 +365,7 @@ TEST(DailyRun, WritesEachDomainOfATaskingOnce) {
         "var/preferences/__quenset__/com.norba.Varnhollow.plist",
         Dictionary{{"ScheduledTasking",
                     Dictionary{{"TaskingID", "T2"}, {"TaskingPayload", std::move(payload)}}}});
-    return device.countCalls("morvend", {"-d"});
+    return device.countCalls("morvend", {"-d"}, "EIO");
   };
   EXPECT_LE(calls(300), calls(3) + 3) << "and what more blocks of a file take";
 }

@@ -299,7 +299,8 @@ TEST(NandinfoProgram, ACaptureIsWholeOrNotThere) {
   if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
   const Device device = deviceWithController();
   const std::string folder = device.root() / "capture";
-  const std::size_t calls = device.countCalls("nandinfo", {"capture", folder, "--compact"});
+  const std::size_t calls =
+      device.countCalls("nandinfo", {"capture", folder, "--compact"}, "kill-before");
   const Lines whole = device.names("capture");
   ASSERT_GT(whole.size(), 5u);
   for (std::size_t at = 1; at <= calls; ++at) {

@@ -75,19 +75,20 @@ bool available() { return false; }
 Outcome run(const Strings& argv, const Strings& environment, const Fault& fault) {
   Strings all = environment;
   all.push_back(std::string("LD_PRELOAD=") + FAULT_SHIM);
-  if (fault.at > 0) {
+  if (!fault.kind.empty()) {
     all.push_back("MORVEND_FAULT_AT=" + std::to_string(fault.at));
     all.push_back("MORVEND_FAULT_KIND=" + fault.kind);
-    if (fault.onward) all.push_back("MORVEND_FAULT_ONWARD=1");
   }
+  if (fault.onward) all.push_back("MORVEND_FAULT_ONWARD=1");
+  if (fault.hurry) all.push_back("MORVEND_FAULT_HURRY=1");
   return start(argv, all);
 }
 
-std::size_t count(const Strings& argv, const Strings& environment) {
+std::size_t count(const Strings& argv, const Strings& environment, const std::string& kind) {
   const support::TemporaryFolder folder;
   Strings all = environment;
   all.push_back("MORVEND_FAULT_COUNT=" + (folder / "count").string());
-  run(argv, all);
+  run(argv, all, {.kind = kind});
   std::size_t number = 0;
   std::ifstream(folder / "count") >> number;
   return number;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-// Runs a program with a fault at the n-th of its state-changing calls; see FaultShim.c for what is
+// Runs a program with a fault at the n-th of its calls of a class; see FaultShim.c for what is
 // counted and for the kinds.
 #pragma once
 
@@ -12,7 +12,8 @@
 namespace faults {
 
 // Every kind, for tests that go through all of them.
-inline constexpr const char* kKinds[] = {"kill-before", "kill-after", "EIO", "ENOSPC", "short"};
+inline constexpr const char* kKinds[] = {"kill-before", "kill-after", "EIO",       "ENOSPC",
+                                         "short",       "EMFILE",     "unreadable"};
 
 // The shim can't be loaded into a program that is built with a sanitizer; why, for GTEST_SKIP.
 bool available();
@@ -22,8 +23,9 @@ using Strings = std::vector<std::string>;
 
 struct Fault {
   std::size_t at = 0;  // from 1; 0 is no fault
-  std::string kind;
+  std::string kind = {};
   bool onward = false;  // every later call, too
+  bool hurry = false;   // the program doesn't sleep, as it doesn't where calls fail
 };
 
 struct Outcome {
@@ -35,7 +37,8 @@ struct Outcome {
 // Runs argv[0] to its end. The environment, "NAME=value" each, is added to this process's.
 Outcome run(const Strings& argv, const Strings& environment, const Fault& fault = {});
 
-// The number of state-changing calls of a run without a fault; 0 if it doesn't end normally.
-std::size_t count(const Strings& argv, const Strings& environment);
+// The number of calls at which a run without a fault could have one of this kind; 0 if it doesn't
+// end normally.
+std::size_t count(const Strings& argv, const Strings& environment, const std::string& kind);
 
 }  // namespace faults

@@ -21,10 +21,16 @@ Outcome runCalls(const support::TemporaryFolder& root, const faults::Fault& faul
   return faults::run({FAULT_SUBJECT, root.path().string()}, {}, fault);
 }
 
-TEST(FaultShim, CountsWhatChangesFilesAndNothingElse) {
+TEST(FaultShim, CountsTheCallsOfItsKindAndNothingElse) {
   if (!faults::available()) GTEST_SKIP() << faults::kUnavailable;
-  const support::TemporaryFolder root;
-  EXPECT_EQ(faults::count({FAULT_SUBJECT, root.path().string()}, {}), kCalls);
+  const std::pair<const char*, std::size_t> rows[] = {
+      {"EIO", kCalls}, {"EMFILE", 2}, {"unreadable", 1}};
+  for (const auto& [kind, calls] : rows) {
+    const support::TemporaryFolder root;
+    EXPECT_EQ(faults::count({FAULT_SUBJECT, root.path().string()}, {}, kind), calls) << kind;
+    const support::TemporaryFolder failing;
+    EXPECT_EQ(runCalls(failing, {calls, kind}).status, 1) << kind;
+  }
 }
 
 TEST(FaultShim, KillsAndFailsAtTheCallThatIsNamed) {
