@@ -160,7 +160,8 @@ base::Result<void> PreferenceFile::merge(const Edit& edit) {
   if (!folder) return folder.error();
   const auto lock = FileLock::take(folder->get(), {log_, root_.hostPath(folder_)});
   if (!lock) return lock.error().at("its folder");
-  if (auto free = refuseLinks(folder->get(), name_); !free) return free;
+  auto free = root_.patience()([&] { return refuseLinks(folder->get(), name_); });
+  if (!free) return free;
   // Another process's writing may leave all that is compared as it was.
   load(true);
   if (state_ == State::unreadable) return *readError_;

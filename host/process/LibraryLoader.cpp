@@ -23,16 +23,19 @@ constexpr std::size_t kMaxModule = std::size_t{64} << 20;
 
 }  // namespace
 
-std::string installedModule() {
+base::Result<std::string> installedModule() {
+  constexpr char kProgram[] = "/proc/self/exe";
   std::error_code error;
-  const auto program = std::filesystem::read_symlink("/proc/self/exe", error);
+  const auto program = std::filesystem::read_symlink(kProgram, error);
+  if (error) return systemError(error.value()).at(kProgram);
   return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
 }
 
 base::Result<FileDescriptor> LibraryLoader::installedInstead(const FileDescriptor& file) const {
-  const std::string path = installedModule();
-  auto installed = opened(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
-  if (!installed) return installed.error().at(path);
+  const auto path = installedModule();
+  if (!path) return path.error();
+  auto installed = opened(::open(path->c_str(), O_RDONLY | O_CLOEXEC));
+  if (!installed) return installed.error().at(*path);
   struct stat theirs, ours;
   if (::fstat(file.get(), &theirs) != 0 || ::fstat(installed->get(), &ours) != 0) {
     return systemError();
@@ -42,10 +45,10 @@ base::Result<FileDescriptor> LibraryLoader::installedInstead(const FileDescripto
     const auto bytes = readRegularFile(file.get(), kMaxModule);
     if (!bytes) return bytes.error();
     const auto expected = readRegularFile(installed->get(), kMaxModule);
-    if (!expected) return expected.error().at(path);
+    if (!expected) return expected.error().at(*path);
     same = *bytes == *expected;
   }
-  if (!same) return base::Error{"it is not the installed module, " + path};
+  if (!same) return base::Error{"it is not the installed module, " + *path};
   return installed;
 }
 
@@ -55,9 +58,12 @@ void* LibraryLoader::load(std::string_view path) {
   }
   auto file = root_.openForReading(path);
   struct stat status;
-  if (!file || ::fstat(file->get(), &status) != 0 || !S_ISREG(status.st_mode)) return nullptr;
+  if (!file || !root_.patience()([&] { return checked(::fstat(file->get(), &status)); }) ||
+      !S_ISREG(status.st_mode)) {
+    return nullptr;
+  }
   if (trusted_ == Trusted::installed) {
-    auto installed = installedInstead(*file);
+    auto installed = root_.patience()([&] { return installedInstead(*file); });
     if (!installed) {
       log_.log(platform::LogLevel::error,
                "Not loading %s: %s; MORVEND_RUN_MODULES=1 would say that this root is trusted",

@@ -20,7 +20,7 @@ namespace host {
 
 // Where the module that device roots carry is installed: in the folder lib beside the one that this
 // program stands in, as the build has it too.
-std::string installedModule();
+base::Result<std::string> installedModule();
 
 class LibraryLoader : public platform::LibraryLoader {
  public:

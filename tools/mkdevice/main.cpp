@@ -34,7 +34,7 @@ int main(int argc, char** argv) {
   host::settleIn();
   constexpr int kDone = 0, kFailed = 1, kUsage = 2;
   mkdevice::MakingOptions options;
-  options.module = host::installedModule();
+  options.module = host::installedModule().orNone().value_or("");
   tools::CommandLog log("mkdevice");
   options.log = &log;
 
