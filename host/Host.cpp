@@ -27,6 +27,8 @@
 
 namespace host {
 
+const char kDefaultRoot[] = MORVEND_DEFAULT_ROOT;
+
 HostOptions HostOptions::fromEnvironment() {
   HostOptions options;
   if (const char* root = std::getenv("MORVEND_ROOT"); root != nullptr && *root != '\0') {

@@ -20,8 +20,11 @@ namespace host {
 
 class StandardErrorLog;
 
+// The device root where nobody names another: "/", or what the build was given.
+extern const char kDefaultRoot[];
+
 struct HostOptions {
-  std::string root = "/";  // the device root, a path of the host
+  std::string root = kDefaultRoot;  // the device root, a path of the host
   platform::LogLevel lowestLevel = platform::LogLevel::standard;
   bool runModules = false;               // of this root, whatever they are: it is trusted
   std::string machineFiles = "/";        // the folder of this machine's /proc, /sys, /etc and /usr

@@ -11,7 +11,8 @@
 
 namespace MORVEND_EXPORTED host {
 
-// Every service over the device root that MORVEND_ROOT names ("/" without it); what was written is
+// Every service over the device root that MORVEND_ROOT names (without it, that of the
+// build: "/", or MORVEND_DEFAULT_ROOT); what was written is
 // on disk once the last pointer is gone. The process ignores SIGPIPE from then on.
 std::shared_ptr<const platform::AllServices> makeServices();
 

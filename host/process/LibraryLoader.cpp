@@ -14,12 +14,18 @@
 
 #include "host/files/Files.h"
 #include "host/files/SystemError.h"
+#include "platform/FaultwatchSupport.h"
 
 namespace host {
 
 namespace {
 
 constexpr std::size_t kMaxModule = std::size_t{64} << 20;
+
+base::Result<FileDescriptor> openModule(const base::Result<std::string>& path) {
+  if (!path) return path.error();
+  return opened(::open(path->c_str(), O_RDONLY | O_CLOEXEC)).at(*path);
+}
 
 }  // namespace
 
@@ -28,14 +34,17 @@ base::Result<std::string> installedModule() {
   std::error_code error;
   const auto program = std::filesystem::read_symlink(kProgram, error);
   if (error) return systemError(error.value()).at(kProgram);
-  return (program.parent_path().parent_path() / "lib" / "FaultwatchSupport.so").string();
+  const auto lib = program.parent_path().parent_path() / "lib";
+  const auto installed = lib / "morvend" / "FaultwatchSupport.so";
+  const bool isInstalled = std::filesystem::exists(installed, error);
+  if (error) return systemError(error.value()).at(installed.string());
+  return (isInstalled ? installed : lib / "FaultwatchSupport.so").string();
 }
 
 base::Result<FileDescriptor> LibraryLoader::installedInstead(const FileDescriptor& file) const {
   const auto path = installedModule();
-  if (!path) return path.error();
-  auto installed = opened(::open(path->c_str(), O_RDONLY | O_CLOEXEC));
-  if (!installed) return installed.error().at(*path);
+  auto installed = openModule(path);
+  if (!installed) return installed;
   struct stat theirs, ours;
   if (::fstat(file.get(), &theirs) != 0 || ::fstat(installed->get(), &ours) != 0) {
     return systemError();
@@ -57,12 +66,14 @@ void* LibraryLoader::load(std::string_view path) {
     return loaded->second.handle;
   }
   auto file = root_.openForReading(path);
+  const bool isInstalled = !file && path == platform::kFaultwatchSupportPath && !root_.isRecorded();
+  if (isInstalled) file = root_.patience()([] { return openModule(installedModule()); });
   struct stat status;
   if (!file || !root_.patience()([&] { return checked(::fstat(file->get(), &status)); }) ||
       !S_ISREG(status.st_mode)) {
     return nullptr;
   }
-  if (trusted_ == Trusted::installed) {
+  if (!isInstalled && trusted_ == Trusted::installed) {
     auto installed = root_.patience()([&] { return installedInstead(*file); });
     if (!installed) {
       log_.log(platform::LogLevel::error,

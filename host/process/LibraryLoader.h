@@ -18,8 +18,8 @@
 
 namespace host {
 
-// Where the module that device roots carry is installed: in the folder lib beside the one that this
-// program stands in, as the build has it too.
+// Where the module that device roots carry is: in the folder lib beside the one that this program
+// stands in, as the build has it, or installed in morvend/ below that.
 base::Result<std::string> installedModule();
 
 class LibraryLoader : public platform::LibraryLoader {
@@ -35,6 +35,8 @@ class LibraryLoader : public platform::LibraryLoader {
   // nowhere, so that a root carries its libraries as files (copies or hard links) or links within.
   // Unless the root is trusted, what is loaded is the installed module, and only where the root's
   // file is the same byte for byte; any other is not loaded, with an error line.
+  // This machine needs no such file: where it has none, its crash-reporting support library is the
+  // installed module.
   // A library that has "FaultwatchSupportUsePreferences" is given the preference store.
   void* load(std::string_view path) override;
   void* symbol(void* library, const char* name) override;

@@ -437,6 +437,11 @@ struct CountingPreferences : platform::PreferenceStore {
 
 TEST_F(DeviceFiles, ALibraryOfTheDeviceActsOnThisProcessesPreferences) {
   CountingPreferences preferences;
+  // This machine has the installed module, a recorded device what its root carries.
+  EXPECT_NE(LibraryLoader(root, preferences, log, LibraryLoader::Trusted::installed)
+                .load(platform::kFaultwatchSupportPath),
+            nullptr);
+  std::filesystem::create_directory(folder / "device");
   LibraryLoader loader(root, preferences, log, LibraryLoader::Trusted::installed);
   EXPECT_EQ(loader.load(platform::kFaultwatchSupportPath), nullptr);
   const auto place = folder / std::string_view(platform::kFaultwatchSupportPath).substr(1);

@@ -17,6 +17,7 @@
 #include "host/process/LibraryLoader.h"
 #include "host/process/Surroundings.h"
 #include "host/process/SystemClock.h"
+#include "tools/common/CommandLine.h"
 #include "tools/common/CommandLog.h"
 #include "tools/common/Terminal.h"
 #include "tools/mkdevice/DeviceMaker.h"
@@ -41,6 +42,7 @@ int main(int argc, char** argv) {
   CLI::App app("Makes a complete sample device root, with some weeks of counters up to yesterday.",
                "mkdevice");
   app.set_version_flag("--version", "mkdevice " MORVEND_VERSION);
+  tools::addCompletion(app);
   app.add_option("DIR", options.folder, "the root's folder: empty, or not there yet")->required();
   app.add_option("--seed", options.sample.seed,
                  "the same number on the same day makes the same device; default: 1")

@@ -17,6 +17,7 @@
 #include "platform/SystemLog.h"
 #include "plist/JSON.h"
 #include "tools/common/ClosestName.h"
+#include "tools/common/CommandLine.h"
 #include "tools/common/Terminal.h"
 #include "tools/common/TerminalText.h"
 #include "tools/nandinfo/Commands.h"
@@ -48,7 +49,7 @@ constexpr char kFooter[] =
     "  nandinfo decode counters 1y copy/telemetry-0.bin\n"
     "  nandinfo decode capture copy\n"
     "Exit status: 0 done; 1 the work failed; 2 wrong usage.\n"
-    "'health' alone: 0 good; 10 watch; 11 replace; 3 unknown.";
+    "'health' alone: 0 good; 10 watch; 11 replace; 3 unknown.\n";
 
 constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
 
@@ -334,27 +335,28 @@ int runNandinfo(const CommandServices& services, int argc, const char* const* ar
   app.add_flag("--compact", form.compact, "JSON on one line");
   app.require_subcommand(1);
   app.fallthrough();
-  app.footer(kFooter);
+  app.footer(kFooter + tools::rootInHelp());
+  tools::addCompletion(app);
   app.formatter(std::make_shared<Help>());
-  // Only the commands that are named, unless help may show them all: to make them takes longer than
-  // most of them run.
+  // Only the commands that are named, unless all may be shown: to make them takes longer than most
+  // of them run.
   const auto named = [words = std::span(argv, static_cast<std::size_t>(argc))](const char* word) {
     return std::find(words.begin(), words.end(), std::string_view(word)) != words.end();
   };
-  const bool help = std::any_of(argv, argv + argc, [](std::string_view word) {
-    return word == "-h" || word.starts_with("--help");
+  const bool all = std::any_of(argv, argv + argc, [](std::string_view word) {
+    return word == "-h" || word.starts_with("--help") || word.starts_with("--completion");
   });
   const auto wrong = [&services](const std::string& what, const std::string& command) {
     services.err << "nandinfo: " << tools::printable(what) << " (see 'nandinfo" << command
                  << " --help')\n";
     return kUsage;
   };
-  if (const std::string unknown = unknownCommand(argc, argv); !help && !unknown.empty()) {
+  if (const std::string unknown = unknownCommand(argc, argv); !all && !unknown.empty()) {
     return wrong(unknown, "");
   }
   CLI::App *group = nullptr, *alone = nullptr;  // `alone` was made last of those without a group
   for (const Command& command : commands()) {
-    if (!help && !named(command.group != nullptr ? command.group : command.name)) continue;
+    if (!all && !named(command.group != nullptr ? command.group : command.name)) continue;
     if (command.group != nullptr && (group == nullptr || group->get_name() != command.group)) {
       if (alone != nullptr && alone->get_name() == command.group) {
         group = alone->require_subcommand(0, 1);

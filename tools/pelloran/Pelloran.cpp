@@ -16,6 +16,7 @@
 
 #include "base/Convert.h"
 #include "tools/common/ClosestName.h"
+#include "tools/common/CommandLine.h"
 #include "tools/common/Terminal.h"
 #include "tools/common/TerminalText.h"
 #include "tools/pelloran/Arguments.h"
@@ -231,6 +232,8 @@ int runPelloran(const Environment& environment, int argc, const char* const* arg
   CLI::App app("Writes and reads the counters of a device.", "pelloran");
   app.set_version_flag("--version", "pelloran " MORVEND_VERSION);
   app.require_subcommand(1);
+  app.footer(tools::rootInHelp());
+  tools::addCompletion(app);
 
   struct {
     const char *name, *description, *valueDescription;
