@@ -12,11 +12,10 @@ fail() { echo "$*" >&2; exit 1; }
 
 cmake --install "$build" --prefix "$work/installed" >/dev/null
 DESTDIR=$work/staged cmake --install "$build" --prefix /opt/elsewhere >/dev/null
-for file in lib/systemd/system/morvend{,-daily}.service \
-  share/dbus-1/system-services/com.norba.pellorand.morvend.service; do
+for file in $(cd "$work/installed" && echo lib/systemd/system/morvend{,-daily,-drives,-extract,-sample}.service share/dbus-1/system-services/*); do
   program=$(sed -nE 's/^Exec(Start)?=([^ ]*).*/\2/p' "$work/installed/$file")
   [[ $program == "$work"/installed/* && -x $program ]] || fail "$file starts '$program'"
-  grep -qE '^Exec(Start)?=/opt/elsewhere/bin/morvend( -d)?$' "$work/staged/opt/elsewhere/$file" ||
+  grep -qE '^Exec(Start)?=/opt/elsewhere/bin/(morvend|nandinfo|pelloran)( |$)' "$work/staged/opt/elsewhere/$file" ||
     fail "$file, staged, starts another program"
   ! grep -H '@[a-z_]*@' "$work/installed/$file" || fail "a place was left open"
 done

@@ -184,6 +184,7 @@ struct Otherwise {
 };
 constexpr Otherwise kOtherwise[] = {
     {"./dev ", "it builds the tree, or runs this test"},
+    {"sudo ", "it changes the machine"},
     {"busctl ", "it listens on the system's bus"},
     {"journalctl ", "it reads the machine's journal"},
     {"name=", "for the messages"},
