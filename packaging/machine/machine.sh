@@ -40,7 +40,7 @@ cp "$packages"/*.deb "$here/trial.sh" "$root/trial/"
 inside sh -c 'apt-get update -q && apt-get install -q -y --no-install-recommends /trial/*.deb' \
   >"$work/install.log" 2>&1 || { tail -n 40 "$work/install.log"; exit 1; }
 install -D -m 644 "$here/trial.service" "$root/etc/systemd/system/trial.service"
-inside systemctl --quiet enable trial.service
+inside systemctl --quiet enable trial.service 2>>"$work/install.log"
 
 say "booting a container"
 timeout --kill-after=10 300 systemd-nspawn --quiet --register=no --keep-unit --directory="$root" --boot \
