@@ -97,8 +97,9 @@ std::string defaultInterface(const DeviceRoot& files, const RouteTable& table) {
 }  // namespace
 
 bool defaultRouteIsMobile(const DeviceRoot& files) {
-  constexpr RouteTable kTables[] = {{"/proc/net/route", 8, 0, 1, 7, 3, 6, "00000000", 10},
-                                    {"/proc/net/ipv6_route", 10, 9, 0, 1, 8, 5, "00", 16}};
+  // The routes of the machine, whatever network this process has of its own.
+  constexpr RouteTable kTables[] = {{"/proc/1/net/route", 8, 0, 1, 7, 3, 6, "00000000", 10},
+                                    {"/proc/1/net/ipv6_route", 10, 9, 0, 1, 8, 5, "00", 16}};
   for (const RouteTable& table : kTables) {
     const std::string interface = defaultInterface(files, table);
     if (!isPlainFileName(interface, kMaxFileName)) continue;

@@ -316,8 +316,8 @@ TEST_F(MachineDevice, TheDefaultRouteIsTheOneOfTheLowestMetric) {
       {"", zeros + " 00 " + zeros + " 00 " + zeros + " ffffffff 1 0 00200200       lo\n", false},
   };
   for (const auto& row : rows) {
-    folder.write("proc/net/route", row.four);
-    folder.write("proc/net/ipv6_route", row.six);
+    folder.write("proc/1/net/route", row.four);
+    folder.write("proc/1/net/ipv6_route", row.six);
     EXPECT_EQ(machine::defaultRouteIsMobile(files), row.isMobile) << row.four << row.six;
   }
 }

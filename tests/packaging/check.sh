@@ -24,7 +24,7 @@ morvend 5
 morvend-daily 5
 morvend-extract 5
 morvend-extract-monthly 5
-morvend-sample 8
+morvend-sample 5
 morvend-drives 14
 EOT
 for timer in "$units"/*.timer; do
