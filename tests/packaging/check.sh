@@ -7,7 +7,7 @@
 set -euo pipefail
 build=$1
 work=$(mktemp -d)
-trap 'kill ${bus:-} 2>/dev/null; rm -rf "$work"' EXIT
+trap 'kill ${bus:-} 2>/dev/null || true; rm -rf "$work"' EXIT
 fail() { echo "$*" >&2; exit 1; }
 cmake --install "$build" --prefix "$work/usr" >/dev/null
 units=$work/usr/lib/systemd/system share=$work/usr/share
