@@ -1,45 +1,28 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
 # Copyright the morvend authors
-# On the machine, as root, once it is up: a day of it, who may do what, and what is left in the end.
-# Says "ok" or "not ok" and what, a line each, and "done".
-name=com.norba.pellorand.morvend
-object=/${name//.//}
-data=/var/lib/morvend
-
-# check WHAT COMMAND...
-check() {
-  local what=$1 output
-  shift
-  if output=$("$@" 2>&1); then echo "ok - $what"; else
-    echo "not ok - $what"
-    printf '%s\n' "$output" | sed 's/^/    /'
-  fi
-}
-is() { [ "$1" = "$2" ] || { printf 'is:     %s\nshould: %s\n' "$1" "$2"; return 1; }; }
-as() { runuser -u "$1" -- "${@:2}"; }
-# refused COMMAND...: fails, and says that it isn't allowed.
-refused() { ! "$@" >/tmp/refused 2>&1 && grep 'Access denied' /tmp/refused; }
-call() { as "$1" busctl call $name $object "${@:2}"; }
+# In the container, as root, once it is up: what the installation made, the day's work at a word, who
+# may do what, and what is left in the end. Says "done" at its end.
+. /trial/checks.sh
 
 # The machine as it is after the installation.
-check "nothing has failed" is "$(systemctl --failed --no-legend)" ""
+check "nothing has failed" is "$(failed_units)" ""
 for timer in daily drives extract extract-monthly sample; do
   check "morvend-$timer.timer is on" systemctl is-active morvend-$timer.timer
 done
 
 # Its own figures, consent, and the night.
 check "a sample" systemctl start morvend-sample.service
-check "consent" as _morvend install -D -m 600 /usr/share/doc/morvend/examples/consent.plist \
-  $data/var/preferences/mobile/com.norba.quenset.plist
+check "consent" consent /usr/share/doc/morvend/examples/consent.plist
 check "a counter of yesterday" as _morvend pelloran add host.vmstat.trial 12345 --day yesterday
 check "the day's run" systemctl start morvend-daily.service
-report=$(find $data/var/spool/morvend/submitted -name 'log-pellorand.193.*Z')
+report=$(find $spool/submitted -name 'log-pellorand.193.*Z')
 check "the report is there" test -f "$report"
-check "it holds the counter, rounded" grep -A1 host.vmstat.trial "$report"
+check "it holds the counter, rounded" is "$(grep -A1 host.vmstat.trial "$report" | tail -n 1 | tr -d '\t ')" \
+  "<integer>12000</integer>"
 check "it is nobody else's" is "$(stat -c '%U:%G %a' "$report")" "_morvend:_morvend 600"
 check "nobody else wrote there" is "$(find $data ! -user _morvend)" ""
-check "no error was said" is "$(journalctl -q -p err -o cat -u 'morvend*')" ""
+check "no error was said" is "$(errors_said)" ""
 
 # The bus.
 useradd -G morvend friend
@@ -52,8 +35,23 @@ check "a member of the group may send" call friend --expect-reply=no $name Messa
 check "root may ping" call root org.freedesktop.DBus.Peer Ping
 check "nobody may not own it" refused as nobody busctl call org.freedesktop.DBus /org/freedesktop/DBus \
   org.freedesktop.DBus RequestName su $name 0
-systemd-analyze security --no-pager 2>/dev/null | grep -E '^morvend'
-check "nothing has failed since" is "$(systemctl --failed --no-legend)" ""
+
+# How far each unit is exposed, of 10: those that are the daemon's 0.5 at most, and the one that asks the
+# drives a little more.
+exposure() { systemd-analyze security --no-pager "$1" 2>/dev/null | sed -n 's/.*exposure level.*: \([0-9.]*\) .*/\1/p'; }
+while read -r unit most; do
+  score=$(exposure $unit.service)
+  check "$unit.service is exposed by ${score:-?} of 10, $most at most" \
+    awk -v score="${score:-10}" -v most=$most 'BEGIN { exit !(score <= most) }'
+done <<'EOT'
+morvend 0.5
+morvend-daily 0.5
+morvend-extract 0.5
+morvend-extract-monthly 0.5
+morvend-sample 0.5
+morvend-drives 1.4
+EOT
+check "nothing has failed since" is "$(failed_units)" ""
 
 # What stays.
 export DEBIAN_FRONTEND=noninteractive
