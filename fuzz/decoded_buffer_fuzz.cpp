@@ -7,13 +7,13 @@
 #include <iterator>
 
 #include "Input.h"
-#include "tools/nandinfo/DecodedBuffer.h"
+#include "NANDInfo/queries/DecodedBuffer.h"
 #include "tools/nandinfo/TableText.h"
 
 using fuzz::require;
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t size) {
-  using namespace nandinfo;
+  using namespace NANDInfo;
   const auto telemetry = [](Bytes buffer) {
     const auto channels = buffer.empty() ? 0u : std::to_integer<std::uint32_t>(buffer.front());
     return decodedTelemetry(buffer, counterLayouts().front(), channels % 4);
@@ -26,7 +26,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, std::size_t siz
   const plist::Dictionary decoded = decode(input.rest());
   require(decoded.number("ok") != nullptr && decoded.text("error") != nullptr,
           "it says what came of it");
-  for (const char c : tableText(decoded, 80)) {
+  for (const char c : nandinfo::tableText(decoded, 80)) {
     require(static_cast<unsigned char>(c) >= 0x20 || c == '\n', "a terminal's cursor stays");
   }
   return 0;

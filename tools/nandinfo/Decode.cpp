@@ -7,21 +7,19 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
+#include <string>
 #include <vector>
 
 #include "NANDInfo/NANDInfo.h"
-#include "base/Text.h"
 #include "host/files/FileDescriptor.h"
-#include "tools/nandinfo/BufferKind.h"
-#include "tools/nandinfo/DecodedBuffer.h"
 
 namespace nandinfo {
 
 namespace {
 
 using base::Error;
-using plist::Array;
 using FileBytes = std::vector<std::byte>;
 
 // Of a file of any kind that can be read to its end.
@@ -45,67 +43,14 @@ base::Result<FileBytes> readInput(const std::string& path) {
   }
 }
 
-// What has been read; a failed one says which file it is about.
-CommandResult outcome(const std::string& path, plist::Dictionary decoded) {
-  const std::string* error = decoded.text("error");
-  if (decoded.number("ok")->boolValue()) return plist::Value(std::move(decoded));
-  Error why{*error != "NA" ? *error : "nothing in it can be decoded"};
-  return {plist::Value(std::move(decoded)), why.at(path)};
-}
-
-template <auto decode>
-CommandResult decodeFile(const Invocation& invocation) {
-  const std::string& path = invocation.arguments.file;
-  const auto bytes = readInput(path);
-  return bytes ? outcome(path, decode(*bytes)) : bytes.error();
-}
-
 }  // namespace
 
-CommandResult decodeFTL(const Invocation& invocation) { return decodeFile<decodedFTL>(invocation); }
-CommandResult decodeFTLStat(const Invocation& invocation) {
-  return decodeFile<decodedFTLStat>(invocation);
-}
-CommandResult decodeLegacy(const Invocation& invocation) {
-  return decodeFile<decodedLegacy>(invocation);
-}
-CommandResult decodeMSP(const Invocation& invocation) { return decodeFile<decodedMSP>(invocation); }
-CommandResult decodeValidity(const Invocation& invocation) {
-  return decodeFile<decodedValidity>(invocation);
-}
-CommandResult decodeDefects(const Invocation& invocation) {
-  return decodeFile<decodedDefects>(invocation);
-}
-CommandResult decodeSnapshot(const Invocation& invocation) {
-  return decodeFile<decodedSnapshot>(invocation);
-}
-
-CommandResult decodeTelemetry(const Invocation& invocation) {
-  const Arguments& arguments = invocation.arguments;
+CommandResult decodeFile(const NANDInfo::BufferDecoder& decoder, const Arguments& arguments) {
   const auto bytes = readInput(arguments.file);
   if (!bytes) return bytes.error();
-  return outcome(arguments.file, decodedTelemetry(*bytes, *findCounterLayout(arguments.layout),
-                                                  arguments.channels));
-}
-
-CommandResult decodeCounters(const Invocation& invocation) {
-  const Arguments& arguments = invocation.arguments;
-  const CounterLayout* layout = findCounterLayout(arguments.layout);
-  auto bytes = readInput(arguments.file);
-  if (!bytes) return bytes.error();
-  if (const std::string why = whyNot(BufferKind::counters, *bytes); !why.empty()) {
-    return Error{why}.at(arguments.file);
-  }
-  if (bytes->size() < layout->words * sizeof(std::uint32_t)) {
-    return Error{base::format("%s: %zu bytes, but the layout %s reads %zu", arguments.file.c_str(),
-                              bytes->size(), layout->name, layout->words * sizeof(std::uint32_t))};
-  }
-  bytes->resize(NANDInfo::kCounterBlockSize);
-  NANDInfo::NandCountersRecord record{};
-  layout->parse(std::span<const std::byte>(*bytes).first<NANDInfo::kCounterBlockSize>(), record);
-  Array words;
-  for (const std::uint32_t word : record) words.push_back(std::uint64_t{word});
-  return plist::Value(std::move(words));
+  CommandResult result(decoder.decode(*bytes, arguments));
+  if (result.error) result.error = result.error->at(arguments.file);
+  return result;
 }
 
 }  // namespace nandinfo

@@ -12,17 +12,19 @@
 
 #include "NANDInfo/NANDInfo.h"
 #include "NANDInfo/TelemetryList.h"
+#include "NANDInfo/queries/DecodedBuffer.h"
 #include "base/Text.h"
 #include "host/files/DeviceRoot.h"
 #include "platform/StandardStreams.h"
 #include "plist/PropertyList.h"
-#include "tools/nandinfo/DecodedBuffer.h"
 
 namespace nandinfo {
 
 namespace {
 
 using base::Error;
+using NANDInfo::Bytes;
+using NANDInfo::CounterLayout;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
@@ -84,7 +86,7 @@ Characteristics characteristicsOf(const NANDInfo::Services& services,
   services.streams.writeOutput(maker.complaint);
   auto* const convert =
       NANDInfo::counterConverter(NANDInfo::chipKind(chip != nullptr ? *chip : ""), maker.code);
-  const auto layouts = counterLayouts();
+  const auto layouts = NANDInfo::counterLayouts();
   const auto layout = std::find_if(layouts.begin(), layouts.end(),
                                    [&](const CounterLayout& row) { return row.parse == convert; });
   const plist::Number* channels = device->number("num-bus");
@@ -99,10 +101,14 @@ struct OpType {
   Dictionary (*decode)(Bytes bytes);
 };
 constexpr OpType kOpTypes[] = {
-    {13, "statistics", decodedFTL},    {10, "read-statistics", decodedFTL},
-    {221, "msp", decodedMSP},          {15, "defects", decodedDefects},
-    {17, "telemetry", nullptr},        {11, "band-statistics", decodedValidity},
-    {39, "task-scheduler", nullptr},   {22, "snapshot", nullptr},
+    {13, "statistics", NANDInfo::decodedFTL},
+    {10, "read-statistics", NANDInfo::decodedFTL},
+    {221, "msp", NANDInfo::decodedMSP},
+    {15, "defects", NANDInfo::decodedDefects},
+    {17, "telemetry", nullptr},
+    {11, "band-statistics", NANDInfo::decodedValidity},
+    {39, "task-scheduler", nullptr},
+    {22, "snapshot", nullptr},
     {145, "snapshot-header", nullptr},
 };
 constexpr std::uint32_t kTelemetry = 17;
@@ -193,7 +199,7 @@ class Capture {
         note(name, bytes->error().text);
       } else if (!(**bytes).empty()) {  // nothing was delivered, and that was the answer
         add(name, opType == kTelemetry
-                      ? decodedTelemetry(spanOf(**bytes), *device.layout, device.channels)
+                      ? NANDInfo::decodedTelemetry(spanOf(**bytes), *device.layout, device.channels)
                       : row->decode(spanOf(**bytes)));
       }
     }
@@ -205,7 +211,7 @@ class Capture {
     if (!folder_.openForStatus(file)) return;
     const auto bytes = read(file);
     if (!bytes) return note(kName, bytes.error().text);
-    add(kName, decodedSnapshot(spanOf(*bytes)));
+    add(kName, NANDInfo::decodedSnapshot(spanOf(*bytes)));
   }
 
   static Bytes spanOf(const std::string& bytes) { return std::as_bytes(std::span(bytes)); }

@@ -6,7 +6,7 @@
 #include <string>
 #include <utility>
 
-#include "platform/DeviceRegistry.h"
+#include "NANDInfo/queries/Drives.h"
 #include "tools/nandinfo/TableText.h"
 
 namespace nandinfo {
@@ -54,29 +54,9 @@ CommandResult record(const Invocation& invocation) {
 
 }  // namespace
 
-std::vector<Dictionary> describedDrives(platform::DeviceRegistry& registry) {
-  std::vector<Dictionary> drives;
-  const platform::RegistryObject iterator = registry.createIterator();
-  while (const platform::RegistryObject entry = iterator != 0 ? registry.next(iterator) : 0) {
-    if (registry.conformsTo(entry, "ZMCStorage") || registry.conformsTo(entry, "Disk")) {
-      const auto drive = registry.searchProperty(entry, platform::kRegistryDriveKey,
-                                                 platform::DeviceRegistry::Direction::children);
-      const auto* description = drive ? drive->as<Dictionary>() : nullptr;
-      if (description != nullptr) drives.push_back(*description);
-    }
-    registry.release(entry);
-  }
-  if (iterator != 0) registry.release(iterator);
-  return drives;
-}
-
 CommandResult drives(const Invocation& invocation) {
   if (invocation.arguments.record) return record(invocation);
-  Array drives;
-  for (Dictionary& drive : describedDrives(invocation.services.registry)) {
-    drives.push_back(std::move(drive));
-  }
-  CommandResult result(std::move(drives));
+  CommandResult result(plist::Value(NANDInfo::describedDrives(invocation.services.registry)));
   const auto& shown = *result.value->as<Array>();
   if (!shown.empty()) result.text = tableText(columnsOf(shown), invocation.width);
   return result;

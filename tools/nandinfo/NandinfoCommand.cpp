@@ -7,12 +7,12 @@
 #include <algorithm>
 #include <charconv>
 #include <memory>
-#include <optional>
 #include <span>
 #include <string_view>
 #include <system_error>
 
 #include "NANDInfo/NANDInfo.h"
+#include "NANDInfo/queries/ControllerWatch.h"
 #include "base/Text.h"
 #include "platform/SystemLog.h"
 #include "plist/JSON.h"
@@ -21,14 +21,14 @@
 #include "tools/common/Terminal.h"
 #include "tools/common/TerminalText.h"
 #include "tools/nandinfo/Commands.h"
-#include "tools/nandinfo/ControllerWatch.h"
-#include "tools/nandinfo/DecodedBuffer.h"
 #include "tools/nandinfo/TableText.h"
 
 namespace nandinfo {
 
 namespace {
 
+using NANDInfo::ControllerWatch;
+using NANDInfo::Needs;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
@@ -56,26 +56,6 @@ constexpr char kGlobalOptions[] = "Global options: --json and --compact.";
 struct Form {
   bool json = false, compact = false;
 };
-
-// Why the work failed, or none if it didn't: no result, one that is an error, one that holds
-// nothing but the library's message, or one that says itself that it isn't right.
-std::optional<std::string> failure(const CommandResult& result) {
-  const auto messageOr = [](const std::string& otherwise) {
-    const std::string message = NANDInfo::GetAPIErrorMessage();
-    return message == "NA" ? otherwise : message;
-  };
-  if (result.error) return result.error->text;
-  if (!result.value) return messageOr("there is no result");
-  const auto* dictionary = result.value->as<Dictionary>();
-  if (dictionary == nullptr) return std::nullopt;
-  if (dictionary->find(NANDInfo::kNANDInfoErrorKey) != nullptr) {
-    return messageOr(description(dictionary->find(NANDInfo::kNANDInfoErrorMessageKey)));
-  }
-  if (dictionary->size() == 1 && dictionary->find(NANDInfo::kTLM_APIErrorMessage) != nullptr) {
-    return messageOr("the result is empty");
-  }
-  return std::nullopt;
-}
 
 bool isEmpty(const Value& value) {
   const auto* dictionary = value.as<Dictionary>();
@@ -135,7 +115,7 @@ class Run {
       say("the output can't be written");
       return kFailed;
     }
-    if (const auto why = failure(result)) return failed(*why);
+    if (const auto why = failureOf(result)) return failed(*why);
     for (const std::string& complaint : complaints_) say(complaint);
     return result.status;
   }
@@ -144,9 +124,10 @@ class Run {
   CommandResult resultOf(const Arguments& arguments) {
     if (services_.log != nullptr) services_.log->keep();
     tools::Progress progress(services_.err, services_.errIsTerminal);
-    return command_.run({watch_.services(), arguments,
-                         [&](const std::string& text) { progress.show(text); }, services_.width,
-                         services_.recordDrives, services_.kept, services_.runLock});
+    return nandinfo::run(
+        command_,
+        {watch_.services(), arguments, [&](const std::string& text) { progress.show(text); },
+         services_.width, services_.recordDrives, services_.kept, services_.runLock});
   }
 
   void say(const std::string& what) {
@@ -154,10 +135,7 @@ class Run {
   }
   // In one line, with what there was to complain of as the reasons.
   int failed(std::string why) {
-    for (const std::string& complaint : complaints_) {
-      why += (&complaint == &complaints_.front() ? ": " : "; ") + complaint;
-    }
-    say(why);
+    say(NANDInfo::withReasons(std::move(why), complaints_));
     return kFailed;
   }
 
@@ -216,33 +194,34 @@ class Help : public CLI::Formatter {
 };
 
 void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
-  const auto takes = [&command](Takes part) { return (command.takes & part) != 0; };
+  const auto takes = [&command](int part) { return (command.takes & part) != 0; };
   CLI::Option* round = nullptr;
-  if (takes(kRound)) {
+  if (takes(NANDInfo::kRound)) {
     round = app.add_flag("--round", arguments.round, "keep the significant digits only");
   }
-  if (takes(kAll)) {
+  if (takes(NANDInfo::kAll)) {
     CLI::Option* all = app.add_flag("--all", arguments.all, "every counter, unrounded");
     round->excludes(all);
     app.add_flag("--stat-keys", arguments.statKeys, "under the keys instead of the names")
         ->needs(all);
   }
-  if (takes(kCode)) {
+  if (takes(NANDInfo::kCode)) {
     app.add_option("CODE", arguments.code, "four letters, such as dBIC")
         ->required()
         ->check([](const std::string& code) {
-          return isCode(code) ? "" : "'" + tools::printable(code) + "' is not four letters";
+          return NANDInfo::isCode(code) ? ""
+                                        : "'" + tools::printable(code) + "' is not four letters";
         });
   }
-  if (takes(kLayout)) {
+  if (takes(NANDInfo::kLayout)) {
     std::string names;
-    for (const CounterLayout& layout : counterLayouts()) {
+    for (const NANDInfo::CounterLayout& layout : NANDInfo::counterLayouts()) {
       names.append(names.empty() ? "" : ", ").append(layout.name);
     }
     app.add_option("LAYOUT", arguments.layout, names)
         ->required()
         ->check([names](const std::string& name) {
-          return findCounterLayout(name) != nullptr
+          return NANDInfo::findCounterLayout(name) != nullptr
                      ? ""
                      : "'" + tools::printable(name) + "' is not a layout: " + names;
         });
@@ -259,8 +238,8 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_option("DIR", arguments.folder, "what 'nandinfo capture' has made, or a folder device/")
         ->required();
   }
-  if (takes(kChannels)) {
-    addNumber(app, "--channels", arguments.channels, NANDInfo::kMaxBuffer / kChannelSize,
+  if (takes(NANDInfo::kChannels)) {
+    addNumber(app, "--channels", arguments.channels, NANDInfo::kMaxBuffer / NANDInfo::kChannelSize,
               "of the controller (default: as many as the file has room for, if it is full)");
   }
   if (takes(kNames)) {
@@ -275,7 +254,7 @@ void addOptions(CLI::App& app, const Command& command, Arguments& arguments) {
     app.add_flag("--acknowledge", arguments.acknowledge,
                  "the errors until now are known; from now on only further ones count");
   }
-  if (takes(kWindow)) addWindow(app, arguments);
+  if (takes(NANDInfo::kWindow)) addWindow(app, arguments);
   if (takes(kSteps)) addSteps(app, arguments);
 }
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "tools/nandinfo/DecodedBuffer.h"
+#include "NANDInfo/queries/DecodedBuffer.h"
 
 #include <algorithm>
 #include <iterator>
@@ -16,21 +16,20 @@
 #include "NANDInfo/SnapshotReader.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
+#include "NANDInfo/queries/BufferKind.h"
+#include "NANDInfo/queries/SnapshotItems.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
-#include "tools/nandinfo/BufferKind.h"
-#include "tools/nandinfo/SnapshotItems.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 namespace {
 
-using NANDInfo::GenericParserCxt;
 using plist::Array;
 using plist::Dictionary;
 using plist::Value;
 
-static_assert(kChannelSize == NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize);
+static_assert(kChannelSize == kCounterBlockSize + kTelemetrySummarySize);
 
 Dictionary whole(const Dictionary& content, bool ok, const std::string& error) {
   Dictionary decoded{{"ok", ok}};
@@ -55,7 +54,7 @@ template <auto decode>
 Dictionary decoded(BufferKind kind, Bytes bytes) {
   if (const std::string why = whyNot(kind, bytes); !why.empty()) return refused(why);
   GenericParserCxt context;
-  const NANDInfo::Decoded outcome = decode(bytes, &context);
+  const Decoded outcome = decode(bytes, &context);
   return withFields(context, outcome.values > 0, outcome.complaint);
 }
 
@@ -102,37 +101,33 @@ Array summedItems(Bytes snapshot) {
 }
 
 constexpr CounterLayout kLayouts[] = {
-    {"1y", 533, "", NANDInfo::parseCounters1y},
-    {"1x-sandisk", 316, "", NANDInfo::parseCounters1xSandisk},
-    {"1x-hynix", 312, "", NANDInfo::parseCounters1xHynix},
-    {"generic", 121, "QM7", NANDInfo::parseCountersAlgoGeneric},
-    {"q8", 127, "QM8", NANDInfo::parseCountersAlgoGenericQ8},
+    {"1y", 533, "", parseCounters1y},
+    {"1x-sandisk", 316, "", parseCounters1xSandisk},
+    {"1x-hynix", 312, "", parseCounters1xHynix},
+    {"generic", 121, "QM7", parseCountersAlgoGeneric},
+    {"q8", 127, "QM8", parseCountersAlgoGenericQ8},
 };
 
 }  // namespace
 
-Dictionary decodedFTL(Bytes bytes) {
-  return decoded<NANDInfo::decodeFTL>(BufferKind::FTLStatistics, bytes);
-}
+Dictionary decodedFTL(Bytes bytes) { return decoded<decodeFTL>(BufferKind::FTLStatistics, bytes); }
 
 Dictionary decodedFTLStat(Bytes bytes) {
-  return decoded<NANDInfo::decodeFTLByKey>(BufferKind::FTLStatistics, bytes);
+  return decoded<decodeFTLByKey>(BufferKind::FTLStatistics, bytes);
 }
 
-Dictionary decodedMSP(Bytes bytes) {
-  return decoded<NANDInfo::decodeMSP>(BufferKind::MSPStatistics, bytes);
-}
+Dictionary decodedMSP(Bytes bytes) { return decoded<decodeMSP>(BufferKind::MSPStatistics, bytes); }
 
 Dictionary decodedLegacy(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::FTLStatistics, bytes); !why.empty()) return refused(why);
-  NANDInfo::LegacyNandInfoCxt context;
-  const bool ok = NANDInfo::decodeLegacy(bytes, context);
+  LegacyNandInfoCxt context;
+  const bool ok = decodeLegacy(bytes, context);
   return withFields(context.fields, ok, {});
 }
 
 Dictionary decodedValidity(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::validity, bytes); !why.empty()) return refused(why);
-  auto lists = NANDInfo::parseValidityList(bytes);
+  auto lists = parseValidityList(bytes);
   if (!lists) return refused(lists.error().text);
   Array fields;
   for (std::size_t i = 0; i < lists->size(); ++i) {
@@ -144,11 +139,11 @@ Dictionary decodedValidity(Bytes bytes) {
 
 Dictionary decodedDefects(Bytes bytes) {
   if (const auto why = whyNot(BufferKind::defects, bytes); !why.empty()) return refused(why);
-  const auto list = NANDInfo::DefectsList::parse(bytes);
+  const auto list = DefectsList::parse(bytes);
   Array defects;
   for (std::size_t i = 0; i < list->size(); ++i) {
-    const NANDInfo::Defect defect = (*list)[i];
-    Dictionary row = NANDInfo::defectLog(defect);
+    const Defect defect = (*list)[i];
+    Dictionary row = defectLog(defect);
     row.set("Mode", std::uint64_t{defect.mode});
     defects.push_back(std::move(row));
   }
@@ -166,7 +161,7 @@ Dictionary decodedSnapshot(Bytes bytes) {
   if (!hasContainer) return refused("it has no container, as a snapshot has");
   Array fields;
   constexpr char kThread[] = "VM_swapout";
-  if (const auto statistics = NANDInfo::getIOStatsWithThreadnameFromKCData(bytes, kThread)) {
+  if (const auto statistics = getIOStatsWithThreadnameFromKCData(bytes, kThread)) {
     constexpr int kMaxCounters = 64;
     base::ByteReader reader(*statistics);
     for (int i = 0; i < kMaxCounters; ++i) {
@@ -187,12 +182,11 @@ Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout, std::uint3
     }
     channels = static_cast<std::uint32_t>(bytes.size() / kChannelSize);
   }
-  const auto list = NANDInfo::parseTelemetryList(bytes, static_cast<std::int32_t>(channels));
+  const auto list = parseTelemetryList(bytes, static_cast<std::int32_t>(channels));
   if (!list) return refused(list.error().text);
   Dictionary byIndex;
   for (std::size_t i = 0; i < list->size(); ++i) {
-    byIndex.set(std::to_string(i),
-                NANDInfo::telemetryLog((*list)[i], NANDInfo::chipKind(layout.chip), layout.parse));
+    byIndex.set(std::to_string(i), telemetryLog((*list)[i], chipKind(layout.chip), layout.parse));
   }
   return whole({{"channels", std::move(byIndex)}}, true, "NA");
 }
@@ -205,4 +199,4 @@ const CounterLayout* findCounterLayout(std::string_view name) {
   return layout != std::end(kLayouts) ? layout : nullptr;
 }
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

@@ -16,7 +16,7 @@
 #include "platform/Eventra.h"
 #include "platform/StandardStreams.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 class ControllerWatch : private platform::DeviceRegistry,
                         private platform::DriverConnections,
@@ -25,10 +25,10 @@ class ControllerWatch : private platform::DeviceRegistry,
  public:
   // Keeps the texts that are written to standard error directly, or lets them pass.
   enum class DirectTexts { kept, passed };
-  ControllerWatch(const NANDInfo::Services& inner, DirectTexts texts);
+  ControllerWatch(const Services& inner, DirectTexts texts);
 
   // The inner services, watched.
-  const NANDInfo::Services& services() { return services_; }
+  const Services& services() { return services_; }
 
   // Why nothing that the library said can come from a controller: none is there, none can be
   // opened, or it answered no command. The empty text when one was asked and answered something, or
@@ -79,7 +79,7 @@ class ControllerWatch : private platform::DeviceRegistry,
 
   void noteLookUp(std::string_view className, platform::RegistryObject found);
 
-  const NANDInfo::Services inner_;
+  const Services inner_;
   const DirectTexts directTexts_;
   std::vector<std::string> texts_;
   std::vector<std::pair<std::string, PayloadProducer>> events_;  // that wait
@@ -89,7 +89,7 @@ class ControllerWatch : private platform::DeviceRegistry,
   std::set<platform::RegistryObject> controllers_;    // every handle that was given out
   std::set<platform::DriverConnection> connections_;  // to controllers
   platform::DriverStatus lastFailure_ = 0;            // of an opening or a command; 0: none so far
-  const NANDInfo::Services services_;
+  const Services services_;
 };
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

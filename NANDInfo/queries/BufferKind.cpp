@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "tools/nandinfo/BufferKind.h"
+#include "NANDInfo/queries/BufferKind.h"
 
 #include <algorithm>
 #include <optional>
@@ -12,17 +12,16 @@
 #include "NANDInfo/MSPDecoder.h"
 #include "NANDInfo/TelemetryList.h"
 #include "NANDInfo/ValidityList.h"
+#include "NANDInfo/queries/SnapshotItems.h"
 #include "base/ByteReader.h"
 #include "base/Text.h"
 #include "base/UTF8.h"
-#include "tools/nandinfo/SnapshotItems.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 namespace {
 
 using base::ByteReader;
-using NANDInfo::GenericParserCxt;
 using Bytes = std::span<const std::byte>;
 
 std::string_view textOf(Bytes bytes) {
@@ -54,7 +53,7 @@ bool isPropertyList(Bytes bytes) {
 template <auto decode>
 std::optional<GenericParserCxt> decodedWithoutComplaint(Bytes bytes) {
   GenericParserCxt fields;
-  const NANDInfo::Decoded decoded = decode(bytes, &fields);
+  const Decoded decoded = decode(bytes, &fields);
   const bool whole = decoded.values > 0 && decoded.complaint.empty();
   return whole ? std::optional(std::move(fields)) : std::nullopt;
 }
@@ -62,7 +61,7 @@ std::optional<GenericParserCxt> decodedWithoutComplaint(Bytes bytes) {
 // Most fields have a name of their own, and the fields take up the bytes.
 bool isFTLStatistics(Bytes bytes) {
   constexpr std::size_t kMaxFieldSize = 16;  // a header and one value
-  const auto fields = decodedWithoutComplaint<NANDInfo::decodeFTL>(bytes);
+  const auto fields = decodedWithoutComplaint<decodeFTL>(bytes);
   if (!fields || fields->size() * kMaxFieldSize < bytes.size()) return false;
   std::size_t named = 0;
   for (std::size_t i = 0; i < fields->size(); ++i) {
@@ -73,7 +72,7 @@ bool isFTLStatistics(Bytes bytes) {
 
 bool isMSPStatistics(Bytes bytes) {
   constexpr std::size_t kMaxFieldSize = 12;
-  const auto fields = decodedWithoutComplaint<NANDInfo::decodeMSP>(bytes);
+  const auto fields = decodedWithoutComplaint<decodeMSP>(bytes);
   return fields && fields->size() * kMaxFieldSize >= bytes.size();
 }
 
@@ -85,22 +84,21 @@ bool isSnapshot(Bytes bytes) {
 }
 
 bool isDefectsList(Bytes bytes) {
-  const auto defects = NANDInfo::DefectsList::parse(bytes);
+  const auto defects = DefectsList::parse(bytes);
   if (!defects || defects->size() == 0) return false;
   for (std::size_t i = 0; i < defects->size(); ++i) {
-    if (!NANDInfo::reasonOffset((*defects)[i].mode)) return false;
+    if (!reasonOffset((*defects)[i].mode)) return false;
   }
   ByteReader header(bytes);
   header.read<std::uint64_t>();
   return header.read<std::uint32_t>() == defects->size() &&
-         bytes.size() == NANDInfo::DefectsList::kHeaderSize +
-                             defects->size() * NANDInfo::DefectsList::kRecordSize;
+         bytes.size() == DefectsList::kHeaderSize + defects->size() * DefectsList::kRecordSize;
 }
 
 // Every record of the list is one of a list that there is, and the last one ends the bytes.
 bool isValidityList(Bytes bytes) {
   constexpr std::uint64_t kHeaderUnit = 8, kRecordSize = 20;
-  const auto lists = NANDInfo::parseValidityList(bytes);
+  const auto lists = parseValidityList(bytes);
   if (!lists) return false;
   ByteReader header(bytes);
   const std::uint64_t count = *header.read<std::uint32_t>();
@@ -125,10 +123,10 @@ constexpr Row kRows[] = {
     {BufferKind::snapshot, "a kernel snapshot", 16, isSnapshot},
     {BufferKind::FTLStatistics, "FTL statistics", 8, isFTLStatistics},
     {BufferKind::MSPStatistics, "MSP statistics", 4, isMSPStatistics},
-    {BufferKind::defects, "a defects list", NANDInfo::DefectsList::kHeaderSize, isDefectsList},
+    {BufferKind::defects, "a defects list", DefectsList::kHeaderSize, isDefectsList},
     {BufferKind::validity, "a validity list", 8, isValidityList},
-    {BufferKind::telemetry, "a telemetry list",
-     NANDInfo::kCounterBlockSize + NANDInfo::kTelemetrySummarySize, isUnknown},
+    {BufferKind::telemetry, "a telemetry list", kCounterBlockSize + kTelemetrySummarySize,
+     isUnknown},
     {BufferKind::counters, "a counter block", 0, isUnknown},
 };
 
@@ -147,4 +145,4 @@ std::string whyNot(BufferKind wanted, Bytes bytes) {
   return base::format("%zu bytes are too few for %s", bytes.size(), own.name);
 }
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

@@ -11,7 +11,7 @@
 
 #include "base/ByteReader.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 inline constexpr std::uint32_t kContainerBegin = 0x13, kContainerEnd = 0x14, kIOStatistics = 0x901,
                                kThreadName = 0x909, kEndOfBuffer = 0xF19158ED;
@@ -46,4 +46,4 @@ class SnapshotItems {
   bool whole_ = false;
 };
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

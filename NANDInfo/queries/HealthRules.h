@@ -11,7 +11,7 @@
 #include <utility>
 #include <vector>
 
-namespace nandinfo {
+namespace NANDInfo {
 
 // From the best to the worst. Unknown: something that a verdict needs wasn't to be had, and nothing
 // that was known is worse than good.
@@ -36,4 +36,4 @@ Judgement judge(const HealthFigures& figures, Source source, const HealthFigures
 HealthFigures judged(const HealthFigures& figures);
 HealthFigures acknowledgeable(const HealthFigures& figures);
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

@@ -16,7 +16,7 @@
 #include "NANDInfo/CounterRecords.h"
 #include "plist/Value.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 using Bytes = std::span<const std::byte>;
 
@@ -42,7 +42,7 @@ struct CounterLayout {
   const char* name;
   std::size_t words;  // the highest that it reads, and one
   const char* chip;   // the identifier of the chips that have it; empty if the vendor decides
-  void (*parse)(NANDInfo::CounterBlock block, NANDInfo::NandCountersRecord& record);
+  void (*parse)(CounterBlock block, NandCountersRecord& record);
 };
 std::span<const CounterLayout> counterLayouts();
 const CounterLayout* findCounterLayout(std::string_view name);
@@ -55,4 +55,4 @@ plist::Dictionary decodedTelemetry(Bytes bytes, const CounterLayout& layout,
 // The bytes of a channel in a telemetry list.
 inline constexpr std::size_t kChannelSize = 4096 + 32;
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "tools/nandinfo/HealthRules.h"
+#include "NANDInfo/queries/HealthRules.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -10,7 +10,7 @@
 
 #include "base/Text.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 namespace {
 
@@ -125,4 +125,4 @@ HealthFigures acknowledgeable(const HealthFigures& figures) {
   return kept(figures, [](const Rule& rule) { return rule.is == Is::count; });
 }
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

@@ -9,7 +9,7 @@
 #include <span>
 #include <string>
 
-namespace nandinfo {
+namespace NANDInfo {
 
 enum class BufferKind : std::uint8_t {
   text,
@@ -27,4 +27,4 @@ enum class BufferKind : std::uint8_t {
 // kind. The empty text when they may be one.
 std::string whyNot(BufferKind wanted, std::span<const std::byte> bytes);
 
-}  // namespace nandinfo
+}  // namespace NANDInfo

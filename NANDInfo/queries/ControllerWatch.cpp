@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-#include "tools/nandinfo/ControllerWatch.h"
+#include "NANDInfo/queries/ControllerWatch.h"
 
 #include <algorithm>
 #include <span>
@@ -20,7 +20,7 @@
 #include "platform/PurgeableSpace.h"
 #include "platform/SystemLog.h"
 
-namespace nandinfo {
+namespace NANDInfo {
 
 using platform::DriverConnection;
 using platform::DriverStatus;
@@ -28,9 +28,7 @@ using platform::RegistryObject;
 
 namespace {
 
-std::span<const NANDInfo::nand_exporter_t> exporters() {
-  return {NANDInfo::nand_exporters_tunnel, NANDInfo::kExporters};
-}
+std::span<const nand_exporter_t> exporters() { return {nand_exporters_tunnel, kExporters}; }
 
 bool isController(std::string_view className) {
   for (const auto& exporter : exporters()) {
@@ -54,22 +52,28 @@ bool asksForSize(std::span<const std::byte> input) {
 }
 
 // The services as the library is to see them: these four stand before the device's own.
-struct Watched : NANDInfo::Services {
+struct Watched : Services {
   platform::StandardStreams& streams;
   platform::Eventra& eventra;
   platform::DeviceRegistry& registry;
   platform::DriverConnections& drivers;
 };
 
+Services watched(const Watched& services) {
+  Services seen(services);
+  seen.exporters = services.exporters;
+  return seen;
+}
+
 }  // namespace
 
-ControllerWatch::ControllerWatch(const NANDInfo::Services& inner, DirectTexts texts)
-    : inner_(inner), directTexts_(texts), services_(Watched{inner, *this, *this, *this, *this}) {}
+ControllerWatch::ControllerWatch(const Services& inner, DirectTexts texts)
+    : inner_(inner), directTexts_(texts), services_(watched({inner, *this, *this, *this, *this})) {}
 
 std::string ControllerWatch::problem() {
   if (!lookedUp_) {
     for (const auto& exporter : exporters()) {
-      NANDInfo::DriverService::walkedTo(services_, exporter.className);
+      DriverService::walkedTo(services_, exporter.className);
     }
   }
   if (found_.empty()) {
@@ -77,7 +81,7 @@ std::string ControllerWatch::problem() {
   }
   if (stage_ == Stage::nothing) {
     // The library knew that it needn't ask. Whether it could have, is seen by opening.
-    NANDInfo::DriverService::walkedTo(services_, found_).open();
+    DriverService::walkedTo(services_, found_).open();
   }
   if (answered_ || stage_ == Stage::opened) return {};
   const std::string status =
@@ -151,4 +155,4 @@ void ControllerWatch::writeError(std::string_view text) {
   if (!text.ends_with("...")) texts_.emplace_back(text);
 }
 
-}  // namespace nandinfo
+}  // namespace NANDInfo
