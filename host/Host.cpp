@@ -127,7 +127,7 @@ struct Host::Assembly {
 
 Host::Host(const HostOptions& options) : assembly_(std::make_unique<Assembly>(options)) {
   // A reader of our output that goes away must not end a run.
-  std::signal(SIGPIPE, SIG_IGN);
+  if (options.ignoresBrokenPipes) std::signal(SIGPIPE, SIG_IGN);
 }
 
 Host::~Host() = default;

@@ -29,6 +29,7 @@ struct HostOptions {
   bool runModules = false;               // of this root, whatever they are: it is trusted
   std::string machineFiles = "/";        // the folder of this machine's /proc, /sys, /etc and /usr
   std::optional<PlayedRun> played = {};  // a run at another time; it posts no notifications
+  bool ignoresBrokenPipes = true;        // in the process, from then on (SIGPIPE)
   // Both borrowed: instead of the host's own on standard error, and of that for all but its texts
   // without a level.
   StandardErrorLog* standardError = nullptr;

@@ -13,28 +13,24 @@ namespace NANDInfo {
 
 namespace {
 
-char message[1024];
-bool recorded = false;
+APIErrorChannel ofTheProcess;
+thread_local APIErrorChannel* current = &ofTheProcess;
 
 }  // namespace
 
 void SetAPIErrorMessage(const char* format, ...) {
-  if (recorded) return;
+  if (current->recorded) return;
   std::va_list arguments;
   va_start(arguments, format);
-  std::vsnprintf(message, sizeof message, format, arguments);
+  std::vsnprintf(current->message, sizeof current->message, format, arguments);
   va_end(arguments);
-  recorded = true;
+  current->recorded = true;
 }
 
-const char* GetAPIErrorMessage() { return recorded ? message : "NA"; }
+const char* GetAPIErrorMessage() { return current->recorded ? current->message : "NA"; }
 
-APIErrorScope::APIErrorScope()
-    : outer_(recorded ? message : ""), outerRecorded_(std::exchange(recorded, false)) {}
+APIErrorScope::APIErrorScope() : outer_(std::exchange(current, &own_)) {}
 
-APIErrorScope::~APIErrorScope() {
-  recorded = outerRecorded_;
-  if (recorded) std::snprintf(message, sizeof message, "%s", outer_.c_str());
-}
+APIErrorScope::~APIErrorScope() { current = outer_; }
 
 }  // namespace NANDInfo

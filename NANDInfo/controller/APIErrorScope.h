@@ -1,17 +1,20 @@
 // SPDX-License-Identifier: Apache-2.0
 // Copyright the morvend authors
 
-// The library's first error message, for one part of the process's life. Programs that use the
-// library can't reach it.
+// The library's first error message, for one part of a thread's life. Programs that use the library
+// can't reach it.
 #pragma once
-
-#include <string>
 
 namespace NANDInfo {
 
-// While it lives, the first error message is this object's own, from none on; afterwards it is
-// again what it was. For tests, which are many processes in one. One lies within another or after
-// it.
+struct APIErrorChannel {
+  char message[1024];
+  bool recorded = false;
+};
+
+// While it lives, the first error message is, for this thread, the object's own, from none on;
+// afterwards it is again what it was. For calls that don't share it, and for tests, which are many
+// processes in one. One lies within another or after it.
 class APIErrorScope {
  public:
   APIErrorScope();
@@ -20,8 +23,8 @@ class APIErrorScope {
   APIErrorScope& operator=(const APIErrorScope&) = delete;
 
  private:
-  std::string outer_;
-  bool outerRecorded_;
+  APIErrorChannel own_;
+  APIErrorChannel* outer_;
 };
 
 }  // namespace NANDInfo

@@ -6,7 +6,6 @@
 #include <algorithm>
 #include <iterator>
 
-#include "NANDInfo/Controller.h"
 #include "NANDInfo/Services.h"
 #include "platform/DeviceRegistry.h"
 
@@ -54,7 +53,7 @@ constexpr nand_exporter_t exporter(const char* className, const char* propertyKe
           .releaseGeneric = ReleaseGenericParserCxt};
 }
 
-constexpr nand_exporter_t kTable[kExporters + 1] = {
+constexpr ExporterTable kTable = {
     exporter("NorbaQRT3NVMeController", kCharacteristics, kNoSelector, 9, true),
     exporter("NorbaEmbeddedNVMeController", kCharacteristics, kNoSelector, 9, false),
     exporter("ZMCStorage", platform::kRegistryPropertyMatchKey, 5, 8, false),
@@ -66,8 +65,10 @@ nand_exporter_t nand_exporters_tunnel[] = {kTable[0], kTable[1], kTable[2], kTab
 
 nand_exporter_t* exporterTable() { return nand_exporters_tunnel; }
 
+ExporterTable freshExporters() { return kTable; }
+
 void ResetExporters() {
-  std::copy(std::begin(kTable), std::end(kTable), std::begin(nand_exporters_tunnel));
+  std::copy(kTable.begin(), kTable.end(), std::begin(nand_exporters_tunnel));
 }
 
 const SelectorPair* getStatsSelectors() { return &statsSelector; }
