@@ -210,6 +210,24 @@ base::Result<void> CounterStore::settle() {
   return database_.settle();
 }
 
+base::Result<void> CounterStore::applyAndKeep(
+    std::string_view name, const std::function<base::Result<Step>(const std::string&)>& step) {
+  const auto stepAndKeep = [&](sqlite::Connection& connection) -> base::Result<void> {
+    const auto kept = host::keptText(connection, name);
+    if (!kept) return kept.error();
+    const auto next = step(*kept);
+    if (!next) return next.error();
+    for (const CounterChange& change : next->changes) {
+      if (auto written = host::record(connection, change); !written) return written;
+    }
+    return keepText(connection, name, next->text);
+  };
+  const std::scoped_lock lock(mutex_);
+  return database_.write(CounterDatabase::Missing::create, [&](sqlite::Connection& connection) {
+    return inTransaction(connection, [&] { return stepAndKeep(connection); });
+  });
+}
+
 base::Result<void> CounterStore::apply(std::span<const CounterChange> changes, Kept kept) {
   for (const CounterChange& change : changes) {
     if (std::isnan(change.sample)) {

@@ -10,6 +10,8 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "host/counters/CounterChange.h"
 #include "host/counters/CounterHistory.h"
@@ -61,6 +63,17 @@ class CounterStore : public platform::CountersService, public platform::HistoryS
   // disk, and is recorded before the next write that it takes.
   using Kept = CounterDatabase::Kept;
   base::Result<void> apply(std::span<const CounterChange> changes, Kept kept = Kept::bySystem);
+
+  // Records what `step` makes of the text that is kept under a name, and keeps the text that it
+  // makes: all of it or nothing, and no other process comes in between. Nothing waits: after an
+  // error nothing is recorded. The step may be asked a second time; the keys are borrowed from it.
+  struct Step {
+    std::vector<CounterChange> changes;
+    std::string text;
+  };
+  base::Result<void> applyAndKeep(
+      std::string_view name, const std::function<base::Result<Step>(const std::string&)>& step);
+
   base::Result<void> set(std::string_view key, std::int64_t value, std::int32_t day);
   base::Result<void> add(std::string_view key, std::int64_t value, std::int32_t day);
   base::Result<void> push(std::string_view key, double value, std::int32_t day,

@@ -10,21 +10,26 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
-#include <filesystem>
-#include <fstream>
+#include <cstdint>
 #include <initializer_list>
 #include <iterator>
-#include <limits>
 #include <memory>
 #include <optional>
+#include <string>
 #include <string_view>
 #include <system_error>
+#include <utility>
+#include <vector>
+
+#include "host/machine/SourceFiles.h"
 
 namespace host::figures {
 
-namespace {
+using machine::countIn;
+using machine::takeUntil;
+using machine::takeWord;
 
-constexpr std::size_t kMaxFileSize = std::size_t{1} << 20;
+namespace {
 
 constexpr std::string_view kVmstatEvents[] = {"pgpgin",
                                               "pgpgout",
@@ -79,36 +84,10 @@ constexpr struct {
                    {DISKSTATS_WRITE_TIME, "write_ms"},
                    {DISKSTATS_IO_TIME, "busy_ms"}};
 
-// Takes what stands before the separator, and the separator, off the text's front.
-std::string_view take(std::string_view& text, char separator) {
-  const auto end = std::min(text.find(separator), text.size());
-  const std::string_view part = text.substr(0, end);
-  text.remove_prefix(std::min(end + 1, text.size()));
-  return part;
-}
-
-std::string_view takeWord(std::string_view& line) {
-  line.remove_prefix(std::min(line.find_first_not_of(" \t"), line.size()));
-  const auto end = std::min(line.find_first_of(" \t"), line.size());
-  const std::string_view word = line.substr(0, end);
-  line.remove_prefix(end);
-  return word;
-}
-
-std::optional<std::int64_t> integer(std::string_view word) {
-  std::int64_t value = 0;
-  const auto [end, error] = std::from_chars(word.data(), word.data() + word.size(), value);
-  if (word.empty() || end != word.data() + word.size()) return std::nullopt;
-  if (error == std::errc::result_out_of_range) {
-    return word.front() == '-' ? std::numeric_limits<std::int64_t>::min()
-                               : std::numeric_limits<std::int64_t>::max();
-  }
-  return error == std::errc() ? std::optional(value) : std::nullopt;
-}
-
 std::optional<std::int64_t> count(std::string_view word) {
-  const auto value = integer(word);
-  return value && *value >= 0 ? value : std::nullopt;
+  const auto value = countIn(word);
+  if (!value) return std::nullopt;
+  return static_cast<std::int64_t>(std::min<std::uint64_t>(*value, INT64_MAX));
 }
 
 std::optional<double> measurement(std::string_view word) {
@@ -120,8 +99,15 @@ std::optional<double> measurement(std::string_view word) {
   return value;
 }
 
-bool isNumber(std::string_view text) {
-  return !text.empty() && text.find_first_not_of("0123456789") == std::string_view::npos;
+// The number of a name that is a prefix, a number and a suffix; empty when it is none.
+std::string_view numberIn(std::string_view name, std::string_view prefix,
+                          std::string_view suffix = "") {
+  if (!name.starts_with(prefix) || !name.ends_with(suffix) ||
+      name.size() <= prefix.size() + suffix.size()) {
+    return {};
+  }
+  name = name.substr(prefix.size(), name.size() - prefix.size() - suffix.size());
+  return name.find_first_not_of("0123456789") == name.npos ? name : std::string_view();
 }
 
 std::string key(std::initializer_list<std::string_view> parts) {
@@ -130,13 +116,8 @@ std::string key(std::initializer_list<std::string_view> parts) {
   return text;
 }
 
-std::string fileText(const std::filesystem::path& path) {
-  std::ifstream file(path, std::ios::binary);
-  std::string text(kMaxFileSize, '\0');
-  file.read(text.data(), static_cast<std::streamsize>(text.size()));
-  text.resize(static_cast<std::size_t>(file.gcount()));
-  return text;
-}
+constexpr const char* kNetworkCounts[] = {"rx_bytes",  "tx_bytes",  "rx_packets", "tx_packets",
+                                          "rx_errors", "tx_errors", "rx_dropped", "tx_dropped"};
 
 // Ends what libproc2 has read.
 template <auto unref>
@@ -164,7 +145,8 @@ void addDisks(MachineFigures& figures) {
     if (!isWhole || isMemory) continue;
     for (const auto& row : kDiskCounts) {
       const std::uint64_t count = std::min<std::uint64_t>(value++->result.ul_int, INT64_MAX);
-      figures.counts.emplace_back(key({"disk", disk, row.name}), static_cast<std::int64_t>(count));
+      figures.counts.emplace_back(key({"disk", machine::inKey(disk), row.name}),
+                                  static_cast<std::int64_t>(count));
     }
   }
 }
@@ -191,7 +173,7 @@ void addLoad(MachineFigures& figures) {
 
 void addVmstat(std::string_view text, MachineFigures& figures) {
   while (!text.empty()) {
-    std::string_view line = take(text, '\n');
+    std::string_view line = takeUntil(text, '\n');
     const std::string_view name = takeWord(line);
     const auto value = count(takeWord(line));
     if (value && std::ranges::find(kVmstatEvents, name) != std::end(kVmstatEvents)) {
@@ -202,11 +184,11 @@ void addVmstat(std::string_view text, MachineFigures& figures) {
 
 void addPressure(std::string_view resource, std::string_view text, MachineFigures& figures) {
   while (!text.empty()) {
-    std::string_view line = take(text, '\n');
+    std::string_view line = takeUntil(text, '\n');
     const std::string_view share = takeWord(line);
     if (share != "some" && share != "full") continue;
     for (std::string_view word = takeWord(line); !word.empty(); word = takeWord(line)) {
-      const std::string_view name = take(word, '=');
+      const std::string_view name = takeUntil(word, '=');
       if (name == "avg10") {
         if (const auto value = measurement(word)) {
           figures.measurements.emplace_back(key({"pressure", resource, share, name}), *value);
@@ -220,35 +202,70 @@ void addPressure(std::string_view resource, std::string_view text, MachineFigure
   }
 }
 
-void addTemperature(std::string_view zone, std::string_view text, MachineFigures& figures) {
-  if (const auto thousandths = integer(take(text, '\n'))) {
-    figures.measurements.emplace_back(key({"thermal", zone, "celsius"}),
-                                      static_cast<double>(*thousandths) / 1000);
+void addNetwork(const DeviceRoot& files, MachineFigures& figures) {
+  for (const auto& [path, name] : machine::sourceDevices(files, "/sys/class/net")) {
+    if (machine::driverOf(files, path + "/device").empty()) continue;
+    for (const char* counter : kNetworkCounts) {
+      const auto value = machine::sourceLine(files, path + "/statistics/" + counter);
+      if (const auto number = value ? count(*value) : std::nullopt) {
+        figures.counts.emplace_back(key({"net", name, counter}), *number);
+      }
+    }
   }
+}
+
+// A temperature in thousandths of a degree.
+void addTemperature(const DeviceRoot& files, const std::string& path, std::string name,
+                    MachineFigures& figures) {
+  const auto line = machine::sourceLine(files, path);
+  const auto thousandths = line ? measurement(*line) : std::nullopt;
+  if (thousandths) figures.measurements.emplace_back(std::move(name), *thousandths / 1000);
+}
+
+void addTemperatures(const DeviceRoot& files, MachineFigures& figures) {
+  for (const auto& [path, name] : machine::sourceDevices(files, "/sys/class/thermal")) {
+    const std::string_view zone = numberIn(name, "thermal_zone");
+    if (zone.empty()) continue;
+    addTemperature(files, path + "/temp", key({"thermal", zone, "celsius"}), figures);
+  }
+  for (const auto& [path, device] : machine::sourceDevices(files, "/sys/class/hwmon")) {
+    const auto chip = machine::sourceLine(files, path + "/name");
+    if (!chip) continue;
+    for (const auto& [input, name] : machine::sourceDevices(files, path)) {
+      const std::string_view sensor = numberIn(name, "temp", "_input");
+      if (sensor.empty()) continue;
+      addTemperature(files, input, key({"sensor", machine::inKey(*chip), sensor, "celsius"}),
+                     figures);
+    }
+  }
+}
+
+// The boot that the counts are of, and how long ago it was.
+void addBoot(const DeviceRoot& files, MachineFigures& figures) {
+  const auto boot = machine::sourceLine(files, "/proc/sys/kernel/random/boot_id");
+  figures.boot = machine::inKey(boot.value_or(""));
+  const auto line = machine::sourceLine(files, "/proc/uptime");
+  std::string_view words = line ? *line : std::string_view();
+  figures.uptime = measurement(takeWord(words)).value_or(0);
 }
 
 }  // namespace
 
-void addFiguresOfFiles(const std::string& root, MachineFigures& figures) {
-  const std::filesystem::path proc = std::filesystem::path(root) / "proc";
-  addVmstat(fileText(proc / "vmstat"), figures);
-  for (const char* resource : {"cpu", "io", "memory"}) {
-    addPressure(resource, fileText(proc / "pressure" / resource), figures);
+void addFiguresOfFiles(const DeviceRoot& files, MachineFigures& figures) {
+  addBoot(files, figures);
+  addVmstat(machine::sourceText(files, "/proc/vmstat").value_or(""), figures);
+  for (const char* resource : {"cpu", "io", "memory", "irq"}) {
+    addPressure(resource,
+                machine::sourceText(files, std::string("/proc/pressure/") + resource).value_or(""),
+                figures);
   }
-  constexpr std::string_view kPrefix = "thermal_zone";
-  std::error_code error;
-  std::filesystem::directory_iterator zone(
-      std::filesystem::path(root) / "sys" / "class" / "thermal", error);
-  for (; !error && zone != std::filesystem::directory_iterator(); zone.increment(error)) {
-    const std::string name = zone->path().filename().string();
-    if (!name.starts_with(kPrefix) || !isNumber(name.substr(kPrefix.size()))) continue;
-    addTemperature(name.substr(kPrefix.size()), fileText(zone->path() / "temp"), figures);
-  }
+  addNetwork(files, figures);
+  addTemperatures(files, figures);
 }
 
 MachineFigures readMachineFigures() {
   MachineFigures figures;
-  addFiguresOfFiles("/", figures);
+  addFiguresOfFiles(DeviceRoot("/"), figures);
   addDisks(figures);
   addMemory(figures);
   addLoad(figures);

@@ -4,14 +4,12 @@
 #include "host/machine/ReportingChannels.h"
 
 #include <algorithm>
-#include <cstddef>
 #include <cstdint>
 #include <limits>
 #include <map>
 #include <memory>
 #include <optional>
 #include <string>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -21,28 +19,7 @@ namespace host::machine {
 
 namespace {
 
-constexpr std::size_t kMaxDevices = 1024;  // of a kind
-constexpr std::size_t kMaxName = 64;       // bytes
-
 using Counters = std::map<std::string, std::uint64_t>;
-
-// A name of the kernel's as it may be part of a key.
-std::string inKey(std::string_view name) {
-  std::string part(name.substr(0, kMaxName));
-  std::ranges::replace_if(
-      part, [](unsigned char c) { return c <= ' ' || c >= 0x7f; }, '_');
-  return part;
-}
-
-// Does the work with the path of each device in the folder, and its name.
-template <typename Work>
-void forEachDevice(const DeviceRoot& files, const std::string& folder, Work work) {
-  std::size_t devices = 0;
-  for (const std::string& name : sourceNames(files, folder)) {
-    if (++devices > kMaxDevices) return;
-    work(folder + "/" + name, name);
-  }
-}
 
 void add(Counters& counters, std::string name, std::optional<std::uint64_t> count) {
   if (!count) return;
@@ -50,18 +27,12 @@ void add(Counters& counters, std::string name, std::optional<std::uint64_t> coun
   sum += std::min(*count, std::numeric_limits<std::uint64_t>::max() - sum);
 }
 
-// The driver of a device, as a part of a key; empty without one.
-std::string driverOf(const DeviceRoot& files, const std::string& device) {
-  const auto lines = sourceText(files, device + "/uevent");
-  return lines ? inKey(assignedValue(*lines, "DRIVER")) : std::string();
-}
-
 void addMemory(const DeviceRoot& files, Counters& counters) {
-  forEachDevice(files, "/sys/devices/system/edac/mc", [&](const auto& path, const auto& name) {
-    const std::string prefix = "edac." + inKey(name);
+  for (const auto& [path, name] : sourceDevices(files, "/sys/devices/system/edac/mc")) {
+    const std::string prefix = "edac." + name;
     add(counters, prefix + ".corrected", sourceCount(files, path + "/ce_count"));
     add(counters, prefix + ".uncorrected", sourceCount(files, path + "/ue_count"));
-  });
+  }
 }
 
 void addPCIe(const DeviceRoot& files, Counters& counters) {
@@ -70,31 +41,30 @@ void addPCIe(const DeviceRoot& files, Counters& counters) {
   } kTotals[] = {{"/aer_dev_correctable", "TOTAL_ERR_COR", ".correctable"},
                  {"/aer_dev_fatal", "TOTAL_ERR_FATAL", ".fatal"},
                  {"/aer_dev_nonfatal", "TOTAL_ERR_NONFATAL", ".nonfatal"}};
-  forEachDevice(files, "/sys/bus/pci/devices", [&](const auto& path, const auto&) {
+  for (const auto& [path, device] : sourceDevices(files, "/sys/bus/pci/devices")) {
     for (const auto& [file, total, name] : kTotals) {
       const auto count = countNamed(sourceText(files, path + file), total);
       if (!count) continue;
       const std::string driver = driverOf(files, path);
       if (!driver.empty()) add(counters, "aer." + driver + name, count);
     }
-  });
+  }
 }
 
 void addBlock(const DeviceRoot& files, Counters& counters) {
-  forEachDevice(files, "/sys/block", [&](const auto& path, const auto& name) {
-    add(counters, "block." + inKey(name) + ".io_errors",
-        sourceCount(files, path + "/device/ioerr_cnt"));
-  });
+  for (const auto& [path, name] : sourceDevices(files, "/sys/block")) {
+    add(counters, "block." + name + ".io_errors", sourceCount(files, path + "/device/ioerr_cnt"));
+  }
 }
 
 void addNetwork(const DeviceRoot& files, Counters& counters) {
-  forEachDevice(files, "/sys/class/net", [&](const auto& path, const auto&) {
+  for (const auto& [path, device] : sourceDevices(files, "/sys/class/net")) {
     const std::string driver = driverOf(files, path + "/device");
-    if (driver.empty()) return;
+    if (driver.empty()) continue;
     for (const char* name : {"rx_errors", "tx_errors"}) {
       add(counters, "net." + driver + "." + name, sourceCount(files, path + "/statistics/" + name));
     }
-  });
+  }
 }
 
 Counters errorCounters(const DeviceRoot& files) {

@@ -108,6 +108,28 @@ std::vector<std::string> sourceNames(const DeviceRoot& files, std::string_view p
   return namesInFolder(folder->get(), kMaxNames).orNone().value_or(std::vector<std::string>());
 }
 
+std::string inKey(std::string_view name) {
+  constexpr std::size_t kMaxName = 64;
+  std::string part(name.substr(0, kMaxName));
+  std::ranges::replace_if(
+      part, [](unsigned char c) { return c <= ' ' || c >= 0x7f; }, '_');
+  return part;
+}
+
+std::vector<SourceDevice> sourceDevices(const DeviceRoot& files, const std::string& path) {
+  std::vector<SourceDevice> devices;
+  for (const std::string& name : sourceNames(files, path)) {
+    if (devices.size() == kMaxDevices) break;
+    devices.push_back({path + "/" + name, inKey(name)});
+  }
+  return devices;
+}
+
+std::string driverOf(const DeviceRoot& files, const std::string& device) {
+  const auto lines = sourceText(files, device + "/uevent");
+  return lines ? inKey(assignedValue(*lines, "DRIVER")) : std::string();
+}
+
 std::optional<std::uint64_t> countNamed(const std::optional<std::string>& text,
                                         std::string_view name) {
   if (!text) return std::nullopt;

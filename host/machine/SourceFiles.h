@@ -21,6 +21,7 @@ namespace host::machine {
 
 inline constexpr std::size_t kMaxSource = std::size_t{64} << 10;  // bytes of a file
 inline constexpr std::size_t kMaxNames = 10'000;                  // in a folder
+inline constexpr std::size_t kMaxDevices = 1024;                  // of a kind
 
 // The bytes of a regular file, those of the kernel included, whose size nobody knows before. A file
 // that is longer than `maximum` is none.
@@ -36,6 +37,19 @@ std::optional<std::uint64_t> sourceCount(const DeviceRoot& files, std::string_vi
 // The names in a folder in bytewise order; none in one that isn't there, or holds more than
 // kMaxNames.
 std::vector<std::string> sourceNames(const DeviceRoot& files, std::string_view path);
+
+// The devices of a kind, each a folder in this one: its path, and its name as it may be part of a
+// key, of 64 characters at most. No more than kMaxDevices.
+struct SourceDevice {
+  std::string path, name;
+};
+std::vector<SourceDevice> sourceDevices(const DeviceRoot& files, const std::string& path);
+
+// The driver of the device with that path, as a part of a key; empty without one.
+std::string driverOf(const DeviceRoot& files, const std::string& device);
+
+// A name of the kernel's as it may be part of a key.
+std::string inKey(std::string_view name);
 
 // Takes what stands before the separator, and the separator, off the text's front; the next word of
 // a line, which is empty at its end.

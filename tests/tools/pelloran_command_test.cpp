@@ -153,15 +153,25 @@ TEST_F(PelloranCommand, AFailedReadOrWriteEndsWithOne) {
 
 TEST_F(PelloranCommand, EachReadingOfTheMachineIsRecordedOnce) {
   EXPECT_EQ(run({"sample"}), 1);
-  figures = {{{"host.vmstat.pgfault", 100}}, {{"host.loadavg.1m", 0.25}, {"host.a", -1.5}}};
+  figures = {
+      "boot", 5, {{"host.vmstat.pgfault", 100}}, {{"host.loadavg.1m", 0.25}, {"host.a", -1.5}}};
   terminal = true;
   EXPECT_EQ(run({"sample", "--every", "0.5", "--for", "1"}), 0) << err;
   EXPECT_EQ(waits, 2);
   EXPECT_NE(err.find("reading 2 of 3"), std::string::npos) << err;
   EXPECT_TRUE(err.ends_with("\r\x1b[K")) << err;
-  EXPECT_EQ(here.rows(),
-            (Lines{"20000 host.vmstat.pgfault 100", "20000 host.a 3600:-1.5 3600:-1.5 3600:-1.5",
-                   "20000 host.loadavg.1m 3600:0.25 3600:0.25 3600:0.25"}));
+  const Lines rows{"20000 host.vmstat.pgfault 0", "20000 host.a 3600:-1.5 3600:-1.5 3600:-1.5",
+                   "20000 host.loadavg.1m 3600:0.25 3600:0.25 3600:0.25"};
+  EXPECT_EQ(here.rows(), rows);
+  // The next day, and another boot.
+  here.clock.seconds = here.clock.seconds + 86400;
+  figures = {"boot", 9, {{"host.vmstat.pgfault", 130}}, {}};
+  EXPECT_EQ(run({"sample"}), 0) << err;
+  figures.counts[0].second = 160;
+  EXPECT_EQ(run({"sample"}), 0) << err;
+  figures = {"another", 9, {{"host.vmstat.pgfault", 7}}, {}};
+  EXPECT_EQ(run({"sample"}), 0) << err;
+  EXPECT_EQ(here.rows()[1], "20001 host.vmstat.pgfault 67");
 }
 
 }  // namespace

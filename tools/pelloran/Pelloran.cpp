@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "base/Convert.h"
+#include "host/figures/DayFigures.h"
 #include "tools/common/ClosestName.h"
 #include "tools/common/CommandLine.h"
 #include "tools/common/Terminal.h"
@@ -33,6 +34,7 @@ constexpr int kDone = 0, kFailed = 1, kUsage = 2;
 constexpr std::size_t kMaxLineSize = std::size_t{1} << 20;
 constexpr std::size_t kLinesBetweenProgress = 50000;
 constexpr double kMaxSampling = 366 * 86400.0;
+constexpr char kReading[] = "machineFigures";  // the name under which the last one is kept
 
 // What the command line says, as text; each command looks at its own part.
 struct Arguments {
@@ -109,7 +111,7 @@ class Command {
     const auto readings = base::saturatingCast<std::int64_t>(lasting / every) + 1;
     tools::Progress progress(environment_.err, environment_.errIsTerminal);
     for (std::int64_t reading = 1; reading <= readings; ++reading) {
-      if (const auto recorded = record(environment_.figures()); !recorded) {
+      if (const auto recorded = record(); !recorded) {
         progress.clear();
         return failed(recorded.error().text);
       }
@@ -177,22 +179,31 @@ class Command {
     return outcome(applied);
   }
 
-  base::Result<void> record(const host::figures::MachineFigures& figures) {
-    const Moment now = momentOf(environment_.clock.now());
-    std::vector<CounterChange> changes;
-    for (const auto& [key, count] : figures.counts) {
-      changes.push_back(
-          {.kind = CounterChange::Kind::set, .key = key, .day = now.day, .amount = count});
-    }
-    for (const auto& [key, value] : figures.measurements) {
-      changes.push_back({.kind = CounterChange::Kind::push,
-                         .key = key,
-                         .day = now.day,
-                         .sample = value,
-                         .seconds = now.second});
-    }
-    if (changes.empty()) return base::Error{"this machine shows no figures"};
-    return environment_.store.apply(changes);
+  // The reading is made with the store's lock held, so that two at once don't count the same twice.
+  base::Result<void> record() {
+    using Step = host::CounterStore::Step;
+    host::figures::DayFigures day;  // holds the keys
+    return environment_.store.applyAndKeep(
+        kReading, [&](const std::string& before) -> base::Result<Step> {
+          day = host::figures::dayFigures(before, environment_.figures());
+          if (day.additions.empty() && day.samples.empty()) {
+            return base::Error{"this machine shows no figures"};
+          }
+          const Moment now = momentOf(environment_.clock.now());
+          Step step{.changes = {}, .text = day.remembered};
+          for (const auto& [key, grown] : day.additions) {
+            step.changes.push_back(
+                {.kind = CounterChange::Kind::add, .key = key, .day = now.day, .amount = grown});
+          }
+          for (const auto& [key, value] : day.samples) {
+            step.changes.push_back({.kind = CounterChange::Kind::push,
+                                    .key = key,
+                                    .day = now.day,
+                                    .sample = value,
+                                    .seconds = now.second});
+          }
+          return step;
+        });
   }
 
   const Environment& environment_;
