@@ -187,24 +187,28 @@ def look_at_report(work, units):
     with open(f"{kept}/report", "rb") as file:
         report = plistlib.load(file)
     scalars, distributions = report.get("PLScalars", {}), report.get("PLDistributions", {})
-    counters = {}
+    counted, measured = {}, set()
     with open(f"{kept}/counters.jsonl", encoding="utf-8") as lines:
         for line in map(json.loads, lines):
-            counters[line["key"]] = line.get("value")
-    counted = {key: value for key, value in counters.items() if re.match(r"host\.(vmstat|disk)\.", key)}
-    check(f"the report holds the day's {len(counted)} counts, rounded to two figures",
-          [f"{key}: {scalars.get(key)}, counted {value}" for key, value in counted.items()
-           if scalars.get(key) != rounded(value, 2)] if counted else ["nothing was counted"])
-    measured = {key for key in counters if re.match(r"host\.(loadavg\.15m$|pressure\..*avg10$|thermal\.)", key)}
-    check(f"it holds the day's {len(measured)} distributions", sorted(measured - distributions.keys())
-          if measured else ["nothing was measured"])
-    listed = r"host\.(vmstat|disk|pressure|thermal)\.|host\.loadavg\.15m$|com\.norba\.(NANDInfo\.|tarvenn\.DiskUsageUser)"
-    check("it holds nothing that the whitelist doesn't name",
-          [key for key in scalars.keys() | distributions.keys() if not re.match(listed, key)])
+            if "samples" in line:
+                measured.add(line["key"])
+            else:
+                counted[line["key"]] = line["value"]
+
+    # What the whitelist of the package names, of what this machine has.
+    listed = r"host\.(vmstat|disk)\.|com\.norba\.(NANDInfo\.|tarvenn\.DiskUsageUser)"
+    due = {key: rounded(value, 2) for key, value in counted.items() if key.startswith(("host.vmstat.", "host.disk."))}
+    check(f"the report holds the day's {len(due)} counts, rounded to two figures",
+          [f"{key}: {scalars.get(key)}, of {counted[key]}" for key, value in due.items()
+           if scalars.get(key) != value] if due else ["nothing was counted"])
+    check("no other count", [key for key in scalars if not re.match(listed, key)])
+    due = {key for key in measured if re.match(r"host\.(loadavg\.15m$|pressure\.|thermal\.)", key)}
+    check(f"the day's {len(due)} distributions, and no other", sorted(due ^ distributions.keys())
+          if due else ["nothing was measured"])
     name = next(drive["name"] for drive in read_json(f"{kept}/second.drives.json") if drive["serial"] == "scratch")
-    writes = scalars.get(f"host.disk.{name}n1.sectors_written")
-    check(f"it holds what was written to the spare drive, {writes} sectors",
-          [] if writes == rounded(units * 1000, 2) else [f"{units * 1000} were"])
+    key = f"host.disk.{name}n1.sectors_written"
+    check(f"what was written to the spare drive, {units * 1000} sectors, as {scalars.get(key)}",
+          [] if counted.get(key) == units * 1000 else [f"counted were {counted.get(key)}"])
 
     with open(f"{work}/after/{SPOOL}/events.jsonl", encoding="utf-8") as lines:
         events = [json.loads(line) for line in lines]
