@@ -239,6 +239,9 @@ TEST(DailyRun, TakesNoFileForAStreamAndNoLimitForItsEnd) {
           << closed << ": " << path;
     }
   }
+
+  // A program built with a sanitizer may write a file of the sanitizer's before its own begins.
+  if (!faults::available()) GTEST_SKIP() << "the rest is for programs without a sanitizer";
   Device device;
   device.become(filled);
   const auto outcome = runAs(device, "ulimit -f 0; exec \"$0\" -d");
